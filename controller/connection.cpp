@@ -1,0 +1,105 @@
+// Finds the first controller that is present and opens and closes connections to its driver.
+
+#include "morwick/connection.h"
+
+#include <cstdio>
+
+#include "platform/platform.h"
+
+namespace {
+
+constexpr uint32_t kConnectionType = 0;
+
+// The service handle of the row's driver, or 0 when none is registered.
+uint32_t FindService(const NandExporter &row) {
+  MatchingRequest *request = ServiceMatching(row.className);
+  return request == nullptr ? 0 : GetMatchingService(request);
+}
+
+}  // namespace
+
+uint32_t findNandExporter(NandExporter **row) {
+  if (row == nullptr) return 0;
+  for (*row = nand_exporters; (*row)->className != nullptr; ++*row) {
+    if (const uint32_t service = FindService(**row); service != 0) {
+      std::printf("Morwick: findNandExporter: Controller found: %s\n", (*row)->className);
+      return service;
+    }
+  }
+  return 0;
+}
+
+int findNandExporterNew(NandExporter **row) {
+  if (row == nullptr) return 0;
+  for (*row = nand_exporters; (*row)->className != nullptr; ++*row) {
+    const uint32_t service = FindService(**row);
+    if (service == 0) continue;
+    uint32_t connection = 0;
+    if (OpenService(service, kConnectionType, &connection) == 0) {
+      std::printf("Morwick_drel: findNandExporterNew: Controller found: %s\n", (*row)->className);
+      (*row)->connection = connection;
+      (*row)->service = service;
+      return 1;
+    }
+    CloseService(connection);
+    ReleaseObject(service);
+  }
+  return 0;
+}
+
+void ReleaseIOInterfaces(NandExporter *row) {
+  if (row == nullptr) return;
+  if (row->connection != 0) CloseService(row->connection);
+  if (row->service != 0) ReleaseObject(row->service);
+}
+
+uint32_t TolkConnect(NandExporter **row) {
+  if (row == nullptr) return 0;
+  const uint32_t service = findNandExporter(row);
+  if (service == 0) {
+    std::fputs("No class found", stderr);
+    return 0;
+  }
+  uint32_t connection = 0;
+  const int32_t result = OpenService(service, kConnectionType, &connection);
+  ReleaseObject(service);
+  if (result != 0) {
+    std::fprintf(stderr, "OpenService failed for class '%s', result 0x%x\n", (*row)->className,
+                 static_cast<uint32_t>(result));
+    return 0;
+  }
+  return connection;
+}
+
+void TolkDisconnect(uint32_t connection) {
+  if (CloseService(connection) != 0) {
+    std::fputs("closing connection to service failed\n", stderr);
+  }
+}
+
+int openKVRConnection(KVRConnection *record) {
+  if (record == nullptr) return 0;
+  record->connection = 0;
+  record->service = findNandExporter(&record->exporter);
+  if (record->service == 0) {
+    std::fputs("Can't get KVR Connection, no matching service!\n", stderr);
+    closeKVRConnection(record);
+    return 0;
+  }
+  // TolkConnect searches again: the driver may have gone, or another may come first by now.
+  record->connection = TolkConnect(&record->exporter);
+  if (record->exporter->getStatsSelectors == KVRGetStatsSelectors && record->connection != 0) {
+    return 1;
+  }
+  std::fputs("Can't get KVR Connection!\n", stderr);
+  closeKVRConnection(record);
+  return 0;
+}
+
+void closeKVRConnection(KVRConnection *record) {
+  if (record == nullptr) return;
+  if (record->connection != 0) CloseService(record->connection);
+  record->connection = 0;
+  if (record->service != 0) ReleaseObject(record->service);
+  record->service = 0;
+}

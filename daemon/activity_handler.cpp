@@ -1,0 +1,126 @@
+// One run: find the controller, open it, ask it to carry out BDR work until none is left or the
+// scheduler wants the daemon to yield, then close and defer or stop.
+
+#include "daemon/activity_handler.h"
+
+#include <unistd.h>
+
+#include <bit>
+#include <cstddef>
+#include <cstdint>
+
+#include "morwick/connection.h"
+#include "morwick/exporter.h"
+
+namespace {
+
+constexpr char kActivityIdentifier[] = "org.morwick.grellon";
+constexpr uint32_t kConnectionType = 0;
+constexpr uint32_t kRequestArgument = 1025;
+constexpr uint32_t kDeferChecks = 6;  // between two requests, one before each pause
+constexpr uint32_t kPauseSeconds = 5;
+
+// The driver's words are little-endian, whatever the host.
+constexpr uint32_t LittleEndian(uint32_t value) {
+  return std::endian::native == std::endian::little ? value : __builtin_bswap32(value);
+}
+
+struct TaskSchedulerRequest {
+  uint32_t command;
+  uint32_t argument;
+  uint8_t reserved[16];
+};
+static_assert(offsetof(TaskSchedulerRequest, command) == 0);
+static_assert(offsetof(TaskSchedulerRequest, argument) == 4);
+static_assert(offsetof(TaskSchedulerRequest, reserved) == 8);
+static_assert(sizeof(TaskSchedulerRequest) == 24);
+
+// What the controller answers one request with: the work still pending, 0 after a failed request.
+uint32_t RequestWork(uint32_t connection, const NandExporter &row, uint32_t command,
+                     uint32_t iteration) {
+  const TaskSchedulerRequest request = {
+      .command = LittleEndian(command), .argument = LittleEndian(kRequestArgument), .reserved = {}};
+  uint32_t reply = 0;
+  size_t replySize = sizeof reply;
+  const int32_t status = CallStructMethod(connection, row.methodSelector, &request, sizeof request,
+                                          &reply, &replySize);
+  const uint32_t bdrPending = LittleEndian(reply);
+  SystemLog("iter# %u - KVR status %s - is BDR done: %s (%u)", iteration,
+            status == 0 ? "pass" : "fail", bdrPending == 0 ? "YES" : "NO", bdrPending);
+  return status == 0 ? bdrPending : 0;
+}
+
+// Lets the controller and the host rest before the next request. False: the scheduler wants the
+// daemon to yield. There is no question after the last pause, the next request follows at once.
+bool PauseUnlessDeferred(Activity *activity) {
+  for (uint32_t check = 1; check <= kDeferChecks; ++check) {
+    if (ActivityShouldDefer(activity)) {
+      SystemLog("  - defer chck %u/%u - deferring!!!!", check, kDeferChecks);
+      return false;
+    }
+    SystemLog("  - defer chck %u/%u - sleeping for %us", check, kDeferChecks, kPauseSeconds);
+    sleep(kPauseSeconds);
+  }
+  return true;
+}
+
+// The work still pending when the loop ends: 0 when there is no more, or a request failed.
+uint32_t RequestUntilDoneOrDeferred(Activity *activity, uint32_t connection,
+                                    const NandExporter &row, uint32_t command) {
+  for (uint32_t iteration = 1;; ++iteration) {
+    SystemLog("iter# %u - BEGIN", iteration);
+    const uint32_t bdrPending = RequestWork(connection, row, command, iteration);
+    if (bdrPending == 0) {
+      SystemLog("iter# %u - DONE - no more BDR", iteration);
+      return 0;
+    }
+    if (!PauseUnlessDeferred(activity)) {
+      SystemLog("iter# %u - DONE for now - more BDR", iteration);
+      return bdrPending;
+    }
+    SystemLog("iter# %u - DONE sleeping - more BDR", iteration);
+  }
+}
+
+// Opens the service and works on it; the connection is closed again in every case.
+uint32_t WorkOnService(Activity *activity, uint32_t service, const NandExporter &row) {
+  if (row.getTaskSchedulerSelectors == nullptr) return 0;
+  const SelectorPair *selectors = row.getTaskSchedulerSelectors();
+  uint32_t connection = 0;
+  if (OpenService(service, kConnectionType, &connection) != 0 || connection == 0) return 0;
+  SystemLog("opened io service connection");
+  const uint32_t bdrPending =
+      RequestUntilDoneOrDeferred(activity, connection, row, selectors->second);
+  SystemLog("closing io service connection");
+  if (CloseService(connection) != 0) SystemLog("error closing connection to service");
+  return bdrPending;
+}
+
+void EndRun(Activity *activity, uint32_t bdrPending) {
+  // Asked afresh: the scheduler may have changed its mind since the last defer check.
+  if (bdrPending != 0 && ActivityShouldDefer(activity)) {
+    SystemLog("deferring grellon daemon\n");
+    SetActivityState(activity, kActivityStateDefer);
+  } else {
+    SystemLog("stopping grellon daemon\n");
+  }
+  ExitTransactionClean();
+}
+
+}  // namespace
+
+void RegisterTaskSchedulerActivity() {
+  RegisterActivity(kActivityIdentifier, kActivityCheckIn, TaskSchedulerActivityHandler);
+}
+
+void TaskSchedulerActivityHandler(Activity *activity) {
+  if (GetActivityState(activity) != kActivityStateRun) return;
+  SystemLog("running grellon");
+  NandExporter *row = nullptr;
+  uint32_t bdrPending = 0;
+  if (const uint32_t service = findNandExporter(&row); service != 0) {
+    bdrPending = WorkOnService(activity, service, *row);
+    ReleaseObject(service);
+  }
+  EndRun(activity, bdrPending);
+}

@@ -1,0 +1,196 @@
+// The driver registry, driver connections and the simulated controllers behind them.
+
+#include <endian.h>
+
+#include <cstdio>
+#include <cstring>
+#include <map>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "platform/platform.h"
+#include "platform/simulated/scenario.h"
+
+struct MatchingRequest {
+  std::string className;
+};
+
+namespace simulated {
+namespace {
+
+enum Result : int32_t {
+  kSuccess = 0,
+  kBadHandle = 0x101,
+  kBadArgument = 0x102,
+  kRefused = 0x103,
+  kDeviceError = 0x104,
+};
+
+constexpr uint32_t kTaskSchedulerCommand = 39;
+constexpr uint32_t kTaskSchedulerArgument = 1025;
+constexpr size_t kTaskSchedulerRequestSize = 24;
+
+// A controller at work: what is left to do, and how often it was called, which faults count by.
+struct Device {
+  const Controller *controller;
+  uint32_t pending;
+  uint32_t lookups = 0;
+  uint32_t opens = 0;
+  uint32_t requests = 0;
+  uint32_t closes = 0;
+};
+
+enum class HandleKind { kService, kConnection };
+
+struct Handle {
+  HandleKind kind;
+  Device *device;
+};
+
+const char *NameOf(HandleKind kind) {
+  return kind == HandleKind::kService ? "service" : "connection";
+}
+
+uint32_t LoadWord(const void *bytes, size_t offset) {
+  uint32_t word;
+  std::memcpy(&word, static_cast<const char *>(bytes) + offset, sizeof word);
+  return le32toh(word);
+}
+
+// All state of the simulated drivers. Calls may come from any thread.
+class Drivers {
+ public:
+  static Drivers &Instance() {
+    static Drivers drivers;
+    return drivers;
+  }
+
+  Drivers() {
+    for (const Controller &controller : TheScenario().controllers) {
+      devices_.push_back({.controller = &controller, .pending = controller.pending});
+    }
+  }
+
+  // At exit: a handle that is still open was leaked.
+  ~Drivers() {
+    for (const auto &[number, handle] : open_) {
+      std::fprintf(stderr, "%s %u of %s is still open\n", NameOf(handle.kind), number,
+                   handle.device->controller->className.c_str());
+    }
+  }
+
+  uint32_t Find(const std::string &className) {
+    const std::lock_guard lock(mutex_);
+    for (Device &device : devices_) {
+      if (device.controller->className != className) continue;
+      if (device.controller->vanish.Hits(++device.lookups)) return 0;
+      return Issue(HandleKind::kService, &device);
+    }
+    return 0;
+  }
+
+  int32_t Open(uint32_t service, uint32_t type, uint32_t *connection) {
+    const std::lock_guard lock(mutex_);
+    *connection = 0;
+    Device *device = DeviceOf(HandleKind::kService, service);
+    if (device == nullptr) return kBadHandle;
+    if (device->controller->refuseOpen.Hits(++device->opens)) return kRefused;
+    if (type != 0) return kBadArgument;
+    *connection = Issue(HandleKind::kConnection, device);
+    return kSuccess;
+  }
+
+  // A failed close leaves nothing open: there is no handle left to try it with again.
+  int32_t Close(uint32_t connection) {
+    const std::lock_guard lock(mutex_);
+    Device *device = DeviceOf(HandleKind::kConnection, connection);
+    if (device == nullptr) return kBadHandle;
+    open_.erase(connection);
+    return device->controller->failClose.Hits(++device->closes) ? kDeviceError : kSuccess;
+  }
+
+  int32_t Release(uint32_t service) {
+    const std::lock_guard lock(mutex_);
+    if (DeviceOf(HandleKind::kService, service) == nullptr) return kBadHandle;
+    open_.erase(service);
+    return kSuccess;
+  }
+
+  // A good request does one unit of work and answers with what is left.
+  int32_t Call(uint32_t connection, uint32_t method, const void *input, size_t inputSize,
+               void *reply, size_t *replySize) {
+    const std::lock_guard lock(mutex_);
+    Device *device = DeviceOf(HandleKind::kConnection, connection);
+    if (device == nullptr) return kBadHandle;
+    const size_t room = *replySize;
+    *replySize = 0;
+    if (device->controller->failRequest.Hits(++device->requests)) return kDeviceError;
+    if (method != TaskSchedulerMethod(device->controller->className) ||
+        inputSize != kTaskSchedulerRequestSize ||
+        LoadWord(input, 0) != kTaskSchedulerCommand ||
+        LoadWord(input, 4) != kTaskSchedulerArgument || room < sizeof(uint32_t)) {
+      return kBadArgument;
+    }
+    if (device->pending > 0) --device->pending;
+    const uint32_t word = htole32(device->pending);
+    std::memcpy(reply, &word, sizeof word);
+    *replySize = sizeof word;
+    return kSuccess;
+  }
+
+ private:
+  // Numbers are never used twice, so that a late use of a handle cannot hit another one.
+  uint32_t Issue(HandleKind kind, Device *device) {
+    open_[++lastHandle_] = {kind, device};
+    return lastHandle_;
+  }
+
+  // Null for a handle that is not open, with a word about it on standard error; 0 means none and
+  // is refused in silence.
+  Device *DeviceOf(HandleKind kind, uint32_t number) {
+    const auto found = open_.find(number);
+    if (found != open_.end() && found->second.kind == kind) return found->second.device;
+    if (number != 0) {
+      std::fprintf(stderr, "%s %u is %s\n", NameOf(kind), number,
+                   found != open_.end()      ? "of another kind"
+                   : number <= lastHandle_   ? "already released"
+                                             : "unknown");
+    }
+    return nullptr;
+  }
+
+  std::mutex mutex_;
+  std::vector<Device> devices_;
+  std::map<uint32_t, Handle> open_;
+  uint32_t lastHandle_ = 0;
+};
+
+}  // namespace
+}  // namespace simulated
+
+using simulated::Drivers;
+
+MatchingRequest *ServiceMatching(const char *className) {
+  return className == nullptr ? nullptr : new MatchingRequest{className};
+}
+
+uint32_t GetMatchingService(MatchingRequest *request) {
+  if (request == nullptr) return 0;
+  const std::string className = std::move(request->className);
+  delete request;
+  return Drivers::Instance().Find(className);
+}
+
+int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
+  return Drivers::Instance().Open(service, type, connection);
+}
+
+int32_t CloseService(uint32_t connection) { return Drivers::Instance().Close(connection); }
+
+int32_t ReleaseObject(uint32_t service) { return Drivers::Instance().Release(service); }
+
+int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
+                         size_t inputSize, void *reply, size_t *replySize) {
+  return Drivers::Instance().Call(connection, selector, input, inputSize, reply, replySize);
+}

@@ -1,0 +1,172 @@
+// The background-activity scheduler and the main queue. A worker thread checks the activity in and
+// runs it on schedule; the main thread waits for signals.
+
+#include <pthread.h>
+#include <signal.h>
+
+#include <condition_variable>
+#include <cstdio>
+#include <cstdlib>
+#include <mutex>
+#include <string>
+#include <thread>
+
+#include "platform/platform.h"
+#include "platform/simulated/scenario.h"
+
+struct Activity {
+  std::string identifier;
+  ActivityHandler handler = nullptr;
+  int state = 0;
+};
+
+namespace simulated {
+namespace {
+
+constexpr int kActivityStateCheckIn = 0;
+constexpr int kActivityStateWait = 1;
+constexpr int kActivityStateDone = 5;
+
+class Scheduler {
+ public:
+  static Scheduler &Instance() {
+    static Scheduler scheduler;
+    return scheduler;
+  }
+
+  void Register(const char *identifier, ActivityHandler handler) {
+    activity_ = {.identifier = identifier, .handler = handler};
+  }
+
+  int State(const Activity &activity) {
+    const std::lock_guard lock(mutex_);
+    return activity.state;
+  }
+
+  bool SetState(Activity &activity, int state) {
+    const std::lock_guard lock(mutex_);
+    if (state != kActivityStateDefer || activity.state != kActivityStateRun) return false;
+    activity.state = state;
+    return true;
+  }
+
+  // Once the scheduler wants the run to yield it does not change its mind within the run.
+  bool ShouldDefer() {
+    const std::lock_guard lock(mutex_);
+    ++questions_;
+    if (deferAtCheck_ != 0 && questions_ >= deferAtCheck_) yieldWanted_ = true;
+    return yieldWanted_;
+  }
+
+  void EndTransaction() {
+    const std::lock_guard lock(mutex_);
+    inTransaction_ = false;
+  }
+
+  // Runs the activity until the schedule ends or a signal asks to stop. Signals are blocked before
+  // the worker starts, so that they reach sigwait and never interrupt a pause of the activity.
+  void Run() {
+    sigset_t signals;
+    sigemptyset(&signals);
+    for (const int signal : {SIGUSR1, SIGTERM, SIGINT}) sigaddset(&signals, signal);
+    pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+    std::thread worker([this, mainThread = pthread_self()] {
+      RunSchedule();
+      pthread_kill(mainThread, SIGTERM);  // the schedule's end stops the main queue like a user
+    });
+    int signal = 0;
+    do {
+      sigwait(&signals, &signal);
+      Yield(signal != SIGUSR1);
+    } while (signal == SIGUSR1);
+    worker.join();
+  }
+
+ private:
+  // SIGUSR1 between two runs finds no activity to yield and means nothing.
+  void Yield(bool stop) {
+    const std::lock_guard lock(mutex_);
+    yieldWanted_ = true;
+    stopping_ = stopping_ || stop;
+    wakeUp_.notify_all();
+  }
+
+  void RunSchedule() {
+    if (activity_.handler == nullptr) return;
+    Enter(kActivityStateCheckIn);
+    activity_.handler(&activity_);
+    const Schedule &schedule = TheScenario().schedule;
+    auto delay = schedule.firstRunAfter;
+    size_t run = 0;
+    for (uint32_t left = schedule.runs; left > 0 && WaitFor(delay); ++run) {
+      const auto &deferAt = schedule.deferAtCheck;
+      if (RunActivity(run < deferAt.size() ? deferAt[run] : 0)) {
+        delay = schedule.resumeAfter;
+      } else {
+        delay = schedule.interval;
+        --left;
+      }
+    }
+  }
+
+  // True when the activity was handed back, to be resumed.
+  bool RunActivity(uint32_t deferAtCheck) {
+    Enter(kActivityStateRun, deferAtCheck);
+    activity_.handler(&activity_);
+    const std::lock_guard lock(mutex_);
+    if (inTransaction_) std::fputs("the run did not end its transaction\n", stderr);
+    const bool deferred = activity_.state == kActivityStateDefer;
+    activity_.state = deferred ? kActivityStateWait : kActivityStateDone;
+    return deferred;
+  }
+
+  void Enter(int state, uint32_t deferAtCheck = 0) {
+    const std::lock_guard lock(mutex_);
+    activity_.state = state;
+    deferAtCheck_ = deferAtCheck;
+    questions_ = 0;
+    inTransaction_ = state == kActivityStateRun;
+    yieldWanted_ = stopping_;
+  }
+
+  // False when the process is to stop instead.
+  bool WaitFor(std::chrono::milliseconds delay) {
+    std::unique_lock lock(mutex_);
+    return !wakeUp_.wait_for(lock, delay, [this] { return stopping_; });
+  }
+
+  std::mutex mutex_;
+  std::condition_variable wakeUp_;
+  Activity activity_;
+  uint32_t deferAtCheck_ = 0;
+  uint32_t questions_ = 0;
+  bool inTransaction_ = false;
+  bool yieldWanted_ = false;
+  bool stopping_ = false;
+};
+
+}  // namespace
+}  // namespace simulated
+
+using simulated::Scheduler;
+
+void RegisterActivity(const char *identifier, ActivityCriteria criteria, ActivityHandler handler) {
+  if (criteria == kActivityCheckIn) Scheduler::Instance().Register(identifier, handler);
+}
+
+int GetActivityState(Activity *activity) { return Scheduler::Instance().State(*activity); }
+
+bool ActivityShouldDefer(Activity *) { return Scheduler::Instance().ShouldDefer(); }
+
+bool SetActivityState(Activity *activity, int state) {
+  return Scheduler::Instance().SetState(*activity, state);
+}
+
+void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
+
+void RunMainQueue() {
+  // Lines that the library prints belong between the lines of the log, not behind them all.
+  std::setvbuf(stdout, nullptr, _IOLBF, 0);
+  Scheduler::Instance().Run();
+  std::exit(EXIT_SUCCESS);
+}
