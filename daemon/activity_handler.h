@@ -9,8 +9,8 @@ extern "C" {
 // Registers the activity; the platform calls the handler from then on.
 void RegisterTaskSchedulerActivity();
 
-// One run of the activity when it is in the run state, nothing otherwise. Blocks in driver calls and
-// sleeps; keeps no state from one run to the next.
+// One run of the activity when it is in the run state, nothing otherwise. Blocks in driver calls
+// and sleeps; keeps no state from one run to the next.
 void TaskSchedulerActivityHandler(Activity *activity);
 }
 

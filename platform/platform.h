@@ -1,8 +1,8 @@
 /*
  * What the library and the daemon need from the platform they run on: the driver registry, driver
  * connections, the background-activity scheduler and the system log. Each folder beside this file
- * implements it for one platform; which one is linked in is a build option, and nothing outside this
- * folder knows.
+ * implements it for one platform; which one is linked in is a build option, and nothing outside
+ * this folder knows.
  */
 #ifndef PLATFORM_PLATFORM_H
 #define PLATFORM_PLATFORM_H

@@ -20,7 +20,8 @@
 extern "C" {
 #endif
 
-/* What openKVRConnection fills. The record is the caller's; its handles are closeKVRConnection's. */
+/* What openKVRConnection fills. The record is the caller's; its handles are closeKVRConnection's.
+ */
 typedef struct KVRConnection {
   uint32_t service;
   uint32_t connection;
@@ -58,8 +59,8 @@ MORWICK_EXPORT void TolkDisconnect(uint32_t connection);
 
 /*
  * Fills the record with the first controller's service and connection. Returns 1, or 0 after a
- * message on standard error; the record's handles are then 0 and everything obtained was given back.
- * Whatever the record held before is overwritten, not closed.
+ * message on standard error; the record's handles are then 0 and everything obtained was given
+ * back. Whatever the record held before is overwritten, not closed.
  */
 MORWICK_EXPORT int openKVRConnection(KVRConnection *record);
 

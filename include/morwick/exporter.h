@@ -17,7 +17,8 @@ extern "C" {
 typedef struct GenericParserCxt GenericParserCxt;
 typedef struct KVRStatsCxt KVRStatsCxt;
 
-/* The two numbers of one kind of controller request. In every pair of the library they are equal. */
+/* The two numbers of one kind of controller request. In every pair of the library they are equal.
+ */
 typedef struct SelectorPair {
   uint32_t first;
   uint32_t second;

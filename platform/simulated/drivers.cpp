@@ -127,8 +127,7 @@ class Drivers {
     *replySize = 0;
     if (device->controller->failRequest.Hits(++device->requests)) return kDeviceError;
     if (method != TaskSchedulerMethod(device->controller->className) ||
-        inputSize != kTaskSchedulerRequestSize ||
-        LoadWord(input, 0) != kTaskSchedulerCommand ||
+        inputSize != kTaskSchedulerRequestSize || LoadWord(input, 0) != kTaskSchedulerCommand ||
         LoadWord(input, 4) != kTaskSchedulerArgument || room < sizeof(uint32_t)) {
       return kBadArgument;
     }
@@ -153,9 +152,9 @@ class Drivers {
     if (found != open_.end() && found->second.kind == kind) return found->second.device;
     if (number != 0) {
       std::fprintf(stderr, "%s %u is %s\n", NameOf(kind), number,
-                   found != open_.end()      ? "of another kind"
-                   : number <= lastHandle_   ? "already released"
-                                             : "unknown");
+                   found != open_.end()    ? "of another kind"
+                   : number <= lastHandle_ ? "already released"
+                                           : "unknown");
     }
     return nullptr;
   }

@@ -4,16 +4,15 @@
 
 #include <errno.h>
 
+#include <toml++/toml.h>
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <fstream>
-#include <iterator>
 #include <limits>
+#include <memory>
 #include <set>
-#include <toml++/toml.h>
 
 namespace simulated {
 namespace {
@@ -29,6 +28,7 @@ pending = 2
 )";
 
 constexpr double kLongestSeconds = 1e6;
+constexpr size_t kLargestFile = 1 << 20;
 
 std::string Quoted(std::string_view text) { return std::string(1, '\'').append(text).append("'"); }
 
@@ -157,9 +157,8 @@ void ReadControllers(const toml::node &node, Report &report, std::vector<Control
     if (!element.is_table()) return report.Add(element.source(), "a controller must be a table");
     ReadController(*element.as_table(), report, &controllers->emplace_back());
     const std::string &className = controllers->back().className;
-    if (std::count_if(controllers->begin(), controllers->end(), [&](const Controller &other) {
-          return other.className == className;
-        }) > 1) {
+    if (std::count_if(controllers->begin(), controllers->end(),
+                      [&](const Controller &other) { return other.className == className; }) > 1) {
       report.Add(element.source(), "a second controller of class " + Quoted(className));
     }
   }
@@ -187,8 +186,9 @@ void ReadScenario(const toml::table &table, Report &report, Scenario *scenario) 
   subtable("log", [&](const toml::table &log) {
     TableReader(log, report).Read("enabled", &scenario->logEnabled);
   });
-  subtable("schedule",
-           [&](const toml::table &schedule) { ReadSchedule(schedule, report, &scenario->schedule); });
+  subtable("schedule", [&](const toml::table &schedule) {
+    ReadSchedule(schedule, report, &scenario->schedule);
+  });
   if (const toml::node *controllers = reader.Find("controller")) {
     ReadControllers(*controllers, report, &scenario->controllers);
   }
@@ -199,12 +199,14 @@ void ReadScenario(const toml::table &table, Report &report, Scenario *scenario) 
   std::exit(2);
 }
 
-std::string ReadFile(const std::string &file) {
-  errno = 0;
-  std::ifstream stream(file, std::ios::binary);
-  std::string text{std::istreambuf_iterator<char>(stream), {}};
-  // A directory opens but cannot be read, which only errno tells.
-  if (!stream.is_open() || errno != 0) Refuse(file + ": " + std::strerror(errno));
+std::string ReadFile(const char *path) {
+  const std::unique_ptr<FILE, int (*)(FILE *)> file(std::fopen(path, "rb"), std::fclose);
+  if (file == nullptr) Refuse(std::string(path) + ": " + std::strerror(errno));
+  std::string text(kLargestFile + 1, '\0');
+  text.resize(std::fread(text.data(), 1, text.size(), file.get()));
+  // A directory opens but cannot be read.
+  if (std::ferror(file.get()) != 0) Refuse(std::string(path) + ": " + std::strerror(errno));
+  if (text.size() > kLargestFile) Refuse(std::string(path) + ": larger than a mebibyte");
   return text;
 }
 
@@ -212,9 +214,8 @@ Scenario LoadScenario() {
   const char *file = std::getenv("GRELLON_SCENARIO");
   Scenario scenario;
   std::string error;
-  const bool good = file == nullptr
-                        ? ParseScenario(kBuiltInScenario, "built-in", &scenario, &error)
-                        : ParseScenario(ReadFile(file), file, &scenario, &error);
+  const bool good = file == nullptr ? ParseScenario(kBuiltInScenario, "built-in", &scenario, &error)
+                                    : ParseScenario(ReadFile(file), file, &scenario, &error);
   if (!good) Refuse(error);
   return scenario;
 }

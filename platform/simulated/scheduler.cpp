@@ -2,9 +2,10 @@
 // runs it on schedule; the main thread waits for signals.
 
 #include <pthread.h>
-#include <signal.h>
+#include <unistd.h>
 
 #include <condition_variable>
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <mutex>
@@ -70,9 +71,9 @@ class Scheduler {
     sigemptyset(&signals);
     for (const int signal : {SIGUSR1, SIGTERM, SIGINT}) sigaddset(&signals, signal);
     pthread_sigmask(SIG_BLOCK, &signals, nullptr);
-    std::thread worker([this, mainThread = pthread_self()] {
+    std::thread worker([this] {
       RunSchedule();
-      pthread_kill(mainThread, SIGTERM);  // the schedule's end stops the main queue like a user
+      kill(getpid(), SIGTERM);  // the schedule's end stops the main queue like a user
     });
     int signal = 0;
     do {
@@ -167,6 +168,7 @@ void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
 void RunMainQueue() {
   // Lines that the library prints belong between the lines of the log, not behind them all.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
+  std::signal(SIGPIPE, SIG_IGN);  // nobody reading the log is no reason to leave a connection open
   Scheduler::Instance().Run();
   std::exit(EXIT_SUCCESS);
 }

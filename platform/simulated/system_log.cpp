@@ -1,4 +1,5 @@
-// The system log: syslog, and standard error too for a person who runs the process in the foreground.
+// The system log: syslog, and standard error too for a person who runs the process in the
+// foreground.
 
 #include <sys/stat.h>
 #include <syslog.h>
@@ -7,6 +8,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <string>
 
 #include "platform/platform.h"
 #include "platform/simulated/scenario.h"
@@ -18,11 +20,8 @@ namespace {
 bool StandardErrorIsTheJournal() {
   const char *journal = std::getenv("JOURNAL_STREAM");
   struct stat stream = {};
-  if (journal == nullptr || fstat(fileno(stderr), &stream) != 0) return false;
-  unsigned long long device = 0;
-  unsigned long long inode = 0;
-  return std::sscanf(journal, "%llu:%llu", &device, &inode) == 2 && device == stream.st_dev &&
-         inode == stream.st_ino;
+  return journal != nullptr && fstat(fileno(stderr), &stream) == 0 &&
+         std::to_string(stream.st_dev) + ":" + std::to_string(stream.st_ino) == journal;
 }
 
 struct Log {
