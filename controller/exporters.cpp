@@ -3,6 +3,9 @@
 #include <cstddef>
 
 #include "morwick/exporter.h"
+#include "morwick/ftl_stats.h"
+#include "morwick/kvr_stats.h"
+#include "morwick/msp_stats.h"
 #include "platform/platform.h"
 
 SelectorPair statsSelector = {13, 13};
@@ -27,7 +30,8 @@ namespace {
 
 // What all classes share; a row states only what is its own.
 constexpr NandExporter Row(const char *className, const char *matchKey, int32_t paramA,
-                           uint32_t methodSelector, SelectorGetter getMSPStatsSelectors) {
+                           uint32_t methodSelector, SelectorGetter getMSPStatsSelectors,
+                           MSPStatsParser mspParseBufferToCxt) {
   return {
       .className = className,
       .matchKey = matchKey,
@@ -44,11 +48,11 @@ constexpr NandExporter Row(const char *className, const char *matchKey, int32_t 
       .getSnapshotSelectors = KVRGetSnapshotSelectors,
       .getSnapshotHeaderSelectors = KVRGetSnapshotHeaderSelectors,
       .getBandStatsSelectors = KVRGetBandStatsSelectors,
-      .parseBufferToCxt = nullptr,
-      .releaseContext = nullptr,
-      .mspParseBufferToCxt = nullptr,
-      .ftlParseBufferToCxt = nullptr,
-      .releaseGenericParserCxt = nullptr,
+      .parseBufferToCxt = KVRParseBufferToCxt,
+      .releaseContext = KVRReleaseContext,
+      .mspParseBufferToCxt = mspParseBufferToCxt,
+      .ftlParseBufferToCxt = KVRFTLParseBufferToCxt,
+      .releaseGenericParserCxt = ReleaseGenericParserCxt,
   };
 }
 
@@ -64,8 +68,9 @@ static_assert(offsetof(NandExporter, releaseGenericParserCxt) + sizeof(void *) =
 
 // constinit: the table must be whole before any code runs.
 constinit NandExporter nand_exporters[4] = {
-    Row("VeltoQRN3NVMeController", kNVMeMatchKey, -1, 9, KVRMSPGetStatsSelectors),
-    Row("VeltoEmbeddedNVMeController", kNVMeMatchKey, -1, 9, nullptr),
-    Row("KVRStorage", PLATFORM_PROPERTY_MATCH_KEY, 5, 8, nullptr),
+    Row("VeltoQRN3NVMeController", kNVMeMatchKey, -1, 9, KVRMSPGetStatsSelectors,
+        KVRMSPParseBufferToCxt),
+    Row("VeltoEmbeddedNVMeController", kNVMeMatchKey, -1, 9, nullptr, nullptr),
+    Row("KVRStorage", PLATFORM_PROPERTY_MATCH_KEY, 5, 8, nullptr, nullptr),
     {},
 };

@@ -1,0 +1,180 @@
+// The statistics parsers, release included, in ns per entry, beside two baselines on the same stream:
+// the plain version, which makes each text with one snprintf, and the bare heap work.
+
+#include <benchmark/benchmark.h>
+#include <malloc.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+
+#include "bench/streams.h"
+#include "morwick/morwick.h"
+#include "stats/entry_list.h"
+
+namespace {
+
+using bench::Stream;
+
+// The plain version: the same walk and the same lists.
+template <typename Context>
+bool PlainAdd(Context *context, const char *prefix, const char *name, uint64_t value) {
+  auto *valueNode = static_cast<ContextNode *>(std::calloc(1, sizeof(ContextNode)));
+  auto *nameNode = static_cast<ContextNode *>(std::calloc(1, sizeof(ContextNode)));
+  if (valueNode == nullptr || nameNode == nullptr) std::abort();
+  if (context->namesTail != nullptr) {
+    context->namesTail->next = nameNode;
+    context->valuesTail->next = valueNode;
+  } else {
+    context->namesHead = nameNode;
+    context->valuesHead = valueNode;
+  }
+  context->namesTail = nameNode;
+  context->valuesTail = valueNode;
+  std::snprintf(nameNode->text, 99, "%s%s", prefix, name);
+  std::snprintf(valueNode->text, 99, "%llu", static_cast<unsigned long long>(value));
+  valueNode->value = value;
+  return true;
+}
+
+template <typename Element, typename Context>
+void PlainAddAll(Context *context, const char *name, const char *separator, const char *elements,
+                 uint32_t count) {
+  char prefix[100];
+  std::snprintf(prefix, sizeof prefix, "%s%s", name, separator);
+  for (uint32_t i = 0; i < count; ++i) {
+    Element element;
+    std::memcpy(&element, elements + i * sizeof element, sizeof element);
+    char index[100] = "";
+    if (count > 1) std::snprintf(index, sizeof index, "%d", static_cast<int>(i));
+    PlainAdd(context, count > 1 ? prefix : name, index, element);
+  }
+}
+
+template <typename Context>
+void PlainStats(Context *context, const Stream &stream, const char *separator) {
+  const char *position = stream.buffer.data();
+  const char *end = position + stream.buffer.size();
+  while (position < end) {
+    uint32_t header[2];
+    std::memcpy(header, position, sizeof header);
+    position += 8;
+    const morwick::StatsKey *key = morwick::FindStatsKey(header[0]);
+    PlainAddAll<uint64_t>(context, key->name.data(), separator, position, key->elements);
+    position += size_t{header[1]} * 8;
+  }
+}
+
+void PlainMSP(GenericParserCxt *context, const Stream &stream) {
+  const char *position = stream.buffer.data();
+  const char *end = position + stream.buffer.size();
+  while (position < end) {
+    uint16_t header[2];
+    std::memcpy(header, position, sizeof header);
+    position += 4;
+    const morwick::StatsKey *key = morwick::FindMSPKey(header[0]);
+    PlainAddAll<uint32_t>(context, key->name.data(), "", position, key->elements);
+    position += header[1];
+  }
+}
+
+// The two blocks of each entry allocated, filled with zeros as a node must be, and freed, in the
+// parsers' order.
+void BareHeap(size_t entries) {
+  static std::vector<ContextNode *> nodes;
+  nodes.resize(entries * 2);
+  for (ContextNode *&node : nodes) {
+    node = static_cast<ContextNode *>(std::malloc(sizeof(ContextNode)));
+    if (node == nullptr) std::abort();
+    *node = morwick::kEmptyNode;
+    benchmark::DoNotOptimize(node);
+  }
+  for (ContextNode *node : nodes) std::free(node);
+}
+
+template <typename Parse>
+void Measure(benchmark::State &state, const Stream &stream, Parse parse) {
+  malloc_trim(0);  // every benchmark starts from a heap in one piece
+  for (auto _ : state) parse(stream);
+  state.counters["ns/entry"] = benchmark::Counter(
+      static_cast<double>(stream.entries) * 1e-9,
+      benchmark::Counter::kIsIterationInvariantRate | benchmark::Counter::kInvert);
+}
+
+uint32_t Size(const Stream &stream) { return static_cast<uint32_t>(stream.buffer.size()); }
+
+void KVR(const Stream &stream) {
+  KVRStatsCxt context = {};
+  if (KVRParseBufferToCxt(&context, stream.buffer.data(), Size(stream)) != 1) std::abort();
+  KVRReleaseContext(&context);
+}
+
+void PlainKVR(const Stream &stream) {
+  KVRStatsCxt context = {};
+  PlainStats(&context, stream, "");
+  KVRReleaseContext(&context);
+}
+
+void FTL(const Stream &stream) {
+  GenericParserCxt context = {};
+  if (KVRFTLParseBufferToCxt(&context, stream.buffer.data(), Size(stream)) != stream.entries) {
+    std::abort();
+  }
+  ReleaseGenericParserCxt(&context);
+}
+
+void PlainFTL(const Stream &stream) {
+  GenericParserCxt context = {};
+  PlainStats(&context, stream, "_");
+  ReleaseGenericParserCxt(&context);
+}
+
+void MSP(const Stream &stream) {
+  GenericParserCxt context = {};
+  if (KVRMSPParseBufferToCxt(&context, stream.buffer.data(), Size(stream)) != stream.entries) {
+    std::abort();
+  }
+  ReleaseGenericParserCxt(&context);
+}
+
+void PlainMSPAndRelease(const Stream &stream) {
+  GenericParserCxt context = {};
+  PlainMSP(&context, stream);
+  ReleaseGenericParserCxt(&context);
+}
+
+void Heap(const Stream &stream) { BareHeap(stream.entries); }
+
+const bool kRegistered = [] {
+  static std::vector<Stream> streams;
+  streams.reserve(6);
+  for (const int copies : {1, 32}) {
+    const std::string suffix = "/x" + std::to_string(copies);
+    const auto add = [&](const char *name, const Stream &stream, void (*run)(const Stream &)) {
+      benchmark::RegisterBenchmark((name + suffix).c_str(), [&stream, run](benchmark::State &state) {
+        Measure(state, stream, run);
+      });
+    };
+    const Stream &stats = streams.emplace_back(bench::StatsStream(copies));
+    const Stream &msp = streams.emplace_back(bench::MSPStream(copies * 10));
+    add("KVR/parser", stats, KVR);
+    add("KVR/plain", stats, PlainKVR);
+    add("KVR/heap", stats, Heap);
+    add("FTL/parser", stats, FTL);
+    add("FTL/plain", stats, PlainFTL);
+    add("FTL/heap", stats, Heap);
+    add("MSP/parser", msp, MSP);
+    add("MSP/plain", msp, PlainMSPAndRelease);
+    add("MSP/heap", msp, Heap);
+  }
+  return true;
+}();
+
+}  // namespace
+
+int main(int argc, char **argv) {
+  // Keeps freed memory in the process: otherwise all three mostly measure the kernel's page faults.
+  mallopt(M_TRIM_THRESHOLD, 1 << 30);
+  benchmark::Initialize(&argc, argv);
+  benchmark::RunSpecifiedBenchmarks();
+}

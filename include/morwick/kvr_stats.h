@@ -1,0 +1,73 @@
+/*
+ * The KVR statistics parser. It fills the entry lists and, from the keys that tools need most, summary
+ * fields that are read without searching the lists.
+ *
+ * Threads: no state outside the context and the buffer. One context belongs to one thread at a time.
+ */
+#ifndef MORWICK_KVR_STATS_H
+#define MORWICK_KVR_STATS_H
+
+#include <stdint.h>
+
+#include "morwick/export.h"
+#include "morwick/parser_context.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/*
+ * Owned by the caller, who fills it with zeros before its first use. Each summary field holds the
+ * (first) value of the last record of its key, cut to the field's width; a key that no buffer had
+ * leaves its field alone. The first four fields are those of GenericParserCxt.
+ */
+typedef struct KVRStatsCxt {
+  ContextNode *namesHead;
+  ContextNode *namesTail;
+  ContextNode *valuesHead;
+  ContextNode *valuesTail;
+  uint32_t exportVersion; /* 0 after a parse that ended at a bad header */
+  int32_t parseMarker;    /* -1 after any parse */
+  uint32_t reserved1;
+  uint32_t numVirtualBlocks;
+  uint32_t blocksPerVirtualBlock;
+  uint32_t pagesPerVirtualBlock;
+  uint32_t bytesPerPage;
+  uint64_t hostReads;
+  uint64_t hostWrites;
+  uint64_t numFreeVirtualBlocks;
+  uint64_t wearLevMoves;
+  uint64_t nandReads;
+  uint64_t nandWrites;
+  uint64_t bandErases;
+  uint64_t reserved2[3];
+  uint64_t IND_pool_free;
+  uint64_t IND_pool_count;
+  uint64_t utilFormatTime;
+  uint64_t numSleepOps;
+  uint64_t maxHighEnduranceBlockErases;
+  uint64_t readCountHisto[5];
+  uint64_t reserved3[2];
+} KVRStatsCxt;
+
+/*
+ * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole 64-bit
+ * word are ignored) and appends to whatever the context holds. An array's elements are named by the
+ * key's name followed directly by the index. Records with unknown keys, and records whose values
+ * would run past the end of the buffer, are passed over.
+ *
+ * Returns 1 when the records were read to the end of the buffer. Returns 0, with everything that was
+ * parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above 0x30000000 or
+ * a length past the end; `exportVersion` is then set to 0) and when memory is refused. A null
+ * context or buffer gets 0. No message is recorded.
+ */
+MORWICK_EXPORT int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size);
+
+/* Frees all entries and fills the whole context with zeros, ready for use again. Null: nothing. */
+MORWICK_EXPORT void KVRReleaseContext(KVRStatsCxt *ctx);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

@@ -1,0 +1,41 @@
+/*
+ * The MSP statistics parser: counters of the NAND read path and of the device, from a stream of small
+ * records with 16-bit keys and byte lengths.
+ *
+ * Threads: no state outside the context and the buffer, but for the library's error message. One
+ * context belongs to one thread at a time.
+ */
+#ifndef MORWICK_MSP_STATS_H
+#define MORWICK_MSP_STATS_H
+
+#include <stdint.h>
+
+#include "morwick/export.h"
+#include "morwick/parser_context.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/*
+ * Parses the buffer's records (any alignment) and appends to whatever the context holds; release it
+ * with ReleaseGenericParserCxt. Only the low 32 bits of `size`, in bytes, are used. An array's
+ * elements are named by the key's name followed directly by the index (by the name alone when the
+ * record holds just one element).
+ *
+ * Returns the number of elements added. Parsing ends at the end of the buffer, at a record of the end
+ * key 0x2FFF, at a record that runs past the end, and when a record could not be added; what was
+ * parsed before is kept. Unknown keys and records of length 0 are passed over.
+ *
+ * Messages (error_message.h) are recorded for a null buffer or a size of 0 (result 0), for a record
+ * whose length differs from its configured one (as many whole elements as both allow are added), and
+ * for a record that could not be added, as with a null context.
+ */
+MORWICK_EXPORT uint64_t KVRMSPParseBufferToCxt(GenericParserCxt *ctx, const void *buffer,
+                                               uint64_t size);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

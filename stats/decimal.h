@@ -1,0 +1,74 @@
+// Unsigned integers to decimal text.
+#ifndef STATS_DECIMAL_H
+#define STATS_DECIMAL_H
+
+#include <bit>
+#include <cstdint>
+#include <cstring>
+
+namespace morwick {
+
+// The eight decimal digits of a value below 10^8, one a byte, the first digit in the lowest byte.
+// All digits are made at once, by multiplication, without a branch for each.
+constexpr uint64_t EightDigits(uint32_t value) {
+  // Two groups of four digits, then four of two, then eight of one, each in its own lane.
+  const uint64_t fours = value / 10000 | static_cast<uint64_t>(value % 10000) << 32;
+  const uint64_t hundreds = ((fours * 10486) >> 20) & 0x0000007f0000007f;
+  const uint64_t twos = hundreds | (fours - hundreds * 100) << 16;
+  const uint64_t tens = ((twos * 103) >> 10) & 0x000f000f000f000f;
+  return tens | (twos - tens * 10) << 8;
+}
+
+constexpr uint64_t kAsciiZeros = 0x3030303030303030;
+
+// Eight bytes, the lowest first.
+inline void StoreText(char *out, uint64_t text) {
+  if constexpr (std::endian::native == std::endian::big) text = __builtin_bswap64(text);
+  std::memcpy(out, &text, sizeof text);
+}
+
+// Writes eight digits, leading zeros included.
+inline char *WriteEightDigits(char *out, uint32_t value) {
+  StoreText(out, EightDigits(value) | kAsciiZeros);
+  return out + 8;
+}
+
+// Writes a value below 10^8 without leading zeros. All eight bytes at `out` are written, zeros
+// behind the last digit: one store costs less than the branch that would spare them.
+inline char *WriteShortDecimal(char *out, uint32_t value) {
+  const uint64_t digits = EightDigits(value);
+  // The last digit counts even when it is 0.
+  const int leadingZeros = std::countr_zero(digits | uint64_t{1} << 56) / 8;
+  StoreText(out, (digits | kAsciiZeros) >> leadingZeros * 8);
+  return out + 8 - leadingZeros;
+}
+
+constexpr size_t kDecimalRoom = 24;  // what WriteDecimal may write at `out`
+
+// Writes any value without leading zeros and returns the end of it; zeros follow. Up to 16 digits
+// take the same path whatever their number: counters vary in length, and a branch on it is
+// mispredicted.
+inline char *WriteDecimal(char *out, uint64_t value) {
+  constexpr uint64_t kGroup = 100000000;
+  if (value >= kGroup * kGroup) {
+    out = WriteShortDecimal(out, static_cast<uint32_t>(value / (kGroup * kGroup)));
+    value %= kGroup * kGroup;
+    out = WriteEightDigits(out, static_cast<uint32_t>(value / kGroup));
+    out = WriteEightDigits(out, static_cast<uint32_t>(value % kGroup));
+    return out;
+  }
+  __extension__ using Wide = unsigned __int128;
+  const uint64_t high = EightDigits(static_cast<uint32_t>(value / kGroup));
+  const uint64_t low = EightDigits(static_cast<uint32_t>(value % kGroup));
+  const int highZeros = std::countr_zero(high) / 8;  // 8 when there are no digits but the low ones
+  const int lowZeros = std::countr_zero(low | uint64_t{1} << 56) / 8;
+  const int leadingZeros = highZeros + (highZeros >> 3) * lowZeros;
+  const Wide text = (Wide{low | kAsciiZeros} << 64 | high | kAsciiZeros) >> leadingZeros * 8;
+  StoreText(out, static_cast<uint64_t>(text));
+  StoreText(out + 8, static_cast<uint64_t>(text >> 64));
+  return out + 16 - leadingZeros;
+}
+
+}  // namespace morwick
+
+#endif

@@ -1,0 +1,122 @@
+// The KVR statistics parser.
+
+#include "morwick/kvr_stats.h"
+
+#include <cstddef>
+
+#include "stats/entry_list.h"
+#include "stats/record_stream.h"
+#include "stats/stats_keys.h"
+
+using morwick::kHighestKey;
+using morwick::kWordSize;
+
+namespace {
+
+// Keeps the value of a key that has a summary field.
+void SetSummaryField(KVRStatsCxt *context, uint32_t key, const uint8_t *values) {
+  const auto value = morwick::LoadLittleEndian<uint64_t>(values);
+  const auto low = static_cast<uint32_t>(value);
+  switch (key) {
+    case 4:
+      context->hostWrites = value;
+      break;
+    case 7:
+      context->hostReads = value;
+      break;
+    case 12:
+      context->IND_pool_free = value;
+      break;
+    case 13:
+      context->IND_pool_count = value;
+      break;
+    case 17:
+      context->wearLevMoves = value;
+      break;
+    case 18:
+      context->nandWrites = value;
+      break;
+    case 19:
+      context->nandReads = value;
+      break;
+    case 20:
+      context->bandErases = value;
+      break;
+    case 28:
+      context->numSleepOps = value;
+      break;
+    case 45:
+      context->maxHighEnduranceBlockErases = value;
+      break;
+    case 48:
+      context->numFreeVirtualBlocks = value;
+      break;
+    case 49:
+      context->bytesPerPage = low;
+      break;
+    case 50:
+      context->pagesPerVirtualBlock = low;
+      break;
+    case 51:
+      context->blocksPerVirtualBlock = low;
+      break;
+    case 52:
+      context->numVirtualBlocks = low;
+      break;
+    case 53:
+      context->exportVersion = low;
+      break;
+    case 56:
+      context->utilFormatTime = value;
+      break;
+    case 265:
+      for (uint64_t &entry : context->readCountHisto) {
+        entry = morwick::LoadLittleEndian<uint64_t>(values);
+        values += kWordSize;
+      }
+      break;
+    default:
+      break;
+  }
+}
+
+}  // namespace
+
+int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size) {
+  if (ctx == nullptr) return 0;
+  ctx->parseMarker = -1;
+  if (buffer == nullptr || size < kWordSize) return 0;
+  morwick::RecordStream stream(buffer, size);
+  while (stream.wordsLeft() > 0) {
+    const morwick::Record record = stream.TakeHeader();
+    if (record.key > kHighestKey || record.length > stream.wordsLeft()) {
+      ctx->exportVersion = 0;
+      return 0;
+    }
+    const morwick::StatsKey *key = morwick::FindStatsKey(record.key);
+    // How many values there are the key says, not the record's length: they may run on into the
+    // records behind it, though never past the buffer.
+    if (key != nullptr && key->elements <= stream.wordsLeft()) {
+      SetSummaryField(ctx, key->id, record.payload);
+      if (!morwick::AppendElements(ctx, morwick::EntryName(key->name), record.payload, kWordSize,
+                                   key->elements)) {
+        return 0;
+      }
+    }
+    stream.Skip(record.length);
+  }
+  return 1;
+}
+
+void KVRReleaseContext(KVRStatsCxt *ctx) {
+  if (ctx == nullptr) return;
+  morwick::FreeEntries(ctx);
+  *ctx = {};
+}
+
+// The offsets that tools in other languages read by, on 64-bit hosts.
+static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, exportVersion) == 32);
+static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, hostReads) == 64);
+static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, IND_pool_free) == 144);
+static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, readCountHisto) == 184);
+static_assert(sizeof(void *) != 8 || sizeof(KVRStatsCxt) == 240);

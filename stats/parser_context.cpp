@@ -1,0 +1,32 @@
+// The generic parser context.
+
+#include "morwick/parser_context.h"
+
+#include "stats/entry_list.h"
+
+using morwick::AppendElements;
+using morwick::AppendEntry;
+
+const ContextNode morwick::kEmptyNode = {};
+
+int AddSingleValueToGenericContext(GenericParserCxt *ctx, const char *prefix, const char *name,
+                                   uint64_t value) {
+  if (ctx == nullptr || prefix == nullptr || name == nullptr) return 0;
+  return AppendEntry(ctx, {prefix, name}, value) != nullptr ? 1 : 0;
+}
+
+int AddMultipleFieldsToGenericContext(GenericParserCxt *ctx, const char *fieldName, const void *src,
+                                      uint32_t width, uint32_t count) {
+  if (width == 0 || count == 0) return 1;
+  if (ctx == nullptr || fieldName == nullptr || src == nullptr) return 0;
+  return AppendElements(ctx, morwick::EntryName(fieldName), static_cast<const uint8_t *>(src),
+                        width, count)
+             ? 1
+             : 0;
+}
+
+void ReleaseGenericParserCxt(GenericParserCxt *ctx) {
+  if (ctx == nullptr) return;
+  morwick::FreeEntries(ctx);
+  *ctx = {};
+}
