@@ -1,5 +1,5 @@
-// The statistics parsers, release included, in ns per entry, beside two baselines on the same stream:
-// the plain version, which makes each text with one snprintf, and the bare heap work.
+// The statistics parsers, release included, in ns per entry, beside two baselines on the same
+// stream: the plain version, which makes each text with one snprintf, and the bare heap work.
 
 #include <benchmark/benchmark.h>
 #include <malloc.h>
@@ -151,9 +151,9 @@ const bool kRegistered = [] {
   for (const int copies : {1, 32}) {
     const std::string suffix = "/x" + std::to_string(copies);
     const auto add = [&](const char *name, const Stream &stream, void (*run)(const Stream &)) {
-      benchmark::RegisterBenchmark((name + suffix).c_str(), [&stream, run](benchmark::State &state) {
-        Measure(state, stream, run);
-      });
+      benchmark::RegisterBenchmark(
+          (name + suffix).c_str(),
+          [&stream, run](benchmark::State &state) { Measure(state, stream, run); });
     };
     const Stream &stats = streams.emplace_back(bench::StatsStream(copies));
     const Stream &msp = streams.emplace_back(bench::MSPStream(copies * 10));

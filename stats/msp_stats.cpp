@@ -26,7 +26,6 @@ bool AddRecord(GenericParserCxt *context, const StatsKey &key, const uint8_t *pa
         key.name.data(), key.id, key.elements, key.elements, static_cast<int>(length));
   }
   *added = std::min(length / kElementSize, key.elements);
-  if (*added == 0) return true;
   if (context != nullptr && morwick::AppendElements(context, morwick::EntryName(key.name), payload,
                                                     kElementSize, *added)) {
     return true;

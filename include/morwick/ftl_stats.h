@@ -17,15 +17,15 @@ extern "C" {
 #endif
 
 /*
- * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole 64-bit
- * word are ignored) and appends to whatever the context holds; release it with
+ * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole
+ * 64-bit word are ignored) and appends to whatever the context holds; release it with
  * ReleaseGenericParserCxt. An array's elements are named by the key's name, an underscore and the
  * index (by name and underscore alone when the record holds just one element).
  *
- * Returns the number of scalar records read plus the number of array elements added. Parsing ends at
- * the end of the buffer, at a record of the end key 0xFFFF, at a bad header (a key above 0x30000000
- * or a length past the end), and when an array could not be added; what was parsed before is kept.
- * Unknown keys and records of length 0 are passed over.
+ * Returns the number of scalar records read plus the number of array elements added. Parsing ends
+ * at the end of the buffer, at a record of the end key 0xFFFF, at a bad header (a key above
+ * 0x30000000 or a length past the end), and when an array could not be added; what was parsed
+ * before is kept. Unknown keys and records of length 0 are passed over.
  *
  * Messages (error_message.h) are recorded for a scalar that could not be added (it is counted all
  * the same), for an array whose length differs from its configured one (the smaller number is

@@ -1,8 +1,9 @@
 /*
- * The KVR statistics parser. It fills the entry lists and, from the keys that tools need most, summary
- * fields that are read without searching the lists.
+ * The KVR statistics parser. It fills the entry lists and, from the keys that tools need most,
+ * summary fields that are read without searching the lists.
  *
- * Threads: no state outside the context and the buffer. One context belongs to one thread at a time.
+ * Threads: no state outside the context and the buffer. One context belongs to one thread at a
+ * time.
  */
 #ifndef MORWICK_KVR_STATS_H
 #define MORWICK_KVR_STATS_H
@@ -51,15 +52,15 @@ typedef struct KVRStatsCxt {
 } KVRStatsCxt;
 
 /*
- * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole 64-bit
- * word are ignored) and appends to whatever the context holds. An array's elements are named by the
- * key's name followed directly by the index. Records with unknown keys, and records whose values
- * would run past the end of the buffer, are passed over.
+ * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole
+ * 64-bit word are ignored) and appends to whatever the context holds. An array's elements are named
+ * by the key's name followed directly by the index. Records with unknown keys, and records whose
+ * values would run past the end of the buffer, are passed over.
  *
- * Returns 1 when the records were read to the end of the buffer. Returns 0, with everything that was
- * parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above 0x30000000 or
- * a length past the end; `exportVersion` is then set to 0) and when memory is refused. A null
- * context or buffer gets 0. No message is recorded.
+ * Returns 1 when the records were read to the end of the buffer. Returns 0, with everything that
+ * was parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above
+ * 0x30000000 or a length past the end; `exportVersion` is then set to 0) and when memory is
+ * refused. A null context or buffer gets 0. No message is recorded.
  */
 MORWICK_EXPORT int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size);
 

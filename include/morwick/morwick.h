@@ -2,6 +2,7 @@
 #ifndef MORWICK_MORWICK_H
 #define MORWICK_MORWICK_H
 
+#include "morwick/capacity.h"
 #include "morwick/connection.h"
 #include "morwick/error_message.h"
 #include "morwick/exporter.h"
@@ -9,5 +10,6 @@
 #include "morwick/kvr_stats.h"
 #include "morwick/msp_stats.h"
 #include "morwick/parser_context.h"
+#include "morwick/snapshot.h"
 
 #endif

@@ -1,6 +1,6 @@
 /*
- * The MSP statistics parser: counters of the NAND read path and of the device, from a stream of small
- * records with 16-bit keys and byte lengths.
+ * The MSP statistics parser: counters of the NAND read path and of the device, from a stream of
+ * small records with 16-bit keys and byte lengths.
  *
  * Threads: no state outside the context and the buffer, but for the library's error message. One
  * context belongs to one thread at a time.
@@ -23,13 +23,13 @@ extern "C" {
  * elements are named by the key's name followed directly by the index (by the name alone when the
  * record holds just one element).
  *
- * Returns the number of elements added. Parsing ends at the end of the buffer, at a record of the end
- * key 0x2FFF, at a record that runs past the end, and when a record could not be added; what was
- * parsed before is kept. Unknown keys and records of length 0 are passed over.
+ * Returns the number of elements added. Parsing ends at the end of the buffer, at a record of the
+ * end key 0x2FFF, at a record that runs past the end, and when a record could not be added; what
+ * was parsed before is kept. Unknown keys and records of length 0 are passed over.
  *
  * Messages (error_message.h) are recorded for a null buffer or a size of 0 (result 0), for a record
- * whose length differs from its configured one (as many whole elements as both allow are added), and
- * for a record that could not be added, as with a null context.
+ * whose length differs from its configured one (as many whole elements as both allow are added),
+ * and for a record that could not be added, as with a null context.
  */
 MORWICK_EXPORT uint64_t KVRMSPParseBufferToCxt(GenericParserCxt *ctx, const void *buffer,
                                                uint64_t size);
