@@ -11,6 +11,17 @@
 
 namespace morwick {
 
+// A piece of a few characters that can be copied without asking how many.
+struct ShortText {
+  static constexpr size_t kRoom = 16;
+
+  char characters[kRoom] = {};
+  size_t length = 0;
+
+  // There must be room.
+  void Append(char character) { characters[length++] = character; }
+};
+
 class BoundedWriter {
  public:
   BoundedWriter(char *output, uint64_t capacity)
@@ -36,6 +47,13 @@ class BoundedWriter {
     return false;
   }
 
+  bool Append(const ShortText &piece) {
+    if (!Fits(ShortText::kRoom)) return Append(std::string_view(piece.characters, piece.length));
+    std::memcpy(position_, piece.characters, ShortText::kRoom);
+    Advance(piece.length);
+    return true;
+  }
+
   // Appends the number as WritePadded does.
   bool AppendPadded(uint32_t value, uint32_t width, char pad) {
     if (Fits(kPaddedRoom)) {  // nearly always: no second copy
@@ -43,7 +61,7 @@ class BoundedWriter {
       return true;
     }
     char text[kPaddedRoom];
-    return Append({text, WritePadded(text, value, width, pad)});
+    return Append(std::string_view(text, WritePadded(text, value, width, pad)));
   }
 
   // Appends the character so many times; they must fit.

@@ -72,29 +72,22 @@ inline char *WriteDecimal(char *out, uint64_t value) {
 constexpr size_t kPaddedRoom = 16;  // what WritePadded may write at `out`
 
 // Writes the value right-aligned in at least `width` (1 to 8) characters and returns the end of it.
-// Lengths and padding are computed, not branched on: columns hold numbers of all lengths.
+// Length and padding are computed, not branched on: columns hold numbers of all lengths.
 inline char *WritePadded(char *out, uint32_t value, uint32_t width, char pad) {
   constexpr uint32_t kGroup = 100000000;
-  const uint32_t high = value / kGroup;  // up to 42
-  const uint64_t digits = EightDigits(value % kGroup);
-
-  // The digits above the lower eight: none, one or two.
-  const uint32_t tens = high * 103 >> 10;
-  const uint32_t highText = (high >= 10 ? tens | (high - tens * 10) << 8 : high) | 0x3030;
-  const auto highDigits = static_cast<uint32_t>((high >= 1) + (high >= 10));
-  out[0] = static_cast<char>(highText);
-  out[1] = static_cast<char>(highText >> 8);
-
-  // The lower eight: padding instead of leading zeros, then cut to the width. All of them are
-  // wanted when there are higher digits.
-  const auto zeros = static_cast<uint32_t>(std::countr_zero(digits | uint64_t{1} << 56)) / 8;
-  const uint32_t leadingZeros = high == 0 ? zeros : 0;
-  const uint64_t padding = (uint64_t{1} << leadingZeros * 8) - 1;  // a mask
-  const uint64_t pads = static_cast<unsigned char>(pad) * uint64_t{0x0101010101010101};
-  const uint64_t text = (digits | kAsciiZeros) ^ (((digits | kAsciiZeros) ^ pads) & padding);
-  const uint32_t length = 8 - leadingZeros < width ? width : 8 - leadingZeros;
-  StoreText(out + highDigits, text >> (8 - length) * 8);
-  return out + highDigits + length;
+  if (value >= kGroup) {  // nine or ten digits, wider than any column
+    out = WriteShortDecimal(out, value / kGroup);
+    return WriteEightDigits(out, value % kGroup);
+  }
+  const uint64_t digits = EightDigits(value);
+  const int leadingBits = std::countr_zero(digits | uint64_t{1} << 56) & ~7;
+  const uint64_t padding = (uint64_t{1} << leadingBits) - 1;  // a mask of the leading zeros
+  // A blank differs from a zero in one bit of each character.
+  const uint64_t text = (digits | kAsciiZeros) ^ (pad == ' ' ? padding & kAsciiZeros / 3 : 0);
+  // As many leading characters go as are padding and not needed for the width.
+  const int droppedBits = std::countr_zero(digits | uint64_t{1} << (64 - 8 * width)) & ~7;
+  StoreText(out, text >> droppedBits);
+  return out + 8 - droppedBits / 8;
 }
 
 }  // namespace morwick

@@ -10,39 +10,26 @@ namespace {
 // Larger numbers are taken for this one: no buffer is as large, and sums of it do not overflow.
 constexpr uint64_t kHuge = 1000000000000000000;
 
-// One conversion, such as %-08.3u.
-struct Conversion {
-  bool left = false;
-  bool zeros = false;
-  bool plus = false;
-  bool blank = false;
-  bool alternate = false;
-  bool hasPrecision = false;
-  uint64_t width = 0;
-  uint64_t precision = 0;
-  char type = '\0';
-
-  bool IsNumber() const { return std::string_view("diuoxX").find(type) != std::string_view::npos; }
-};
-
-// Takes a format apart: stretches of plain text, and the conversions between them.
+// Walks over a format.
 class FormatReader {
  public:
   explicit FormatReader(std::string_view format) : rest_(format) {}
 
   bool AtEnd() const { return rest_.empty(); }
 
-  // The plain text up to the next conversion or the end; a doubled % is a piece of its own.
-  std::string_view TakeText() {
-    const bool doubled = rest_.starts_with("%%");
-    const std::string_view text = doubled ? rest_.substr(1, 1) : rest_.substr(0, rest_.find('%'));
-    rest_.remove_prefix(doubled ? 2 : text.size());
+  // Takes plain text up to the next conversion or the end; a doubled % stands for one.
+  ShortText TakeText() {
+    ShortText text;
+    while (!rest_.empty()) {
+      const bool percent = rest_.front() == '%';
+      if (percent && !rest_.starts_with("%%")) break;
+      text.Append(rest_.front());
+      rest_.remove_prefix(percent ? 2 : 1);
+    }
     return text;
   }
 
-  // True when a conversion is next.
-  bool AtConversion() const { return rest_.starts_with('%') && !rest_.starts_with("%%"); }
-
+  // Takes the conversion that is next. Its type is NUL when the format ends in the middle of it.
   Conversion TakeConversion() {
     Conversion conversion;
     rest_.remove_prefix(1);
@@ -98,20 +85,6 @@ class FormatReader {
   std::string_view rest_;
 };
 
-template <typename Accept>
-bool AsksFor(std::string_view format, size_t arguments, Accept accept) {
-  FormatReader reader(format);
-  size_t conversions = 0;
-  while (!reader.AtEnd()) {
-    if (!reader.AtConversion()) {
-      reader.TakeText();
-    } else if (!accept(reader.TakeConversion()) || ++conversions > arguments) {
-      return false;
-    }
-  }
-  return true;
-}
-
 // The parts of a converted number, in print order: sign or base, zeros, digits, in a field.
 bool AppendField(BoundedWriter &writer, const Conversion &conversion, std::string_view prefix,
                  uint64_t zeros, std::string_view digits) {
@@ -134,14 +107,12 @@ std::string_view Digits(uint32_t value, uint32_t shift, const char *symbols, cha
   return {start, end};
 }
 
+bool AppendPlain(BoundedWriter &writer, const Conversion &conversion, uint32_t value) {
+  const auto width = std::max<uint32_t>(static_cast<uint32_t>(conversion.width), 1);
+  return writer.AppendPadded(value, width, conversion.zeros ? '0' : ' ');
+}
+
 bool AppendNumber(BoundedWriter &writer, const Conversion &conversion, uint32_t value) {
-  // What nearly every format asks for.
-  if (conversion.type == 'u' && !conversion.hasPrecision && !conversion.left &&
-      conversion.width <= 8) {
-    return writer.AppendPadded(value,
-                               std::max<uint32_t>(static_cast<uint32_t>(conversion.width), 1),
-                               conversion.zeros ? '0' : ' ');
-  }
   char text[kDecimalRoom];
   std::string_view digits;
   std::string_view prefix;
@@ -183,39 +154,46 @@ bool AppendNumber(BoundedWriter &writer, const Conversion &conversion, uint32_t 
   return AppendField(writer, conversion, prefix, zeros, digits);
 }
 
-// Prints the text of the format and hands each conversion on.
+// Prints the plain texts of the format and hands each conversion on.
 template <typename AppendArgument>
-bool Print(BoundedWriter &writer, std::string_view format, AppendArgument append) {
-  FormatReader reader(format);
-  while (!reader.AtEnd()) {
-    if (!(reader.AtConversion() ? append(reader.TakeConversion())
-                                : writer.Append(reader.TakeText()))) {
-      return false;
-    }
+bool Print(BoundedWriter &writer, const PrintFormat &format, AppendArgument append) {
+  if (!writer.Append(format.texts[0])) return false;
+  for (size_t i = 0; i < format.conversionCount; ++i) {
+    if (!append(format.conversions[i], i) || !writer.Append(format.texts[i + 1])) return false;
   }
   return true;
 }
 
 }  // namespace
 
-bool AsksForNumbersOnly(std::string_view format, size_t numbers) {
-  return AsksFor(format, numbers, [](const Conversion &asked) { return asked.IsNumber(); });
+bool ReadPrintFormat(std::string_view text, Arguments arguments, PrintFormat *format) {
+  const std::string_view types = arguments == Arguments::kOneText ? "s" : "diuoxX";
+  const size_t most = arguments == Arguments::kTwoNumbers ? 2 : 1;
+  *format = {};
+  FormatReader reader(text);
+  format->texts[0] = reader.TakeText();
+  while (!reader.AtEnd()) {
+    const Conversion conversion = reader.TakeConversion();
+    if (format->conversionCount == most || conversion.type == '\0' ||
+        types.find(conversion.type) == std::string_view::npos) {
+      return false;
+    }
+    format->conversions[format->conversionCount] = conversion;
+    format->texts[++format->conversionCount] = reader.TakeText();
+  }
+  return true;
 }
 
-bool AsksForOneTextOnly(std::string_view format) {
-  return AsksFor(format, 1, [](const Conversion &asked) { return asked.type == 's'; });
-}
-
-bool PrintNumbers(BoundedWriter &writer, std::string_view format,
+bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,
                   std::span<const uint32_t> numbers) {
-  auto number = numbers.begin();
-  return Print(writer, format, [&](const Conversion &conversion) {
-    return AppendNumber(writer, conversion, *number++);
+  return Print(writer, format, [&](const Conversion &conversion, size_t index) {
+    return conversion.IsPlain() ? AppendPlain(writer, conversion, numbers[index])
+                                : AppendNumber(writer, conversion, numbers[index]);
   });
 }
 
-bool PrintText(BoundedWriter &writer, std::string_view format, std::string_view text) {
-  return Print(writer, format, [&](const Conversion &conversion) {
+bool PrintText(BoundedWriter &writer, const PrintFormat &format, std::string_view text) {
+  return Print(writer, format, [&](const Conversion &conversion, size_t) {
     const uint64_t length = conversion.hasPrecision ? conversion.precision : text.size();
     return AppendField(writer, conversion, "", 0, text.substr(0, length));
   });

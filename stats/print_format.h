@@ -1,5 +1,5 @@
-// Print formats that come from outside: checked first, then printed without the C library, so that
-// nothing is ever asked of it that was not checked.
+// Print formats that come from outside: taken apart and checked first, then printed without the C
+// library, so that nothing is ever asked of it that was not checked.
 #ifndef STATS_PRINT_FORMAT_H
 #define STATS_PRINT_FORMAT_H
 
@@ -11,17 +11,42 @@
 
 namespace morwick {
 
-// True when the format asks for at most `numbers` unsigned integers and nothing else.
-bool AsksForNumbersOnly(std::string_view format, size_t numbers);
+// One conversion, such as %-08.3u.
+struct Conversion {
+  bool left = false;
+  bool zeros = false;
+  bool plus = false;
+  bool blank = false;
+  bool alternate = false;
+  bool hasPrecision = false;
+  char type = '\0';
+  uint64_t width = 0;
+  uint64_t precision = 0;
 
-// True when the format asks for at most one text and nothing else.
-bool AsksForOneTextOnly(std::string_view format);
+  // An unsigned number in a field of at most eight characters: nearly all there are.
+  bool IsPlain() const { return type == 'u' && !hasPrecision && !left && width <= 8; }
+};
 
-// Print what printf would, for a format that has passed its check with as many arguments. False
-// when it does not fit, at a cost of no more than what fits.
-bool PrintNumbers(BoundedWriter &writer, std::string_view format,
+// A format taken apart: plain text, then a conversion and plain text in turn.
+struct PrintFormat {
+  static constexpr size_t kMostConversions = 2;
+
+  ShortText texts[kMostConversions + 1];
+  Conversion conversions[kMostConversions];
+  size_t conversionCount = 0;
+};
+
+// What a format may ask for.
+enum class Arguments { kOneNumber, kTwoNumbers, kOneText };
+
+// Takes apart a format shorter than ShortText::kRoom. False when it asks for anything else than
+// (fewer of) these arguments.
+bool ReadPrintFormat(std::string_view text, Arguments arguments, PrintFormat *format);
+
+// Print what printf would. False when it does not fit, at a cost of no more than what fits.
+bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,
                   std::span<const uint32_t> numbers);
-bool PrintText(BoundedWriter &writer, std::string_view format, std::string_view text);
+bool PrintText(BoundedWriter &writer, const PrintFormat &format, std::string_view text);
 
 }  // namespace morwick
 
