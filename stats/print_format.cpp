@@ -174,8 +174,7 @@ bool ReadPrintFormat(std::string_view text, Arguments arguments, PrintFormat *fo
   format->texts[0] = reader.TakeText();
   while (!reader.AtEnd()) {
     const Conversion conversion = reader.TakeConversion();
-    if (format->conversionCount == most || conversion.type == '\0' ||
-        types.find(conversion.type) == std::string_view::npos) {
+    if (format->conversionCount == most || types.find(conversion.type) == std::string_view::npos) {
       return false;
     }
     format->conversions[format->conversionCount] = conversion;

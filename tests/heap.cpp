@@ -4,6 +4,8 @@
 #include <cstdlib>
 
 // The linker sends the calls of everything under test here (--wrap).
+// NOLINTBEGIN(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the linker gives these
+// names
 extern "C" {
 void *__real_malloc(size_t size);
 void *__real_calloc(size_t count, size_t size);
@@ -38,3 +40,4 @@ void *__wrap_calloc(size_t count, size_t size) {
 void *__wrap_realloc(void *block, size_t size) {
   return Refuses() ? nullptr : __real_realloc(block, size);
 }
+// NOLINTEND(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)

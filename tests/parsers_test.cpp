@@ -2,7 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include <cstring>
+#include <algorithm>
 
 #include "morwick/morwick.h"
 #include "tests/fake_platform.h"
@@ -65,7 +65,7 @@ std::string Elements(const std::string &name, int count, uint64_t first) {
 }
 
 std::string TakeMessage() {
-  const std::string message = GetAPIErrorMessage();
+  std::string message = GetAPIErrorMessage();
   std::free(GlobalAPIErrorMessage);
   GlobalAPIErrorMessage = nullptr;
   return message;
@@ -124,8 +124,8 @@ Parsed Parse(StreamKind kind, const std::string &bytes, bool filled = false, siz
     parsed.exportVersion = kvr.exportVersion;
   }
   KVRReleaseContext(&kvr);
-  const KVRStatsCxt zero = {};
-  EXPECT_EQ(std::memcmp(&kvr, &zero, sizeof zero), 0);
+  const auto *record = reinterpret_cast<const char *>(&kvr);
+  EXPECT_EQ(std::count(record, record + sizeof kvr, '\0'), static_cast<long>(sizeof kvr));
   ReleaseGenericParserCxt(&generic);
   ReleaseGenericParserCxt(&generic);
   EXPECT_EQ(Entries(generic), "");

@@ -353,8 +353,7 @@ TEST(InplaceSnapshotTest, PassesThroughBuffersOfAnySize) {
 }
 
 TEST(InplaceSnapshotTest, ChargesNothingForHugeWidths) {
-  for (const char *format :
-       {"%2000000000u", "%.2000000000u", "%9999999999999u", "%.4000000000x"}) {
+  for (const char *format : {"%2000000000u", "%.2000000000u", "%9999999999999u", "%.4000000000x"}) {
     const Snapshot snapshot = {Header(6, 4, 3, {{0, 0, 0, format}}), Bytes({1, 2, 3})};
     uint32_t state = 0;
     const Rendered rendered = RenderInplace(snapshot, 1000, &state);
@@ -382,6 +381,7 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   EXPECT_STREQ(output, "untouched");
   EXPECT_EQ(size, sizeof output);
   EXPECT_EQ(state, 7U);
+  state = 0;
   EXPECT_EQ(inplace(nullptr, 36, output, &size, header.data(), &state), 1U);
 }
 

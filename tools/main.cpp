@@ -2,7 +2,8 @@
 
 #include <CLI/CLI.hpp>
 #include <csignal>
-#include <new>
+#include <exception>
+#include <sstream>
 
 #include "tools/commands.h"
 
@@ -53,8 +54,11 @@ Status Run(int argc, char **argv) {
       throw CLI::ValidationError("--header", "csv is for the fixed layout only");
     }
   } catch (const CLI::Success &success) {  // --help, --version
-    app.exit(success);
-    return tools::Output().Finish(tools::kGood);
+    std::ostringstream text;
+    app.exit(success, text);
+    tools::Output output;
+    output.Write(text.str());
+    return output.Finish(tools::kGood);
   } catch (const CLI::Error &error) {
     std::fprintf(stderr, "morwick: %s (see morwick --help)\n", error.what());
     return tools::kBadUsage;
@@ -72,8 +76,8 @@ int main(int argc, char **argv) {
   std::signal(SIGPIPE, SIG_IGN);  // a closed pipe is an error like any other
   try {
     return Run(argc, argv);
-  } catch (const std::bad_alloc &) {
-    std::fputs("morwick: out of memory\n", stderr);
+  } catch (const std::exception &error) {  // out of memory, before all
+    std::fprintf(stderr, "morwick: %s\n", error.what());
     return tools::kBadUsage;
   }
 }

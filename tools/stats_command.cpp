@@ -195,6 +195,12 @@ Status StatsCommand(const StatsOptions &options) {
     statistics = ParseGeneric(*row, row->mspParseBufferToCxt, *dump, uint64_t{dump->size()});
   }
 
+  // The 64-bit parsers pass over what is no whole word; a dump that ends so was cut.
+  const size_t rest = options.stream == "msp" ? 0 : dump->size() % sizeof(uint64_t);
+  if (statistics.problem.empty() && rest != 0) {
+    statistics.problem = "the last " + std::to_string(rest) + " bytes are not a whole word";
+  }
+
   Output output;
   if (options.format == "json") {
     PrintJson(output, statistics, options, *row);

@@ -105,7 +105,7 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
 /*
  * Renders a snapshot in the layout that its header describes, through a buffer of any size, in as
  * many calls as it takes. `*state` is the index of the next record: set it to 0 before the first
- * call and leave it alone from then on. Before each call set `*outputSize` to the capacity of
+ * call and keep it between calls. Before each call set `*outputSize` to the capacity of
  * `output`, in bytes; afterwards it is the length of the text of this call plus 1, for its NUL.
  *
  * Returns 1 when the last record has been dealt with, and 0 when the buffer was full: take the text

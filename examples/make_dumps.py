@@ -1,0 +1,72 @@
+#!/usr/bin/env python3
+"""Makes the example dumps in this folder; the same ones every time."""
+
+import math
+import pathlib
+import random
+import struct
+
+folder = pathlib.Path(__file__).parent
+random.seed(1)
+
+
+def words(records):
+    """64-bit statistics records: key id, length in words, values."""
+    return b"".join(
+        struct.pack(f"<II{len(values)}Q", key, len(values), *values) for key, values in records)
+
+
+(folder / "kvr.bin").write_bytes(words([
+    (53, [7]), (52, [4096]), (51, [8]), (50, [1152]), (49, [16384]),
+    (7, [918273645]), (4, [123456789]), (19, [1020304050]), (18, [234567891]), (20, [40961]),
+    (48, [312]), (17, [77]), (265, [900, 80, 7, 1, 0]),
+]))
+
+(folder / "ftl.bin").write_bytes(words([
+    (1, [5]), (2, [45678]), (3, [98765]), (14, [2 ** i for i in range(10)]),
+    (9, [12]), (10, [13]), (11, [1]),
+]))
+
+(folder / "msp.bin").write_bytes(b"".join(
+    struct.pack(f"<HH{len(values)}I", key, 4 * len(values), *values) for key, values in [
+        (4096, [812345]), (4127, [5, 4, 3, 2, 1, 0, 0, 0, 0, 0]), (4137, [3]),
+        (8195, list(range(31, 47))), (8202, [4]),
+    ]))
+
+
+def record(second):
+    """One fixed snapshot record: a load that swells and ebbs, and a burst of slow writes."""
+    load = 1 + math.sin(second / 9) ** 2
+    burst = 40 if 55 <= second < 65 else 1
+    r = [0] * 63
+    r[0] = second
+    for k in range(4):
+        writes = int(300 * load / (k + 1)) + random.randrange(20)
+        reads = int(700 * load / (k + 1)) + random.randrange(50)
+        write_latency = writes * (90 + random.randrange(30)) * burst
+        read_latency = reads * (60 + random.randrange(20)) * (1 + burst // 8)
+        r[2 + 3 * k:5 + 3 * k] = [writes, write_latency, 900 * burst + random.randrange(300)]
+        r[14 + 3 * k:17 + 3 * k] = [reads, read_latency, 700 * (1 + burst // 8)]
+    r[1] = 10 * burst // 4
+    r[26:32] = [2 * burst, 9000, 4000, 9500, 4400 + 10 * burst, 120 * burst]
+    r[33] = 1
+    r[36:38] = [3, 17]
+    r[39:46] = [1230 * burst, burst, 4 * burst, 310 - burst, 2, 10, 5120 - 20 * burst]
+    r[47:49] = [6, 9]
+    r[50:55] = [12, 1, 256, 2, 31]
+    return struct.pack("<63I", *r)
+
+
+(folder / "snapshot.bin").write_bytes(b"".join(record(second) for second in range(1, 121)))
+
+descriptors = [
+    (0, 0, 4, b"T=%04u"), (0, 108, 4, b" HR=%4u"), (0, 112, 4, b" HW=%4u"),
+    (2, 156, 4, b" TH=%8u.%02u"), (3, 56, 48, b" R%s="), (3, 8, 48, b" W%s="),
+]
+text = b"Example layout\0\0"
+table = 36 + len(text)
+(folder / "snapshot_header.bin").write_bytes(
+    struct.pack("<9I", 0, 6, 252, 121, 0, 0, table, 0, 0) + text +
+    struct.pack("<II", len(descriptors), 0) +
+    b"".join(struct.pack("<HHII16s", kind, 0, offset, size, layout)
+             for kind, offset, size, layout in descriptors))
