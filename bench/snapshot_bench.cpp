@@ -196,10 +196,11 @@ size_t PlainInplace(char *output, size_t capacity) {
         const uint32_t value = word(field.fieldOffset);
         writer.Append(field.format, value / 1000, value % 1000 / 10);
       } else {
+        const char *labels[] = {"O", "L", "M"};
         const char *first[] = {"%4u", "%7u", "%5u"};
         const char *further[] = {"/%4u", "/%7u", "/%5u"};
         for (uint32_t part = 0; part < 3; ++part) {
-          writer.Append(field.format, &"O\0L\0M"[part * 2]);
+          writer.Append(field.format, labels[part]);
           for (uint32_t k = 0; k < field.fieldSize / 12; ++k) {
             writer.Append(k == 0 ? first[part] : further[part],
                           word(field.fieldOffset + 4 * part + 12 * k));

@@ -36,12 +36,12 @@ class BoundedWriter {
   // false.
   bool Append(std::string_view piece) {
     if (Fits(piece.size())) {
-      std::memcpy(position_, piece.data(), piece.size());
+      piece.copy(position_, piece.size());
       Advance(piece.size());
       return true;
     }
     if (free_ > 0) {
-      std::memcpy(position_, piece.data(), free_ - 1);
+      piece.copy(position_, free_ - 1);
       position_[free_ - 1] = '\0';
     }
     return false;

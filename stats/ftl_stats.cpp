@@ -20,8 +20,10 @@ constexpr uint32_t kEndKey = 0xFFFF;
 
 void AddScalar(GenericParserCxt *context, const StatsKey &key, const Record &record) {
   const auto value = morwick::LoadLittleEndian<uint64_t>(record.payload);
-  if (context != nullptr && morwick::AppendEntry(context, morwick::EntryName(key.name), value))
+  if (context != nullptr &&
+      morwick::AppendEntry(context, morwick::EntryName(key.name), value) != nullptr) {
     return;
+  }
   SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u) cannot add 1 element to context",
                      key.name.data(), key.id);
 }

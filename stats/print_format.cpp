@@ -115,7 +115,7 @@ bool AppendPlain(BoundedWriter &writer, const Conversion &conversion, uint32_t v
 bool AppendNumber(BoundedWriter &writer, const Conversion &conversion, uint32_t value) {
   char text[kDecimalRoom];
   std::string_view digits;
-  std::string_view prefix = "";
+  std::string_view prefix;
   switch (conversion.type) {
     case 'd':
     case 'i': {

@@ -109,8 +109,9 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * `output`, in bytes; afterwards it is the length of the text of this call plus 1, for its NUL.
  *
  * Returns 1 when the last record has been dealt with, and 0 when the buffer was full: take the text
- * and call again. A record that did not fit is passed over and not printed later; a call in which
- * no line was completed yields the empty text. While the banner does not fit, every call returns 0
+ * and call again. A record that did not fit is passed over and not printed later, unless you set
+ * `*state` back by one, so that it is tried again with the buffer to itself. A call in which no
+ * line was completed yields the empty text. While the banner does not fit, every call returns 0
  * with the empty text and `*state` at 0. A record whose first described field is 0 prints no line.
  * A null pointer or a capacity of 0 gets 0 and nothing is touched.
  *
