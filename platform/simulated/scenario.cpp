@@ -236,6 +236,14 @@ uint32_t TaskSchedulerMethod(std::string_view className) {
 bool ParseScenario(std::string_view text, const std::string &file, Scenario *scenario,
                    std::string *error) {
   Report report(file);
+  // The TOML library's tables of characters beyond ASCII run into undefined behaviour for some.
+  const auto foreign = std::find_if(text.begin(), text.end(),
+                                    [](char c) { return static_cast<unsigned char>(c) > 127; });
+  if (foreign != text.end()) {
+    const auto line = 1 + std::count(text.begin(), foreign, '\n');
+    *error = file + ":" + std::to_string(line) + ": a character that is not ASCII";
+    return false;
+  }
   const toml::parse_result result = toml::parse(text);
   if (result) {
     ReadScenario(result.table(), report, scenario);

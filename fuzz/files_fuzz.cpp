@@ -1,0 +1,50 @@
+// Files from outside: the first byte chooses between a scenario and a snapshot header. A header
+// that passes its check is used, at the end of its own allocation.
+
+#include <vector>
+
+#include "fuzz/fuzz.h"
+#include "morwick/morwick.h"
+#include "platform/simulated/scenario.h"
+#include "tools/snapshot_header.h"
+
+namespace {
+
+void CheckScenario(std::string_view text) {
+  simulated::Scenario scenario;
+  std::string error;
+  const bool good = simulated::ParseScenario(text, "file", &scenario, &error);
+  Require(good == error.empty());
+  Require(good || error.starts_with("file:"));
+  if (!good) return;
+  for (const simulated::Controller &controller : scenario.controllers) {
+    Require(simulated::TaskSchedulerMethod(controller.className) != 0);
+  }
+}
+
+void CheckHeader(std::string_view file) {
+  const std::string wrong = tools::CheckSnapshotHeader(file);
+  Require(wrong == tools::CheckSnapshotHeader(file));
+  if (!wrong.empty()) return;
+  const std::vector<char> header(file.begin(), file.end());
+  const std::vector<char> snapshot(1000, 'a');
+  std::vector<char> output(1 << 16);
+  uint64_t size = output.size();
+  uint32_t state = 0;
+  KVRParseSnapshotBufferWithInplaceParser(snapshot.data(), snapshot.size(), output.data(), &size,
+                                          header.data(), &state);
+  Require(size >= 1 && size <= output.size() && output[size - 1] == '\0');
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
+  if (size == 0) return 0;
+  const std::string_view rest(reinterpret_cast<const char *>(data) + 1, size - 1);
+  if (data[0] % 2 == 0) {
+    CheckScenario(rest);
+  } else {
+    CheckHeader(rest);
+  }
+  return 0;
+}
