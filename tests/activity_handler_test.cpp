@@ -136,6 +136,31 @@ TEST_F(ActivityHandlerTest, EndsEachRunAsItShould) {
   }
 }
 
+// Whatever fails, alone or with any other call: nothing leaks, nothing is released twice (the
+// platform sees to that), and the run ends.
+TEST_F(ActivityHandlerTest, EndsEveryRunWhateverFails) {
+  for (const std::deque<bool> &deferAnswers : {std::deque<bool>{}, {false, true, true}, {true}}) {
+    size_t calls = 1;
+    for (size_t first = 0; first <= calls; ++first) {
+      for (size_t second = first; second <= calls; ++second) {
+        fakePlatform = FakePlatform();
+        fakePlatform.present = {kFirstClass, kThirdClass};
+        fakePlatform.replies = {3, 2, 1, 0};
+        fakePlatform.deferAnswers = deferAnswers;
+        fakePlatform.failing = {"#" + std::to_string(first), "#" + std::to_string(second)};
+        TaskSchedulerActivityHandler(nullptr);
+        calls = std::max(calls, fakePlatform.calls);
+        const bool stopped = fakePlatform.journal.ends_with(kStop);
+        const bool deferred = fakePlatform.journal.ends_with(
+            "log deferring grellon daemon\n\nset state 3\nexit clean\n");
+        EXPECT_TRUE(stopped || deferred) << fakePlatform.journal;
+        EXPECT_LE(fakePlatform.calls, 20U);
+        TearDown();
+      }
+    }
+  }
+}
+
 TEST_F(ActivityHandlerTest, ReleasesTheServiceOfARowWithoutTaskScheduler) {
   const SelectorGetter getter = nand_exporters[0].getTaskSchedulerSelectors;
   nand_exporters[0].getTaskSchedulerSelectors = nullptr;

@@ -149,6 +149,23 @@ TEST_F(ConnectionTest, EachWayInFindsOpensAndGivesBack) {
   }
 }
 
+// Any call failing, and any two: whatever was obtained is given back once.
+TEST_F(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {
+  for (const WayIn way : {kFind, kFindNew, kConnect, kOpen}) {
+    for (int first = 0; first <= 16; ++first) {
+      for (int second = first; second <= 16; ++second) {
+        fakePlatform = FakePlatform();
+        fakePlatform.present = {kFirst, kThird};
+        fakePlatform.failing = {"#" + std::to_string(first), "#" + std::to_string(second)};
+        const Outcome outcome = Use(way);
+        EXPECT_TRUE(outcome.row >= 0 && outcome.row <= 3);
+        EXPECT_TRUE(outcome.good || !outcome.err.empty() || way == kFind || way == kFindNew);
+        TearDown();
+      }
+    }
+  }
+}
+
 TEST_F(ConnectionTest, RefusesARowWithAnotherStatisticsGetter) {
   fakePlatform.present = {kFirst};
   nand_exporters[0].getStatsSelectors = KVRGetSnapshotSelectors;

@@ -3,17 +3,17 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <fstream>
 
 #include "platform/platform.h"
-#include "tests/process.h"
 
 namespace {
 
 class SimulatedPlatformTest : public testing::Test {
  protected:
   static void SetUpTestSuite() {
-    const std::string file = TemporaryFile(
-        "platform.toml", "[[controller]]\nclass = 'KVRStorage'\npending = 3\nvanish = [2]\n");
+    const std::string file = testing::TempDir() + "simulated_platform_test.toml";
+    std::ofstream(file) << "[[controller]]\nclass = 'KVRStorage'\npending = 3\nvanish = [2]\n";
     setenv("GRELLON_SCENARIO", file.c_str(), 1);
   }
 };

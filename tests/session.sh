@@ -1,0 +1,49 @@
+#!/usr/bin/env bash
+# Plays a session, a file of commands as a person types them ("$ command") and of what they print,
+# indented by four, with the exit status in brackets when it is not 0; fails with the difference.
+# GRELLON, MORWICK, FAST_SLEEP and SOURCE name the programs, the library to preload and the tree.
+# Usage: session.sh SESSION
+set -uo pipefail
+session=$(realpath "$1")
+work=$(mktemp -d)
+trap 'kill "${pid:-}" 2>/dev/null; rm -rf "$work"' EXIT
+cd "$work" || exit 1
+cp "$SOURCE"/examples/*.bin .
+export LD_PRELOAD=
+
+# With pauses a thousand times shorter; the sanitizer would rather be preloaded before them.
+fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
+morwick() { "$MORWICK" "$@"; }
+grellon() { "$GRELLON" "$@"; }
+scenario() { printf "$@" >scenario.toml && export GRELLON_SCENARIO=scenario.toml; }
+# The 32-bit little-endian numbers, one after the other.
+le32() { for n; do printf "$(printf '\\x%02x' $((n & 255)) $((n >> 8 & 255)) $((n >> 16 & 255)) $((n >> 24 & 255)))"; done; }
+
+# The daemon in the background: start it (with a library preloaded), wait until its log says something,
+# signal and await it.
+start() {
+  : >log
+  LD_PRELOAD=${1:-} ASAN_OPTIONS=verify_asan_link_order=0 "$GRELLON" >log 2>&1 &
+  pid=$!
+}
+wait_for() {
+  for _ in {1..1000}; do [ "$(grep -c -- "$1" log)" -ge "${2:-1}" ] && return; sleep 0.02; done
+  echo "no '$1' in the log"; cat log
+}
+stop() { SECONDS=0; kill "-$1" "$pid"; wait "$pid"; echo "status $?, $([ $SECONDS -le 6 ] && echo "in time" || echo "after $SECONDS s")"; }
+
+while IFS= read -r -u 9 line; do
+  case $line in
+    '$ '*)
+      printf '%s\n' "$line"
+      eval "${line#\$ }" >output 2>&1 </dev/null
+      status=$?
+      sed 's/^/    /' output
+      [ $status -eq 0 ] || echo "    [$status]"
+      ;;
+    '    '*) ;;
+    *) printf '%s\n' "$line" ;;
+  esac
+done 9<"$session" >played
+[ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
+diff "$session" played && echo "as expected"
