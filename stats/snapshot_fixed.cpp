@@ -141,7 +141,8 @@ uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t snapshotSize, cha
   const auto *record = static_cast<const uint8_t *>(snapshot);
   for (uint32_t i = 0; i < recordCount; ++i, record += sizeof(SnapshotRecord)) {
     char line[kLineRoom + morwick::kPaddedRoom];
-    if (!writer.Append({line, WriteLine(line, record)})) return 0;
+    const size_t length = WriteLine(line, record);
+    if (!writer.Append({line, length})) return 0;
   }
   if (!writer.Append("\n")) return 0;
   writer.EndAt(writer.length());

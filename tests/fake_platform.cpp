@@ -83,11 +83,11 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
   EXPECT_EQ(*replySize, 4U);
   const auto *bytes = static_cast<const unsigned char *>(input);
   const auto zeros = std::count(bytes + 8, bytes + inputSize, 0);
+  const auto half = [&](size_t offset) { return bytes[offset] + 256U * bytes[offset + 1]; };
   char line[100];
   std::snprintf(line, sizeof line, "call %u method %u: %u bytes, %u %u and %u zeros", connection,
-                selector, static_cast<unsigned>(inputSize),
-                bytes[0] | bytes[1] << 8 | bytes[2] << 16,
-                bytes[4] | bytes[5] << 8 | bytes[6] << 16, static_cast<unsigned>(zeros));
+                selector, static_cast<unsigned>(inputSize), half(0), half(4),
+                static_cast<unsigned>(zeros));
   fakePlatform.Write(line);
   uint32_t word = 0;
   std::memcpy(&word, reply, sizeof word);

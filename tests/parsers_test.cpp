@@ -202,7 +202,7 @@ TEST(ParsersTest, KeepSummaryFields) {
   KVRStatsCxt c = {};
   const uint64_t high = 0x100000000;
   for (const uint64_t key :
-       {4, 7, 12, 13, 17, 18, 19, 20, 28, 45, 48, 49, 50, 51, 52, 53, 56, 265}) {
+       {4U, 7U, 12U, 13U, 17U, 18U, 19U, 20U, 28U, 45U, 48U, 49U, 50U, 51U, 52U, 53U, 56U, 265U}) {
     const std::string record =
         Stream(kKVR, std::to_string(key) + ":1 " + std::to_string(high + key) + " 0:4 " +
                          std::to_string(key) + "..1000");

@@ -212,11 +212,10 @@ std::string ReadFile(const char *path) {
 
 Scenario LoadScenario() {
   const char *file = std::getenv("GRELLON_SCENARIO");
+  const std::string text = file == nullptr ? std::string(kBuiltInScenario) : ReadFile(file);
   Scenario scenario;
   std::string error;
-  const bool good = file == nullptr ? ParseScenario(kBuiltInScenario, "built-in", &scenario, &error)
-                                    : ParseScenario(ReadFile(file), file, &scenario, &error);
-  if (!good) Refuse(error);
+  if (!ParseScenario(text, file == nullptr ? "built-in" : file, &scenario, &error)) Refuse(error);
   return scenario;
 }
 
@@ -237,12 +236,13 @@ bool ParseScenario(std::string_view text, const std::string &file, Scenario *sce
                    std::string *error) {
   Report report(file);
   // The TOML library's tables of characters beyond ASCII run into undefined behaviour for some.
-  const auto foreign = std::find_if(text.begin(), text.end(),
-                                    [](char c) { return static_cast<unsigned char>(c) > 127; });
-  if (foreign != text.end()) {
-    const auto line = 1 + std::count(text.begin(), foreign, '\n');
-    *error = file + ":" + std::to_string(line) + ": a character that is not ASCII";
-    return false;
+  size_t line = 1;
+  for (const char c : text) {
+    if (static_cast<unsigned char>(c) > 127) {
+      *error = file + ":" + std::to_string(line) + ": a character that is not ASCII";
+      return false;
+    }
+    if (c == '\n') ++line;
   }
   const toml::parse_result result = toml::parse(text);
   if (result) {
