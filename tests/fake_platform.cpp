@@ -58,7 +58,8 @@ uint32_t GetMatchingService(MatchingRequest *request) {
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   EXPECT_EQ(fakePlatform.openHandles[service], "service");
   const bool fails = fakePlatform.Fails("open");
-  *connection = fails ? 0 : fakePlatform.Issue("connection");
+  *connection =
+      fails || fakePlatform.failing.contains("handle 0") ? 0 : fakePlatform.Issue("connection");
   fakePlatform.Write("open " + std::to_string(service) + " type " + std::to_string(type) + " = " +
                      std::to_string(*connection));
   return fails ? 0x2c7 : 0;

@@ -418,9 +418,19 @@ TEST(BindingsTest, ServeAToolThroughTheRowAlone) {
     GenericParserCxt generic = {};
     EXPECT_EQ(row.ftlParseBufferToCxt(&generic, Stream(kFTL, "1:1 5").data(), 16), 1U);
     const bool first = exporter == nand_exporters;
+    uint32_t selector = 0;  // of all kinds in turn, as digits of a number
+    for (const SelectorGetter getter :
+         {row.getStatsSelectors, row.getDefectsListSelectors, row.getTelemetryListSelectors,
+          row.getTaskSchedulerSelectors, row.getSnapshotSelectors, row.getBandStatsSelectors}) {
+      selector = selector * 40 + getter()->first;
+      EXPECT_EQ(getter()->second, getter()->first);
+    }
+    EXPECT_EQ(selector, ((((13U * 40 + 15) * 40 + 17) * 40 + 39) * 40 + 22) * 40 + 11);
+    EXPECT_EQ(row.getSnapshotHeaderSelectors()->second, 145U);
     EXPECT_EQ(row.getMSPStatsSelectors != nullptr, first);
     EXPECT_EQ(row.mspParseBufferToCxt != nullptr, first);
     if (row.mspParseBufferToCxt != nullptr) {
+      EXPECT_EQ(row.getMSPStatsSelectors()->second, 221U);
       EXPECT_EQ(row.mspParseBufferToCxt(&generic, Stream(kMSP, "4096:4 6").data(), 8), 1U);
     }
     EXPECT_EQ(Entries(generic), first ? "version=5 passWithTmodeHard=6 " : "version=5 ");

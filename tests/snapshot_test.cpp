@@ -298,6 +298,8 @@ TEST(InplaceSnapshotTest, EndsWhereHeaderOrSnapshotEnd) {
       {Header(6, 0, 0xffffffff, kCountingFields), three, "", 0xfffffffe},
       {Header(6, 3, 0xffffffff, kCountingFields), three, "", 12},
       {Header(6, 12, 3, {}), three, "", 2},
+      {Header(6, 12, 2, std::vector<Descriptor>(50, {0, 0, 0, "%u"})), three,
+       banner + std::string(50, '1') + "\n", 1},
       {Header(6, 12, 3, {{0, 9, 0, "%u"}, {0, 0, 0, "%u"}}), three, "", 2},
       {Header(6, 0xffffffff, 3, kCountingFields), three, "", 0},
   };
