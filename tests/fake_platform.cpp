@@ -4,12 +4,27 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
+#include <sstream>
 
 FakePlatform fakePlatform;
 
 struct MatchingRequest {
   std::string className;
 };
+
+void FakePlatform::Reset(const std::map<std::string, std::string> &script) {
+  *this = FakePlatform();
+  for (const auto &[key, words] : script) {
+    std::istringstream stream(words);
+    for (std::string word; stream >> word;) {
+      if (key == "present") present.insert(word);
+      if (key == "failing") failing.insert(word);
+      if (key == "replies") replies.push_back(word);
+      if (key == "defers") defers.push_back(word);
+      if (key == "state") activityState = std::stoi(word);
+    }
+  }
+}
 
 bool FakePlatform::Fails(const std::string &name) {
   ++calls;
@@ -50,7 +65,7 @@ uint32_t GetMatchingService(MatchingRequest *request) {
   const bool found = fakePlatform.present.contains(request->className);
   delete request;
   const uint32_t service =
-      found && !fakePlatform.Fails("look up") ? fakePlatform.Issue("service") : 0;
+      found && !fakePlatform.Fails("lookup") ? fakePlatform.Issue("service") : 0;
   fakePlatform.Write("look up = " + std::to_string(service));
   return service;
 }
@@ -59,7 +74,7 @@ int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   EXPECT_EQ(fakePlatform.openHandles[service], "service");
   const bool fails = fakePlatform.Fails("open");
   *connection =
-      fails || fakePlatform.failing.contains("handle 0") ? 0 : fakePlatform.Issue("connection");
+      fails || fakePlatform.failing.contains("handle0") ? 0 : fakePlatform.Issue("connection");
   fakePlatform.Write("open " + std::to_string(service) + " type " + std::to_string(type) + " = " +
                      std::to_string(*connection));
   return fails ? 0x2c7 : 0;
@@ -94,7 +109,7 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
   std::memcpy(&word, reply, sizeof word);
   EXPECT_EQ(word, 0U) << "the reply is not cleared before the call";
   if (!fakePlatform.replies.empty()) {
-    word = fakePlatform.replies.front();
+    word = static_cast<uint32_t>(std::stoul(fakePlatform.replies.front()));
     fakePlatform.replies.pop_front();
   }
   std::memcpy(reply, &word, sizeof word);
@@ -109,11 +124,8 @@ void RegisterActivity(const char *identifier, ActivityCriteria criteria, Activit
 int GetActivityState(Activity *) { return fakePlatform.activityState; }
 
 bool ActivityShouldDefer(Activity *) {
-  bool answer = false;
-  if (!fakePlatform.deferAnswers.empty()) {
-    answer = fakePlatform.deferAnswers.front();
-    fakePlatform.deferAnswers.pop_front();
-  }
+  const bool answer = !fakePlatform.defers.empty() && fakePlatform.defers.front() == "yes";
+  if (!fakePlatform.defers.empty()) fakePlatform.defers.pop_front();
   fakePlatform.Write(answer ? "defer? yes" : "defer? no");
   return answer;
 }

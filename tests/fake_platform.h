@@ -12,11 +12,11 @@
 #include "platform/platform.h"
 
 struct FakePlatform {
-  // The script. A queue that has run out answers 0 or false.
-  std::set<std::string> present;  // driver classes that are registered
-  std::set<std::string> failing;  // calls that fail, as "name#n" or, counting all calls, "#n"
-  std::deque<uint32_t> replies;   // what the controller answers requests with
-  std::deque<bool> deferAnswers;  // what the scheduler answers questions with
+  // The script. A list that has run out answers 0 or no.
+  std::set<std::string> present;    // driver classes that are registered
+  std::set<std::string> failing;    // calls that fail, as "name#n" or, counting all calls, "#n"
+  std::deque<std::string> replies;  // what the controller answers requests with
+  std::deque<std::string> defers;   // what the scheduler answers questions with: yes or no
   int activityState = kActivityStateRun;
 
   // What happened, a line a call.
@@ -27,6 +27,8 @@ struct FakePlatform {
   size_t openRequests = 0;
   uint32_t lastHandle = 0;
 
+  // Starts anew with a script: words by "present", "failing", "replies", "defers", "state".
+  void Reset(const std::map<std::string, std::string> &script);
   void Write(const std::string &line) { journal += line + "\n"; }
   bool Fails(const std::string &name);
   uint32_t Issue(const std::string &what);

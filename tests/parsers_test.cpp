@@ -403,8 +403,7 @@ TEST(ErrorMessageTest, IsOneOfThoseThatEightThreadsReportAtOnce) {
 // A tool's whole way, with nothing named but the row.
 TEST(BindingsTest, ServeAToolThroughTheRowAlone) {
   for (NandExporter *exporter = nand_exporters; exporter->className != nullptr; ++exporter) {
-    fakePlatform = FakePlatform();
-    fakePlatform.present = {exporter->className};
+    fakePlatform.Reset({{"present", exporter->className}});
     KVRConnection connection = {};
     testing::internal::CaptureStdout();
     ASSERT_EQ(openKVRConnection(&connection), 1);
