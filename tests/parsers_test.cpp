@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <barrier>
+#include <fstream>
 #include <set>
 #include <sstream>
 #include <thread>
@@ -61,15 +62,6 @@ std::string Entries(const Context &context) {
   return text;
 }
 
-// "name0=first name1=first+1 ..."
-std::string Elements(const std::string &name, uint64_t count, uint64_t first) {
-  std::string text;
-  for (uint64_t i = 0; i < count; ++i) {
-    text += name + std::to_string(i) + "=" + std::to_string(first + i) + " ";
-  }
-  return text;
-}
-
 std::string TakeMessage() {
   std::string message = GetAPIErrorMessage();
   std::free(GlobalAPIErrorMessage);
@@ -122,80 +114,21 @@ const std::string kFTL14 = "KVRFTLParseBufferToCxt: hostWriteLogHisto(14): ";
 const std::string kInvalid = "KVRMSPParseBufferToCxt: Passed in invalid buffer or empty buffer";
 
 TEST(ParsersTest, ReadGoodAndBadStreams) {
-  const std::string flips =
-      ", KVRMSPParseBufferToCxt: FS2decodedBitFlips(4120): cfg 11 elements; "
-      "(11*4) cfg bytes != (";
-  const std::string hard =
-      ", KVRMSPParseBufferToCxt: passWithTmodeHard(4096): cfg 1 elements; "
-      "(1*4) cfg bytes != (";
-  const std::string hist = "hostWriteLogHisto_";
-  const struct {
-    Kind kind;
-    std::string stream;
-    std::string seen;
-  } cases[] = {
-      // clang-format off
-      {kKVR, "", "-> 0"},
-      {kKVR, "'1234567", "-> 0"},
-      {kKVR, "0:0 '1234", "-> 1"},
-      {kKVR, "4:1 1000 '1234567", "hostWrites=1000 -> 1"},
-      {kKVR, "53:1 0xffffffff00000007", "exportVersion=18446744069414584327 -> 1, version 7"},
-      {kKVR, "53:1 5 0x30000001:0", "exportVersion=5 -> 0, version 0"},
-      {kKVR, "53:1 5 0x30000000:0", "exportVersion=5 -> 1, version 5"},
-      {kKVR, "4:1 1000 4:1", "hostWrites=1000 -> 0, version 0"},
-      {kKVR, "700:3 1 2", "-> 0, version 0"},
-      {kKVR, "700:0xffffffff 1 2", "-> 0, version 0"},
-      {kKVR, "0:2 4 4 660:1 4 0xffff:0 4:1 1", "hostWrites=1 -> 1"},
-      {kKVR, "4:1 1 4:3 2 3 4 4:1 5", "hostWrites=1 hostWrites=2 hostWrites=5 -> 1"},
-      // Shorter than its key: the words behind it are taken, if there are enough.
-      {kKVR, "4:0 700:0", "hostWrites=700 -> 1"},
-      {kKVR, "4:0", "-> 1"},
-      {kKVR, "265:1 1 700:2 2 3", "-> 1"},
-      {kKVR, "265:1 1 0:3 2 3 4", "readCountHisto0=1 readCountHisto1=12884901888 readCountHisto2=2 "
-                                  "readCountHisto3=3 readCountHisto4=4 -> 1"},
-      {kKVR, "90:160 5..164", Elements("qosPerCmdQ", 160, 5) + "-> 1"},
-
-      {kFTL, "", "-> 0"},
-      {kFTL, "'1234567", "-> 0"},
-      {kFTL, "1:1 5 14:10 3..12 '1234", "version=5 " + Elements(hist, 10, 3) + "-> 11"},
-      {kFTL, "0xffff:0 0x30000001:0 1:1 5", "version=5 -> 1"},
-      {kFTL, "1:1 5 0xffff:1 1 1:1 5", "version=5 -> 1"},
-      {kFTL, "0x30000000:1 1 1:1 5", "version=5 -> 1"},
-      {kFTL, "0x30000001:1 1 1:1 5", "-> 0"},
-      {kFTL, "1:1 5 1:2 5", "version=5 -> 1"},
-      {kFTL, "1:1 5 1:0xffffffff 5", "version=5 -> 1"},
-      {kFTL, "1:1 5 1:1", "version=5 -> 1"},
-      {kFTL, "14:12 3..14 1:1 5", Elements(hist, 10, 3) + "version=5 -> 11, " + kFTL14 +
-                                  "(#10) cfg elements != (12) buffer elements"},
-      {kFTL, "14:3 3..5 15:1 8", Elements(hist, 3, 3) + "hostReadLogHisto_=8 -> 4, " + kFTL14 +
-                                 "(#10) cfg elements != (3) buffer elements"},
-      {kFTL, "1:4 5..8 1:1 6", "version=5 version=6 -> 2"},
-      {kFTL, "21:1 1 293:1 1 0:1 1 660:1 1 659:1 2", "raidVerificationReads=2 -> 1"},
-
-      {kMSP, "", "-> 0, " + kInvalid},
-      {kMSP, "0:0 0x1000:0 0x2fff:0 0x2ffe:0 4096:4 5", "passWithTmodeHard=5 -> 1"},
-      {kMSP, "4096:4 5 0x2fff:4 1 4096:4 5", "passWithTmodeHard=5 -> 1"},
-      {kMSP, "4096:4 5 0x2ffe:8 1 1 4096:4 6", "passWithTmodeHard=5 passWithTmodeHard=6 -> 2"},
-      {kMSP, "4096:4 5 0x2ffe:9 1 1", "passWithTmodeHard=5 -> 1"},
-      {kMSP, "4096:4 5 4096:5 1", "passWithTmodeHard=5 -> 1"},
-      {kMSP, "4096:4 5 '1", "passWithTmodeHard=5 -> 1"},
-      {kMSP, "4096:4 5 '123", "passWithTmodeHard=5 -> 1"},
-      {kMSP, "4120:8 7 8 4096:4 5", "FS2decodedBitFlips0=7 FS2decodedBitFlips1=8 "
-                                    "passWithTmodeHard=5 -> 3" + flips + "8) buffer bytes"},
-      {kMSP, "4120:7 7 '123", "FS2decodedBitFlips=7 -> 1" + flips + "7) buffer bytes"},
-      {kMSP, "4096:8 9 10", "passWithTmodeHard=9 -> 1" + hard + "8) buffer bytes"},
-      {kMSP, "4096:2 '12 4096:4 5", "passWithTmodeHard=5 -> 1" + hard + "2) buffer bytes"},
-      {kMSP, "4169:4 1 8192:4 1 8215:4 1 0:4 1 4095:4 1 0xffff:4 1 8214:20 1..5",
-             Elements("active_time_hist", 5, 1) + "-> 5"},
-      // clang-format on
-  };
-  for (const auto &[kind, notation, seen] : cases) {
-    SCOPED_TRACE(testing::Message() << notation << " of kind " << kind);
-    const std::string bytes = Stream(kind, notation);
+  std::ifstream cases(CASES "/streams.txt");
+  int count = 0;
+  for (std::string line; std::getline(cases, line);) {
+    if (line.empty() || line.starts_with('#')) continue;
+    SCOPED_TRACE(line);
+    const Kind kind = line.starts_with("KVR") ? kKVR : line.starts_with("FTL") ? kFTL : kMSP;
+    const size_t bar = line.find(" | ", 6);
+    const std::string bytes = Stream(kind, line.substr(6, bar - 6));
+    const std::string seen = line.substr(bar + 3);
     EXPECT_EQ(Parse(kind, bytes), seen);
     EXPECT_EQ(Parse(kind, bytes, false, 1), seen) << "unaligned";
     EXPECT_EQ(Parse(kind, bytes, true), "validLbas=1 " + seen) << "into a context with an entry";
+    ++count;
   }
+  EXPECT_GT(count, 40);
 }
 
 TEST(ParsersTest, KeepSummaryFields) {
@@ -269,20 +202,18 @@ TEST(ParsersTest, LoseOneEntryWhenMemoryIsRefused) {
     Kind kind;
     std::string stream;
     std::string seen[5];  // by the entry that is lost
-  } cases[] = {
-      {kKVR,
-       "1:1 5 93:3 6..8 4:1 9",
-       {"-> 0", "a=5 b1=7 b2=8 -> 0", "a=5 b0=6 b2=8 -> 0", "a=5 b0=6 b1=7 -> 0",
-        "a=5 b0=6 b1=7 b2=8 -> 0"}},
-      {kFTL,
-       "1:1 5 93:3 6..8 4:1 9",
-       {"b_0=6 b_1=7 b_2=8 c=9 -> 5!", "a=5 b_1=7 b_2=8 -> 1!", "a=5 b_0=6 b_2=8 -> 1!",
-        "a=5 b_0=6 b_1=7 -> 1!", "a=5 b_0=6 b_1=7 b_2=8 -> 5!"}},
-      {kMSP,
-       "4096:4 5 4139:12 6..8 4135:4 9",
-       {"-> 0!", "a=5 b1=7 b2=8 -> 1!", "a=5 b0=6 b2=8 -> 1!", "a=5 b0=6 b1=7 -> 1!",
-        "a=5 b0=6 b1=7 b2=8 -> 4!"}},
-  };
+  } cases[] = {{kKVR,
+                "1:1 5 93:3 6..8 4:1 9",
+                {"-> 0", "a=5 b1=7 b2=8 -> 0", "a=5 b0=6 b2=8 -> 0", "a=5 b0=6 b1=7 -> 0",
+                 "a=5 b0=6 b1=7 b2=8 -> 0"}},
+               {kFTL,
+                "1:1 5 93:3 6..8 4:1 9",
+                {"b_0=6 b_1=7 b_2=8 c=9 -> 5!", "a=5 b_1=7 b_2=8 -> 1!", "a=5 b_0=6 b_2=8 -> 1!",
+                 "a=5 b_0=6 b_1=7 -> 1!", "a=5 b_0=6 b_1=7 b_2=8 -> 5!"}},
+               {kMSP,
+                "4096:4 5 4139:12 6..8 4135:4 9",
+                {"-> 0!", "a=5 b1=7 b2=8 -> 1!", "a=5 b0=6 b2=8 -> 1!", "a=5 b0=6 b1=7 -> 1!",
+                 "a=5 b0=6 b1=7 b2=8 -> 4!"}}};
   const std::pair<std::string, std::string> shortNames[] = {
       {"version", "a"},
       {"passWithTmodeHard", "a"},
@@ -313,17 +244,15 @@ TEST(ParserContextTest, AddsLittleEndianElementsOfAnyWidth) {
     uint32_t width, count;
     int result;
     std::string entries;
-  } cases[] = {
-      {3, 1, 1, "f=13417386 "},
-      {1, 3, 1, "f0=170 f1=187 f2=204 "},
-      {2, 2, 1, "f0=48042 f1=56780 "},
-      {8, 1, 1, "f=" + std::to_string(0x2211ffeeddccbbaa) + " "},
-      {9, 1, 0, ""},
-      {9, 2, 0, ""},
-      {0, 5, 1, ""},
-      {4, 0, 1, ""},
-      {4, 65536, 0, ""},
-  };
+  } cases[] = {{3, 1, 1, "f=13417386 "},
+               {1, 3, 1, "f0=170 f1=187 f2=204 "},
+               {2, 2, 1, "f0=48042 f1=56780 "},
+               {8, 1, 1, "f=" + std::to_string(0x2211ffeeddccbbaa) + " "},
+               {9, 1, 0, ""},
+               {9, 2, 0, ""},
+               {0, 5, 1, ""},
+               {4, 0, 1, ""},
+               {4, 65536, 0, ""}};
   for (const auto &[width, count, result, entries] : cases) {
     GenericParserCxt context = {};
     EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "f", bytes.data(), width, count), result);

@@ -31,13 +31,11 @@ TEST_F(SimulatedPlatformTest, DoesOneUnitForTheRightRequestOnly) {
     size_t size, room;
     bool good;
     uint32_t left;
-  } cases[] = {
-      {9, 39, 1025, 24, 4, false, 0}, {8, 38, 1025, 24, 4, false, 0},
-      {8, 39, 1024, 24, 4, false, 0}, {8, 39, 1025, 23, 4, false, 0},
-      {8, 39, 1025, 24, 3, false, 0}, {8, 39, 1025, 24, 4, true, 2},
-      {8, 39, 1025, 24, 8, true, 1},  {8, 39, 1025, 24, 4, true, 0},
-      {8, 39, 1025, 24, 4, true, 0},
-  };
+  } cases[] = {{9, 39, 1025, 24, 4, false, 0}, {8, 38, 1025, 24, 4, false, 0},
+               {8, 39, 1024, 24, 4, false, 0}, {8, 39, 1025, 23, 4, false, 0},
+               {8, 39, 1025, 24, 3, false, 0}, {8, 39, 1025, 24, 4, true, 2},
+               {8, 39, 1025, 24, 8, true, 1},  {8, 39, 1025, 24, 4, true, 0},
+               {8, 39, 1025, 24, 4, true, 0}};
   for (const auto &[method, command, argument, size, room, good, left] : cases) {
     const std::array<uint32_t, 6> request = {command, argument};
     uint32_t reply = 0;
