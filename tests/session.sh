@@ -15,9 +15,13 @@ export LD_PRELOAD=
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
 morwick() { "$MORWICK" "$@"; }
 grellon() { "$GRELLON" "$@"; }
-scenario() { printf "$@" >scenario.toml && export GRELLON_SCENARIO=scenario.toml; }
+scenario() { printf %b "$1" >scenario.toml && export GRELLON_SCENARIO=scenario.toml; }
 # The 32-bit little-endian numbers, one after the other.
-le32() { for n; do printf "$(printf '\\x%02x' $((n & 255)) $((n >> 8 & 255)) $((n >> 16 & 255)) $((n >> 24 & 255)))"; done; }
+le32() {
+  for n; do
+    printf %b "$(printf '\\x%02x' $((n & 255)) $((n >> 8 & 255)) $((n >> 16 & 255)) $((n >> 24 & 255)))"
+  done
+}
 
 # The daemon in the background: start it (with a library preloaded), wait until its log says something,
 # signal and await it.
