@@ -347,7 +347,7 @@ TEST(BindingsTest, ServeAToolThroughTheRowAlone) {
     EXPECT_EQ(row.ftlParseBufferToCxt(&generic, Stream(kFTL, "1:1 5").data(), 16), 1U);
     const bool first = exporter == nand_exporters;
     uint32_t selector = 0;  // of all kinds in turn, as digits of a number
-    for (const SelectorGetter getter :
+    for (const auto getter :
          {row.getStatsSelectors, row.getDefectsListSelectors, row.getTelemetryListSelectors,
           row.getTaskSchedulerSelectors, row.getSnapshotSelectors, row.getBandStatsSelectors}) {
       selector = selector * 40 + getter()->first;
