@@ -65,7 +65,7 @@ std::string RenderFixed(const std::vector<char> &snapshot, size_t capacity) {
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   if (size < 3) return 0;
-  const size_t capacity = size_t{1} + data[0] + 16U * data[1];
+  const size_t capacity = size_t{1} + data[0] + size_t{16} * data[1];
   std::string_view input(reinterpret_cast<const char *>(data) + 3, size - 3);
   const std::vector<char> header = HeaderFrom(input, data[2] % 40);
   const std::vector<char> snapshot(input.begin(), input.end());

@@ -226,7 +226,8 @@ TEST(ParsersTest, LoseOneEntryWhenMemoryIsRefused) {
       std::string seen = Parse(kind, Stream(kind, stream), false, 0, refused);
       // A message of any text counts as one.
       if (const size_t comma = seen.find(", KVR"); comma != std::string::npos) {
-        seen.replace(comma, std::string::npos, "!");
+        seen.resize(comma);
+        seen += "!";
       }
       for (const auto &[name, letter] : shortNames) {
         for (size_t at = 0; (at = seen.find(name)) != std::string::npos;) {
