@@ -7,8 +7,6 @@
 using morwick::AppendElements;
 using morwick::AppendEntry;
 
-const ContextNode morwick::kEmptyNode = {};
-
 int AddSingleValueToGenericContext(GenericParserCxt *ctx, const char *prefix, const char *name,
                                    uint64_t value) {
   if (ctx == nullptr || prefix == nullptr || name == nullptr) return 0;
