@@ -45,28 +45,19 @@ inline char *WriteShortDecimal(char *out, uint32_t value) {
 
 constexpr size_t kDecimalRoom = 24;  // what WriteDecimal may write at `out`
 
-// Writes any value without leading zeros and returns the end of it; zeros follow. Up to 16 digits
-// take the same path whatever their number: counters vary in length, and a branch on it is
-// mispredicted.
+// Writes any value without leading zeros and returns the end of it; zeros follow.
 inline char *WriteDecimal(char *out, uint64_t value) {
   constexpr uint64_t kGroup = 100000000;
-  if (value >= kGroup * kGroup) {
-    out = WriteShortDecimal(out, static_cast<uint32_t>(value / (kGroup * kGroup)));
-    value %= kGroup * kGroup;
-    out = WriteEightDigits(out, static_cast<uint32_t>(value / kGroup));
+  if (value < kGroup) return WriteShortDecimal(out, static_cast<uint32_t>(value));
+  const auto low = static_cast<uint32_t>(value % kGroup);
+  value /= kGroup;
+  if (value < kGroup) {
+    out = WriteShortDecimal(out, static_cast<uint32_t>(value));
+  } else {
+    out = WriteShortDecimal(out, static_cast<uint32_t>(value / kGroup));
     out = WriteEightDigits(out, static_cast<uint32_t>(value % kGroup));
-    return out;
   }
-  __extension__ using Wide = unsigned __int128;
-  const uint64_t high = EightDigits(static_cast<uint32_t>(value / kGroup));
-  const uint64_t low = EightDigits(static_cast<uint32_t>(value % kGroup));
-  const int highZeros = std::countr_zero(high) / 8;  // 8 when there are no digits but the low ones
-  const int lowZeros = std::countr_zero(low | uint64_t{1} << 56) / 8;
-  const int leadingZeros = highZeros + (highZeros >> 3) * lowZeros;
-  const Wide text = (Wide{low | kAsciiZeros} << 64 | high | kAsciiZeros) >> leadingZeros * 8;
-  StoreText(out, static_cast<uint64_t>(text));
-  StoreText(out + 8, static_cast<uint64_t>(text >> 64));
-  return out + 16 - leadingZeros;
+  return WriteEightDigits(out, low);
 }
 
 constexpr size_t kPaddedRoom = 16;  // what WritePadded may write at `out`
