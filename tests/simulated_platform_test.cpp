@@ -1,8 +1,10 @@
 // The simulated drivers: handles are checked, and only the right request does work.
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <array>
+#include <cstdio>
 #include <fstream>
 
 #include "platform/platform.h"
@@ -12,10 +14,13 @@ namespace {
 class SimulatedPlatformTest : public testing::Test {
  protected:
   static void SetUpTestSuite() {
-    const std::string file = testing::TempDir() + "simulated_platform_test.toml";
     std::ofstream(file) << "[[controller]]\nclass = 'KVRStorage'\npending = 3\nvanish = [2]\n";
     setenv("GRELLON_SCENARIO", file.c_str(), 1);
   }
+  static void TearDownTestSuite() { std::remove(file.c_str()); }
+
+  static inline const std::string file =
+      testing::TempDir() + "simulated_platform_" + std::to_string(getpid()) + ".toml";
 };
 
 uint32_t Find() { return GetMatchingService(ServiceMatching("KVRStorage")); }
