@@ -34,7 +34,7 @@ find_package(morwick 1 REQUIRED)
 add_executable(consumer consumer.cpp)
 target_link_libraries(consumer PRIVATE morwick::morwick)
 END
-cmake -S "$work/cmake" -B "$work/cmake/build" -DCMAKE_PREFIX_PATH="$prefix" \
+cmake -G Ninja -S "$work/cmake" -B "$work/cmake/build" -DCMAKE_PREFIX_PATH="$prefix" \
   -DCMAKE_CXX_FLAGS="$flags" >/dev/null
 cmake --build "$work/cmake/build" >/dev/null
 expect "$("$work/cmake/build/consumer")" "32 GB, 1338 characters"
