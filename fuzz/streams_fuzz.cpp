@@ -6,6 +6,7 @@
 
 #include "fuzz/fuzz.h"
 #include "morwick/morwick.h"
+#include "tests/entries.h"
 
 namespace {
 
@@ -15,22 +16,12 @@ struct Outcome {
   std::string text;
 };
 
-// All entries as text, after checking the lists.
 template <typename Context>
 void Collect(const Context &context, Outcome *outcome) {
-  const ContextNode *name = context.namesHead;
-  const ContextNode *value = context.valuesHead;
-  const ContextNode *lastName = nullptr;
-  const ContextNode *lastValue = nullptr;
-  for (; name != nullptr && value != nullptr; name = name->next, value = value->next) {
-    Require(std::to_string(value->value) == value->text);
-    outcome->text.append(name->text).append("=").append(value->text).append(" ");
-    ++outcome->entries;
-    lastName = name;
-    lastValue = value;
-  }
-  Require(name == nullptr && value == nullptr);
-  Require(context.namesTail == lastName && context.valuesTail == lastValue);
+  const Entries entries(context);
+  Require(entries.sound);
+  outcome->entries = entries.count;
+  outcome->text = entries.text;
 }
 
 Outcome Parse(uint8_t kind, uint8_t shape, const uint8_t *data, size_t size) {

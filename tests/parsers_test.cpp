@@ -10,6 +10,7 @@
 #include <thread>
 
 #include "morwick/morwick.h"
+#include "tests/entries.h"
 #include "tests/fake_platform.h"
 #include "tests/heap.h"
 
@@ -43,23 +44,11 @@ std::string Stream(Kind kind, const std::string &notation) {
   return bytes;
 }
 
-// "name=value " for each entry, after checking what must hold for any context.
 template <typename Context>
-std::string Entries(const Context &context) {
-  std::string text;
-  const ContextNode *name = context.namesHead;
-  const ContextNode *value = context.valuesHead;
-  const ContextNode *lastName = nullptr;
-  const ContextNode *lastValue = nullptr;
-  for (; name != nullptr && value != nullptr; name = name->next, value = value->next) {
-    EXPECT_TRUE(value->text == std::to_string(value->value) && name->value == 0);
-    text += std::string(name->text) + "=" + value->text + " ";
-    lastName = name;
-    lastValue = value;
-  }
-  EXPECT_TRUE(name == nullptr && value == nullptr) << "one list is longer";
-  EXPECT_TRUE(context.namesTail == lastName && context.valuesTail == lastValue);
-  return text;
+std::string TextOf(const Context &context) {
+  const Entries entries(context);
+  EXPECT_TRUE(entries.sound) << entries.text;
+  return entries.text;
 }
 
 std::string TakeMessage() {
@@ -96,7 +85,7 @@ std::string Parse(Kind kind, const std::string &bytes, bool filled = false, size
       break;
   }
   RefuseAllocation(0);
-  std::string seen = kind == kKVR ? Entries(kvr) : Entries(generic);
+  std::string seen = kind == kKVR ? TextOf(kvr) : TextOf(generic);
   seen += "-> " + std::to_string(result);
   if (kvr.exportVersion != 99) seen += ", version " + std::to_string(kvr.exportVersion);
   if (const std::string message = TakeMessage(); message != "NA") seen += ", " + message;
@@ -106,7 +95,7 @@ std::string Parse(Kind kind, const std::string &bytes, bool filled = false, size
   EXPECT_EQ(std::count(record, record + sizeof kvr, '\0'), static_cast<long>(sizeof kvr));
   ReleaseGenericParserCxt(&generic);
   ReleaseGenericParserCxt(&generic);
-  EXPECT_EQ(Entries(generic), "");
+  EXPECT_EQ(TextOf(generic), "");
   return seen;
 }
 
@@ -160,7 +149,7 @@ TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
   EXPECT_EQ(AddMultipleFieldsToGenericContext(nullptr, "a", "1234", 4, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(nullptr, "a", "1234", 0, 1), 1);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&generic, "a", nullptr, 4, 1), 0);
-  EXPECT_EQ(Entries(generic), "");
+  EXPECT_EQ(TextOf(generic), "");
   ReleaseGenericParserCxt(nullptr);
   EXPECT_EQ(KVRMSPParseBufferToCxt(&generic, hard.data(), 0x500000008), 1U);
   ReleaseGenericParserCxt(&generic);
@@ -184,7 +173,7 @@ TEST(ParserContextTest, AddsLittleEndianElementsOfAnyWidth) {
   for (const auto &[width, count, result, entries] : cases) {
     GenericParserCxt context = {};
     EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "f", bytes.data(), width, count), result);
-    EXPECT_EQ(Entries(context), entries);
+    EXPECT_EQ(TextOf(context), entries);
     ReleaseGenericParserCxt(&context);
   }
 }
@@ -198,7 +187,7 @@ TEST(ParserContextTest, DropsTheEntryThatMemoryIsRefusedFor) {
     EXPECT_EQ(AddSingleValueToGenericContext(&context, "", "g", 1), refused <= 2 ? 0 : 1);
     RefuseAllocation(0);
     const std::string seen[] = {"f1=50 f2=51 ", "f0=49 f2=51 g=1 ", "f0=49 f1=50 g=1 "};
-    EXPECT_EQ(Entries(context), seen[(refused - 1) / 2]);
+    EXPECT_EQ(TextOf(context), seen[(refused - 1) / 2]);
     ReleaseGenericParserCxt(&context);
   }
 }
@@ -215,12 +204,12 @@ TEST(ParserContextTest, CutsNamesAt98Characters) {
     for (int i = 0; i < 12345; ++i) {
       expected += (name + std::to_string(i)).substr(0, 98) + "=1 ";
     }
-    EXPECT_EQ(Entries(context), expected);
+    EXPECT_EQ(TextOf(context), expected);
     ReleaseGenericParserCxt(&context);
   }
 }
 
-// Entries checks each text against its value.
+// TextOf checks each text against its value.
 TEST(ParserContextTest, WritesEveryMagnitude) {
   GenericParserCxt context = {};
   for (uint64_t power = 1;; power *= 10) {
@@ -229,7 +218,7 @@ TEST(ParserContextTest, WritesEveryMagnitude) {
     }
     if (power == 10000000000000000000U) break;
   }
-  EXPECT_TRUE(Entries(context).starts_with("v=0 v=1 v=2 "));
+  EXPECT_TRUE(TextOf(context).starts_with("v=0 v=1 v=2 "));
   ReleaseGenericParserCxt(&context);
 }
 
@@ -283,7 +272,7 @@ TEST(BindingsTest, ServeAToolThroughTheRowAlone) {
     const NandExporter &row = *connection.exporter;
     KVRStatsCxt kvr = {};
     EXPECT_EQ(row.parseBufferToCxt(&kvr, Stream(kKVR, "4:1 7").data(), 16), 1);
-    EXPECT_EQ(Entries(kvr), "hostWrites=7 ");
+    EXPECT_EQ(TextOf(kvr), "hostWrites=7 ");
     row.releaseContext(&kvr);
     GenericParserCxt generic = {};
     EXPECT_EQ(row.ftlParseBufferToCxt(&generic, Stream(kFTL, "1:1 5").data(), 16), 1U);
@@ -303,7 +292,7 @@ TEST(BindingsTest, ServeAToolThroughTheRowAlone) {
       EXPECT_EQ(row.getMSPStatsSelectors()->second, 221U);
       EXPECT_EQ(row.mspParseBufferToCxt(&generic, Stream(kMSP, "4096:4 6").data(), 8), 1U);
     }
-    EXPECT_EQ(Entries(generic), first ? "version=5 passWithTmodeHard=6 " : "version=5 ");
+    EXPECT_EQ(TextOf(generic), first ? "version=5 passWithTmodeHard=6 " : "version=5 ");
     row.releaseGenericParserCxt(&generic);
     closeKVRConnection(&connection);
     EXPECT_TRUE(fakePlatform.openHandles.empty());

@@ -15,7 +15,8 @@ namespace {
 class SimulatedPlatformTest : public testing::Test {
  protected:
   static void SetUpTestSuite() {
-    if (std::getenv("GRELLON_SCENARIO") != nullptr) return;  // the child of a death test inherits it
+    if (std::getenv("GRELLON_SCENARIO") != nullptr)
+      return;  // the child of a death test inherits it
     std::ofstream(file) << "[[controller]]\nclass = 'KVRStorage'\npending = 3\nvanish = [2]\n";
     setenv("GRELLON_SCENARIO", file.c_str(), 1);
   }

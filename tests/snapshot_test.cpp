@@ -345,29 +345,12 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
 }
 
 TEST(CapacityTest, RoundsToSignificantDigits) {
-  const struct {
-    uint64_t value, digits, rounded;
-  } cases[] = {{0, 3, 0},
-               {12345, 3, 12300},
-               {12350, 3, 12400},
-               {99950, 3, 100000},
-               {1499, 1, 1000},
-               {1500, 1, 2000},
-               {123, 3, 123},
-               {7, 3, 7},
-               {7, 0, 10},
-               {4, 0, 0},
-               {123456789012345678, 5, 123460000000000000},
-               {18446744073709551615U, 2, 18000000000000000000U},
-               {18446744073709551615U, 1, 0},
-               {18446744073709551615U, 4, 18446744073709551615U},
-               {18446744073709551615U, 20, 18446744073709551615U},
-               {1234567890123456789, 0, 0},
-               {1234567890123456789, 1, 1000000000000000000},
-               {999999999999999, 15, 1000000000000000}};
-  for (const auto &[value, digits, rounded] : cases) {
+  std::ifstream cases(CASES "/rounding.txt");
+  int count = 0;
+  for (uint64_t value, digits, rounded; cases >> value >> digits >> rounded; ++count) {
     EXPECT_EQ(roundSig(value, digits), rounded) << value << " to " << digits;
   }
+  EXPECT_EQ(count, 18);
 }
 
 }  // namespace
