@@ -43,7 +43,6 @@ std::string RenderInplace(const std::vector<char> &header, const std::vector<cha
     const uint64_t result = KVRParseSnapshotBufferWithInplaceParser(
         snapshot.data(), snapshot.size(), output.data(), &size, header.data(), &state);
     Require(result <= 1 && state >= before && size >= 1);
-    // A number may hold a NUL from the header's own text only; lines never do.
     CheckText(output, size - 1);
     whole += output.data();
     if (result == 1) break;
