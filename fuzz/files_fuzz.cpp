@@ -1,9 +1,9 @@
 // Files from outside: the first byte chooses between a scenario and a snapshot header. A header
 // that passes its check is used, at the end of its own allocation.
 
+#include <cassert>
 #include <vector>
 
-#include "fuzz/fuzz.h"
 #include "morwick/morwick.h"
 #include "platform/simulated/scenario.h"
 #include "tools/snapshot_header.h"
@@ -14,17 +14,17 @@ void CheckScenario(std::string_view text) {
   simulated::Scenario scenario;
   std::string error;
   const bool good = simulated::ParseScenario(text, "file", &scenario, &error);
-  Require(good == error.empty());
-  Require(good || error.starts_with("file:"));
+  assert(good == error.empty());
+  assert(good || error.starts_with("file:"));
   if (!good) return;
   for (const simulated::Controller &controller : scenario.controllers) {
-    Require(simulated::TaskSchedulerMethod(controller.className) != 0);
+    assert(simulated::TaskSchedulerMethod(controller.className) != 0);
   }
 }
 
 void CheckHeader(std::string_view file) {
   const std::string wrong = tools::CheckSnapshotHeader(file);
-  Require(wrong == tools::CheckSnapshotHeader(file));
+  assert(wrong == tools::CheckSnapshotHeader(file));
   if (!wrong.empty()) return;
   const std::vector<char> header(file.begin(), file.end());
   const std::vector<char> snapshot(1000, 'a');
@@ -33,7 +33,7 @@ void CheckHeader(std::string_view file) {
   uint32_t state = 0;
   KVRParseSnapshotBufferWithInplaceParser(snapshot.data(), snapshot.size(), output.data(), &size,
                                           header.data(), &state);
-  Require(size >= 1 && size <= output.size() && output[size - 1] == '\0');
+  assert(size >= 1 && size <= output.size() && output[size - 1] == '\0');
 }
 
 }  // namespace

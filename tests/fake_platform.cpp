@@ -1,141 +1,188 @@
 #include "tests/fake_platform.h"
 
+#include <gtest/gtest.h>
+
 #include <algorithm>
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
+#include <fstream>
 #include <sstream>
 
-FakePlatform fakePlatform;
+#include "platform/platform.h"
 
 struct MatchingRequest {
   std::string className;
 };
 
-void FakePlatform::Reset(const std::map<std::string, std::string> &script) {
-  *this = FakePlatform();
-  for (const auto &[key, words] : script) {
-    std::istringstream stream(words);
-    for (std::string word; stream >> word;) {
-      if (key == "present") present.insert(word);
-      if (key == "failing") failing.insert(word);
-      if (key == "replies") replies.push_back(word);
-      if (key == "defers") defers.push_back(word);
-      if (key == "state") activityState = std::stoi(word);
-    }
-  }
+namespace {
+
+struct FakePlatform {
+  Script script;
+  std::string journal;
+  size_t calls = 0;  // of those that can fail
+  std::map<std::string, size_t> callsByName;
+  std::map<uint32_t, std::string> openHandles;
+  size_t openRequests = 0;
+  uint32_t lastHandle = 0;
+};
+
+FakePlatform platform;
+
+template <typename... Parts>
+void Write(const Parts &...parts) {
+  std::ostringstream line;
+  (line << ... << parts) << "\n";
+  platform.journal += line.str();
 }
 
-bool FakePlatform::Fails(const std::string &name) {
-  ++calls;
-  return failing.contains(name + "#" + std::to_string(++callsByName[name])) ||
-         failing.contains("#" + std::to_string(calls));
+bool Lists(const std::string &key, const std::string &word) {
+  return (" " + platform.script[key] + " ").find(" " + word + " ") != std::string::npos;
 }
 
-uint32_t FakePlatform::Issue(const std::string &what) {
-  openHandles[++lastHandle] = what;
-  return lastHandle;
+// The word that is next in turn, or `otherwise` when they have run out.
+std::string Take(const std::string &key, const std::string &otherwise) {
+  std::string &words = platform.script[key];
+  if (words.empty()) return otherwise;
+  std::string word = words.substr(0, words.find(' '));
+  words.erase(0, word.size() + 1);
+  return word;
 }
 
-void FakePlatform::Return(uint32_t handle, const std::string &what) {
-  const auto found = openHandles.find(handle);
-  if (found == openHandles.end() || found->second != what) {
-    ADD_FAILURE() << what << " " << handle << " is not open";
-  } else {
-    openHandles.erase(found);
-  }
+bool Fails(const std::string &name) {
+  ++platform.calls;
+  return Lists("failing", name + "#" + std::to_string(++platform.callsByName[name])) ||
+         Lists("failing", "#" + std::to_string(platform.calls));
 }
 
-void PlatformTest::TearDown() {
-  EXPECT_EQ(fakePlatform.openRequests, 0U) << "a matching request was not consumed";
-  for (const auto &[handle, what] : fakePlatform.openHandles) {
+uint32_t Issue(const std::string &what) {
+  platform.openHandles[++platform.lastHandle] = what;
+  return platform.lastHandle;
+}
+
+void Return(uint32_t handle, const std::string &what) {
+  EXPECT_EQ(platform.openHandles[handle], what) << handle << " is not open";
+  platform.openHandles.erase(handle);
+}
+
+}  // namespace
+
+std::string Play(const Script &script, const std::function<void()> &body) {
+  platform = FakePlatform();
+  platform.script = script;
+  testing::internal::CaptureStdout();
+  testing::internal::CaptureStderr();
+  body();
+  std::string printed = testing::internal::GetCapturedStdout();
+  printed += testing::internal::GetCapturedStderr();
+  EXPECT_EQ(platform.openRequests, 0U) << "a matching request was not consumed";
+  for (const auto &[handle, what] : platform.openHandles) {
     ADD_FAILURE() << what << " " << handle << " was left open";
   }
+  return printed.empty() ? platform.journal : printed + "\n" + platform.journal;
+}
+
+void PlayCases(const std::string &file, const std::function<void(Script &)> &body) {
+  std::ifstream cases(CASES "/" + file);
+  EXPECT_EQ(cases.peek(), '=') << file;
+  for (std::string line; std::getline(cases, line);) {
+    SCOPED_TRACE(line);
+    Script script;
+    while (std::getline(cases, line) && line != "->") {
+      const size_t colon = line.find(": ");
+      script[line.substr(0, colon)] = line.substr(colon + 2);
+    }
+    std::string expected;
+    while (cases.peek() != '=' && std::getline(cases, line)) expected += line + "\n";
+    EXPECT_EQ(Play(script, [&] { body(script); }), expected);
+  }
+}
+
+std::vector<std::string> PlayEveryFailure(Script script, const std::function<void()> &body) {
+  std::vector<std::string> outcomes;
+  for (size_t first = 0, calls = 1; first <= calls; ++first) {
+    for (size_t second = first; second <= calls; ++second) {
+      script["failing"] = "#" + std::to_string(first) + " #" + std::to_string(second);
+      SCOPED_TRACE(script["failing"]);
+      outcomes.push_back(Play(script, body));
+      EXPECT_LE(platform.calls, 20U) << "an endless run";
+      calls = std::clamp<size_t>(platform.calls, calls, 20);
+    }
+  }
+  return outcomes;
 }
 
 MatchingRequest *ServiceMatching(const char *className) {
-  fakePlatform.Write(std::string("match ") + className);
-  if (fakePlatform.Fails("match")) return nullptr;
-  ++fakePlatform.openRequests;
+  Write("match ", className);
+  if (Fails("match")) return nullptr;
+  ++platform.openRequests;
   return new MatchingRequest{className};
 }
 
 uint32_t GetMatchingService(MatchingRequest *request) {
-  --fakePlatform.openRequests;
-  const bool found = fakePlatform.present.contains(request->className);
+  --platform.openRequests;
+  const bool found = Lists("present", request->className) && !Fails("lookup");
   delete request;
-  const uint32_t service =
-      found && !fakePlatform.Fails("lookup") ? fakePlatform.Issue("service") : 0;
-  fakePlatform.Write("look up = " + std::to_string(service));
+  const uint32_t service = found ? Issue("service") : 0;
+  Write("look up = ", service);
   return service;
 }
 
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
-  EXPECT_EQ(fakePlatform.openHandles[service], "service");
-  const bool fails = fakePlatform.Fails("open");
-  *connection =
-      fails || fakePlatform.failing.contains("handle0") ? 0 : fakePlatform.Issue("connection");
-  fakePlatform.Write("open " + std::to_string(service) + " type " + std::to_string(type) + " = " +
-                     std::to_string(*connection));
+  EXPECT_EQ(platform.openHandles[service], "service");
+  const bool fails = Fails("open");
+  *connection = fails || Lists("failing", "handle0") ? 0 : Issue("connection");
+  Write("open ", service, " type ", type, " = ", *connection);
   return fails ? 0x2c7 : 0;
 }
 
 int32_t CloseService(uint32_t connection) {
-  fakePlatform.Write("close " + std::to_string(connection));
+  Write("close ", connection);
   if (connection == 0) return 1;
-  fakePlatform.Return(connection, "connection");
-  return fakePlatform.Fails("close") ? 1 : 0;
+  Return(connection, "connection");
+  return Fails("close") ? 1 : 0;
 }
 
 int32_t ReleaseObject(uint32_t service) {
-  fakePlatform.Write("release " + std::to_string(service));
-  fakePlatform.Return(service, "service");
-  return fakePlatform.Fails("release") ? 1 : 0;
+  Write("release ", service);
+  Return(service, "service");
+  return Fails("release") ? 1 : 0;
 }
 
 int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
                          size_t inputSize, void *reply, size_t *replySize) {
-  EXPECT_EQ(fakePlatform.openHandles[connection], "connection");
-  EXPECT_EQ(*replySize, 4U);
+  EXPECT_EQ(platform.openHandles[connection], "connection");
   const auto *bytes = static_cast<const unsigned char *>(input);
-  const auto zeros = std::count(bytes + 8, bytes + inputSize, 0);
-  const auto half = [&](size_t offset) { return bytes[offset] + 256U * bytes[offset + 1]; };
-  char line[100];
-  std::snprintf(line, sizeof line, "call %u method %u: %u bytes, %u %u and %u zeros", connection,
-                selector, static_cast<unsigned>(inputSize), half(0), half(4),
-                static_cast<unsigned>(zeros));
-  fakePlatform.Write(line);
-  uint32_t word = 0;
-  std::memcpy(&word, reply, sizeof word);
-  EXPECT_EQ(word, 0U) << "the reply is not cleared before the call";
-  if (!fakePlatform.replies.empty()) {
-    word = static_cast<uint32_t>(std::stoul(fakePlatform.replies.front()));
-    fakePlatform.replies.pop_front();
-  }
-  std::memcpy(reply, &word, sizeof word);
-  return fakePlatform.Fails("call") ? 1 : 0;
+  Write("call ", connection, " method ", selector, ": ", inputSize, " bytes, ",
+        bytes[0] + 256 * bytes[1], " ", bytes[4] + 256 * bytes[5], " and ",
+        std::count(bytes + 8, bytes + inputSize, 0), " zeros");
+  const uint32_t cleared = 0;
+  EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
+  const auto pending = static_cast<uint32_t>(std::stoul(Take("replies", "0")));
+  std::memcpy(reply, &pending, sizeof pending);
+  return Fails("call") ? 1 : 0;
 }
 
 void RegisterActivity(const char *identifier, ActivityCriteria criteria, ActivityHandler) {
-  fakePlatform.Write(std::string("register ") + identifier +
-                     (criteria == kActivityCheckIn ? " at check-in" : ""));
+  Write("register ", identifier, criteria == kActivityCheckIn ? " at check-in" : "");
 }
 
-int GetActivityState(Activity *) { return fakePlatform.activityState; }
+int GetActivityState(Activity *) {
+  return std::stoi(Take("state", std::to_string(kActivityStateRun)));
+}
 
 bool ActivityShouldDefer(Activity *) {
-  const bool answer = !fakePlatform.defers.empty() && fakePlatform.defers.front() == "yes";
-  if (!fakePlatform.defers.empty()) fakePlatform.defers.pop_front();
-  fakePlatform.Write(answer ? "defer? yes" : "defer? no");
+  const bool answer = Take("defers", "no") == "yes";
+  Write("defer? ", answer ? "yes" : "no");
   return answer;
 }
 
 bool SetActivityState(Activity *, int state) {
-  fakePlatform.Write("set state " + std::to_string(state));
+  Write("set state ", state);
   return true;
 }
 
-void ExitTransactionClean() { fakePlatform.Write("exit clean"); }
+void ExitTransactionClean() { Write("exit clean"); }
 
 void RunMainQueue() { std::abort(); }
 
@@ -145,10 +192,10 @@ void SystemLog(const char *format, ...) {
   va_start(arguments, format);
   std::vsnprintf(message, sizeof message, format, arguments);
   va_end(arguments);
-  fakePlatform.Write(std::string("log ") + message);
+  Write("log ", message);
 }
 
 extern "C" unsigned sleep(unsigned seconds) {
-  fakePlatform.Write("sleep " + std::to_string(seconds));
+  Write("sleep ", seconds);
   return 0;
 }

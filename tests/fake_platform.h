@@ -2,46 +2,28 @@
 #ifndef TESTS_FAKE_PLATFORM_H
 #define TESTS_FAKE_PLATFORM_H
 
-#include <gtest/gtest.h>
-
-#include <deque>
+#include <functional>
 #include <map>
-#include <set>
 #include <string>
+#include <vector>
 
-#include "platform/platform.h"
+// Words by key. "present": the driver classes that are registered; "failing": the calls that fail,
+// as "name#n" or, counting all calls, "#n"; "replies" and "defers": what controller and scheduler
+// answer in turn, 0 and no when the words have run out; "state": the activity's, unless it is
+// to run.
+using Script = std::map<std::string, std::string>;
 
-struct FakePlatform {
-  // The script. A list that has run out answers 0 or no.
-  std::set<std::string> present;    // driver classes that are registered
-  std::set<std::string> failing;    // calls that fail, as "name#n" or, counting all calls, "#n"
-  std::deque<std::string> replies;  // what the controller answers requests with
-  std::deque<std::string> defers;   // what the scheduler answers questions with: yes or no
-  int activityState = kActivityStateRun;
+// What the body did to a fresh platform with this script: what it printed, if anything, and behind
+// a line end its calls, one a line. The test fails when it left a handle open or returned one that
+// was not.
+std::string Play(const Script &script, const std::function<void()> &body);
 
-  // What happened, a line a call.
-  std::string journal;
-  size_t calls = 0;  // of those that can fail
-  std::map<std::string, size_t> callsByName;
-  std::map<uint32_t, std::string> openHandles;
-  size_t openRequests = 0;
-  uint32_t lastHandle = 0;
+// Plays the cases of a file under tests/cases, each against what is to come of it. A line "== name"
+// begins a case, "key: value" lines are its script, and behind a line "->" stands the outcome.
+void PlayCases(const std::string &file, const std::function<void(Script &)> &body);
 
-  // Starts anew with a script: words by "present", "failing", "replies", "defers", "state".
-  void Reset(const std::map<std::string, std::string> &script);
-  void Write(const std::string &line) { journal += line + "\n"; }
-  bool Fails(const std::string &name);
-  uint32_t Issue(const std::string &what);
-  void Return(uint32_t handle, const std::string &what);
-};
-
-extern FakePlatform fakePlatform;
-
-// Starts every test from a fresh platform and fails the test that leaves a handle open.
-class PlatformTest : public testing::Test {
- protected:
-  PlatformTest() { fakePlatform = FakePlatform(); }
-  void TearDown() override;
-};
+// Plays again and again, with every call failing alone and with every other one, and gives back
+// each outcome.
+std::vector<std::string> PlayEveryFailure(Script script, const std::function<void()> &body);
 
 #endif

@@ -2,25 +2,12 @@
 
 #include <atomic>
 #include <cstdlib>
-
-// The linker sends the calls of everything under test here (--wrap).
-// NOLINTBEGIN(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the linker gives these
-// names
-extern "C" {
-void *__real_malloc(size_t size);
-void *__real_calloc(size_t count, size_t size);
-void *__real_realloc(void *block, size_t size);
-void *__wrap_malloc(size_t size);
-void *__wrap_calloc(size_t count, size_t size);
-void *__wrap_realloc(void *block, size_t size);
-}
+#include <new>
 
 namespace {
 
 std::atomic<size_t> allocations = 0;
 std::atomic<size_t> refused = 0;
-
-bool Refuses() { return ++allocations == refused; }
 
 }  // namespace
 
@@ -31,13 +18,33 @@ void RefuseAllocation(size_t number) {
 
 size_t AllocationCount() { return allocations; }
 
-void *__wrap_malloc(size_t size) { return Refuses() ? nullptr : __real_malloc(size); }
+// The linker sends the calls of everything under test here (--wrap) and gives them these names.
+// NOLINTBEGIN(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
+extern "C" {
+void *__real_malloc(size_t size);
+void *__real_calloc(size_t count, size_t size);
+
+void *__wrap_malloc(size_t size) {
+  return ++allocations == refused ? nullptr : __real_malloc(size);
+}
 
 void *__wrap_calloc(size_t count, size_t size) {
-  return Refuses() ? nullptr : __real_calloc(count, size);
+  return ++allocations == refused ? nullptr : __real_calloc(count, size);
 }
-
-void *__wrap_realloc(void *block, size_t size) {
-  return Refuses() ? nullptr : __real_realloc(block, size);
 }
 // NOLINTEND(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
+
+// Counted too, wherever it is called, the standard library's own code included.
+void *operator new(size_t size) {
+  ++allocations;
+  return __real_malloc(size);
+}
+
+void operator delete(void *block) noexcept { std::free(block); }
+
+void operator delete(void *block, size_t) noexcept { std::free(block); }
+
+std::vector<char> Unaligned(const std::string &bytes) {
+  const std::string shifted = "x" + bytes;
+  return {shifted.begin(), shifted.end()};
+}

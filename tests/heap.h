@@ -3,29 +3,16 @@
 #ifndef TESTS_HEAP_H
 #define TESTS_HEAP_H
 
-#include <cstdint>
-#include <memory>
 #include <string>
-#include <string_view>
+#include <vector>
 
-// Refuses the n-th allocation from now, counted from 1; 0 refuses none.
+// Refuses the n-th allocation from now, counted from 1, with malloc or calloc; 0 refuses none.
 void RefuseAllocation(size_t number);
 
-// malloc, calloc and realloc calls since the last RefuseAllocation.
+// Allocations since the last RefuseAllocation, those with new included.
 size_t AllocationCount();
 
-// A copy of the bytes at the very end of an allocation, `shift` bytes off its aligned start.
-class ExactBuffer {
- public:
-  explicit ExactBuffer(std::string_view bytes, size_t shift = 0)
-      : memory_(new char[bytes.size() + shift]), start_(memory_.get() + shift) {
-    bytes.copy(start_, bytes.size());
-  }
-  char *data() const { return start_; }
-
- private:
-  std::unique_ptr<char[]> memory_;
-  char *start_;
-};
+// A copy of the bytes from index 1 on, which is never aligned, to the very end of the allocation.
+std::vector<char> Unaligned(const std::string &bytes);
 
 #endif

@@ -1,0 +1,62 @@
+// The parsers side by side, for tests and fuzz targets alike.
+#ifndef TESTS_PARSING_H
+#define TESTS_PARSING_H
+
+#include <string>
+
+#include "morwick/morwick.h"
+
+enum Kind { kKVR, kFTL, kMSP, kArray };
+
+struct Contexts {
+  KVRStatsCxt kvr;
+  GenericParserCxt generic;
+};
+
+// Parses into the context that is the kind's, or into none. Of an array, the first byte is the
+// width of its elements.
+inline uint64_t ParseInto(Contexts *contexts, Kind kind, const char *data, size_t size) {
+  GenericParserCxt *generic = contexts == nullptr ? nullptr : &contexts->generic;
+  const auto size32 = static_cast<uint32_t>(size);
+  if (kind == kFTL) return KVRFTLParseBufferToCxt(generic, data, size32);
+  if (kind == kMSP) return KVRMSPParseBufferToCxt(generic, data, size);
+  int result = 0;
+  if (kind == kArray) {
+    const auto width = static_cast<unsigned char>(data[0]);
+    const uint32_t count = width == 0 ? 1 : (size32 - 1) / width;
+    result = AddMultipleFieldsToGenericContext(generic, "f", data + 1, width, count);
+  } else {
+    result = KVRParseBufferToCxt(contexts == nullptr ? nullptr : &contexts->kvr, data, size32);
+  }
+  return static_cast<uint64_t>(result);
+}
+
+// A context's entries as text, with what must hold for any context checked.
+struct Entries {
+  std::string text;  // "name=value " for each entry
+  size_t count = 0;
+  // Lists of equal length whose tails are the last nodes; texts that say the values.
+  bool sound = true;
+
+  template <typename Context>
+  explicit Entries(const Context &context) {
+    const ContextNode *name = context.namesHead;
+    const ContextNode *value = context.valuesHead;
+    const ContextNode *lastName = nullptr;
+    const ContextNode *lastValue = nullptr;
+    for (; name != nullptr && value != nullptr; name = name->next, value = value->next, ++count) {
+      sound = sound && value->text == std::to_string(value->value) && name->value == 0;
+      text.append(name->text).append("=").append(value->text).append(" ");
+      lastName = name;
+      lastValue = value;
+    }
+    sound = sound && name == nullptr && value == nullptr && context.namesTail == lastName &&
+            context.valuesTail == lastValue;
+  }
+};
+
+inline Entries EntriesOf(const Contexts &contexts, Kind kind) {
+  return kind == kKVR ? Entries(contexts.kvr) : Entries(contexts.generic);
+}
+
+#endif
