@@ -135,8 +135,9 @@ TEST(InplaceSnapshotTest, PrintsNumbersAsPrintfDoes) {
   }
 }
 
-// Counts, hundredths and an unprinted number; the third record of twelve bytes is empty, and the
+// A count, thousandths and an unprinted number; the third record of twelve bytes is empty, and the
 // fourth is cut.
+const Fields kCounting = {{0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}};
 constexpr uint32_t kWords[] = {1, 0, 7, 2, 100000, 7, 0, 5000, 7, 4, 9000000, 7};
 constexpr size_t kSize = sizeof kWords - 1;
 
@@ -169,8 +170,7 @@ TEST(InplaceSnapshotTest, KeepsTheRulesCallAfterCall) {
     for (const uint32_t recordCount : {0U, 1U, 2U, 4U, 9U, 0xffffffff}) {
       for (const uint32_t version : {5U, 6U}) {
         const std::string &banner = version < 6 ? legend : kBanner;
-        const std::string header = Header(version, recordSize, recordCount,
-                                          {{0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}});
+        const std::string header = Header(version, recordSize, recordCount, kCounting);
         for (uint64_t capacity = banner.size() - 10; capacity < banner.size() + 100; ++capacity) {
           for (uint32_t call = 0, state = 0; call < 10; ++call) {
             const Rendered expected = Expected(recordSize, recordCount, banner, capacity, state);
@@ -185,7 +185,7 @@ TEST(InplaceSnapshotTest, KeepsTheRulesCallAfterCall) {
 
 TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   char output[2000] = "untouched";
-  const std::string header = Header(6, 12, 3, {});
+  const std::string header = Header(6, 12, 3, kCounting);
   uint64_t size = sizeof output;
   uint64_t none = 0;
   uint32_t state = 7;
@@ -199,7 +199,8 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   EXPECT_STREQ(output, "untouched");
   EXPECT_TRUE(size == sizeof output && state == 7);
   EXPECT_EQ(kInplace(nullptr, 36, output, &size, header.data(), &(state = 0)), 1U);
-  EXPECT_EQ(Render("records, empty without a field", 500, header), (Rendered{1, 1, "", 2}));
+  EXPECT_EQ(Render("records, empty without a field", 500, Header(6, 12, 3, {})),
+            (Rendered{1, 1, "", 2}));
 }
 
 TEST(CapacityTest, RoundsToSignificantDigits) {

@@ -168,7 +168,6 @@ void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
 void RunMainQueue() {
   // Lines that the library prints belong between the lines of the log, not behind them all.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
-  std::signal(SIGPIPE, SIG_IGN);  // nobody reading the log is no reason to leave a connection open
   Scheduler::Instance().Run();
   std::exit(EXIT_SUCCESS);
 }

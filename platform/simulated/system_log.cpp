@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <syslog.h>
 
+#include <csignal>
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
@@ -26,6 +27,7 @@ bool StandardErrorIsTheJournal() {
 
 struct Log {
   Log() : foreground(!StandardErrorIsTheJournal()) {
+    std::signal(SIGPIPE, SIG_IGN);  // nobody reading is no reason to leave a connection open
     openlog("grellon", LOG_PID, LOG_DAEMON);
     if (!TheScenario().logEnabled) setlogmask(LOG_UPTO(LOG_WARNING));
   }
