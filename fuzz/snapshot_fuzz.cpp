@@ -27,7 +27,7 @@ std::vector<char> HeaderFrom(std::string_view &input, uint32_t descriptors) {
 std::string TextIn(const std::vector<char> &output, uint64_t length) {
   assert(length < output.size());
   assert(std::memchr(output.data(), '\0', output.size()) == output.data() + length);
-  return output.data();
+  return {output.data(), length};
 }
 
 std::string RenderInplace(const std::vector<char> &header, const std::vector<char> &snapshot,

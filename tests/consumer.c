@@ -5,6 +5,10 @@
 
 #include "morwick/morwick.h"
 
+static void PrintSelectors(SelectorGetter getter) {
+  if (getter != NULL) printf(" %" PRIu32 "/%" PRIu32, getter()->first, getter()->second);
+}
+
 static void PrintEntries(const ContextNode *name, const ContextNode *value) {
   for (; name != NULL; name = name->next, value = value->next) {
     printf(" %s=%" PRIu64, name->text, value->value);
@@ -15,16 +19,15 @@ int main(void) {
   static const unsigned char words[] = {50, 0, 0, 0, 1, 0, 0, 0, 7, 0, 0, 0, 0, 0, 0, 0};
   static const unsigned char msp[] = {0, 16, 4, 0, 6, 0, 0, 0};
   for (const NandExporter *row = nand_exporters; row->className != NULL; ++row) {
-    const SelectorGetter getters[] = {
-        row->getStatsSelectors,          row->getMSPStatsSelectors,
-        row->getDefectsListSelectors,    row->getTelemetryListSelectors,
-        row->getTaskSchedulerSelectors,  row->getSnapshotSelectors,
-        row->getSnapshotHeaderSelectors, row->getBandStatsSelectors};
     printf("%s:", row->className);
-    for (int i = 0; i < 8; ++i) {
-      if (getters[i] != NULL)
-        printf(" %" PRIu32 "/%" PRIu32, getters[i]()->first, getters[i]()->second);
-    }
+    PrintSelectors(row->getStatsSelectors);
+    PrintSelectors(row->getMSPStatsSelectors);
+    PrintSelectors(row->getDefectsListSelectors);
+    PrintSelectors(row->getTelemetryListSelectors);
+    PrintSelectors(row->getTaskSchedulerSelectors);
+    PrintSelectors(row->getSnapshotSelectors);
+    PrintSelectors(row->getSnapshotHeaderSelectors);
+    PrintSelectors(row->getBandStatsSelectors);
     KVRStatsCxt statistics = {0};
     row->parseBufferToCxt(&statistics, words, sizeof words);
     PrintEntries(statistics.namesHead, statistics.valuesHead);

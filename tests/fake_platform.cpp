@@ -160,6 +160,7 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
   EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
   const auto pending = static_cast<uint32_t>(std::stoul(Take("replies", "0")));
   std::memcpy(reply, &pending, sizeof pending);
+  *replySize = sizeof pending;
   return Fails("call") ? 1 : 0;
 }
 
