@@ -14,8 +14,7 @@ void CheckScenario(std::string_view text) {
   simulated::Scenario scenario;
   std::string error;
   const bool good = simulated::ParseScenario(text, "file", &scenario, &error);
-  assert(good == error.empty());
-  assert(good || error.starts_with("file:"));
+  assert(good ? error.empty() : error.starts_with("file:"));
   if (!good) return;
   for (const simulated::Controller &controller : scenario.controllers) {
     assert(simulated::TaskSchedulerMethod(controller.className) != 0);

@@ -78,9 +78,8 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
     KVRReleaseContext(&contexts.kvr);
     ReleaseGenericParserCxt(&contexts.generic);
   }
-  const auto *record = reinterpret_cast<const char *>(&contexts);
-  EXPECT_EQ(std::count(record, record + sizeof contexts, '\0'), static_cast<long>(sizeof contexts))
-      << "zero-filled";
+  const std::string_view record(reinterpret_cast<const char *>(&contexts), sizeof contexts);
+  EXPECT_EQ(record.find_first_not_of('\0'), record.npos) << "released means zero-filled";
   return seen;
 }
 
@@ -91,9 +90,7 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
     if (line.empty() || line.starts_with('#')) continue;
     SCOPED_TRACE(line);
     std::istringstream columns(line);
-    std::string how;
-    std::string stream;
-    std::string seen;
+    std::string how, stream, seen;
     std::getline(std::getline(std::getline(columns, how, '|'), stream, '|') >> std::ws, seen);
     // An entry takes two allocations, for its value and its name; without one, none is refused.
     const size_t mark = how.find('!');

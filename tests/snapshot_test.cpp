@@ -100,9 +100,7 @@ TEST(InplaceSnapshotTest, PrintsWhatDescriptorsAskFor) {
   for (std::string line; std::getline(cases, line);) {
     if (line.starts_with('#')) continue;
     SnapshotFieldDescriptor field = {};
-    std::string format;
-    std::string arrow;
-    std::string text;
+    std::string format, arrow, text;
     std::istringstream columns(line);
     columns.unsetf(std::ios::dec);  // hexadecimal numbers too
     columns >> field.kind >> field.fieldOffset >> field.fieldSize >> std::quoted(format) >> arrow >>
