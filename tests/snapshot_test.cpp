@@ -38,15 +38,16 @@ Rendered Render(const std::string &snapshot, uint64_t capacity, const std::strin
                 uint32_t state = 0) {
   const std::vector<char> records = Unaligned(snapshot);
   const std::vector<char> layout = Unaligned(header);
-  std::vector<char> output(capacity, 'x');
+  std::vector<char> room(capacity + 1, 'x');
+  char *output = room.data() + 1;
   uint64_t size = capacity;
   RefuseAllocation(0);
-  const uint64_t result = header.empty()
-                              ? kFixed(records.data() + 1, snapshot.size(), output.data(), &size)
-                              : kInplace(records.data() + 1, snapshot.size(), output.data(), &size,
-                                         layout.data() + 1, &state);
+  const uint64_t result =
+      header.empty()
+          ? kFixed(records.data() + 1, snapshot.size(), output, &size)
+          : kInplace(records.data() + 1, snapshot.size(), output, &size, layout.data() + 1, &state);
   EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
-  return {result, size, capacity == 0 ? "" : output.data(), state};
+  return {result, size, capacity == 0 ? "" : output, state};
 }
 
 std::string Bytes(const std::vector<uint32_t> &words) {
@@ -133,9 +134,9 @@ TEST(InplaceSnapshotTest, PrintsNumbersAsPrintfDoes) {
   }
 }
 
-// A count, thousandths and an unprinted number; the third record of twelve bytes is empty, and the
+// A count, thousandths and two priorities. Of twelve bytes the third record is empty, and the
 // fourth is cut.
-const Fields kCounting = {{0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}};
+const Fields kCounting = {{0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}, {3, 9, 0, 24, "%s"}};
 constexpr uint32_t kWords[] = {1, 0, 7, 2, 100000, 7, 0, 5000, 7, 4, 9000000, 7};
 constexpr size_t kSize = sizeof kWords - 1;
 
@@ -153,6 +154,7 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
     if (recordSize < 4 || record[0] == 0) continue;
     text += "N=" + std::to_string(record[0]);
     if (recordSize >= 8) text += " A=" + std::to_string(record[1] / 1000) + ".00";
+    if (recordSize >= 24) text += "O   1/   2L      0/ 100000M    7/    7";
     text += "\n";
     if (text.size() >= capacity) return {0, completed.size() + 1, completed, state};
     completed = text;
@@ -162,14 +164,14 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
 
 TEST(InplaceSnapshotTest, KeepsTheRulesCallAfterCall) {
   const std::string records(reinterpret_cast<const char *>(kWords), kSize);
-  std::string legend = Render("", 2000).text;
-  legend.pop_back();
-  for (const uint32_t recordSize : {0U, 3U, 4U, 8U, 12U, 0xffffffff}) {
+  const std::string legend = Render("", 1338).text;  // no room for the line end behind it
+  for (const uint32_t recordSize : {0U, 3U, 4U, 8U, 12U, 24U, 0xffffffff}) {
     for (const uint32_t recordCount : {0U, 1U, 2U, 4U, 9U, 0xffffffff}) {
       for (const uint32_t version : {5U, 6U}) {
         const std::string &banner = version < 6 ? legend : kBanner;
         const std::string header = Header(version, recordSize, recordCount, kCounting);
-        for (uint64_t capacity = banner.size() - 10; capacity < banner.size() + 100; ++capacity) {
+        const uint64_t first = banner.size() - kBanner.size() + 1;
+        for (uint64_t capacity = first; capacity < first + 150; ++capacity) {
           for (uint32_t call = 0, state = 0; call < 10; ++call) {
             const Rendered expected = Expected(recordSize, recordCount, banner, capacity, state);
             ASSERT_EQ(Render(records, capacity, header, state), expected) << capacity;
@@ -197,8 +199,7 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   EXPECT_STREQ(output, "untouched");
   EXPECT_TRUE(size == sizeof output && state == 7);
   EXPECT_EQ(kInplace(nullptr, 36, output, &size, header.data(), &(state = 0)), 1U);
-  EXPECT_EQ(Render("records, empty without a field", 500, Header(6, 12, 3, {})),
-            (Rendered{1, 1, "", 2}));
+  EXPECT_EQ(Render("no field, no line", 500, Header(6, 4, 3, {}), 7), (Rendered{1, 1, "", 7}));
 }
 
 TEST(CapacityTest, RoundsToSignificantDigits) {
