@@ -30,17 +30,21 @@ struct Stream {
   size_t entries = 0;
 };
 
-inline Stream StatsStream(int copies) {
+// Every key that `find` knows below `ids`, so many times over. A header is two of `HeaderPart`: the
+// key, and the number of its elements times `lengthUnit`.
+template <typename HeaderPart, typename Element>
+Stream MakeStream(const morwick::StatsKey *(*find)(uint32_t), uint32_t ids, uint32_t lengthUnit,
+                  int copies) {
   std::mt19937_64 random(1);
   Stream stream;
   for (int copy = 0; copy < copies; ++copy) {
-    for (uint32_t id = 0; id < 660; ++id) {
-      const morwick::StatsKey *key = morwick::FindStatsKey(id);
+    for (uint32_t id = 0; id < ids; ++id) {
+      const morwick::StatsKey *key = find(id);
       if (key == nullptr) continue;
-      Append(&stream.buffer, key->id);
-      Append(&stream.buffer, key->elements);
+      Append(&stream.buffer, static_cast<HeaderPart>(key->id));
+      Append(&stream.buffer, static_cast<HeaderPart>(key->elements * lengthUnit));
       for (uint32_t i = 0; i < key->elements; ++i) {
-        Append(&stream.buffer, MixedMagnitude(random, 64));
+        Append(&stream.buffer, static_cast<Element>(MixedMagnitude(random, 8 * sizeof(Element))));
       }
       stream.entries += key->elements;
     }
@@ -48,22 +52,12 @@ inline Stream StatsStream(int copies) {
   return stream;
 }
 
+inline Stream StatsStream(int copies) {
+  return MakeStream<uint32_t, uint64_t>(morwick::FindStatsKey, 660, 1, copies);
+}
+
 inline Stream MSPStream(int copies) {
-  std::mt19937_64 random(1);
-  Stream stream;
-  for (int copy = 0; copy < copies; ++copy) {
-    for (uint32_t id = 4096; id < 8215; ++id) {
-      const morwick::StatsKey *key = morwick::FindMSPKey(id);
-      if (key == nullptr) continue;
-      Append(&stream.buffer, static_cast<uint16_t>(key->id));
-      Append(&stream.buffer, static_cast<uint16_t>(key->elements * 4));
-      for (uint32_t i = 0; i < key->elements; ++i) {
-        Append(&stream.buffer, static_cast<uint32_t>(MixedMagnitude(random, 32)));
-      }
-      stream.entries += key->elements;
-    }
-  }
-  return stream;
+  return MakeStream<uint16_t, uint32_t>(morwick::FindMSPKey, 8215, sizeof(uint32_t), copies);
 }
 
 }  // namespace bench

@@ -1,13 +1,11 @@
 // morwick snapshot: prints a snapshot as the library's text or as CSV.
 
-#include <endian.h>
-
 #include <algorithm>
-#include <cstring>
 
 #include "morwick/morwick.h"
 #include "tools/commands.h"
 #include "tools/snapshot_header.h"
+#include "tools/words.h"
 
 namespace tools {
 namespace {
@@ -43,15 +41,6 @@ void PrintFixed(Output &output, const std::string &snapshot) {
     if (!output.Write(std::string_view(text).substr(legend.size()))) return;
   }
   output.Write("\n");
-}
-
-SnapshotRecord ReadRecord(const char *bytes) {
-  uint32_t words[sizeof(SnapshotRecord) / sizeof(uint32_t)];
-  std::memcpy(words, bytes, sizeof words);
-  for (uint32_t &word : words) word = le32toh(word);
-  SnapshotRecord record;
-  std::memcpy(&record, words, sizeof record);
-  return record;
 }
 
 std::string Milliseconds(uint32_t microseconds) {
@@ -92,8 +81,8 @@ std::string CsvRow(const SnapshotRecord &record) {
 void PrintCsv(Output &output, const std::string &snapshot) {
   output.Write(kCsvHeader);
   for (uint64_t i = 0; i < RecordCount(snapshot); ++i) {
-    const SnapshotRecord record = ReadRecord(snapshot.data() + i * sizeof(SnapshotRecord));
-    if (!output.Write(CsvRow(record))) return;
+    const auto bytes = std::string_view(snapshot).substr(i * sizeof(SnapshotRecord));
+    if (!output.Write(CsvRow(ReadWords<SnapshotRecord>(bytes)))) return;
   }
 }
 
@@ -114,7 +103,7 @@ Status FixedLayout(const SnapshotOptions &options, const std::string &snapshot) 
 Status DescribedLayout(const SnapshotOptions &options, const std::string &snapshot,
                        const std::string &header) {
   const std::string name = DisplayName(options.file);
-  const uint32_t recordCount = ReadSnapshotHeader(header).recordCount;
+  const uint32_t recordCount = ReadWords<SnapshotHeader>(header).recordCount;
   const uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
   Output output;
   Status status = kGood;

@@ -2,9 +2,8 @@
 
 #include "tools/snapshot_header.h"
 
-#include <endian.h>
-
-#include <cstring>
+#include "morwick/snapshot.h"
+#include "tools/words.h"
 
 namespace tools {
 namespace {
@@ -13,15 +12,6 @@ constexpr uint32_t kFirstTextVersion = 6;   // the first one whose banner is the
 constexpr uint64_t kDescriptorsOffset = 8;  // in the table, behind the count
 
 }  // namespace
-
-SnapshotHeader ReadSnapshotHeader(std::string_view file) {
-  uint32_t words[sizeof(SnapshotHeader) / sizeof(uint32_t)] = {};
-  file.copy(reinterpret_cast<char *>(words), sizeof words);
-  for (uint32_t &word : words) word = le32toh(word);
-  SnapshotHeader header;
-  std::memcpy(&header, words, sizeof header);
-  return header;
-}
 
 std::string CheckSnapshotHeader(std::string_view file) {
   const auto wrong = [&](const std::string &field, uint64_t value) {
@@ -32,7 +22,7 @@ std::string CheckSnapshotHeader(std::string_view file) {
     return "a header of " + std::to_string(file.size()) + " bytes is shorter than " +
            std::to_string(sizeof(SnapshotHeader));
   }
-  const SnapshotHeader header = ReadSnapshotHeader(file);
+  const SnapshotHeader header = ReadWords<SnapshotHeader>(file);
   if (header.recordSize == 0) return "record size 0 is too small";
   if (header.formatVersion >= kFirstTextVersion &&
       file.find('\0', sizeof(SnapshotHeader)) == std::string_view::npos) {
@@ -40,9 +30,7 @@ std::string CheckSnapshotHeader(std::string_view file) {
   }
   const uint64_t table = header.descriptorTableOffset;
   if (table + kDescriptorsOffset > file.size()) return wrong("descriptor table offset", table);
-  uint32_t count = 0;
-  std::memcpy(&count, file.data() + table, sizeof count);
-  count = le32toh(count);
+  const auto count = ReadWords<uint32_t>(file.substr(table));
   if (table + kDescriptorsOffset + uint64_t{count} * sizeof(SnapshotFieldDescriptor) >
       file.size()) {
     return wrong("descriptor count", count);

@@ -91,6 +91,26 @@ Statistics ParseGeneric(const NandExporter &row, Parser parser, const std::strin
   return statistics;
 }
 
+Statistics Parse(const NandExporter &row, const std::string &stream, const std::string &dump) {
+  Statistics statistics;
+  if (dump.empty()) {
+    statistics.problem = "the file is empty";
+  } else if (stream == "kvr") {
+    statistics = ParseKVR(row, dump);
+  } else if (stream == "ftl") {
+    statistics =
+        ParseGeneric(row, row.ftlParseBufferToCxt, dump, static_cast<uint32_t>(dump.size()));
+  } else {
+    statistics = ParseGeneric(row, row.mspParseBufferToCxt, dump, uint64_t{dump.size()});
+  }
+  // The 64-bit parsers pass over what is no whole word; a dump that ends so was cut.
+  const size_t rest = stream == "msp" ? 0 : dump.size() % sizeof(uint64_t);
+  if (statistics.problem.empty() && rest != 0) {
+    statistics.problem = "the last " + std::to_string(rest) + " bytes are not a whole word";
+  }
+  return statistics;
+}
+
 // The table's row of the class, or the first one. Null, after a complaint, for an unknown class.
 const NandExporter *FindRow(const std::string &className) {
   const NandExporter *row = nand_exporters;
@@ -183,23 +203,7 @@ Status StatsCommand(const StatsOptions &options) {
   // The parsers take 32-bit sizes.
   const std::optional<std::string> dump = ReadInput(options.file, UINT32_MAX);
   if (!dump) return kBadUsage;
-  Statistics statistics;
-  if (dump->empty()) {
-    statistics.problem = "the file is empty";
-  } else if (options.stream == "kvr") {
-    statistics = ParseKVR(*row, *dump);
-  } else if (options.stream == "ftl") {
-    statistics =
-        ParseGeneric(*row, row->ftlParseBufferToCxt, *dump, static_cast<uint32_t>(dump->size()));
-  } else {
-    statistics = ParseGeneric(*row, row->mspParseBufferToCxt, *dump, uint64_t{dump->size()});
-  }
-
-  // The 64-bit parsers pass over what is no whole word; a dump that ends so was cut.
-  const size_t rest = options.stream == "msp" ? 0 : dump->size() % sizeof(uint64_t);
-  if (statistics.problem.empty() && rest != 0) {
-    statistics.problem = "the last " + std::to_string(rest) + " bytes are not a whole word";
-  }
+  const Statistics statistics = Parse(*row, options.stream, *dump);
 
   Output output;
   if (options.format == "json") {
