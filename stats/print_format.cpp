@@ -52,23 +52,12 @@ class FormatReader {
   bool TakeFlag(Conversion *conversion) {
     if (rest_.empty()) return false;
     switch (rest_.front()) {
-      case '-':
-        conversion->left = true;
-        break;
-      case '0':
-        conversion->zeros = true;
-        break;
-      case '+':
-        conversion->plus = true;
-        break;
-      case ' ':
-        conversion->blank = true;
-        break;
-      case '#':
-        conversion->alternate = true;
-        break;
-      default:
-        return false;
+      case '-': conversion->left = true; break;
+      case '0': conversion->zeros = true; break;
+      case '+': conversion->plus = true; break;
+      case ' ': conversion->blank = true; break;
+      case '#': conversion->alternate = true; break;
+      default: return false;
     }
     rest_.remove_prefix(1);
     return true;
@@ -124,18 +113,10 @@ bool AppendNumber(BoundedWriter &writer, const Conversion &conversion, uint32_t 
       digits = {text, WriteDecimal(text, negative ? 0U - value : value)};
       break;
     }
-    case 'o':
-      digits = Digits(value, 3, "01234567", std::end(text));
-      break;
-    case 'x':
-      digits = Digits(value, 4, "0123456789abcdef", std::end(text));
-      break;
-    case 'X':
-      digits = Digits(value, 4, "0123456789ABCDEF", std::end(text));
-      break;
-    default:
-      digits = {text, WriteDecimal(text, value)};
-      break;
+    case 'o': digits = Digits(value, 3, "01234567", std::end(text)); break;
+    case 'x': digits = Digits(value, 4, "0123456789abcdef", std::end(text)); break;
+    case 'X': digits = Digits(value, 4, "0123456789ABCDEF", std::end(text)); break;
+    default: digits = {text, WriteDecimal(text, value)}; break;
   }
   // A precision is a least number of digits; at 0, the number 0 has none.
   if (conversion.hasPrecision && conversion.precision == 0 && value == 0) digits = "";

@@ -96,12 +96,9 @@ constexpr size_t kLineRoom = std::size(kColumns) * (kLabelRoom + kNumberRoom) + 
 
 constexpr uint32_t PartOf(uint32_t value, Part part) {
   switch (part) {
-    case Part::kThousands:
-      return value / 1000;
-    case Part::kHundredths:
-      return value % 1000 / 10;
-    case Part::kWhole:
-      break;
+    case Part::kThousands: return value / 1000;
+    case Part::kHundredths: return value % 1000 / 10;
+    case Part::kWhole: break;
   }
   return value;
 }

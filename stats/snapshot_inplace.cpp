@@ -165,8 +165,7 @@ bool AppendField(BoundedWriter &writer, const Field &field, const uint8_t *recor
       return AppendPriorities(writer, field, "O", value, 4) &&
              AppendPriorities(writer, field, "L", value + kWordSize, 7) &&
              AppendPriorities(writer, field, "M", value + size_t{2} * kWordSize, 5);
-    case Field::kNothing:
-      break;
+    case Field::kNothing: break;
   }
   return true;
 }

@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <barrier>
 #include <fstream>
 #include <set>
@@ -67,11 +66,9 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   RefuseAllocation(0);
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
-  EXPECT_TRUE(entries.text.starts_with("validLbas=1 "));
-  std::string seen = entries.text.substr(12) + "-> " + std::to_string(result);
-  if (contexts.kvr.exportVersion != 99) {
-    seen += ", version " + std::to_string(contexts.kvr.exportVersion);
-  }
+  std::string seen = entries.text + "-> " + std::to_string(result);
+  const uint32_t version = contexts.kvr.exportVersion;
+  if (version != 99) seen += ", version " + std::to_string(version);
   if (const std::string message = TakeMessage(); message != "NA") seen += ", " + message;
   EXPECT_EQ(contexts.kvr.parseMarker, -1);
   for (int time = 0; time < 2; ++time) {
@@ -95,17 +92,16 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
     // An entry takes two allocations, for its value and its name; without one, none is refused.
     const size_t mark = how.find('!');
     const size_t entry = mark == std::string::npos ? 0 : std::stoul(how.substr(mark + 1));
-    EXPECT_EQ(Parse(how, stream, 2 * entry - 1), seen);
-    EXPECT_EQ(Parse(how, stream, 2 * entry), seen);
+    EXPECT_EQ(Parse(how, stream, 2 * entry - 1), "validLbas=1 " + seen);
+    EXPECT_EQ(Parse(how, stream, 2 * entry), "validLbas=1 " + seen);
   }
 }
 
 TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
-  const std::string invalid = "KVRMSPParseBufferToCxt: Passed in invalid buffer or empty buffer";
   const std::string hard = Stream(kMSP, "4096:4 5");
   GenericParserCxt context = {};
   EXPECT_EQ(KVRMSPParseBufferToCxt(&context, hard.data(), 0x500000000), 0U);
-  EXPECT_EQ(TakeMessage(), invalid);
+  EXPECT_TRUE(TakeMessage().ends_with("Passed in invalid buffer or empty buffer"));
   EXPECT_EQ(KVRMSPParseBufferToCxt(&context, hard.data(), 0x500000008), 1U);
   ReleaseGenericParserCxt(&context);
   KVRReleaseContext(nullptr);
@@ -126,9 +122,7 @@ TEST(ParserContextTest, CutsNamesAt98Characters) {
     AddSingleValueToGenericContext(&context, std::string(90, 'a').c_str(), name.c_str(), 0);
     AddMultipleFieldsToGenericContext(&context, name.c_str(), bytes.data(), 1, 12345);
     std::string expected = (std::string(90, 'a') + name).substr(0, 98) + "=0 ";
-    for (int i = 0; i < 12345; ++i) {
-      expected += (name + std::to_string(i)).substr(0, 98) + "=1 ";
-    }
+    for (int i = 0; i < 12345; ++i) expected += (name + std::to_string(i)).substr(0, 98) + "=1 ";
     EXPECT_EQ(Entries(context).text, expected);
     ReleaseGenericParserCxt(&context);
   }
@@ -144,7 +138,7 @@ TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
   EXPECT_EQ(TakeMessage(), "100%d 7");
   for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
     SetAPIErrorMessage("%s", std::string(length, 'x').c_str());
-    EXPECT_EQ(TakeMessage().size(), std::min<size_t>(length, 1023));
+    EXPECT_EQ(TakeMessage().size(), length < 1023 ? length : 1023U);
   }
 }
 

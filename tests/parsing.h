@@ -16,19 +16,15 @@ struct Contexts {
 // Parses into the context that is the kind's, or into none. Of an array, the first byte is the
 // width of its elements.
 inline uint64_t ParseInto(Contexts *contexts, Kind kind, const char *data, size_t size) {
+  KVRStatsCxt *kvr = contexts == nullptr ? nullptr : &contexts->kvr;
   GenericParserCxt *generic = contexts == nullptr ? nullptr : &contexts->generic;
   const auto size32 = static_cast<uint32_t>(size);
+  if (kind == kKVR) return static_cast<uint64_t>(KVRParseBufferToCxt(kvr, data, size32));
   if (kind == kFTL) return KVRFTLParseBufferToCxt(generic, data, size32);
   if (kind == kMSP) return KVRMSPParseBufferToCxt(generic, data, size);
-  int result = 0;
-  if (kind == kArray) {
-    const auto width = static_cast<unsigned char>(data[0]);
-    const uint32_t count = width == 0 ? 1 : (size32 - 1) / width;
-    result = AddMultipleFieldsToGenericContext(generic, "f", data + 1, width, count);
-  } else {
-    result = KVRParseBufferToCxt(contexts == nullptr ? nullptr : &contexts->kvr, data, size32);
-  }
-  return static_cast<uint64_t>(result);
+  const auto width = static_cast<unsigned char>(data[0]);
+  const uint32_t count = width == 0 ? 1 : (size32 - 1) / width;
+  return AddMultipleFieldsToGenericContext(generic, "f", data + 1, width, count) == 1 ? 1 : 0;
 }
 
 // A context's entries as text, with what must hold for any context checked.

@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <array>
 #include <cstdlib>
 
 #include "platform/platform.h"
@@ -29,10 +28,10 @@ TEST(SimulatedPlatformTest, DoesOneUnitForTheRightRequestOnly) {
                {8, 39, 1025, 24, 8, true, 1},  {8, 39, 1025, 24, 4, true, 0},
                {8, 39, 1025, 24, 4, true, 0}};
   for (const auto &[method, command, argument, size, room, good, left] : cases) {
-    const std::array<uint32_t, 6> request = {command, argument};
+    const uint32_t request[6] = {command, argument};
     uint32_t reply = 0;
     size_t replySize = room;
-    EXPECT_EQ(CallStructMethod(connection, method, &request, size, &reply, &replySize) == 0, good);
+    EXPECT_EQ(CallStructMethod(connection, method, request, size, &reply, &replySize) == 0, good);
     EXPECT_EQ(reply, left);
     EXPECT_EQ(replySize, good ? 4U : 0U);
   }

@@ -59,10 +59,9 @@ TEST(FixedSnapshotTest, CutsTheTextAtAnyCapacity) {
   const std::string whole = Render(snapshot, 10000).text;
   EXPECT_TRUE(whole.starts_with("Key: \nT   - Timestamp\n") && whole.ends_with("\n\n"));
   for (uint64_t capacity = 0; capacity <= whole.size() + 1; ++capacity) {
-    const Rendered expected =
-        capacity > whole.size()
-            ? Rendered{1, whole.size(), whole}
-            : Rendered{0, capacity, whole.substr(0, std::max<uint64_t>(capacity, 1) - 1)};
+    const bool fits = capacity > whole.size();
+    const Rendered expected = {fits ? 1U : 0U, fits ? whole.size() : capacity,
+                               whole.substr(0, std::max<uint64_t>(capacity, 1) - 1)};
     ASSERT_EQ(Render(snapshot, capacity), expected);
   }
 }
@@ -85,9 +84,7 @@ const std::string kBanner = "- KVR Snapshot - \nheader text\n";
 // Renders one record through the fields, each followed by a line end.
 std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fields) {
   Fields lines = {{4, 9, 0, 0, ""}};
-  for (const SnapshotFieldDescriptor &field : fields) {
-    lines.insert(lines.end(), {field, {0, 9, 0, 0, "\n"}});
-  }
+  for (const auto &field : fields) lines.insert(lines.end(), {field, {0, 9, 0, 0, "\n"}});
   const std::string header = Header(6, static_cast<uint32_t>(record.size() * 4), 2, lines);
   const std::string text = Render(Bytes(record), 5000, header).text;
   EXPECT_TRUE(text.starts_with(kBanner));
