@@ -131,9 +131,10 @@ TEST(InplaceSnapshotTest, PrintsNumbersAsPrintfDoes) {
   }
 }
 
-// A count, thousandths and two priorities. Of twelve bytes the third record is empty, and the
-// fourth is cut.
-const Fields kCounting = {{0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}, {3, 9, 0, 24, "%s"}};
+// A count, thousandths, labels without a priority and a priority without labels. Of twelve bytes
+// the third record is empty, and the fourth is cut.
+const Fields kCounting = {
+    {0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}, {3, 9, 0, 0, "%4s="}, {3, 9, 12, 12, ""}};
 constexpr uint32_t kWords[] = {1, 0, 7, 2, 100000, 7, 0, 5000, 7, 4, 9000000, 7};
 constexpr size_t kSize = sizeof kWords - 1;
 
@@ -151,7 +152,8 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
     if (recordSize < 4 || record[0] == 0) continue;
     text += "N=" + std::to_string(record[0]);
     if (recordSize >= 8) text += " A=" + std::to_string(record[1] / 1000) + ".00";
-    if (recordSize >= 24) text += "O   1/   2L      0/ 100000M    7/    7";
+    text += "   O=   L=   M=";
+    if (recordSize >= 24) text += "   2 100000    7";
     text += "\n";
     if (text.size() >= capacity) return {0, completed.size() + 1, completed, state};
     completed = text;
