@@ -79,7 +79,6 @@ void TolkDisconnect(uint32_t connection) {
 
 int openKVRConnection(KVRConnection *record) {
   if (record == nullptr) return 0;
-  record->connection = 0;
   record->service = findNandExporter(&record->exporter);
   if (record->service == 0) {
     std::fputs("Can't get KVR Connection, no matching service!\n", stderr);

@@ -36,10 +36,11 @@ static_assert(offsetof(TaskSchedulerRequest, reserved) == 8);
 static_assert(sizeof(TaskSchedulerRequest) == 24);
 
 // What the controller answers one request with: the work still pending, 0 after a failed request.
-uint32_t RequestWork(uint32_t connection, const NandExporter &row, uint32_t command,
+uint32_t RequestWork(uint32_t connection, const NandExporter &row, const SelectorPair &selectors,
                      uint32_t iteration) {
-  const TaskSchedulerRequest request = {
-      .command = LittleEndian(command), .argument = LittleEndian(kRequestArgument), .reserved = {}};
+  const TaskSchedulerRequest request = {.command = LittleEndian(selectors.second),
+                                        .argument = LittleEndian(kRequestArgument),
+                                        .reserved = {}};
   uint32_t reply = 0;
   size_t replySize = sizeof reply;
   const int32_t status = CallStructMethod(connection, row.methodSelector, &request, sizeof request,
@@ -66,10 +67,10 @@ bool PauseUnlessDeferred(Activity *activity) {
 
 // The work still pending when the loop ends: 0 when there is no more, or a request failed.
 uint32_t RequestUntilDoneOrDeferred(Activity *activity, uint32_t connection,
-                                    const NandExporter &row, uint32_t command) {
+                                    const NandExporter &row, const SelectorPair &selectors) {
   for (uint32_t iteration = 1;; ++iteration) {
     SystemLog("iter# %u - BEGIN", iteration);
-    const uint32_t bdrPending = RequestWork(connection, row, command, iteration);
+    const uint32_t bdrPending = RequestWork(connection, row, selectors, iteration);
     if (bdrPending == 0) {
       SystemLog("iter# %u - DONE - no more BDR", iteration);
       return 0;
@@ -89,8 +90,7 @@ uint32_t WorkOnService(Activity *activity, uint32_t service, const NandExporter 
   uint32_t connection = 0;
   if (OpenService(service, kConnectionType, &connection) != 0 || connection == 0) return 0;
   SystemLog("opened io service connection");
-  const uint32_t bdrPending =
-      RequestUntilDoneOrDeferred(activity, connection, row, selectors->second);
+  const uint32_t bdrPending = RequestUntilDoneOrDeferred(activity, connection, row, *selectors);
   SystemLog("closing io service connection");
   if (CloseService(connection) != 0) SystemLog("error closing connection to service");
   return bdrPending;

@@ -60,10 +60,11 @@ class EntryName {
   size_t length_ = 0;
 };
 
-// Appends one entry and returns its name node, or null without memory for both nodes; nothing is
-// added then.
+// Appends one entry and returns its name node, or null without a context or without memory for both
+// nodes; nothing is added then.
 template <typename Context>
 ContextNode *AppendEntry(Context *context, const EntryName &name, uint64_t value) {
+  if (context == nullptr) return nullptr;
   void *valueMemory = std::malloc(sizeof(ContextNode));
   void *nameMemory = std::malloc(sizeof(ContextNode));
   if (valueMemory == nullptr || nameMemory == nullptr) {
@@ -88,14 +89,12 @@ ContextNode *AppendEntry(Context *context, const EntryName &name, uint64_t value
   return nameNode;
 }
 
-// Appends one entry for each element, named `name` and its index, or `name` alone when there
-// is just one. False when an element could not be added; the others are added all the same.
+// Appends one entry for each element of at most 8 bytes, named `name` and its index, or `name`
+// alone when there is just one. False when an element could not be added; the others are added all
+// the same.
 template <typename Context>
 bool AppendElements(Context *context, const EntryName &name, const uint8_t *elements,
                     uint32_t width, uint32_t count) {
-  constexpr uint32_t kWidest = 8;
-  constexpr uint32_t kMost = 65535;
-  if (width > kWidest || count > kMost) return false;
   bool allAdded = true;
   for (uint32_t index = 0; index < count; ++index, elements += width) {
     ContextNode *node = AppendEntry(context, name, LoadLittleEndian(elements, width));

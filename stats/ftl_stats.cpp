@@ -20,10 +20,7 @@ constexpr uint32_t kEndKey = 0xFFFF;
 
 void AddScalar(GenericParserCxt *context, const StatsKey &key, const Record &record) {
   const auto value = morwick::LoadLittleEndian<uint64_t>(record.payload);
-  if (context != nullptr &&
-      morwick::AppendEntry(context, morwick::EntryName(key.name), value) != nullptr) {
-    return;
-  }
+  if (morwick::AppendEntry(context, morwick::EntryName(key.name), value) != nullptr) return;
   SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u) cannot add 1 element to context",
                      key.name.data(), key.id);
 }
@@ -36,8 +33,7 @@ uint32_t AddArray(GenericParserCxt *context, const StatsKey &key, const Record &
                        key.name.data(), key.id, key.elements, static_cast<int>(record.length));
   }
   const uint32_t count = std::min(record.length, key.elements);
-  if (context != nullptr &&
-      morwick::AppendElements(context, {key.name, "_"}, record.payload, kWordSize, count)) {
+  if (morwick::AppendElements(context, {key.name, "_"}, record.payload, kWordSize, count)) {
     return count;
   }
   SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u): Cannot add %u elements to context",

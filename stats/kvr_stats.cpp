@@ -3,6 +3,7 @@
 #include "morwick/kvr_stats.h"
 
 #include <cstddef>
+#include <string_view>
 
 #include "stats/entry_list.h"
 #include "stats/record_stream.h"
@@ -45,6 +46,23 @@ void SetSummaryField(KVRStatsCxt *context, uint32_t key, const uint8_t *values) 
   }
 }
 
+// Appends one pair, named by the prefix followed directly by the name. False without memory for it.
+bool KVRAddValueToContext(KVRStatsCxt *ctx, std::string_view prefix, std::string_view name,
+                          uint64_t value) {
+  return morwick::AppendEntry(ctx, {prefix, name}, value) != nullptr;
+}
+
+// Takes over what a known key carries: its summary field and a pair for each of its values. False
+// when memory was refused for a pair; the others are appended all the same.
+bool KVRAddFieldsToContext(KVRStatsCxt *ctx, uint32_t key, std::string_view name,
+                           const uint8_t *values, uint32_t count) {
+  SetSummaryField(ctx, key, values);
+  if (count == 1) {
+    return KVRAddValueToContext(ctx, "", name, morwick::LoadLittleEndian<uint64_t>(values));
+  }
+  return morwick::AppendElements(ctx, morwick::EntryName(name), values, kWordSize, count);
+}
+
 }  // namespace
 
 int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size) {
@@ -61,12 +79,9 @@ int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size) {
     const morwick::StatsKey *key = morwick::FindStatsKey(record.key);
     // How many values there are the key says, not the record's length: they may run on into the
     // records behind it, though never past the buffer.
-    if (key != nullptr && key->elements <= stream.wordsLeft()) {
-      SetSummaryField(ctx, key->id, record.payload);
-      if (!morwick::AppendElements(ctx, morwick::EntryName(key->name), record.payload, kWordSize,
-                                   key->elements)) {
-        return 0;
-      }
+    if (key != nullptr && key->elements <= stream.wordsLeft() &&
+        !KVRAddFieldsToContext(ctx, key->id, key->name, record.payload, key->elements)) {
+      return 0;
     }
     stream.Skip(record.length);
   }

@@ -26,8 +26,8 @@ bool AddRecord(GenericParserCxt *context, const StatsKey &key, const uint8_t *pa
         key.name.data(), key.id, key.elements, key.elements, static_cast<int>(length));
   }
   *added = std::min(length / kElementSize, key.elements);
-  if (context != nullptr && morwick::AppendElements(context, morwick::EntryName(key.name), payload,
-                                                    kElementSize, *added)) {
+  if (morwick::AppendElements(context, morwick::EntryName(key.name), payload, kElementSize,
+                              *added)) {
     return true;
   }
   SetAPIErrorMessage("KVRMSPParseBufferToCxt: %s(%u): Error adding %u elements to context",

@@ -70,29 +70,40 @@ void ReadField(const uint8_t *descriptor, uint32_t recordSize, Field *field) {
   }
 }
 
-// What the header says, for the records that lie in the snapshot whole.
-class Layout {
+// The index of the record that ends the rendering, the header's last or the first one that does not
+// lie in the snapshot whole. It is not printed itself.
+uint32_t LastRecord(const uint8_t *header, uint64_t snapshotSize) {
+  const uint32_t recordSize = Word(header, offsetof(SnapshotHeader, recordSize));
+  const uint32_t recordCount = Word(header, offsetof(SnapshotHeader, recordCount));
+  const uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
+  if (recordSize == 0) return last;
+  return static_cast<uint32_t>(std::min<uint64_t>(last, snapshotSize / recordSize));
+}
+
+// Of the header's text no more is looked at than the capacity holds.
+bool AppendBanner(BoundedWriter &writer, const uint8_t *header, uint64_t capacity) {
+  if (Word(header, offsetof(SnapshotHeader, formatVersion)) < kFirstTextVersion) {
+    return writer.Append(morwick::kSnapshotLegend);
+  }
+  const auto *text = reinterpret_cast<const char *>(header) + sizeof(SnapshotHeader);
+  return writer.Append("- KVR Snapshot - \n") && writer.Append({text, strnlen(text, capacity)}) &&
+         writer.Append("\n");
+}
+
+// The fields of a line, from the header's descriptor table.
+class Fields {
  public:
-  Layout(const uint8_t *header, uint64_t snapshotSize)
-      : header_(header),
-        table_(header + Word(header, offsetof(SnapshotHeader, descriptorTableOffset))),
+  explicit Fields(const uint8_t *header)
+      : table_(header + Word(header, offsetof(SnapshotHeader, descriptorTableOffset))),
         recordSize_(Word(header, offsetof(SnapshotHeader, recordSize))) {
-    const uint32_t recordCount = Word(header, offsetof(SnapshotHeader, recordCount));
-    last_ = recordCount == 0 ? 0 : recordCount - 1;
-    if (recordSize_ != 0) {
-      last_ = static_cast<uint32_t>(std::min<uint64_t>(last_, snapshotSize / recordSize_));
-    }
-    for (uint32_t i = 0; i < std::min(fieldCount(), kReadyFields); ++i) {
+    for (uint32_t i = 0; i < std::min(count(), kReadyFields); ++i) {
       ReadField(Descriptor(i), recordSize_, &readyFields_[i]);
     }
   }
 
   uint32_t recordSize() const { return recordSize_; }
 
-  // The index of the record that ends the rendering; it is not printed itself.
-  uint32_t last() const { return last_; }
-
-  uint32_t fieldCount() const { return Word(table_, 0); }
+  uint32_t count() const { return Word(table_, 0); }
 
   // The field with this index; `scratch` is room for one that is not kept ready.
   const Field &field(uint32_t index, Field *scratch) const {
@@ -102,20 +113,9 @@ class Layout {
   }
 
   // Whether the field that tells an empty record lies in the records at all.
-  bool TellsEmptyRecords() const {
-    return fieldCount() > 0 && emptyOffset() + kWordSize <= recordSize_;
-  }
+  bool TellEmptyRecords() const { return count() > 0 && emptyOffset() + kWordSize <= recordSize_; }
 
-  bool IsEmpty(const uint8_t *record) const { return Word(record, emptyOffset()) == 0; }
-
-  bool AppendBanner(BoundedWriter &writer, uint64_t capacity) const {
-    if (Word(header_, offsetof(SnapshotHeader, formatVersion)) < kFirstTextVersion) {
-      return writer.Append(morwick::kSnapshotLegend);
-    }
-    const auto *text = reinterpret_cast<const char *>(header_) + sizeof(SnapshotHeader);
-    return writer.Append("- KVR Snapshot - \n") && writer.Append({text, strnlen(text, capacity)}) &&
-           writer.Append("\n");
-  }
+  bool AreEmpty(const uint8_t *record) const { return Word(record, emptyOffset()) == 0; }
 
  private:
   // The fields that are read once a call instead of once a record, which takes half the time.
@@ -130,10 +130,8 @@ class Layout {
     return Word(Descriptor(0), offsetof(SnapshotFieldDescriptor, fieldOffset));
   }
 
-  const uint8_t *header_;
   const uint8_t *table_;
   uint32_t recordSize_;
-  uint32_t last_;
   Field readyFields_[kReadyFields];
 };
 
@@ -170,10 +168,10 @@ bool AppendField(BoundedWriter &writer, const Field &field, const uint8_t *recor
   return true;
 }
 
-bool AppendLine(BoundedWriter &writer, const Layout &layout, const uint8_t *record) {
+bool AppendLine(BoundedWriter &writer, const Fields &fields, const uint8_t *record) {
   Field scratch;
-  for (uint32_t i = 0; i < layout.fieldCount(); ++i) {
-    if (!AppendField(writer, layout.field(i, &scratch), record)) return false;
+  for (uint32_t i = 0; i < fields.count(); ++i) {
+    if (!AppendField(writer, fields.field(i, &scratch), record)) return false;
   }
   return writer.Append("\n");
 }
@@ -187,7 +185,7 @@ uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot, uint64_t 
       *outputSize == 0) {
     return 0;
   }
-  const Layout layout(static_cast<const uint8_t *>(header), snapshot == nullptr ? 0 : snapshotSize);
+  const auto *layout = static_cast<const uint8_t *>(header);
   BoundedWriter writer(output, *outputSize);
   // Ends this call with the text up to the last complete line.
   const auto end = [&](uint64_t completed, uint64_t result) {
@@ -196,16 +194,21 @@ uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot, uint64_t 
     return result;
   };
 
-  if (*state == 0 && !layout.AppendBanner(writer, *outputSize)) return end(0, 0);
-  uint64_t completed = 0;
+  if (*state == 0 && !AppendBanner(writer, layout, *outputSize)) return end(0, 0);
+  const uint32_t last = LastRecord(layout, snapshot == nullptr ? 0 : snapshotSize);
+  if (*state >= last) return end(0, 1);
+
+  // Only now: a header without a record to print needs no descriptor table.
+  const Fields fields(layout);
   // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
-  if (!layout.TellsEmptyRecords()) *state = std::max(*state, layout.last());
-  while (*state < layout.last()) {
+  if (!fields.TellEmptyRecords()) *state = last;
+  uint64_t completed = 0;
+  while (*state < last) {
     const uint8_t *record =
-        static_cast<const uint8_t *>(snapshot) + uint64_t{layout.recordSize()} * *state;
+        static_cast<const uint8_t *>(snapshot) + uint64_t{fields.recordSize()} * *state;
     ++*state;
-    if (layout.IsEmpty(record)) continue;
-    if (!AppendLine(writer, layout, record)) return end(completed, 0);
+    if (fields.AreEmpty(record)) continue;
+    if (!AppendLine(writer, fields, record)) return end(completed, 0);
     completed = writer.length();
   }
   return end(completed, 1);

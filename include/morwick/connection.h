@@ -20,7 +20,9 @@
 extern "C" {
 #endif
 
-/* What openKVRConnection fills. The record is the caller's; its handles are closeKVRConnection's.
+/*
+ * What openKVRConnection fills. The record is the caller's, who fills it with zeros before its first
+ * use; its handles are closeKVRConnection's.
  */
 typedef struct KVRConnection {
   uint32_t service;
@@ -50,7 +52,9 @@ MORWICK_EXPORT void ReleaseIOInterfaces(NandExporter *row);
 
 /*
  * Finds as findNandExporter does and opens a connection. Returns the connection handle, to be given
- * back with TolkDisconnect, or 0 after a line on standard error. `*row` is always set.
+ * back with TolkDisconnect, or 0 after a message on standard error: "No class found", without a line
+ * end, when there is no driver, and a line with the result code when the driver refuses. A driver
+ * that says success without giving a handle gets 0 in silence. `*row` is always set.
  */
 MORWICK_EXPORT uint32_t TolkConnect(NandExporter **row);
 
@@ -60,7 +64,8 @@ MORWICK_EXPORT void TolkDisconnect(uint32_t connection);
 /*
  * Fills the record with the first controller's service and connection. Returns 1, or 0 after a
  * message on standard error; the record's handles are then 0 and everything obtained was given
- * back. Whatever the record held before is overwritten, not closed.
+ * back. Close a record before it is opened again: its handles are overwritten, but for a connection
+ * that it still holds when no driver is found, which is closed.
  */
 MORWICK_EXPORT int openKVRConnection(KVRConnection *record);
 

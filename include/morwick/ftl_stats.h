@@ -1,5 +1,5 @@
 /*
- * The FTL statistics parser: the 64-bit record stream of kvr_stats.h, read more strictly.
+ * The FTL statistics parser: the 64-bit record stream that kvr_stats.h draws, read more strictly.
  *
  * Threads: no state outside the context and the buffer, but for the library's error message. One
  * context belongs to one thread at a time.
@@ -25,7 +25,8 @@ extern "C" {
  * Returns the number of scalar records read plus the number of array elements added. Parsing ends
  * at the end of the buffer, at a record of the end key 0xFFFF, at a bad header (a key above
  * 0x30000000 or a length past the end), and when an array could not be added; what was parsed
- * before is kept. Unknown keys and records of length 0 are passed over.
+ * before is kept, and so are those elements of that last array that could be added, though they
+ * are not counted. Unknown keys and records of length 0 are passed over.
  *
  * Messages (error_message.h) are recorded for a scalar that could not be added (it is counted all
  * the same), for an array whose length differs from its configured one (the smaller number is

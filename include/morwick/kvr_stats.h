@@ -2,6 +2,21 @@
  * The KVR statistics parser. It fills the entry lists and, from the keys that tools need most,
  * summary fields that are read without searching the lists.
  *
+ * The 64-bit record stream, which the FTL parser reads too, is a row of 64-bit words, each stored
+ * little-endian: records laid end to end from the first word of the buffer to its last whole one,
+ * without an end mark of their own.
+ *
+ *     word    bytes of the word   content
+ *     0       0 to 3              key id
+ *             4 to 7              length of the payload, in words
+ *     1 on    0 to 7              the payload: value 0, value 1 and so on
+ *
+ * So the eight-byte value 1000 of key 4 is
+ *
+ *     04 00 00 00  01 00 00 00    e8 03 00 00 00 00 00 00
+ *
+ * and the next header begins behind it. A record of length 0 is a header alone.
+ *
  * Threads: no state outside the context and the buffer. One context belongs to one thread at a
  * time.
  */

@@ -62,9 +62,14 @@ typedef struct SnapshotRecord {
 } SnapshotRecord;
 
 /*
- * What a controller says about the layout of its snapshots. Behind it follow the header text, ended
- * by a NUL, and at `descriptorTableOffset` from the start of the header the descriptor table: a
- * 32-bit descriptor count, 4 bytes without meaning, and the descriptors.
+ * What a controller says about the layout of its snapshots:
+ *
+ *     offset                         size     content
+ *     0                              36       SnapshotHeader
+ *     36                             any      the header text, ended by a NUL
+ *     descriptorTableOffset          4        descriptor count
+ *     descriptorTableOffset + 4      4        without meaning
+ *     descriptorTableOffset + 8      28 each  SnapshotFieldDescriptor, in print order
  */
 typedef struct SnapshotHeader {
   uint32_t unused1;
@@ -97,7 +102,8 @@ typedef struct SnapshotFieldDescriptor {
  * `*outputSize` is the capacity of `output` in bytes. Returns 1 and sets it to the length of the
  * text without its NUL. Returns 0 and leaves it alone when the text and its NUL do not fit:
  * `output` then holds as much of the text as fits, ended by a NUL (nothing for a capacity of 0). A
- * null pointer gets 0; `snapshot` may be null when `snapshotSize` is 0.
+ * null pointer gets 0; `snapshot` may be null when there is not one whole record. The number of
+ * records is kept to 32 bits: 252 times 2^32 bytes are 1 and no record.
  */
 MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t snapshotSize,
                                                char *output, uint64_t *outputSize);
@@ -109,19 +115,44 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * `output`, in bytes; afterwards it is the length of the text of this call plus 1, for its NUL.
  *
  * Returns 1 when the last record has been dealt with, and 0 when the buffer was full: take the text
- * and call again. A record that did not fit is passed over and not printed later, unless you set
- * `*state` back by one, so that it is tried again with the buffer to itself. A call in which no
- * line was completed yields the empty text. While the banner does not fit, every call returns 0
- * with the empty text and `*state` at 0. A record whose first described field is 0 prints no line.
- * A null pointer or a capacity of 0 gets 0 and nothing is touched.
+ * and call again. The record that did not fit is passed over and not printed later. A call in which
+ * no line was completed yields the empty text, also where it had written the banner. While the
+ * banner does not fit, every call returns 0 with the empty text and `*state` at 0. A record whose
+ * first described field is 0 prints no line.
+ *
+ * To lose no record, come again for the one that did not fit. After a call that completed lines set
+ * `*state` back by one: the record then has the buffer to itself. After a call that completed none,
+ * restore the state that it began with (the banner was dropped with the record, and is due again at
+ * 0) and give more room. Set back by one instead, it would fail at the same record for ever.
+ *
+ *     uint64_t room = 4096;
+ *     char *text = malloc(room);
+ *     uint32_t state = 0;
+ *     while (text != NULL) {
+ *       const uint32_t start = state;
+ *       uint64_t size = room;
+ *       const uint64_t done = KVRParseSnapshotBufferWithInplaceParser(
+ *           snapshot, snapshotSize, text, &size, header, &state);
+ *       fwrite(text, 1, size - 1, stdout);
+ *       if (done) break;
+ *       if (size > 1) {
+ *         --state;
+ *       } else {
+ *         state = start;
+ *         text = realloc(text, room *= 2);
+ *       }
+ *     }
+ *
+ * A null header, output, output size or state and a capacity of 0 get 0, and nothing is touched. A
+ * null snapshot is one without records: 1 and the empty text, unless the banner does not fit.
  *
  * The header is not trusted, but it must be whole: its text, descriptor table and descriptors are
- * read where it says they are. Nothing outside `snapshotSize` bytes is read; a record that does not
- * lie in them whole ends the rendering. A descriptor prints nothing when its field lies outside the
- * record or its format has no NUL, or asks for anything that its kind does not supply: one number,
- * for kind 2 two, by d, i, u, o, x or X with any flags, width and precision; for kind 3 one text by
- * s. When the first described field lies outside the record, or there is none, every record counts
- * as empty.
+ * read where it says they are, the table only when there is a record to print. Nothing outside
+ * `snapshotSize` bytes is read; a record that does not lie in them whole ends the rendering. A
+ * descriptor prints nothing when its field lies outside the record or its format has no NUL, or
+ * asks for anything that its kind does not supply: one number, for kind 2 two, by d, i, u, o, x or
+ * X with any flags, width and precision; for kind 3 one text by s. When the first described field
+ * lies outside the record, or there is none, every record counts as empty.
  */
 MORWICK_EXPORT uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot,
                                                                 uint64_t snapshotSize, char *output,
