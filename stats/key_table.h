@@ -8,6 +8,8 @@
 #include <cstdint>
 #include <string_view>
 
+#include "stats/checksum.h"
+
 namespace morwick {
 
 struct StatsKey {
@@ -28,11 +30,20 @@ constexpr ptrdiff_t ArrayKeyCount(const std::array<StatsKey, kRows> &keys) {
   return std::ranges::count_if(keys, [](const StatsKey &key) { return key.elements > 1; });
 }
 
+// Over ids, names and elements of all rows.
 template <size_t kRows>
-constexpr size_t LongestName(const std::array<StatsKey, kRows> &keys) {
-  size_t longest = 0;
-  for (const StatsKey &key : keys) longest = std::max(longest, key.name.size());
-  return longest;
+constexpr uint32_t TableChecksum(const std::array<StatsKey, kRows> &keys) {
+  uint32_t sum = Checksum("");
+  for (const StatsKey &key : keys) {
+    for (const uint32_t number : {key.id, key.elements}) {
+      for (uint32_t shift = 0; shift < 32; shift += 8) {
+        const char byte[] = {static_cast<char>(number >> shift)};
+        sum = Checksum({byte, 1}, sum);
+      }
+    }
+    sum = Checksum(key.name, sum);
+  }
+  return sum;
 }
 
 // For each id from kFirst to kLast the number of its row, counted from 1; 0 for an id without one.

@@ -107,9 +107,8 @@ constexpr std::array<StatsKey, 95> kKeys = {{
 // clang-format on
 
 static_assert(IdsAscend(kKeys));
-static_assert(kKeys.front().id == 4096 && kKeys.back().id == 8214);
 static_assert(ArrayKeyCount(kKeys) == 17);
-static_assert(LongestName(kKeys) == 50);
+static_assert(ChecksumIs<TableChecksum(kKeys), 4196365885>());
 
 constexpr auto kRowOfId = RowsById<4096, 8214>(kKeys);
 

@@ -4,6 +4,8 @@
 
 #include <string_view>
 
+#include "stats/checksum.h"
+
 namespace morwick {
 
 // clang-format off: one line of the text a line (the C line has no end of its own)
@@ -39,6 +41,7 @@ inline constexpr std::string_view kSnapshotLegend =
 // clang-format on
 
 static_assert(kSnapshotLegend.size() == 1337);
+static_assert(ChecksumIs<Checksum(kSnapshotLegend), 3008276375>());
 
 }  // namespace morwick
 

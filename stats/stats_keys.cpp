@@ -580,9 +580,8 @@ constexpr std::array<StatsKey, 568> kKeys = {{
 // clang-format on
 
 static_assert(IdsAscend(kKeys));
-static_assert(kKeys.front().id == 1 && kKeys.back().id == 659);
 static_assert(ArrayKeyCount(kKeys) == 100);
-static_assert(LongestName(kKeys) == 41);
+static_assert(ChecksumIs<TableChecksum(kKeys), 1567143984>());
 
 constexpr auto kRowOfId = RowsById<1, 659>(kKeys);
 

@@ -12,11 +12,18 @@ namespace {
 void Handle() { TaskSchedulerActivityHandler(nullptr); }
 
 TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
-  PlayCases("activity_handler.txt", [](Script &script) {
-    SelectorGetter &slot = nand_exporters[0].getTaskSchedulerSelectors;
-    if (script.contains("without task scheduler")) slot = nullptr;
+  const NandExporter whole = nand_exporters[0];
+  PlayCases("activity_handler.txt", [&](Script &script) {
+    if (script.contains("without task scheduler")) {
+      nand_exporters[0].getTaskSchedulerSelectors = nullptr;
+    }
+    if (script.contains("other numbers")) {
+      nand_exporters[0].methodSelector = 7;
+      taskSchedulerSelectors = {50, 51};
+    }
     Handle();
-    slot = KVRGetTaskSchedulerSelectors;
+    nand_exporters[0] = whole;
+    taskSchedulerSelectors = {39, 39};
   });
 }
 

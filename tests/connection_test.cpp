@@ -11,17 +11,20 @@
 
 namespace {
 
-// Goes in by one of the four ways, gives back what it obtained and prints the outcome.
-void Use(const std::string &way) {
+// Goes in by one of the four ways, gives back what it obtained and prints the outcome. A record
+// that is opened may hold a connection.
+void Use(const std::string &way, uint32_t held = 0) {
   NandExporter *row = nullptr;
-  KVRConnection record = {77, 78, nullptr};
+  KVRConnection record = {77, held, nullptr};
   bool good = false;
   if (way == "find") {
     if (const uint32_t service = findNandExporter(&row)) good = ReleaseObject(service) == 0;
   } else if (way == "find new") {
     good = findNandExporterNew(&row) == 1;
     EXPECT_EQ(row->service != 0 && row->connection != 0, good);
+    const NandExporter before = *row;
     ReleaseIOInterfaces(row);
+    EXPECT_TRUE(row->service == before.service && row->connection == before.connection);
   } else if (way == "connect") {
     const uint32_t connection = TolkConnect(&row);
     good = connection != 0;
@@ -41,7 +44,8 @@ TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {
   PlayCases("connection.txt", [](Script &script) {
     SelectorGetter &slot = nand_exporters[0].getStatsSelectors;
     if (script.contains("other getter")) slot = KVRGetSnapshotSelectors;
-    Use(script["way"]);
+    NandExporter *row = nullptr;
+    Use(script["way"], script.contains("held") ? TolkConnect(&row) : 0);
     slot = KVRGetStatsSelectors;
   });
 }

@@ -9,6 +9,7 @@
 #include <fstream>
 #include <sstream>
 
+#include "morwick/exporter.h"
 #include "platform/platform.h"
 
 struct MatchingRequest {
@@ -52,6 +53,13 @@ bool Fails(const std::string &name) {
   ++platform.calls;
   return Lists("failing", name + "#" + std::to_string(++platform.callsByName[name])) ||
          Lists("failing", "#" + std::to_string(platform.calls));
+}
+
+// A failure's code is negative unless the script has another.
+int32_t Result(bool fails) {
+  const std::string &code = platform.script["failure"];
+  if (!fails) return 0;
+  return code.empty() ? INT32_MIN : static_cast<int32_t>(std::stol(code));
 }
 
 uint32_t Issue(const std::string &what) {
@@ -129,35 +137,39 @@ int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   const bool fails = Fails("open");
   *connection = fails || Lists("failing", "handle0") ? 0 : Issue("connection");
   Write("open ", service, " type ", type, " = ", *connection);
-  return fails ? 0x2c7 : 0;
+  return Result(fails);
 }
 
 int32_t CloseService(uint32_t connection) {
   Write("close ", connection);
   if (connection == 0) return 1;
   Return(connection, "connection");
-  return Fails("close") ? 1 : 0;
+  return Result(Fails("close"));
 }
 
 int32_t ReleaseObject(uint32_t service) {
   Write("release ", service);
   Return(service, "service");
-  return Fails("release") ? 1 : 0;
+  return Result(Fails("release"));
 }
 
 int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
                          size_t inputSize, void *reply, size_t *replySize) {
   EXPECT_EQ(platform.openHandles[connection], "connection");
   const auto *bytes = static_cast<const unsigned char *>(input);
-  Write("call ", connection, " method ", selector, ": ", inputSize, " bytes, ",
-        bytes[0] + 256 * bytes[1], " ", bytes[4] + 256 * bytes[5], " and ",
-        std::count(bytes + 8, bytes + inputSize, 0), " zeros");
+  uint32_t words[2];
+  std::memcpy(words, bytes, sizeof words);
+  Write("call ", connection, " method ", selector, ": ", inputSize, " bytes, ", words[0], " ",
+        words[1], " and ", std::count(bytes + 8, bytes + inputSize, 0), " zeros");
   const uint32_t cleared = 0;
   EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
   const auto pending = static_cast<uint32_t>(std::stoul(Take("replies", "0")));
   std::memcpy(reply, &pending, sizeof pending);
-  *replySize = sizeof pending;
-  return Fails("call") ? 1 : 0;
+  *replySize = 1;  // not looked at, and not what the next call may begin with
+  // The pair is a writable global: a request takes what stands in it then.
+  const std::string second = std::to_string(taskSchedulerSelectors.second);
+  taskSchedulerSelectors.second = static_cast<uint32_t>(std::stoul(Take("commands", second)));
+  return Result(Fails("call"));
 }
 
 void RegisterActivity(const char *identifier, ActivityCriteria criteria, ActivityHandler) {

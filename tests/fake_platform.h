@@ -8,9 +8,10 @@
 #include <vector>
 
 // Words by key. "present": the driver classes that are registered; "failing": the calls that fail,
-// as "name#n" or, counting all calls, "#n"; "replies" and "defers": what controller and scheduler
-// answer in turn, 0 and no when the words have run out; "state": the activity's, unless it is
-// to run.
+// as "name#n" or, counting all calls, "#n"; "failure": their code, unless it is negative; "replies"
+// and "defers": what controller and scheduler answer in turn, 0 and no when the words have run out;
+// "commands": what each call leaves in the task-scheduler pair; "state": the activity's, unless it
+// is to run.
 using Script = std::map<std::string, std::string>;
 
 // What the body did to a fresh platform with this script: what it printed, if anything, and behind

@@ -1,5 +1,6 @@
-// The heap as tests need it: allocations are counted and can be refused, and buffers end where
-// their allocation ends, so that AddressSanitizer sees one byte too many.
+// The heap as tests need it: allocations are counted and can be refused, a test that leaves a block
+// behind fails, and buffers end where their allocation ends, so that AddressSanitizer sees one byte
+// too many.
 #ifndef TESTS_HEAP_H
 #define TESTS_HEAP_H
 

@@ -59,6 +59,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   EXPECT_EQ(KVRParseBufferToCxt(&contexts.kvr, Stream(kKVR, "8:1 1").data(), 16), 1);
   EXPECT_EQ(AddSingleValueToGenericContext(&contexts.generic, "valid", "Lbas", 1), 1);
   contexts.kvr.exportVersion = 99;
+  contexts.kvr.parseMarker = 5;
   RefuseAllocation(refused);
   const uint64_t result =
       ParseInto(how.ends_with("-context ") ? nullptr : &contexts, kind,
@@ -70,7 +71,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   const uint32_t version = contexts.kvr.exportVersion;
   if (version != 99) seen += ", version " + std::to_string(version);
   if (const std::string message = TakeMessage(); message != "NA") seen += ", " + message;
-  EXPECT_EQ(contexts.kvr.parseMarker, -1);
+  EXPECT_EQ(contexts.kvr.parseMarker, kind == kKVR && !how.ends_with("-context ") ? -1 : 5);
   for (int time = 0; time < 2; ++time) {
     KVRReleaseContext(&contexts.kvr);
     ReleaseGenericParserCxt(&contexts.generic);
@@ -107,7 +108,17 @@ TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
   KVRReleaseContext(nullptr);
   ReleaseGenericParserCxt(nullptr);
   EXPECT_EQ(AddSingleValueToGenericContext(nullptr, "", "a", 1), 0);
+  EXPECT_EQ(AddSingleValueToGenericContext(&context, nullptr, "a", 1), 0);
+  EXPECT_EQ(AddSingleValueToGenericContext(&context, "", nullptr, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", nullptr, 4, 1), 0);
+  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, "abcd", 4, 1), 0);
+  const std::string bytes(65536, 1);
+  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", bytes.data(), 1, 65536), 0);
+  EXPECT_EQ(Entries(context).count, 0U);
+  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", bytes.data(), 1, 65535), 1);
+  EXPECT_TRUE(Entries(context).text.ends_with(" a65534=1 "));
+  EXPECT_EQ(Entries(context).count, 65535U);
+  ReleaseGenericParserCxt(&context);
   RefuseAllocation(1);
   EXPECT_EQ(AddSingleValueToGenericContext(&context, "", "a", 1), 0);
   RefuseAllocation(0);

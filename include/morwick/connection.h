@@ -21,8 +21,8 @@ extern "C" {
 #endif
 
 /*
- * What openKVRConnection fills. The record is the caller's, who fills it with zeros before its first
- * use; its handles are closeKVRConnection's.
+ * What openKVRConnection fills. The record is the caller's, who fills it with zeros before its
+ * first use; its handles are closeKVRConnection's.
  */
 typedef struct KVRConnection {
   uint32_t service;
@@ -52,9 +52,9 @@ MORWICK_EXPORT void ReleaseIOInterfaces(NandExporter *row);
 
 /*
  * Finds as findNandExporter does and opens a connection. Returns the connection handle, to be given
- * back with TolkDisconnect, or 0 after a message on standard error: "No class found", without a line
- * end, when there is no driver, and a line with the result code when the driver refuses. A driver
- * that says success without giving a handle gets 0 in silence. `*row` is always set.
+ * back with TolkDisconnect, or 0 after a message on standard error: "No class found", without a
+ * line end, when there is no driver, and a line with the result code when the driver refuses. A
+ * driver that says success without giving a handle gets 0 in silence. `*row` is always set.
  */
 MORWICK_EXPORT uint32_t TolkConnect(NandExporter **row);
 

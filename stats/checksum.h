@@ -1,0 +1,26 @@
+// Checksums of what is published letter for letter: an edit that was not meant does not compile.
+#ifndef STATS_CHECKSUM_H
+#define STATS_CHECKSUM_H
+
+#include <cstdint>
+#include <string_view>
+
+namespace morwick {
+
+// FNV-1a, 32 bits. Give the checksum so far to go on with it.
+constexpr uint32_t Checksum(std::string_view text, uint32_t sum = 0x811c9dc5) {
+  for (const char c : text) sum = (sum ^ static_cast<uint8_t>(c)) * 0x01000193;
+  return sum;
+}
+
+// The compiler shows both numbers when they differ.
+template <uint32_t kComputed, uint32_t kWritten>
+consteval bool ChecksumIs() {
+  static_assert(kComputed == kWritten,
+                "published text was edited; if that was meant, write kComputed for kWritten");
+  return true;
+}
+
+}  // namespace morwick
+
+#endif
