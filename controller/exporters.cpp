@@ -6,7 +6,7 @@
 #include "morwick/ftl_stats.h"
 #include "morwick/kvr_stats.h"
 #include "morwick/msp_stats.h"
-#include "platform/platform.h"
+#include "morwick/platform.h"
 
 SelectorPair statsSelector = {13, 13};
 SelectorPair mspStatsSelector = {221, 221};

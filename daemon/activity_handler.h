@@ -2,7 +2,7 @@
 #ifndef DAEMON_ACTIVITY_HANDLER_H
 #define DAEMON_ACTIVITY_HANDLER_H
 
-#include "platform/platform.h"
+#include "morwick/platform.h"
 
 extern "C" {
 

@@ -6,7 +6,7 @@
 
 #include <iostream>
 
-#include "platform/platform.h"
+#include "morwick/platform.h"
 #include "tests/fake_platform.h"
 
 namespace {

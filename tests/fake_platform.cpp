@@ -10,7 +10,7 @@
 #include <sstream>
 
 #include "morwick/exporter.h"
-#include "platform/platform.h"
+#include "morwick/platform.h"
 
 struct MatchingRequest {
   std::string className;

@@ -32,7 +32,7 @@ typedef struct KVRConnection {
 
 /*
  * Finds the first row whose driver is registered, sets `*row` to it and says so on standard output.
- * Returns the service handle, which the caller releases with the platform's ReleaseObject.
+ * Returns the service handle, which the caller gives back with ReleaseObject (platform.h).
  * Returns 0 in silence when no driver is registered; `*row` is then the terminating row.
  */
 MORWICK_EXPORT uint32_t findNandExporter(NandExporter **row);

@@ -10,6 +10,7 @@
 #include "morwick/kvr_stats.h"
 #include "morwick/msp_stats.h"
 #include "morwick/parser_context.h"
+#include "morwick/platform.h"
 #include "morwick/snapshot.h"
 
 #endif

@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/platform.h"
+#include "morwick/platform.h"
 #include "platform/simulated/scenario.h"
 
 struct MatchingRequest {

@@ -12,7 +12,7 @@
 #include <string>
 #include <thread>
 
-#include "platform/platform.h"
+#include "morwick/platform.h"
 #include "platform/simulated/scenario.h"
 
 struct Activity {

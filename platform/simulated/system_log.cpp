@@ -11,7 +11,7 @@
 #include <cstring>
 #include <string>
 
-#include "platform/platform.h"
+#include "morwick/platform.h"
 #include "platform/simulated/scenario.h"
 
 namespace simulated {
