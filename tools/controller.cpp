@@ -89,7 +89,8 @@ Controller::Controller(const std::string &className, const std::string &what) {
   NandExporter *row = FindRow(className);
   const uint32_t service = row == nullptr ? findNandExporter(&row) : FindService(*row);
   if (service == 0) {
-    Complain(className.empty() ? what : className + ": " + what, "no such controller is present");
+    Complain(className.empty() ? what : className + ": " + what,
+             className.empty() ? "no controller is present" : "it is not present");
     return;
   }
   row_ = row;

@@ -104,9 +104,9 @@ std::string DisplayName(const std::string &file) { return file == "-" ? "standar
 
 Input::Input(const std::string &file)
     : name_(DisplayName(file)),
-      descriptor_(file == "-" ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC)),
-      nextProgress_(isatty(STDERR_FILENO) != 0 ? MillisecondsNow() + 1000 : INT64_MAX) {
+      descriptor_(file == "-" ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC)) {
   if (descriptor_ < 0) error_ = errno;
+  if (isatty(STDERR_FILENO) != 0) nextProgress_ = MillisecondsNow() + 1000;
   struct stat status = {};
   if (fstat(descriptor_, &status) == 0 && S_ISREG(status.st_mode)) {
     size_ = static_cast<uint64_t>(status.st_size);

@@ -69,7 +69,7 @@ class Input {
   uint64_t size_ = 0;
   uint64_t read_ = 0;
   bool progressShown_ = false;
-  int64_t nextProgress_;
+  int64_t nextProgress_ = INT64_MAX;  // on no terminal, never
 };
 
 // Reads the whole of an input. Without a value it has complained: it cannot be read or is larger

@@ -155,6 +155,11 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     return count;
   };
   SnapshotRecords records(read, recordSize);
+  if (!records.Load()) return kBadUsage;
+  if (records.empty()) {
+    Complain(snapshot.name, "there is nothing in it");
+    return kBadData;
+  }
   Status status = kGood;
   bool good = true;
   if (options.summary) {
@@ -176,10 +181,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     good = PrintFixedText(output, records);
   }
   if (!good) return kBadUsage;
-  if (records.empty()) {
-    Complain(snapshot.name, "there is nothing in it");
-    status = kBadData;
-  } else if (records.rest() > 0 && !(text && snapshot.header)) {
+  if (records.rest() > 0 && !(text && snapshot.header)) {
     Complain(snapshot.name,
              "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
     status = kBadData;

@@ -17,7 +17,7 @@ SnapshotRecords::SnapshotRecords(ReadBytes read, size_t recordSize)
       recordSize_(recordSize),
       buffer_(recordSize + std::max(kBlockSize, recordSize), '\0') {}
 
-std::optional<std::string_view> SnapshotRecords::Next() {
+bool SnapshotRecords::Load() {
   // What is no whole record yet goes to the front.
   char *front = buffer_.data() + recordSize_;
   filled_ -= used_;
@@ -25,13 +25,18 @@ std::optional<std::string_view> SnapshotRecords::Next() {
   used_ = 0;
   while (filled_ < recordSize_) {
     const auto count = read_(front + filled_, buffer_.size() - recordSize_ - filled_);
-    if (!count) return std::nullopt;
-    if (*count == 0) return std::string_view();
+    if (!count) return false;
+    if (*count == 0) break;
     filled_ += *count;
     total_ += *count;
   }
+  return true;
+}
+
+std::optional<std::string_view> SnapshotRecords::Next() {
+  if (!Load()) return std::nullopt;
   used_ = filled_ / recordSize_ * recordSize_;
-  return std::string_view(front, used_);
+  return std::string_view(buffer_).substr(recordSize_, used_);
 }
 
 }  // namespace tools

@@ -17,6 +17,9 @@ class SnapshotRecords {
 
   SnapshotRecords(ReadBytes read, size_t recordSize);
 
+  // Reads until there is a whole record, or the end. False when reading has failed.
+  bool Load();
+
   // The next block of whole records, empty at the end. In front of it lies room of one record,
   // which may be read. Without a value, reading has failed.
   std::optional<std::string_view> Next();
