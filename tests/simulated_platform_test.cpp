@@ -27,6 +27,7 @@ int64_t wallClock = 0;  // in milliseconds since 1970; 0 for the real one
 }  // namespace
 
 // Takes the place of the platform's, for the wall clock.
+// NOLINTNEXTLINE(readability-inconsistent-declaration-parameter-name): the C library's are reserved
 extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
   if (clock != CLOCK_REALTIME || wallClock == 0) {
     return static_cast<int>(syscall(SYS_clock_gettime, clock, time));
@@ -88,8 +89,7 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
   const uint32_t connection = Connect();
   const std::string none;
   const struct {
-    uint32_t method, command, argument;
-    size_t size, room;
+    uint32_t method, command, argument, size, room;
     int32_t result;
     std::string reply;
     uint32_t beyond = 0;  // in the bytes that are to be 0, from the front or from behind
@@ -153,8 +153,7 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
 }
 
 TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
-  const std::string scenario = std::getenv("GRELLON_SCENARIO");
-  const std::string examples = scenario.substr(0, scenario.rfind('/')) + "/../../examples/";
+  setenv("GRELLON_SCENARIO", SOURCE "/packaging/scenarios/statistics.toml", 1);
   const uint32_t connection = Connect("VeltoQRN3NVMeController");
   const struct {
     uint32_t command;
@@ -166,7 +165,7 @@ TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
                {145, "snapshot_header.bin"}};
   for (const auto &[command, file] : cases) {
     std::ostringstream dump;
-    dump << std::ifstream(examples + file).rdbuf();
+    dump << std::ifstream(std::string(SOURCE "/examples/") + file).rdbuf();
     EXPECT_EQ(Read(connection, 9, command), dump.str()) << file;
   }
   CloseService(connection);
@@ -178,9 +177,12 @@ std::vector<uint64_t> Values(const ContextNode *node) {
   return values;
 }
 
+struct Statistics {
+  std::vector<uint64_t> ftl, msp;
+};
+
 // What the controller makes of its statistics, through all three parsers.
-void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
-                     std::vector<uint64_t> *mspValues) {
+Statistics CheckStatistics(uint32_t connection) {
   const std::string statistics = Read(connection, 9, 13);
   const std::string mspStatistics = Read(connection, 9, 221);
   const auto size = static_cast<uint32_t>(statistics.size());
@@ -192,11 +194,10 @@ void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
   const uint64_t mspCount =
       KVRMSPParseBufferToCxt(&msp, mspStatistics.data(), mspStatistics.size());
   EXPECT_EQ(GlobalAPIErrorMessage, nullptr) << GlobalAPIErrorMessage;
-  *ftlValues = Values(ftl.valuesHead);
-  *mspValues = Values(msp.valuesHead);
-  EXPECT_EQ(ftlValues->size(), ftlCount);
-  EXPECT_EQ(mspValues->size(), mspCount);
-  EXPECT_EQ(Values(kvr.valuesHead), *ftlValues);
+  Statistics values = {.ftl = Values(ftl.valuesHead), .msp = Values(msp.valuesHead)};
+  EXPECT_EQ(values.ftl.size(), ftlCount);
+  EXPECT_EQ(values.msp.size(), mspCount);
+  EXPECT_EQ(Values(kvr.valuesHead), values.ftl);
   const uint64_t summary[] = {kvr.exportVersion,
                               kvr.numVirtualBlocks,
                               kvr.blocksPerVirtualBlock,
@@ -219,6 +220,7 @@ void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
   KVRReleaseContext(&kvr);
   ReleaseGenericParserCxt(&ftl);
   ReleaseGenericParserCxt(&msp);
+  return values;
 }
 
 // What the controller makes of its snapshot: sensible numbers, and by its header the same lines as
@@ -266,29 +268,32 @@ void CheckSnapshot(uint32_t connection, uint32_t lastSecond) {
 TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
   setenv("GRELLON_SCENARIO", "", 1);  // as if it were unset
   const uint32_t connection = Connect("VeltoQRN3NVMeController");
-  const int64_t powerOn = 1704067200000;
-  std::vector<uint64_t> ftl, msp, ftlBefore, mspBefore;
-  int64_t ageBefore = 0;
-  for (const int64_t time : {int64_t{1}, powerOn + 120'000, powerOn + 120'100, powerOn + 3'599'999,
-                             powerOn + 3'600'000, int64_t{8'000'000'000'000}}) {
-    wallClock = time;
-    const int64_t age = std::max<int64_t>(time - powerOn, 120'000);
-    CheckStatistics(connection, &ftl, &msp);
+  const uint64_t powerOn = 1704067200000;
+  const auto notLess = [](const std::vector<uint64_t> &values,
+                          const std::vector<uint64_t> &before) {
+    return std::equal(values.begin(), values.end(), before.begin(), std::greater_equal());
+  };
+  Statistics before;
+  uint64_t ageBefore = 0;
+  for (const uint64_t time :
+       {uint64_t{1}, powerOn + 120'000, powerOn + 120'100, powerOn + 3'599'999, powerOn + 3'600'000,
+        uint64_t{8'000'000'000'000}}) {
+    wallClock = static_cast<int64_t>(time);
+    const uint64_t age = std::max(time, powerOn + 120'000) - powerOn;
+    Statistics now = CheckStatistics(connection);
     CheckSnapshot(connection, static_cast<uint32_t>(age / 1000));
-    EXPECT_EQ(ftl[9], static_cast<uint64_t>((powerOn + age) / 1000)) << "the calendar time";
-    EXPECT_EQ(ftl[10], static_cast<uint64_t>(age / 3'600'000)) << "the hours";
-    EXPECT_EQ(msp[0], std::min<uint64_t>(900'000 + age / 90, 4294967295));
+    EXPECT_EQ(now.ftl.at(9), (powerOn + age) / 1000) << "the calendar time";
+    EXPECT_EQ(now.ftl.at(10), age / 3'600'000) << "the hours";
+    EXPECT_EQ(now.msp.at(0), std::min<uint64_t>(900'000 + age / 90, 4294967295));
     if (ageBefore != 0) {
-      EXPECT_EQ(ftl != ftlBefore, age > ageBefore);
-      EXPECT_EQ(msp != mspBefore, age > ageBefore);
-      EXPECT_TRUE(std::equal(ftl.begin(), ftl.end(), ftlBefore.begin(), std::greater_equal()));
-      EXPECT_TRUE(std::equal(msp.begin(), msp.end(), mspBefore.begin(), std::greater_equal()));
+      EXPECT_EQ(now.ftl != before.ftl, age > ageBefore);
+      EXPECT_EQ(now.msp != before.msp, age > ageBefore);
+      EXPECT_TRUE(notLess(now.ftl, before.ftl) && notLess(now.msp, before.msp));
     }
-    ftlBefore = ftl;
-    mspBefore = msp;
+    before = std::move(now);
     ageBefore = age;
   }
-  for (const uint32_t command : {13, 221, 22, 145}) {
+  for (const uint32_t command : {13U, 221U, 22U, 145U}) {
     const uint32_t request[6] = {command};
     std::string reply(101, '#');
     size_t size = 99;
@@ -296,7 +301,7 @@ TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
     EXPECT_EQ(size, 99U);
     EXPECT_EQ(reply, Read(connection, 9, command).substr(0, 99) + "##");
   }
-  for (const uint32_t command : {11, 15, 17}) {
+  for (const uint32_t command : {11U, 15U, 17U}) {
     const uint32_t request[6] = {command};
     size_t size = 99;
     EXPECT_EQ(CallStructMethod(connection, 9, request, sizeof request, nullptr, &size),
