@@ -38,6 +38,12 @@ extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
 
 namespace {
 
+constexpr int32_t kBadHandle = 0x101;
+constexpr int32_t kBadArgument = 0x102;
+constexpr int32_t kRefused = 0x103;
+constexpr int32_t kDeviceError = 0x104;
+constexpr int32_t kNotOffered = 0x105;
+
 // A file in memory, by its name in the one folder where all of them are.
 std::string File(const std::string &text) {
   const int file = memfd_create("file", 0);
@@ -55,8 +61,8 @@ uint32_t Find(const char *className = "KVRStorage") {
 
 uint32_t Connect(const char *className = "KVRStorage") {
   const uint32_t service = Find(className);
-  uint32_t connection = 0;
-  EXPECT_NE(OpenService(service, 1, &connection), 0);
+  uint32_t connection = 1;
+  EXPECT_EQ(OpenService(service, 1, &connection), kBadArgument);
   EXPECT_EQ(connection, 0U);
   EXPECT_EQ(OpenService(service, 0, &connection), 0);
   EXPECT_EQ(ReleaseObject(service), 0);
@@ -72,12 +78,11 @@ std::string Read(uint32_t connection, uint32_t method, uint32_t command) {
   return reply;
 }
 
-constexpr int32_t kBadArgument = 0x102;
-constexpr int32_t kDeviceError = 0x104;
-constexpr int32_t kNotOffered = 0x105;
-
 // Each line sends one request; what has gone before it counts. A room of 99 is more than there is.
 TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
+  int fifo[2] = {};
+  ASSERT_EQ(pipe(fifo), 0);
+  ASSERT_EQ(write(fifo[1], "0123456789rest", 14), 14);
   Play(
       "[[controller]]\nclass = 'KVRStorage'\nvanish = [2]\npending = 3\nfail_request = [3]\n"
       "fail_read = [5]\nshort_read = [8, 19]\nmsp = '" +
@@ -85,7 +90,7 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
       "', '" + File("third") + "']\nsnapshot = '" + File("") +
       "'\nsnapshot_header = '/'\n"
       "defects = [\"/no\\n\\u007f\", '" +
-      File("never") + "']\ntelemetry = '/dev/zero'\n");
+      File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
   const uint32_t connection = Connect();
   const std::string none;
   const struct {
@@ -126,7 +131,7 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
       {8, 11, 0, 24, 99, kNotOffered, none},
       {8, 15, 0, 24, 99, kDeviceError, none},
       {8, 15, 0, 24, 99, kDeviceError, none},
-      {8, 17, 0, 24, 10, 0, std::string(10, '\0')},
+      {8, 17, 0, 24, 10, 0, "0123456789"},
       {8, 13, 0, 24, 99, 0, "th"},
       {8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
   };
@@ -148,6 +153,8 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
             "platform_tests: '/': Is a directory\n"
             "platform_tests: '/no\\x0a\\x7f': No such file or directory\n"
             "platform_tests: '/no\\x0a\\x7f': No such file or directory\n");
+  std::string rest(99, '\0');
+  EXPECT_EQ(read(fifo[0], rest.data(), rest.size()), 4) << "what there was no room for";
   EXPECT_EQ(CloseService(connection), 0);
   EXPECT_EQ(Find(), 0U) << "the second look-up finds it gone";
 }
@@ -217,6 +224,8 @@ Statistics CheckStatistics(uint32_t connection) {
                               kvr.maxHighEnduranceBlockErases,
                               kvr.readCountHisto[4]};
   EXPECT_EQ(std::count(std::begin(summary), std::end(summary), 0), 0);
+  EXPECT_TRUE(
+      std::is_sorted(std::begin(kvr.readCountHisto), std::end(kvr.readCountHisto), std::greater()));
   KVRReleaseContext(&kvr);
   ReleaseGenericParserCxt(&ftl);
   ReleaseGenericParserCxt(&msp);
@@ -312,24 +321,31 @@ TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
 }
 
 TEST(SimulatedPlatformTest, RefusesAndReportsBadHandles) {
-  Play("[[controller]]\nclass = 'KVRStorage'\n");
+  Play("[[controller]]\nclass = 'KVRStorage'\nrefuse_open = [2]\nfail_close = [2]\n");
+  EXPECT_EQ(ServiceMatching(nullptr), nullptr);
+  EXPECT_EQ(GetMatchingService(nullptr), 0U);
   const uint32_t service = Find();
   uint32_t connection = 0;
-  OpenService(service, 0, &connection);
-  ASSERT_NE(connection, 0U);
+  uint32_t second = 1;
+  size_t size = 99;
+  EXPECT_EQ(OpenService(service, 0, &connection), 0);
+  EXPECT_EQ(OpenService(service, 0, &second), kRefused);
+  EXPECT_EQ(second, 0U);
+  EXPECT_EQ(OpenService(service, 0, &second), 0);
   testing::internal::CaptureStderr();
-  EXPECT_NE(CloseService(service), 0);
-  EXPECT_NE(ReleaseObject(connection + 1), 0);
+  EXPECT_EQ(CloseService(service), kBadHandle);
+  EXPECT_EQ(ReleaseObject(second + 1), kBadHandle);
   EXPECT_EQ(CloseService(connection), 0);
-  EXPECT_NE(CloseService(connection), 0);
+  EXPECT_EQ(CloseService(second), kDeviceError);
+  EXPECT_EQ(CloseService(second), kBadHandle);
+  EXPECT_EQ(CallStructMethod(connection, 8, nullptr, 0, nullptr, &size), kBadHandle);
   EXPECT_EQ(ReleaseObject(service), 0);
-  EXPECT_NE(OpenService(service, 0, &connection), 0);
-  EXPECT_NE(CloseService(0), 0);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            "connection " + std::to_string(service) + " is of another kind\n" + "service " +
-                std::to_string(service + 2) + " is unknown\n" + "connection " +
-                std::to_string(service + 1) + " is already released\n" + "service " +
-                std::to_string(service) + " is already released\n");
+  EXPECT_EQ(OpenService(service, 0, &connection), kBadHandle);
+  EXPECT_EQ(CloseService(0), kBadHandle);
+  EXPECT_EQ(
+      testing::internal::GetCapturedStderr(),
+      "connection 1 is of another kind\nservice 4 is unknown\nconnection 3 is already released\n"
+      "connection 2 is already released\nservice 1 is already released\n");
 }
 
 TEST(SimulatedPlatformTest, ReportsHandlesLeftOpenAtExit) {
