@@ -66,6 +66,8 @@ static int PrintController(void) {
 }
 
 int main(void) {
+  printf("morwick %d.%d.%d %s\n", MORWICK_VERSION_MAJOR, MORWICK_VERSION_MINOR,
+         MORWICK_VERSION_PATCH, MORWICK_VERSION_TEXT);
   for (const NandExporter *row = nand_exporters; row->className != NULL; ++row) PrintRow(row);
   return PrintController();
 }

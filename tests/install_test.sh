@@ -60,10 +60,11 @@ done
 prefix=$work/moved
 mv "$work/installed" "$prefix"
 expect "$("$prefix/bin/morwick" capacity 30000)" "32"
-GRELLON_SCENARIO="$source/packaging/scenarios/empty.toml" "$prefix/sbin/grellon" 2>&1 |
+GRELLON_SCENARIO=$prefix/share/morwick/packaging/scenarios/empty.toml "$prefix/sbin/grellon" 2>&1 |
   grep -q "stopping grellon daemon"
-(cd "$prefix" && ls share/man/man8/grellon.8 share/man/man1/morwick.1 share/man/man3/libmorwick.3 \
-  share/bash-completion/completions/morwick) >/dev/null
+(cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
+  bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md \
+  morwick/examples/latency.gp) >/dev/null
 build_and_consume "$prefix" given
 
 cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \
