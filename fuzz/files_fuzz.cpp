@@ -13,11 +13,18 @@ namespace {
 void CheckScenario(std::string_view text) {
   simulated::Scenario scenario;
   std::string error;
-  const bool good = simulated::ParseScenario(text, "file", &scenario, &error);
-  assert(good ? error.empty() : error.starts_with("file:"));
+  const bool good = simulated::ParseScenario(text, "folder/file", &scenario, &error);
+  assert(good ? error.empty() : error.starts_with("folder/file:"));
   if (!good) return;
   for (const simulated::Controller &controller : scenario.controllers) {
-    assert(simulated::TaskSchedulerMethod(controller.className) != 0);
+    assert(simulated::RequestMethod(controller.className) != 0);
+    assert(controller.files.size() == simulated::kBuffers.size());
+    for (const auto &[command, files] : controller.files) {
+      for (const std::string &file : files) {
+        assert(file.starts_with('/') || (file.starts_with("folder/") && file.size() > 7));
+        assert(file.find('\0') == std::string::npos);
+      }
+    }
   }
 }
 

@@ -1,50 +1,313 @@
-// The simulated drivers, with the scenario of cases/vanishes.toml: handles are checked, and only
-// the right request does work. The simulated scheduler, each time in a process of its own.
+// The simulated drivers: handles are checked, only the right requests are answered, and what a
+// controller makes up is good for every parser. The simulated scheduler. Each test in a process of
+// its own, with a scenario of its own.
 
 #include <gtest/gtest.h>
 #include <sys/mman.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
-#include <cstring>
+#include <ctime>
+#include <fstream>
+#include <functional>
+#include <set>
+#include <sstream>
 #include <string>
+#include <vector>
 
-#include "morwick/platform.h"
+#include "morwick/morwick.h"
 
 namespace {
 
-uint32_t Find() { return GetMatchingService(ServiceMatching("KVRStorage")); }
+int64_t wallClock = 0;  // in milliseconds since 1970; 0 for the real one
 
-TEST(SimulatedPlatformTest, DoesOneUnitForTheRightRequestOnly) {
-  const uint32_t service = Find();
+}  // namespace
+
+// Takes the place of the platform's, for the wall clock.
+extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
+  if (clock != CLOCK_REALTIME || wallClock == 0) {
+    return static_cast<int>(syscall(SYS_clock_gettime, clock, time));
+  }
+  *time = {.tv_sec = wallClock / 1000, .tv_nsec = wallClock % 1000 * 1'000'000};
+  return 0;
+}
+
+namespace {
+
+// A file in memory, by its name in the one folder where all of them are.
+std::string File(const std::string &text) {
+  const int file = memfd_create("file", 0);
+  EXPECT_EQ(write(file, text.data(), text.size()), static_cast<ssize_t>(text.size()));
+  return std::to_string(file);
+}
+
+void Play(const std::string &scenario) {
+  setenv("GRELLON_SCENARIO", ("/proc/self/fd/" + File(scenario)).c_str(), 1);
+}
+
+uint32_t Find(const char *className = "KVRStorage") {
+  return GetMatchingService(ServiceMatching(className));
+}
+
+uint32_t Connect(const char *className = "KVRStorage") {
+  const uint32_t service = Find(className);
   uint32_t connection = 0;
   EXPECT_NE(OpenService(service, 1, &connection), 0);
-  ASSERT_EQ(OpenService(service, 0, &connection), 0);
-  ReleaseObject(service);
+  EXPECT_EQ(connection, 0U);
+  EXPECT_EQ(OpenService(service, 0, &connection), 0);
+  EXPECT_EQ(ReleaseObject(service), 0);
+  return connection;
+}
+
+std::string Read(uint32_t connection, uint32_t method, uint32_t command) {
+  const uint32_t request[6] = {command};
+  std::string reply(1 << 20, '\0');
+  size_t size = reply.size();
+  EXPECT_EQ(CallStructMethod(connection, method, request, sizeof request, reply.data(), &size), 0);
+  reply.resize(size);
+  return reply;
+}
+
+constexpr int32_t kBadArgument = 0x102;
+constexpr int32_t kDeviceError = 0x104;
+constexpr int32_t kNotOffered = 0x105;
+
+// Each line sends one request; what has gone before it counts. A room of 99 is more than there is.
+TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
+  Play(
+      "[[controller]]\nclass = 'KVRStorage'\nvanish = [2]\npending = 3\nfail_request = [3]\n"
+      "fail_read = [5]\nshort_read = [8, 19]\nmsp = '" +
+      File("msp") + "'\nstatistics = ['" + File("first") + "', '/proc/self/fd/" + File("2nd") +
+      "', '" + File("third") + "']\nsnapshot = '" + File("") +
+      "'\nsnapshot_header = '/'\n"
+      "defects = [\"/no\\n\\u007f\", '" +
+      File("never") + "']\ntelemetry = '/dev/zero'\n");
+  const uint32_t connection = Connect();
+  const std::string none;
   const struct {
     uint32_t method, command, argument;
     size_t size, room;
-    bool good;
-    uint32_t left;
-  } cases[] = {{9, 39, 1025, 24, 4, false, 0}, {8, 38, 1025, 24, 4, false, 0},
-               {8, 39, 1024, 24, 4, false, 0}, {8, 39, 1025, 23, 4, false, 0},
-               {8, 39, 1025, 24, 3, false, 0}, {8, 39, 1025, 24, 4, true, 2},
-               {8, 39, 1025, 24, 8, true, 1},  {8, 39, 1025, 24, 4, true, 0},
-               {8, 39, 1025, 24, 4, true, 0}};
-  for (const auto &[method, command, argument, size, room, good, left] : cases) {
-    const uint32_t request[6] = {command, argument};
-    uint32_t reply = 0;
+    int32_t result;
+    std::string reply;
+    uint32_t beyond = 0;  // in the bytes that are to be 0, from the front or from behind
+  } cases[] = {
+      {9, 39, 1025, 24, 99, kBadArgument, none},
+      {8, 38, 1025, 24, 99, kBadArgument, none},
+      {8, 39, 1025, 23, 99, kBadArgument, none},
+      {8, 39, 1025, 25, 99, kBadArgument, none},
+      {8, 39, 1025, 24, 99, kBadArgument, none, 1},
+      {8, 39, 1025, 24, 99, kBadArgument, none, 1U << 31},
+      {8, 39, 1024, 24, 99, kBadArgument, none},
+      {8, 39, 1025, 24, 3, kBadArgument, none},
+      {8, 39, 1025, 24, 99, kDeviceError, none},
+      {8, 39, 1025, 24, 4, 0, {"\2\0\0\0", 4}},
+      {8, 39, 1025, 24, 99, 0, {"\1\0\0\0", 4}},
+      {9, 13, 0, 24, 99, kBadArgument, none},
+      {8, 13, 0, 23, 99, kBadArgument, none},
+      {8, 13, 0, 24, 99, kBadArgument, none, 1},
+      {8, 13, 0, 24, 4, 0, "firs"},
+      {8, 221, 0, 24, 99, 0, "msp"},
+      {8, 13, 0, 24, 5, 0, "first"},
+      {8, 13, 0, 24, 0, 0, none},
+      {8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
+      {8, 13, 0, 24, 99, kDeviceError, none},
+      {8, 13, 1, 24, 99, kBadArgument, none},
+      {8, 13, 0, 24, 6, 0, "first"},
+      {8, 13, 0, 24, 3, 0, "2"},  // half of what fills the room does not fill it
+      {8, 13, 0, 24, 5, 0, "third"},
+      {8, 13, 0, 24, 99, 0, "third"},
+      {8, 13, 0, 24, 99, 0, "third"},
+      {8, 221, 0, 24, 99, 0, "msp"},
+      {8, 22, 0, 24, 99, 0, none},
+      {8, 145, 0, 24, 99, kDeviceError, none},
+      {8, 11, 0, 24, 99, kNotOffered, none},
+      {8, 15, 0, 24, 99, kDeviceError, none},
+      {8, 15, 0, 24, 99, kDeviceError, none},
+      {8, 17, 0, 24, 10, 0, std::string(10, '\0')},
+      {8, 13, 0, 24, 99, 0, "th"},
+      {8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
+  };
+  testing::internal::CaptureStderr();
+  int line = 0;
+  for (const auto &[method, command, argument, size, room, result, reply, beyond] : cases) {
+    const uint32_t request[6] = {command, argument, beyond & 1, 0, 0, beyond & ~1U};
+    std::string buffer(room + 1, '#');
     size_t replySize = room;
-    EXPECT_EQ(CallStructMethod(connection, method, request, size, &reply, &replySize) == 0, good);
-    EXPECT_EQ(reply, left);
-    EXPECT_EQ(replySize, good ? 4U : 0U);
+    EXPECT_EQ(CallStructMethod(connection, method, request, size, buffer.data(), &replySize),
+              result)
+        << "line " << ++line;
+    EXPECT_EQ(buffer.substr(0, replySize), reply) << "line " << line;
+    EXPECT_EQ(buffer.find_first_not_of({"#\0", 2}, replySize), std::string::npos)
+        << "line " << line;
+    EXPECT_EQ(buffer.back(), '#') << "line " << line;
   }
+  EXPECT_EQ(testing::internal::GetCapturedStderr(),
+            "platform_tests: '/': Is a directory\n"
+            "platform_tests: '/no\\x0a\\x7f': No such file or directory\n"
+            "platform_tests: '/no\\x0a\\x7f': No such file or directory\n");
   EXPECT_EQ(CloseService(connection), 0);
   EXPECT_EQ(Find(), 0U) << "the second look-up finds it gone";
 }
 
+TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
+  const std::string scenario = std::getenv("GRELLON_SCENARIO");
+  const std::string examples = scenario.substr(0, scenario.rfind('/')) + "/../../examples/";
+  const uint32_t connection = Connect("VeltoQRN3NVMeController");
+  const struct {
+    uint32_t command;
+    const char *file;
+  } cases[] = {{13, "kvr.bin"},
+               {13, "ftl.bin"},
+               {221, "msp.bin"},
+               {22, "snapshot.bin"},
+               {145, "snapshot_header.bin"}};
+  for (const auto &[command, file] : cases) {
+    std::ostringstream dump;
+    dump << std::ifstream(examples + file).rdbuf();
+    EXPECT_EQ(Read(connection, 9, command), dump.str()) << file;
+  }
+  CloseService(connection);
+}
+
+std::vector<uint64_t> Values(const ContextNode *node) {
+  std::vector<uint64_t> values;
+  for (; node != nullptr; node = node->next) values.push_back(node->value);
+  return values;
+}
+
+// What the controller makes of its statistics, through all three parsers.
+void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
+                     std::vector<uint64_t> *mspValues) {
+  const std::string statistics = Read(connection, 9, 13);
+  const std::string mspStatistics = Read(connection, 9, 221);
+  const auto size = static_cast<uint32_t>(statistics.size());
+  KVRStatsCxt kvr = {};
+  GenericParserCxt ftl = {};
+  GenericParserCxt msp = {};
+  EXPECT_EQ(KVRParseBufferToCxt(&kvr, statistics.data(), size), 1);
+  const uint32_t ftlCount = KVRFTLParseBufferToCxt(&ftl, statistics.data(), size);
+  const uint64_t mspCount =
+      KVRMSPParseBufferToCxt(&msp, mspStatistics.data(), mspStatistics.size());
+  EXPECT_EQ(GlobalAPIErrorMessage, nullptr) << GlobalAPIErrorMessage;
+  *ftlValues = Values(ftl.valuesHead);
+  *mspValues = Values(msp.valuesHead);
+  EXPECT_EQ(ftlValues->size(), ftlCount);
+  EXPECT_EQ(mspValues->size(), mspCount);
+  EXPECT_EQ(Values(kvr.valuesHead), *ftlValues);
+  const uint64_t summary[] = {kvr.exportVersion,
+                              kvr.numVirtualBlocks,
+                              kvr.blocksPerVirtualBlock,
+                              kvr.pagesPerVirtualBlock,
+                              kvr.bytesPerPage,
+                              kvr.hostReads,
+                              kvr.hostWrites,
+                              kvr.numFreeVirtualBlocks,
+                              kvr.wearLevMoves,
+                              kvr.nandReads,
+                              kvr.nandWrites,
+                              kvr.bandErases,
+                              kvr.IND_pool_free,
+                              kvr.IND_pool_count,
+                              kvr.utilFormatTime,
+                              kvr.numSleepOps,
+                              kvr.maxHighEnduranceBlockErases,
+                              kvr.readCountHisto[4]};
+  EXPECT_EQ(std::count(std::begin(summary), std::end(summary), 0), 0);
+  KVRReleaseContext(&kvr);
+  ReleaseGenericParserCxt(&ftl);
+  ReleaseGenericParserCxt(&msp);
+}
+
+// What the controller makes of its snapshot: sensible numbers, and by its header the same lines as
+// in the fixed layout.
+void CheckSnapshot(uint32_t connection, uint32_t lastSecond) {
+  const std::string snapshot = Read(connection, 9, 22);
+  const std::string header = Read(connection, 9, 145);
+  std::string fixed(1 << 20, '\0');
+  std::string described(1 << 20, '\0');
+  uint64_t size = fixed.size();
+  EXPECT_EQ(KVRParseSnapshotBuffer(snapshot.data(), snapshot.size(), fixed.data(), &size), 1U);
+  fixed.resize(size);
+  size = described.size();
+  uint32_t state = 0;
+  EXPECT_EQ(KVRParseSnapshotBufferWithInplaceParser(snapshot.data(), snapshot.size(),
+                                                    described.data(), &size, header.data(), &state),
+            1U);
+  described.resize(size - 1);
+  const std::string banner = "- KVR Snapshot - \nSimulated controller\n";
+  EXPECT_EQ(described.substr(0, banner.size()), banner);
+  EXPECT_EQ(fixed.substr(1337), described.substr(banner.size()) + "\n");
+
+  std::vector<SnapshotRecord> records(120);
+  ASSERT_EQ(snapshot.size(), records.size() * sizeof records[0]);
+  snapshot.copy(reinterpret_cast<char *>(records.data()), snapshot.size());
+  uint32_t second = lastSecond - 120;
+  std::set<uint32_t> operations;
+  for (const SnapshotRecord &record : records) {
+    EXPECT_EQ(record.timestamp, ++second);
+    EXPECT_GE(record.nandReads, record.hostReads);
+    EXPECT_GE(record.nandWrites, record.hostWrites);
+    for (const auto &priorities : {record.reads, record.writes}) {
+      for (const SnapshotOperations *each = priorities; each < priorities + 4; ++each) {
+        EXPECT_GE(each->totalLatency, each->maxLatency);
+        EXPECT_GT(each->maxLatency, 0U);
+        operations.insert(each->count);
+      }
+    }
+  }
+  EXPECT_GT(operations.size(), 100U);
+}
+
+// At each time in turn: before the first power-on, two minutes after it, 100 ms apart, about a full
+// hour, and when counters of 32 bits have come to their end.
+TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
+  setenv("GRELLON_SCENARIO", "", 1);  // as if it were unset
+  const uint32_t connection = Connect("VeltoQRN3NVMeController");
+  const int64_t powerOn = 1704067200000;
+  std::vector<uint64_t> ftl, msp, ftlBefore, mspBefore;
+  int64_t ageBefore = 0;
+  for (const int64_t time : {int64_t{1}, powerOn + 120'000, powerOn + 120'100, powerOn + 3'599'999,
+                             powerOn + 3'600'000, int64_t{8'000'000'000'000}}) {
+    wallClock = time;
+    const int64_t age = std::max<int64_t>(time - powerOn, 120'000);
+    CheckStatistics(connection, &ftl, &msp);
+    CheckSnapshot(connection, static_cast<uint32_t>(age / 1000));
+    EXPECT_EQ(ftl[9], static_cast<uint64_t>((powerOn + age) / 1000)) << "the calendar time";
+    EXPECT_EQ(ftl[10], static_cast<uint64_t>(age / 3'600'000)) << "the hours";
+    EXPECT_EQ(msp[0], std::min<uint64_t>(900'000 + age / 90, 4294967295));
+    if (ageBefore != 0) {
+      EXPECT_EQ(ftl != ftlBefore, age > ageBefore);
+      EXPECT_EQ(msp != mspBefore, age > ageBefore);
+      EXPECT_TRUE(std::equal(ftl.begin(), ftl.end(), ftlBefore.begin(), std::greater_equal()));
+      EXPECT_TRUE(std::equal(msp.begin(), msp.end(), mspBefore.begin(), std::greater_equal()));
+    }
+    ftlBefore = ftl;
+    mspBefore = msp;
+    ageBefore = age;
+  }
+  for (const uint32_t command : {13, 221, 22, 145}) {
+    const uint32_t request[6] = {command};
+    std::string reply(101, '#');
+    size_t size = 99;
+    EXPECT_EQ(CallStructMethod(connection, 9, request, sizeof request, reply.data(), &size), 0);
+    EXPECT_EQ(size, 99U);
+    EXPECT_EQ(reply, Read(connection, 9, command).substr(0, 99) + "##");
+  }
+  for (const uint32_t command : {11, 15, 17}) {
+    const uint32_t request[6] = {command};
+    size_t size = 99;
+    EXPECT_EQ(CallStructMethod(connection, 9, request, sizeof request, nullptr, &size),
+              kNotOffered);
+    EXPECT_EQ(size, 0U);
+  }
+  CloseService(connection);
+}
+
 TEST(SimulatedPlatformTest, RefusesAndReportsBadHandles) {
+  Play("[[controller]]\nclass = 'KVRStorage'\n");
   const uint32_t service = Find();
   uint32_t connection = 0;
   OpenService(service, 0, &connection);
@@ -65,6 +328,7 @@ TEST(SimulatedPlatformTest, RefusesAndReportsBadHandles) {
 }
 
 TEST(SimulatedPlatformTest, ReportsHandlesLeftOpenAtExit) {
+  Play("[[controller]]\nclass = 'KVRStorage'\n");
   GTEST_FLAG_SET(death_test_style, "threadsafe");
   EXPECT_EXIT(std::exit(Find() == 1 ? 0 : 1), testing::ExitedWithCode(0),
               "service 1 of KVRStorage is still open");
@@ -90,11 +354,29 @@ void Journal(Activity *activity) {
   if (std::getenv("FORGETFUL") == nullptr) ExitTransactionClean();
 }
 
+// A scenario that cannot be read leaves a tool without controllers, and the daemon does not start.
+TEST(SimulatedPlatformDeathTest, EndsForABadScenarioOnlyWhereItMay) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  setenv("GRELLON_SCENARIO", "/no/such", 1);
+  const auto find = [] { return Find() + Find("VeltoQRN3NVMeController"); };
+  const struct {
+    void (*call)();
+    int status;
+  } cases[] = {{[] {}, 0},
+               {[] { SystemLog("%s", "never"); }, 2},
+               {[] { RegisterActivity("never", kActivityCheckIn, Journal); }, 2},
+               {[] { RunMainQueue(); }, 2}};
+  for (const auto &[call, status] : cases) {
+    EXPECT_EXIT((call(), std::exit(static_cast<int>(find()))), testing::ExitedWithCode(status),
+                "^platform_tests: /no/such: No such file or directory\n$");
+    if (status == 0) continue;
+    EXPECT_EXIT((find(), call()), testing::ExitedWithCode(status),
+                "^platform_tests: /no/such: No such file or directory\n$");
+  }
+}
+
 [[noreturn]] void PlaySchedule(const std::string &schedule) {
-  const int file = memfd_create("scenario", 0);
-  const std::string text = "[schedule]\n" + schedule;
-  EXPECT_EQ(write(file, text.data(), text.size()), static_cast<ssize_t>(text.size()));
-  setenv("GRELLON_SCENARIO", ("/proc/self/fd/" + std::to_string(file)).c_str(), 1);
+  Play("[schedule]\n" + schedule);
   RegisterActivity("test", kActivityCheckIn, Journal);
   RunMainQueue();
 }

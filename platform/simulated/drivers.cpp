@@ -2,14 +2,18 @@
 
 #include <endian.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 #include <map>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "morwick/platform.h"
+#include "platform/simulated/files.h"
+#include "platform/simulated/own_buffers.h"
 #include "platform/simulated/scenario.h"
 
 struct MatchingRequest {
@@ -25,20 +29,25 @@ enum Result : int32_t {
   kBadArgument = 0x102,
   kRefused = 0x103,
   kDeviceError = 0x104,
+  kNotOffered = 0x105,
 };
 
-constexpr uint32_t kTaskSchedulerCommand = 39;
+constexpr size_t kRequestSize = 24;  // command, argument, zeros
+constexpr size_t kRequestZeros = 8;
 constexpr uint32_t kTaskSchedulerArgument = 1025;
-constexpr size_t kTaskSchedulerRequestSize = 24;
+constexpr uint32_t kReadArgument = 0;
 
-// A controller at work: what is left to do, and how often it was called, which faults count by.
+// A controller at work: what is left to do, which files its next reads hand out, and how often it
+// was called, which faults count by.
 struct Device {
   const Controller *controller;
   uint32_t pending;
   uint32_t lookups = 0;
   uint32_t opens = 0;
   uint32_t requests = 0;
+  uint32_t reads = 0;
   uint32_t closes = 0;
+  std::map<uint32_t, size_t> nextFiles = {};  // by command
 };
 
 enum class HandleKind { kService, kConnection };
@@ -67,7 +76,9 @@ class Drivers {
   }
 
   Drivers() {
-    for (const Controller &controller : TheScenario().controllers) {
+    const Scenario *scenario = TheScenario();
+    if (scenario == nullptr) return;  // no controllers: a tool finds nothing
+    for (const Controller &controller : scenario->controllers) {
       devices_.push_back({.controller = &controller, .pending = controller.pending});
     }
   }
@@ -117,7 +128,6 @@ class Drivers {
     return kSuccess;
   }
 
-  // A good request does one unit of work and answers with what is left.
   int32_t Call(uint32_t connection, uint32_t method, const void *input, size_t inputSize,
                void *reply, size_t *replySize) {
     const std::lock_guard lock(mutex_);
@@ -125,12 +135,28 @@ class Drivers {
     if (device == nullptr) return kBadHandle;
     const size_t room = *replySize;
     *replySize = 0;
-    if (device->controller->failRequest.Hits(++device->requests)) return kDeviceError;
-    if (method != TaskSchedulerMethod(device->controller->className) ||
-        inputSize != kTaskSchedulerRequestSize || LoadWord(input, 0) != kTaskSchedulerCommand ||
-        LoadWord(input, 4) != kTaskSchedulerArgument || room < sizeof(uint32_t)) {
+    if (method != RequestMethod(device->controller->className) || inputSize != kRequestSize) {
       return kBadArgument;
     }
+    const auto *request = static_cast<const char *>(input);
+    if (std::any_of(request + kRequestZeros, request + kRequestSize, [](char c) { return c != 0; }))
+      return kBadArgument;
+    const uint32_t command = LoadWord(request, 0);
+    const uint32_t argument = LoadWord(request, 4);
+    if (command == kTaskScheduler) return DoUnit(device, argument, reply, room, replySize);
+    if (std::any_of(kBuffers.begin(), kBuffers.end(),
+                    [&](const Buffer &buffer) { return buffer.command == command; })) {
+      return Read(device, command, argument, reply, room, replySize);
+    }
+    return kBadArgument;
+  }
+
+ private:
+  // Does one unit of work and answers with what is left.
+  static int32_t DoUnit(Device *device, uint32_t argument, void *reply, size_t room,
+                        size_t *replySize) {
+    if (device->controller->failRequest.Hits(++device->requests)) return kDeviceError;
+    if (argument != kTaskSchedulerArgument || room < sizeof(uint32_t)) return kBadArgument;
     if (device->pending > 0) --device->pending;
     const uint32_t word = htole32(device->pending);
     std::memcpy(reply, &word, sizeof word);
@@ -138,7 +164,35 @@ class Drivers {
     return kSuccess;
   }
 
- private:
+  // Answers with a buffer, cut to the room: the next file in turn, or what the controller makes.
+  static int32_t Read(Device *device, uint32_t command, uint32_t argument, void *reply, size_t room,
+                      size_t *replySize) {
+    const Controller &controller = *device->controller;
+    const uint32_t read = ++device->reads;
+    if (controller.failRead.Hits(read)) return kDeviceError;
+    if (argument != kReadArgument) return kBadArgument;
+    const std::vector<std::string> &files = controller.files.at(command);
+    size_t &next = device->nextFiles[command];
+    size_t size = 0;
+    if (files.empty()) {
+      const std::optional<size_t> made = MakeOwnBuffer(command, reply, room);
+      if (!made) return kNotOffered;
+      size = *made;
+    } else if (const int error = ReadFile(files[next].c_str(), reply, room, &size); error != 0) {
+      Complain(Quoted(files[next]) + ": " + std::strerror(error));
+      return kDeviceError;
+    }
+    if (controller.shortRead.Hits(read)) {
+      // Who looks beyond a short reply is not to find the rest of it there.
+      std::fill_n(static_cast<char *>(reply) + size / 2, size - size / 2, '\0');
+      size /= 2;
+    }
+    // A reply that fills the room may have been cut, and the same is asked for again with more.
+    if (size < room && next + 1 < files.size()) ++next;
+    *replySize = size;
+    return kSuccess;
+  }
+
   // Numbers are never used twice, so that a late use of a handle cannot hit another one.
   uint32_t Issue(HandleKind kind, Device *device) {
     open_[++lastHandle_] = {kind, device};

@@ -2,17 +2,16 @@
 
 #include "platform/simulated/scenario.h"
 
-#include <errno.h>
-
 #include <toml++/toml.h>
 #include <algorithm>
 #include <cmath>
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <limits>
-#include <memory>
+#include <optional>
 #include <set>
+
+#include "platform/simulated/files.h"
 
 namespace simulated {
 namespace {
@@ -29,8 +28,6 @@ pending = 2
 
 constexpr double kLongestSeconds = 1e6;
 constexpr size_t kLargestFile = 1 << 20;
-
-std::string Quoted(std::string_view text) { return std::string(1, '\'').append(text).append("'"); }
 
 // The first error found, with the place it was found at.
 class Report {
@@ -112,7 +109,26 @@ class TableReader {
     *target = std::chrono::milliseconds(std::llround(seconds * 1000));
   }
 
+  // A file or some, whose names are put behind `folder`.
+  void Read(std::string_view key, std::vector<std::string> *target, std::string_view folder) {
+    const toml::node *node = Find(key);
+    if (node == nullptr) return;
+    const toml::array *array = node->as_array();
+    if (array == nullptr) return ReadFileName(*node, key, folder, target);
+    if (array->empty()) Reject(*node, key, kNotFiles);
+    for (const toml::node &element : *array) ReadFileName(element, key, folder, target);
+  }
+
  private:
+  static constexpr const char *kNotFiles = "must be a file or a list of files";
+
+  void ReadFileName(const toml::node &node, std::string_view key, std::string_view folder,
+                    std::vector<std::string> *target) {
+    const std::string name = node.value_exact<std::string>().value_or("");
+    if (name.empty() || name.find('\0') != std::string::npos) return Reject(node, key, kNotFiles);
+    target->push_back(name[0] == '/' ? name : std::string(folder) + name);
+  }
+
   void Reject(const toml::node &node, std::string_view key, const std::string &reason) {
     report_.Add(node.source(), Quoted(key) + " " + reason);
   }
@@ -131,7 +147,8 @@ class TableReader {
   std::set<std::string_view> known_;
 };
 
-void ReadController(const toml::table &table, Report &report, Controller *controller) {
+void ReadController(const toml::table &table, std::string_view folder, Report &report,
+                    Controller *controller) {
   TableReader reader(table, report);
   if (const toml::node *name = reader.Find("class"); name == nullptr) {
     report.Add(table.source(), "'class' is missing");
@@ -139,7 +156,7 @@ void ReadController(const toml::table &table, Report &report, Controller *contro
     report.Add(name->source(), "'class' must be text");
   } else {
     controller->className = name->value_or(std::string());
-    if (TaskSchedulerMethod(controller->className) == 0) {
+    if (RequestMethod(controller->className) == 0) {
       report.Add(name->source(), "unknown controller class " + Quoted(controller->className));
     }
   }
@@ -147,15 +164,21 @@ void ReadController(const toml::table &table, Report &report, Controller *contro
   reader.Read("vanish", &controller->vanish);
   reader.Read("refuse_open", &controller->refuseOpen);
   reader.Read("fail_request", &controller->failRequest);
+  reader.Read("fail_read", &controller->failRead);
+  reader.Read("short_read", &controller->shortRead);
   reader.Read("fail_close", &controller->failClose);
+  for (const auto &[key, command] : kBuffers) {
+    reader.Read(key, &controller->files[command], folder);
+  }
 }
 
-void ReadControllers(const toml::node &node, Report &report, std::vector<Controller> *controllers) {
+void ReadControllers(const toml::node &node, std::string_view folder, Report &report,
+                     std::vector<Controller> *controllers) {
   const toml::array *array = node.as_array();
   if (array == nullptr) return report.Add(node.source(), "'controller' must be [[controller]]");
   for (const toml::node &element : *array) {
     if (!element.is_table()) return report.Add(element.source(), "a controller must be a table");
-    ReadController(*element.as_table(), report, &controllers->emplace_back());
+    ReadController(*element.as_table(), folder, report, &controllers->emplace_back());
     const std::string &className = controllers->back().className;
     if (std::count_if(controllers->begin(), controllers->end(),
                       [&](const Controller &other) { return other.className == className; }) > 1) {
@@ -173,7 +196,8 @@ void ReadSchedule(const toml::table &table, Report &report, Schedule *schedule) 
   reader.Read("defer_at_check", &schedule->deferAtCheck, 0);
 }
 
-void ReadScenario(const toml::table &table, Report &report, Scenario *scenario) {
+void ReadScenario(const toml::table &table, std::string_view folder, Report &report,
+                  Scenario *scenario) {
   TableReader reader(table, report);
   const auto subtable = [&](std::string_view key, auto read) {
     const toml::node *node = reader.Find(key);
@@ -190,33 +214,30 @@ void ReadScenario(const toml::table &table, Report &report, Scenario *scenario) 
     ReadSchedule(schedule, report, &scenario->schedule);
   });
   if (const toml::node *controllers = reader.Find("controller")) {
-    ReadControllers(*controllers, report, &scenario->controllers);
+    ReadControllers(*controllers, folder, report, &scenario->controllers);
   }
 }
 
-[[noreturn]] void Refuse(const std::string &reason) {
-  std::fprintf(stderr, "%s: %s\n", program_invocation_short_name, reason.c_str());
-  std::exit(2);
-}
-
-std::string ReadFile(const char *path) {
-  const std::unique_ptr<FILE, int (*)(FILE *)> file(std::fopen(path, "rb"), std::fclose);
-  if (file == nullptr) Refuse(std::string(path) + ": " + std::strerror(errno));
-  std::string text(kLargestFile + 1, '\0');
-  text.resize(std::fread(text.data(), 1, text.size(), file.get()));
-  // A directory opens but cannot be read.
-  if (std::ferror(file.get()) != 0) Refuse(std::string(path) + ": " + std::strerror(errno));
-  if (text.size() > kLargestFile) Refuse(std::string(path) + ": larger than a mebibyte");
-  return text;
-}
-
-Scenario LoadScenario() {
+std::optional<Scenario> LoadScenario() {
   const char *file = std::getenv("GRELLON_SCENARIO");
-  const std::string text = file == nullptr ? std::string(kBuiltInScenario) : ReadFile(file);
-  Scenario scenario;
+  std::string text(kBuiltInScenario);
   std::string error;
-  if (!ParseScenario(text, file == nullptr ? "built-in" : file, &scenario, &error)) Refuse(error);
-  return scenario;
+  if (file == nullptr || *file == '\0') {
+    file = "built-in";
+  } else {
+    text.resize(kLargestFile + 1);
+    size_t size = 0;
+    if (const int number = ReadFile(file, text.data(), text.size(), &size); number != 0) {
+      error = std::string(file) + ": " + std::strerror(number);
+    } else if (size > kLargestFile) {
+      error = std::string(file) + ": larger than a mebibyte";
+    }
+    text.resize(size);
+  }
+  Scenario scenario;
+  if (error.empty() && ParseScenario(text, file, &scenario, &error)) return scenario;
+  Complain(error);
+  return std::nullopt;
 }
 
 }  // namespace
@@ -225,7 +246,7 @@ bool Fault::Hits(uint32_t call) const {
   return always || std::find(calls.begin(), calls.end(), call) != calls.end();
 }
 
-uint32_t TaskSchedulerMethod(std::string_view className) {
+uint32_t RequestMethod(std::string_view className) {
   if (className == "VeltoQRN3NVMeController") return 9;
   if (className == "VeltoEmbeddedNVMeController") return 9;
   if (className == "KVRStorage") return 8;
@@ -246,7 +267,8 @@ bool ParseScenario(std::string_view text, const std::string &file, Scenario *sce
   }
   const toml::parse_result result = toml::parse(text);
   if (result) {
-    ReadScenario(result.table(), report, scenario);
+    const std::string folder = file.substr(0, file.rfind('/') + 1);
+    ReadScenario(result.table(), folder, report, scenario);
   } else {
     report.Add(result.error().source(), std::string(result.error().description()));
   }
@@ -254,9 +276,15 @@ bool ParseScenario(std::string_view text, const std::string &file, Scenario *sce
   return error->empty();
 }
 
-const Scenario &TheScenario() {
-  static const Scenario scenario = LoadScenario();
-  return scenario;
+const Scenario *TheScenario() {
+  static const std::optional<Scenario> scenario = LoadScenario();
+  return scenario ? &*scenario : nullptr;
+}
+
+const Scenario &RequireScenario() {
+  const Scenario *scenario = TheScenario();
+  if (scenario == nullptr) std::exit(2);
+  return *scenario;
 }
 
 }  // namespace simulated

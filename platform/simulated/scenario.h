@@ -2,13 +2,42 @@
 #ifndef PLATFORM_SIMULATED_SCENARIO_H
 #define PLATFORM_SIMULATED_SCENARIO_H
 
+#include <array>
 #include <chrono>
 #include <cstdint>
+#include <map>
 #include <string>
 #include <string_view>
 #include <vector>
 
 namespace simulated {
+
+// What a request asks for: its first number.
+enum Command : uint32_t {
+  kReadBand = 11,
+  kReadStatistics = 13,
+  kReadDefects = 15,
+  kReadTelemetry = 17,
+  kReadSnapshot = 22,
+  kTaskScheduler = 39,
+  kReadSnapshotHeader = 145,
+  kReadMsp = 221,
+};
+
+// The buffers that are read from a controller, and the scenario's keys for them.
+struct Buffer {
+  std::string_view key;
+  Command command;
+};
+inline constexpr std::array<Buffer, 7> kBuffers = {{
+    {"statistics", kReadStatistics},
+    {"msp", kReadMsp},
+    {"snapshot", kReadSnapshot},
+    {"snapshot_header", kReadSnapshotHeader},
+    {"band", kReadBand},
+    {"defects", kReadDefects},
+    {"telemetry", kReadTelemetry},
+}};
 
 // Which calls of one kind go wrong: all of them, or those with the listed numbers, counted from 1.
 struct Fault {
@@ -24,7 +53,11 @@ struct Controller {
   Fault vanish;          // look-ups that find nothing
   Fault refuseOpen;
   Fault failRequest;
+  Fault failRead;
+  Fault shortRead;
   Fault failClose;
+  std::map<uint32_t, std::vector<std::string>>
+      files;  // by command: what its reads hand out in turn
 };
 
 struct Schedule {
@@ -42,16 +75,20 @@ struct Scenario {
   bool logEnabled = true;
 };
 
-// The driver method that takes task-scheduler requests for the class, or 0 for an unknown class.
-uint32_t TaskSchedulerMethod(std::string_view className);
+// The driver method that takes the requests for a controller of the class; 0 for an unknown class.
+uint32_t RequestMethod(std::string_view className);
 
-// Parses the text of a scenario file. On failure returns false with "FILE:LINE: reason" in `error`.
+// Parses the text of a scenario file; the files it names are relative to that file. On failure
+// returns false with "FILE:LINE: reason" in `error`. Opens nothing.
 bool ParseScenario(std::string_view text, const std::string &file, Scenario *scenario,
                    std::string *error);
 
 // The scenario of this process, loaded at the first call: the file that GRELLON_SCENARIO names, or
-// the built-in one. A bad file is one line on standard error and ends the process with status 2.
-const Scenario &TheScenario();
+// the built-in one. Null for a bad file, about which there is one line on standard error.
+const Scenario *TheScenario();
+
+// The same where there is no going on without one: a bad file ends the process with status 2.
+const Scenario &RequireScenario();
 
 }  // namespace simulated
 

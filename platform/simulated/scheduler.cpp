@@ -96,7 +96,7 @@ class Scheduler {
     if (activity_.handler == nullptr) return;
     Enter(kActivityStateCheckIn);
     activity_.handler(&activity_);
-    const Schedule &schedule = TheScenario().schedule;
+    const Schedule &schedule = RequireScenario().schedule;
     auto delay = schedule.firstRunAfter;
     size_t run = 0;
     for (uint32_t left = schedule.runs; left > 0 && WaitFor(delay); ++run) {
@@ -152,6 +152,7 @@ class Scheduler {
 using simulated::Scheduler;
 
 void RegisterActivity(const char *identifier, ActivityCriteria criteria, ActivityHandler handler) {
+  simulated::RequireScenario();
   if (criteria == kActivityCheckIn) Scheduler::Instance().Register(identifier, handler);
 }
 
@@ -166,6 +167,7 @@ bool SetActivityState(Activity *activity, int state) {
 void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
 
 void RunMainQueue() {
+  simulated::RequireScenario();
   // Lines that the library prints belong between the lines of the log, not behind them all.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
   Scheduler::Instance().Run();

@@ -29,7 +29,7 @@ struct Log {
   Log() : foreground(!StandardErrorIsTheJournal()) {
     std::signal(SIGPIPE, SIG_IGN);  // nobody reading is no reason to leave a connection open
     openlog("grellon", LOG_PID, LOG_DAEMON);
-    if (!TheScenario().logEnabled) setlogmask(LOG_UPTO(LOG_WARNING));
+    if (!RequireScenario().logEnabled) setlogmask(LOG_UPTO(LOG_WARNING));
   }
   bool foreground;
 };
