@@ -55,14 +55,13 @@ static int PrintController(void) {
   const int32_t failure = CallStructMethod(controller.connection, row->methodSelector, request,
                                            sizeof request, buffer, &size);
   KVRStatsCxt statistics = {0};
-  const int parsed =
-      failure == 0 && row->parseBufferToCxt(&statistics, buffer, (uint32_t)size) == 1;
-  printf("%s: %zu bytes, version %" PRIu32 ", host reads %" PRIu64 ", host writes %" PRIu64 "\n",
-         row->className, size, statistics.exportVersion, statistics.hostReads,
-         statistics.hostWrites);
+  const int parsed = failure == 0 ? row->parseBufferToCxt(&statistics, buffer, (uint32_t)size) : 0;
+  printf("%s: result %d, version %" PRIu32 ", host reads %" PRIu64 ", band erases %" PRIu64 "\n",
+         row->className, parsed, statistics.exportVersion, statistics.hostReads,
+         statistics.bandErases);
   row->releaseContext(&statistics);
   closeKVRConnection(&controller);
-  return parsed ? 0 : 1;
+  return parsed == 1 ? 0 : 1;
 }
 
 int main(void) {
