@@ -34,7 +34,7 @@ consume() {
 
 # Programs against the tree $1, which is called $2.
 build_and_consume() {
-  local language standard tree=$1 name=$2
+  local language compile tree=$1 name=$2
   cat >"$work/CMakeLists.txt" <<'END_OF_PROJECT'
 cmake_minimum_required(VERSION 3.25)
 project(consumer LANGUAGES ${language})
@@ -61,10 +61,12 @@ END_OF_PROJECT
 cmake --install "$build" --prefix "$work/installed" >/dev/null
 DESTDIR=$work/root cmake --install "$build" --prefix /usr >/dev/null
 for root in "" "$work/root"; do
-  unit=${root:-$work/installed}
-  unit=$(find "$unit" -name grellon.service)
-  [ -x "$root$(sed -n 's/^ExecStart=//p' "$unit")" ] || { echo "$unit starts nothing"; exit 1; }
+  unit=$(find "${root:-$work/installed}" -name grellon.service)
+  program=$root$(sed -n 's/^ExecStart=//p' "$unit")
+  scenario=$root$(sed -n 's/^Environment=GRELLON_SCENARIO=//p' "$unit")
+  if ! [ -x "$program" ] || ! [ -f "$scenario" ]; then echo "$unit starts nothing"; exit 1; fi
 done
+[ -f "$work/root/etc/grellon/scenario.toml" ]
 
 prefix=$work/moved
 scenarios=$prefix/share/morwick/packaging/scenarios
@@ -72,6 +74,7 @@ mv "$work/installed" "$prefix"
 expect "$("$prefix/bin/morwick" capacity 30000)" "32"
 if [ "$platform" = simulated ]; then
   GRELLON_SCENARIO=$scenarios/empty.toml "$prefix/sbin/grellon" 2>&1 | grep -q "stopping grellon"
+  GRELLON_SCENARIO=$scenario "$prefix/bin/morwick" find >/dev/null 2>&1
 fi
 (cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
   bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md \
