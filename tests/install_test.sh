@@ -1,47 +1,88 @@
 #!/usr/bin/env bash
-# Installs into an empty prefix, then builds and runs a program in C against what is there, through
-# pkg-config and through CMake.
-# Usage: install_test.sh BUILD_FOLDER SOURCE_FOLDER [COMPILER_FLAG...]
+# Installs as the README says, moves the tree, and builds a program against it by pkg-config and by
+# CMake, in C alone and in C++; then the same with the static library.
+# Usage: install_test.sh BUILD_FOLDER SOURCE_FOLDER PLATFORM [COMPILER_FLAG...]
 set -euo pipefail
 
-build=$1 source=$2
-flags=${*:3}
+build=$1 source=$2 platform=$3
+flags=${*:4}
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-prefix=$work/prefix
-
-cmake --install "$build" --prefix "$prefix" >/dev/null
 
 expect() {
   [ "$1" = "$2" ] || { printf 'expected "%s"\nbut got  "%s"\n' "$2" "$1"; exit 1; }
 }
 
-rows="VeltoQRN3NVMeController: 13/13 221/221 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7 passWithTmodeHard=6
-VeltoEmbeddedNVMeController: 13/13 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7
-KVRStorage: 13/13 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7"
+rows="VeltoQRN3NVMeController: -1 9 9 Controller Characteristics: 13/13 221/221 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7 passWithTmodeHard=6
+VeltoEmbeddedNVMeController: -1 9 9 Controller Characteristics: 13/13 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7
+KVRStorage: 5 8 8 PropertyMatch: 13/13 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7"
+reading="Morwick: findNandExporter: Controller found: VeltoQRN3NVMeController
+Morwick: findNandExporter: Controller found: VeltoQRN3NVMeController
+VeltoQRN3NVMeController: result 1, version 7, host reads 918273645, band erases 40961"
 
-PKG_CONFIG_PATH=$(dirname "$(find "$prefix" -name morwick.pc)")
-export PKG_CONFIG_PATH
-# shellcheck disable=SC2046,SC2086  # lists of flags
-cc -std=c11 $flags "$source/tests/consumer.c" -o "$work/with_pkg_config" \
-  $(pkg-config --define-prefix --cflags --libs morwick)
-libraries=$(pkg-config --define-prefix --variable=libdir morwick)
-expect "$(LD_LIBRARY_PATH=$libraries "$work/with_pkg_config")" "$rows"
+# On another platform the controllers are those that the machine has.
+consume() {
+  local version
+  version=$(pkg-config --modversion morwick)
+  if [ "$platform" = simulated ]; then
+    expect "$(GRELLON_SCENARIO=$scenarios/statistics.toml "$1" 2>&1; echo "status $?")" \
+      "morwick $version $version"$'\n'"$rows"$'\n'"$reading"$'\n'"status 0"
+  else
+    expect "$("$1" 2>/dev/null | head -n 4)" "morwick $version $version"$'\n'"$rows"
+  fi
+}
 
-cat >"$work/CMakeLists.txt" <<END
+# Programs against the tree $1, which is called $2.
+build_and_consume() {
+  local language compile tree=$1 name=$2
+  cat >"$work/CMakeLists.txt" <<'END_OF_PROJECT'
 cmake_minimum_required(VERSION 3.25)
-project(consumer LANGUAGES C)
+project(consumer LANGUAGES ${language})
 find_package(morwick 1 REQUIRED)
-add_executable(with_cmake $source/tests/consumer.c)
-target_link_libraries(with_cmake PRIVATE morwick::morwick)
-END
-cmake -G Ninja -S "$work" -B "$work/build" -DCMAKE_PREFIX_PATH="$prefix" -DCMAKE_C_FLAGS="$flags" >/dev/null
-cmake --build "$work/build" >/dev/null
-expect "$("$work/build/with_cmake")" "$rows"
+add_executable(consumer ${source}/tests/consumer.c)
+set_source_files_properties(${source}/tests/consumer.c PROPERTIES LANGUAGE ${language})
+target_link_libraries(consumer PRIVATE morwick::morwick)
+END_OF_PROJECT
+  PKG_CONFIG_PATH=$(dirname "$(find "$tree" -name morwick.pc)")
+  export PKG_CONFIG_PATH
+  for language in C CXX; do
+    [ $language = C ] && compile="cc -std=c11" || compile="c++ -std=c++20 -x c++"
+    # shellcheck disable=SC2046,SC2086  # lists of flags
+    $compile $flags "$source/tests/consumer.c" -x none -o "$work/consumer" \
+      $(pkg-config --cflags --libs morwick)
+    LD_LIBRARY_PATH=$(pkg-config --variable=libdir morwick) consume "$work/consumer"
+    cmake -G Ninja -S "$work" -B "$work/$name-$language" -Dlanguage=$language -Dsource="$source" \
+      -DCMAKE_PREFIX_PATH="$tree" -DCMAKE_${language}_FLAGS="$flags" >/dev/null
+    cmake --build "$work/$name-$language" >/dev/null
+    consume "$work/$name-$language/consumer"
+  done
+}
 
+cmake --install "$build" --prefix "$work/installed" >/dev/null
+DESTDIR=$work/root cmake --install "$build" --prefix /usr >/dev/null
+for root in "" "$work/root"; do
+  unit=$(find "${root:-$work/installed}" -name grellon.service)
+  program=$root$(sed -n 's/^ExecStart=//p' "$unit")
+  scenario=$root$(sed -n 's/^Environment=GRELLON_SCENARIO=//p' "$unit")
+  if ! [ -x "$program" ] || ! [ -f "$scenario" ]; then echo "$unit starts nothing"; exit 1; fi
+done
+[ -f "$work/root/etc/grellon/scenario.toml" ]
+
+prefix=$work/moved
+scenarios=$prefix/share/morwick/packaging/scenarios
+mv "$work/installed" "$prefix"
 expect "$("$prefix/bin/morwick" capacity 30000)" "32"
-GRELLON_SCENARIO="$source/packaging/scenarios/empty.toml" "$prefix/sbin/grellon" 2>&1 |
-  grep -q "stopping grellon daemon"
-(cd "$prefix" && ls share/man/man8/grellon.8 share/man/man1/morwick.1 share/man/man3/libmorwick.3 \
-  share/bash-completion/completions/morwick lib/systemd/system/grellon.service)
-grep -q "^ExecStart=.*/sbin/grellon" "$prefix/lib/systemd/system/grellon.service"
+if [ "$platform" = simulated ]; then
+  GRELLON_SCENARIO=$scenarios/empty.toml "$prefix/sbin/grellon" 2>&1 | grep -q "stopping grellon"
+  GRELLON_SCENARIO=$scenario "$prefix/bin/morwick" find >/dev/null 2>&1
+fi
+(cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
+  bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md \
+  morwick/examples/latency.gp) >/dev/null
+build_and_consume "$prefix" given
+
+cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \
+  -DCMAKE_C_FLAGS="$flags" -DCMAKE_CXX_FLAGS="$flags" >/dev/null
+cmake --build "$work/static" --target morwick >/dev/null
+cmake --install "$work/static" --prefix "$work/archives" --component libmorwick-dev >/dev/null
+build_and_consume "$work/archives" static

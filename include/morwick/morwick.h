@@ -13,4 +13,13 @@
 #include "morwick/platform.h"
 #include "morwick/snapshot.h"
 
+/*
+ * The version of the library that these headers belong to. One of the same major number runs what
+ * was built with an earlier one.
+ */
+#define MORWICK_VERSION_MAJOR 1
+#define MORWICK_VERSION_MINOR 0
+#define MORWICK_VERSION_PATCH 0
+#define MORWICK_VERSION_TEXT "1.0.0"
+
 #endif
