@@ -59,8 +59,8 @@ void PlainStats(Context *context, const Stream &stream, const char *separator) {
     uint32_t header[2];
     std::memcpy(header, position, sizeof header);
     position += 8;
-    const morwick::StatsKey *key = morwick::FindStatsKey(header[0]);
-    PlainAddAll<uint64_t>(context, key->name.data(), separator, position, key->elements);
+    const morwick::KeyRow *key = morwick::FindStatsKey(header[0]);
+    PlainAddAll<uint64_t>(context, key->name.data(), separator, position, key->elementCount);
     position += size_t{header[1]} * 8;
   }
 }
@@ -72,8 +72,8 @@ void PlainMSP(GenericParserCxt *context, const Stream &stream) {
     uint16_t header[2];
     std::memcpy(header, position, sizeof header);
     position += 4;
-    const morwick::StatsKey *key = morwick::FindMSPKey(header[0]);
-    PlainAddAll<uint32_t>(context, key->name.data(), "", position, key->elements);
+    const morwick::KeyRow *key = morwick::FindMSPKey(header[0]);
+    PlainAddAll<uint32_t>(context, key->name.data(), "", position, key->elementCount);
     position += header[1];
   }
 }

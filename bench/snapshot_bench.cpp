@@ -16,7 +16,7 @@ namespace {
 
 constexpr uint32_t kRecords = 2000;
 
-// The last record of the in-place variant is never printed, so there is one more.
+// The last record of the described rendering is never printed, so there is one more.
 const std::vector<SnapshotRecord> &Records() {
   static const std::vector<SnapshotRecord> records = [] {
     std::mt19937 random(1);
@@ -178,7 +178,7 @@ struct Header {
   };
 };
 
-size_t PlainInplace(char *output, size_t capacity) {
+size_t PlainDescribed(char *output, size_t capacity) {
   static const Header header;
   PlainWriter writer(output, capacity);
   writer.Append("- KVR Snapshot - \n%s\n", header.text);
@@ -213,7 +213,7 @@ size_t PlainInplace(char *output, size_t capacity) {
   return static_cast<size_t>(writer.end() - output);
 }
 
-size_t Inplace(char *output, size_t capacity) {
+size_t Described(char *output, size_t capacity) {
   static const Header header;
   uint64_t size = capacity;
   uint32_t state = 0;
@@ -240,8 +240,8 @@ void Measure(benchmark::State &state) {
 BENCHMARK(Measure<Fixed>)->Name("fixed/formatter");
 BENCHMARK(Measure<PlainFixed>)->Name("fixed/plain");
 BENCHMARK(Measure<FmtFixed>)->Name("fixed/libfmt");
-BENCHMARK(Measure<Inplace>)->Name("inplace/formatter");
-BENCHMARK(Measure<PlainInplace>)->Name("inplace/plain");
+BENCHMARK(Measure<Described>)->Name("described/formatter");
+BENCHMARK(Measure<PlainDescribed>)->Name("described/plain");
 
 std::string Text(size_t (*render)(char *, size_t)) {
   return {Buffer().data(), render(Buffer().data(), Buffer().size())};
@@ -252,7 +252,8 @@ std::string Text(size_t (*render)(char *, size_t)) {
 int main(int argc, char **argv) {
   // A comparison counts only between equal texts.
   const std::string fixed = Text(Fixed);
-  if (fixed != Text(PlainFixed) || fixed != Text(FmtFixed) || Text(Inplace) != Text(PlainInplace)) {
+  if (fixed != Text(PlainFixed) || fixed != Text(FmtFixed) ||
+      Text(Described) != Text(PlainDescribed)) {
     std::fputs("the versions differ in their text\n", stderr);
     return 1;
   }

@@ -33,20 +33,20 @@ struct Stream {
 // Every key that `find` knows below `ids`, so many times over. A header is two of `HeaderPart`: the
 // key, and the number of its elements times `lengthUnit`.
 template <typename HeaderPart, typename Element>
-Stream MakeStream(const morwick::StatsKey *(*find)(uint32_t), uint32_t ids, uint32_t lengthUnit,
+Stream MakeStream(const morwick::KeyRow *(*find)(uint32_t), uint32_t ids, uint32_t lengthUnit,
                   int copies) {
   std::mt19937_64 random(1);
   Stream stream;
   for (int copy = 0; copy < copies; ++copy) {
     for (uint32_t id = 0; id < ids; ++id) {
-      const morwick::StatsKey *key = find(id);
+      const morwick::KeyRow *key = find(id);
       if (key == nullptr) continue;
       Append(&stream.buffer, static_cast<HeaderPart>(key->id));
-      Append(&stream.buffer, static_cast<HeaderPart>(key->elements * lengthUnit));
-      for (uint32_t i = 0; i < key->elements; ++i) {
+      Append(&stream.buffer, static_cast<HeaderPart>(key->elementCount * lengthUnit));
+      for (uint32_t i = 0; i < key->elementCount; ++i) {
         Append(&stream.buffer, static_cast<Element>(MixedMagnitude(random, 8 * sizeof(Element))));
       }
-      stream.entries += key->elements;
+      stream.entries += key->elementCount;
     }
   }
   return stream;

@@ -8,8 +8,6 @@
 
 namespace {
 
-constexpr uint32_t kConnectionType = 0;
-
 // The service handle of the row's driver, or 0 when none is registered.
 uint32_t FindService(const NandExporter &row) {
   MatchingRequest *request = ServiceMatching(row.className);
@@ -35,12 +33,14 @@ int findNandExporterNew(NandExporter **row) {
     const uint32_t service = FindService(**row);
     if (service == 0) continue;
     uint32_t connection = 0;
-    if (OpenService(service, kConnectionType, &connection) == 0) {
+    if (OpenService(service, kNandConnectionType, &connection) == 0) {
+      // The other prefix tells in a log which of the two searches found it.
       std::printf("Morwick_drel: findNandExporterNew: Controller found: %s\n", (*row)->className);
       (*row)->connection = connection;
       (*row)->service = service;
       return 1;
     }
+    // A driver that fails may leave a handle all the same; where it left none, 0 is refused.
     CloseService(connection);
     ReleaseObject(service);
   }
@@ -57,11 +57,11 @@ uint32_t TolkConnect(NandExporter **row) {
   if (row == nullptr) return 0;
   const uint32_t service = findNandExporter(row);
   if (service == 0) {
-    std::fputs("No class found", stderr);
+    std::fputs("No class found", stderr);  // no line end: what the caller says follows on the line
     return 0;
   }
   uint32_t connection = 0;
-  const int32_t result = OpenService(service, kConnectionType, &connection);
+  const int32_t result = OpenService(service, kNandConnectionType, &connection);
   ReleaseObject(service);
   if (result != 0) {
     std::fprintf(stderr, "OpenService failed for class '%s', result 0x%x\n", (*row)->className,

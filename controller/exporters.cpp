@@ -28,20 +28,26 @@ SelectorPair *KVRGetSnapshotHeaderSelectors() { return &snapshotHeaderSelectors;
 
 namespace {
 
-// What all classes share; a row states only what is its own.
-constexpr NandExporter Row(const char *className, const char *matchKey, int32_t paramA,
-                           uint32_t methodSelector, SelectorGetter getMSPStatsSelectors,
-                           MSPStatsParser mspParseBufferToCxt) {
+// What is a class's own; the rest all rows share.
+struct Traits {
+  const char *className;
+  const char *matchKey;
+  int32_t exporterParamA;
+  uint32_t methodSelector;
+  bool hasMSPStatistics = false;
+};
+
+constexpr NandExporter Row(const Traits &traits) {
   return {
-      .className = className,
-      .matchKey = matchKey,
+      .className = traits.className,
+      .matchKey = traits.matchKey,
       .connection = 0,
       .service = 0,
-      .exporterParamA = paramA,
-      .methodSelector = methodSelector,
-      .exporterParamB = methodSelector,
+      .exporterParamA = traits.exporterParamA,
+      .methodSelector = traits.methodSelector,
+      .exporterParamB = traits.methodSelector,
       .getStatsSelectors = KVRGetStatsSelectors,
-      .getMSPStatsSelectors = getMSPStatsSelectors,
+      .getMSPStatsSelectors = traits.hasMSPStatistics ? KVRMSPGetStatsSelectors : nullptr,
       .getDefectsListSelectors = KVRGetDefectsListSelectors,
       .getTelemetryListSelectors = KVRGetTelemetryListSelectors,
       .getTaskSchedulerSelectors = KVRGetTaskSchedulerSelectors,
@@ -50,7 +56,7 @@ constexpr NandExporter Row(const char *className, const char *matchKey, int32_t 
       .getBandStatsSelectors = KVRGetBandStatsSelectors,
       .parseBufferToCxt = KVRParseBufferToCxt,
       .releaseContext = KVRReleaseContext,
-      .mspParseBufferToCxt = mspParseBufferToCxt,
+      .mspParseBufferToCxt = traits.hasMSPStatistics ? KVRMSPParseBufferToCxt : nullptr,
       .ftlParseBufferToCxt = KVRFTLParseBufferToCxt,
       .releaseGenericParserCxt = ReleaseGenericParserCxt,
   };
@@ -66,11 +72,20 @@ static_assert(offsetof(NandExporter, methodSelector) == 2 * sizeof(void *) + 12)
 static_assert(offsetof(NandExporter, releaseGenericParserCxt) + sizeof(void *) ==
               sizeof(NandExporter));
 
-// constinit: the table must be whole before any code runs.
-constinit NandExporter nand_exporters[4] = {
-    Row("VeltoQRN3NVMeController", kNVMeMatchKey, -1, 9, KVRMSPGetStatsSelectors,
-        KVRMSPParseBufferToCxt),
-    Row("VeltoEmbeddedNVMeController", kNVMeMatchKey, -1, 9, nullptr, nullptr),
-    Row("KVRStorage", PLATFORM_PROPERTY_MATCH_KEY, 5, 8, nullptr, nullptr),
+// In search order. constinit: the table must be whole before any code runs.
+constinit NandExporter nand_exporters[] = {
+    Row({.className = "VeltoQRN3NVMeController",
+         .matchKey = kNVMeMatchKey,
+         .exporterParamA = -1,
+         .methodSelector = 9,
+         .hasMSPStatistics = true}),
+    Row({.className = "VeltoEmbeddedNVMeController",
+         .matchKey = kNVMeMatchKey,
+         .exporterParamA = -1,
+         .methodSelector = 9}),
+    Row({.className = "KVRStorage",
+         .matchKey = PLATFORM_PROPERTY_MATCH_KEY,
+         .exporterParamA = 5,
+         .methodSelector = 8}),
     {},
 };

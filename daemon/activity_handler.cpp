@@ -5,25 +5,19 @@
 
 #include <unistd.h>
 
-#include <bit>
 #include <cstddef>
 #include <cstdint>
 
 #include "morwick/connection.h"
 #include "morwick/exporter.h"
+#include "morwick/little_endian.h"
 
 namespace {
 
 constexpr char kActivityIdentifier[] = "org.morwick.grellon";
-constexpr uint32_t kConnectionType = 0;
 constexpr uint32_t kRequestArgument = 1025;
 constexpr uint32_t kDeferChecks = 6;  // between two requests, one before each pause
 constexpr uint32_t kPauseSeconds = 5;
-
-// The driver's words are little-endian, whatever the host.
-constexpr uint32_t LittleEndian(uint32_t value) {
-  return std::endian::native == std::endian::little ? value : __builtin_bswap32(value);
-}
 
 struct TaskSchedulerRequest {
   uint32_t command;
@@ -38,14 +32,14 @@ static_assert(sizeof(TaskSchedulerRequest) == 24);
 // What the controller answers one request with: the work still pending, 0 after a failed request.
 uint32_t RequestWork(uint32_t connection, const NandExporter &row, const SelectorPair &selectors,
                      uint32_t iteration) {
-  const TaskSchedulerRequest request = {.command = LittleEndian(selectors.second),
-                                        .argument = LittleEndian(kRequestArgument),
+  const TaskSchedulerRequest request = {.command = LittleEndian32(selectors.second),
+                                        .argument = LittleEndian32(kRequestArgument),
                                         .reserved = {}};
   uint32_t reply = 0;
   size_t replySize = sizeof reply;
   const int32_t status = CallStructMethod(connection, row.methodSelector, &request, sizeof request,
                                           &reply, &replySize);
-  const uint32_t bdrPending = LittleEndian(reply);
+  const uint32_t bdrPending = LittleEndian32(reply);
   SystemLog("iter# %u - KVR status %s - is BDR done: %s (%u)", iteration,
             status == 0 ? "pass" : "fail", bdrPending == 0 ? "YES" : "NO", bdrPending);
   return status == 0 ? bdrPending : 0;
@@ -88,7 +82,7 @@ uint32_t WorkOnService(Activity *activity, uint32_t service, const NandExporter 
   if (row.getTaskSchedulerSelectors == nullptr) return 0;
   const SelectorPair *selectors = row.getTaskSchedulerSelectors();
   uint32_t connection = 0;
-  if (OpenService(service, kConnectionType, &connection) != 0 || connection == 0) return 0;
+  if (OpenService(service, kNandConnectionType, &connection) != 0 || connection == 0) return 0;
   SystemLog("opened io service connection");
   const uint32_t bdrPending = RequestUntilDoneOrDeferred(activity, connection, row, *selectors);
   SystemLog("closing io service connection");

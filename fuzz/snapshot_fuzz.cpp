@@ -30,7 +30,7 @@ std::string TextIn(const std::vector<char> &output, uint64_t length) {
   return {output.data(), length};
 }
 
-std::string RenderInplace(const std::vector<char> &header, const std::vector<char> &snapshot,
+std::string RenderDescribed(const std::vector<char> &header, const std::vector<char> &snapshot,
                           size_t capacity) {
   std::string whole;
   uint32_t state = 0;
@@ -64,7 +64,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   std::string_view input(reinterpret_cast<const char *>(data) + 3, size - 3);
   const std::vector<char> header = HeaderFrom(input, data[2] % 40);
   const std::vector<char> snapshot(input.begin(), input.end());
-  assert(RenderInplace(header, snapshot, capacity) == RenderInplace(header, snapshot, capacity));
+  assert(RenderDescribed(header, snapshot, capacity) == RenderDescribed(header, snapshot, capacity));
   assert(RenderFixed(snapshot, capacity) == RenderFixed(snapshot, capacity));
   return 0;
 }

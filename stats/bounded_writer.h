@@ -1,4 +1,5 @@
-// Text into a caller's buffer, piece by piece. A piece fits when its NUL fits too.
+// Text into a caller's buffer, piece by piece. A piece fits when its NUL fits too; behind one that
+// did not, nothing fits any more.
 #ifndef STATS_BOUNDED_WRITER_H
 #define STATS_BOUNDED_WRITER_H
 
@@ -10,17 +11,6 @@
 #include "stats/decimal.h"
 
 namespace morwick {
-
-// A piece of a few characters that can be copied without asking how many.
-struct ShortText {
-  static constexpr size_t kRoom = 16;
-
-  char characters[kRoom] = {};
-  size_t length = 0;
-
-  // There must be room.
-  void Append(char character) { characters[length++] = character; }
-};
 
 class BoundedWriter {
  public:
@@ -37,46 +27,54 @@ class BoundedWriter {
   bool Append(std::string_view piece) {
     if (Fits(piece.size())) {
       piece.copy(position_, piece.size());
-      Advance(piece.size());
-      return true;
+      return Advance(piece.size());
     }
     if (free_ > 0) {
       piece.copy(position_, free_ - 1);
       position_[free_ - 1] = '\0';
     }
-    return false;
+    return Fail();
   }
 
-  bool Append(const ShortText &piece) {
-    if (!Fits(ShortText::kRoom)) return Append(std::string_view(piece.characters, piece.length));
-    std::memcpy(position_, piece.characters, ShortText::kRoom);
-    Advance(piece.length);
-    return true;
+  // Appends the first characters of an array. Where there is room the whole array is copied, which
+  // for a few characters takes less time than asking how many they are.
+  template <size_t kRoom>
+  bool AppendFirst(const char (&characters)[kRoom], size_t length) {
+    if (!Fits(kRoom)) return Append(std::string_view(characters, length));
+    std::memcpy(position_, characters, kRoom);
+    return Advance(length);
   }
 
   // Appends the number as WritePadded does.
   bool AppendPadded(uint32_t value, uint32_t width, char pad) {
     if (Fits(kPaddedRoom)) {  // nearly always: no second copy
-      Advance(static_cast<size_t>(WritePadded(position_, value, width, pad) - position_));
-      return true;
+      return Advance(static_cast<size_t>(WritePadded(position_, value, width, pad) - position_));
     }
     char text[kPaddedRoom];
     return Append(std::string_view(text, WritePadded(text, value, width, pad)));
   }
 
-  // Appends the character so many times; they must fit.
-  void Fill(char character, size_t count) {
-    std::memset(position_, character, count);
-    Advance(count);
+  // Appends what `print`, which is given room and its size, prints there as snprintf does.
+  template <typename Print>
+  bool AppendPrinted(Print print) {
+    const int length = print(position_, free_);
+    if (length < 0 || !Fits(static_cast<uint64_t>(length))) return Fail();
+    return Advance(static_cast<size_t>(length));
   }
 
   // Ends the text at this length, at most the present one. There must be a capacity.
   void EndAt(uint64_t length) { start_[length] = '\0'; }
 
  private:
-  void Advance(size_t length) {
+  bool Advance(size_t length) {
     position_ += length;
     free_ -= length;
+    return true;
+  }
+
+  bool Fail() {
+    free_ = 0;
+    return false;
   }
 
   char *start_;

@@ -13,6 +13,12 @@ constexpr uint32_t Checksum(std::string_view text, uint32_t sum = 0x811c9dc5) {
   return sum;
 }
 
+// The four bytes of a number, the lowest first.
+constexpr uint32_t Checksum(uint32_t number, uint32_t sum) {
+  for (int shift = 0; shift < 32; shift += 8) sum = (sum ^ (number >> shift & 0xff)) * 0x01000193;
+  return sum;
+}
+
 // The compiler shows both numbers when they differ.
 template <uint32_t kComputed, uint32_t kWritten>
 consteval bool ChecksumIs() {

@@ -9,8 +9,8 @@
 #include <new>
 #include <string_view>
 
+#include "morwick/little_endian.h"
 #include "morwick/parser_context.h"
-#include "stats/byte_order.h"
 #include "stats/decimal.h"
 
 namespace morwick {
@@ -89,6 +89,15 @@ ContextNode *AppendEntry(Context *context, const EntryName &name, uint64_t value
   return nameNode;
 }
 
+// An unsigned little-endian integer of up to 8 bytes, zero-extended.
+inline uint64_t LoadElement(const uint8_t *bytes, uint32_t width) {
+  if (width == 8) return LoadLittleEndian64(bytes);
+  if (width == 4) return LoadLittleEndian32(bytes);
+  uint8_t padded[8] = {};
+  std::memcpy(padded, bytes, width);
+  return LoadLittleEndian64(padded);
+}
+
 // Appends one entry for each element of at most 8 bytes, named `name` and its index, or `name`
 // alone when there is just one. False when an element could not be added; the others are added all
 // the same.
@@ -97,7 +106,7 @@ bool AppendElements(Context *context, const EntryName &name, const uint8_t *elem
                     uint32_t width, uint32_t count) {
   bool allAdded = true;
   for (uint32_t index = 0; index < count; ++index, elements += width) {
-    ContextNode *node = AppendEntry(context, name, LoadLittleEndian(elements, width));
+    ContextNode *node = AppendEntry(context, name, LoadElement(elements, width));
     if (node == nullptr) {
       allAdded = false;
     } else if (count > 1) {
@@ -105,6 +114,16 @@ bool AppendElements(Context *context, const EntryName &name, const uint8_t *elem
     }
   }
   return allAdded;
+}
+
+// Frees a node, if there is one, and returns the next.
+inline ContextNode *FreeNode(ContextNode *node) {
+  if (node == nullptr) return nullptr;
+  ContextNode *next = node->next;
+  // Asked for early, where it is long in coming: a tenth of the time of large parses.
+  if (next != nullptr) __builtin_prefetch(&next->next);
+  std::free(node);
+  return next;
 }
 
 // Frees the two lists side by side, in the order in which their nodes were allocated: freed one
@@ -115,14 +134,8 @@ void FreeEntries(Context *context) {
   ContextNode *names = context->namesHead;
   ContextNode *values = context->valuesHead;
   while (names != nullptr || values != nullptr) {
-    for (ContextNode **node : {&values, &names}) {
-      if (*node == nullptr) continue;
-      ContextNode *next = (*node)->next;
-      // Asked for early, where it is long in coming: a tenth of the time of large parses.
-      if (next != nullptr) __builtin_prefetch(&next->next);
-      std::free(*node);
-      *node = next;
-    }
+    values = FreeNode(values);
+    names = FreeNode(names);
   }
 }
 

@@ -6,64 +6,56 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string_view>
 
 #include "stats/checksum.h"
 
 namespace morwick {
 
-struct StatsKey {
+struct KeyRow {
   uint32_t id;
   std::string_view name;  // a literal: its data() ends in a NUL
-  uint32_t elements;      // 1 for a scalar key
+  uint32_t elementCount;  // 1 for a scalar key
 };
 
-template <size_t kRows>
-constexpr bool IdsAscend(const std::array<StatsKey, kRows> &keys) {
-  return std::ranges::adjacent_find(keys, [](const StatsKey &key, const StatsKey &next) {
-           return key.id >= next.id;
-         }) == keys.end();
-}
+// The table of the given rows, which must stand in id order; in which place each id has its row is
+// worked out at compile time.
+template <const auto &kRows>
+class KeyTable {
+ public:
+  // In constant time; null for an id without a row.
+  static const KeyRow *Find(uint32_t id) {
+    const uint32_t index = id - kFirst;  // wraps to a large number below the first
+    if (index >= kPlaceOfId.size() || kPlaceOfId[index] == 0) return nullptr;
+    return &kRows[kPlaceOfId[index] - 1U];
+  }
 
-template <size_t kRows>
-constexpr ptrdiff_t ArrayKeyCount(const std::array<StatsKey, kRows> &keys) {
-  return std::ranges::count_if(keys, [](const StatsKey &key) { return key.elements > 1; });
-}
-
-// Over ids, names and elements of all rows.
-template <size_t kRows>
-constexpr uint32_t TableChecksum(const std::array<StatsKey, kRows> &keys) {
-  uint32_t sum = Checksum("");
-  for (const StatsKey &key : keys) {
-    for (const uint32_t number : {key.id, key.elements}) {
-      for (uint32_t shift = 0; shift < 32; shift += 8) {
-        const char byte[] = {static_cast<char>(number >> shift)};
-        sum = Checksum({byte, 1}, sum);
-      }
+  // Over ids, names and element counts of all rows.
+  static constexpr uint32_t RowsChecksum() {
+    uint32_t sum = Checksum("");
+    for (const KeyRow &row : kRows) {
+      sum = Checksum(row.name, Checksum(row.elementCount, Checksum(row.id, sum)));
     }
-    sum = Checksum(key.name, sum);
+    return sum;
   }
-  return sum;
-}
 
-// For each id from kFirst to kLast the number of its row, counted from 1; 0 for an id without one.
-template <uint32_t kFirst, uint32_t kLast, size_t kRows>
-constexpr auto RowsById(const std::array<StatsKey, kRows> &keys) {
-  std::array<uint16_t, kLast - kFirst + 1> rows = {};
-  for (size_t row = 0; row < kRows; ++row) {
-    rows[keys[row].id - kFirst] = static_cast<uint16_t>(row + 1);
-  }
-  return rows;
-}
+ private:
+  static_assert(std::ranges::adjacent_find(kRows, std::ranges::greater_equal(), &KeyRow::id) ==
+                    kRows.end(),
+                "the rows of a key table stand in id order, each id once");
 
-// In constant time; null for an id without a row.
-template <uint32_t kFirst, size_t kRows, size_t kIds>
-const StatsKey *FindRow(const std::array<StatsKey, kRows> &keys,
-                        const std::array<uint16_t, kIds> &rowOfId, uint32_t id) {
-  const uint32_t index = id - kFirst;  // wraps to a large number below kFirst
-  if (index >= kIds || rowOfId[index] == 0) return nullptr;
-  return &keys[rowOfId[index] - 1U];
-}
+  static constexpr uint32_t kFirst = kRows.front().id;
+
+  // For each id from the first to the last the number of its row, counted from 1; 0 without one.
+  static constexpr auto kPlaceOfId = [] {
+    std::array<uint16_t, kRows.back().id - kFirst + 1> places = {};
+    for (size_t row = 0; row < kRows.size(); ++row) {
+      places[kRows[row].id - kFirst] = static_cast<uint16_t>(row + 1);
+    }
+    return places;
+  }();
+};
 
 }  // namespace morwick
 

@@ -9,14 +9,12 @@
 #include "stats/record_stream.h"
 #include "stats/stats_keys.h"
 
-using morwick::kHighestKey;
-using morwick::kWordSize;
-
+namespace morwick {
 namespace {
 
 // Keeps the value of a key that has a summary field.
-void SetSummaryField(KVRStatsCxt *context, uint32_t key, const uint8_t *values) {
-  const auto value = morwick::LoadLittleEndian<uint64_t>(values);
+void SetSummaryField(KVRStatsCxt *context, int32_t key, const uint8_t *values) {
+  const auto value = LoadLittleEndian64(values);
   const auto low = static_cast<uint32_t>(value);
   switch (key) {
     case 4: context->hostWrites = value; break;
@@ -38,7 +36,7 @@ void SetSummaryField(KVRStatsCxt *context, uint32_t key, const uint8_t *values) 
     case 56: context->utilFormatTime = value; break;
     case 265:
       for (uint64_t &entry : context->readCountHisto) {
-        entry = morwick::LoadLittleEndian<uint64_t>(values);
+        entry = LoadLittleEndian64(values);
         values += kWordSize;
       }
       break;
@@ -49,43 +47,47 @@ void SetSummaryField(KVRStatsCxt *context, uint32_t key, const uint8_t *values) 
 // Appends one pair, named by the prefix followed directly by the name. False without memory for it.
 bool KVRAddValueToContext(KVRStatsCxt *ctx, std::string_view prefix, std::string_view name,
                           uint64_t value) {
-  return morwick::AppendEntry(ctx, {prefix, name}, value) != nullptr;
+  return AppendEntry(ctx, {prefix, name}, value) != nullptr;
 }
 
 // Takes over what a known key carries: its summary field and a pair for each of its values. False
 // when memory was refused for a pair; the others are appended all the same.
-bool KVRAddFieldsToContext(KVRStatsCxt *ctx, uint32_t key, std::string_view name,
+bool KVRAddFieldsToContext(KVRStatsCxt *ctx, int32_t key, std::string_view name,
                            const uint8_t *values, uint32_t count) {
   SetSummaryField(ctx, key, values);
-  if (count == 1) {
-    return KVRAddValueToContext(ctx, "", name, morwick::LoadLittleEndian<uint64_t>(values));
+  if (count == 1) return KVRAddValueToContext(ctx, "", name, LoadLittleEndian64(values));
+  return AppendElements(ctx, EntryName(name), values, kWordSize, count);
+}
+
+// False at a bad header and when memory is refused; what was read before is in the context.
+bool ParseKVR(KVRStatsCxt *ctx, RecordStream stream) {
+  while (stream.wordsLeft() > 0) {
+    const Record record = stream.TakeHeader();
+    if (record.id > kHighestId || record.length > stream.wordsLeft()) {
+      ctx->exportVersion = 0;
+      return false;
+    }
+    // How many values there are the key says, not the record's length: they may run on into the
+    // records behind it, though never past the buffer.
+    const KeyRow *key = FindStatsKey(record.id);
+    if (key != nullptr && key->elementCount <= stream.wordsLeft() &&
+        !KVRAddFieldsToContext(ctx, static_cast<int32_t>(key->id), key->name, record.payload,
+                               key->elementCount)) {
+      return false;
+    }
+    stream.Skip(record.length);
   }
-  return morwick::AppendElements(ctx, morwick::EntryName(name), values, kWordSize, count);
+  return true;
 }
 
 }  // namespace
+}  // namespace morwick
 
 int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size) {
   if (ctx == nullptr) return 0;
   ctx->parseMarker = -1;
-  if (buffer == nullptr || size < kWordSize) return 0;
-  morwick::RecordStream stream(buffer, size);
-  while (stream.wordsLeft() > 0) {
-    const morwick::Record record = stream.TakeHeader();
-    if (record.key > kHighestKey || record.length > stream.wordsLeft()) {
-      ctx->exportVersion = 0;
-      return 0;
-    }
-    const morwick::StatsKey *key = morwick::FindStatsKey(record.key);
-    // How many values there are the key says, not the record's length: they may run on into the
-    // records behind it, though never past the buffer.
-    if (key != nullptr && key->elements <= stream.wordsLeft() &&
-        !KVRAddFieldsToContext(ctx, key->id, key->name, record.payload, key->elements)) {
-      return 0;
-    }
-    stream.Skip(record.length);
-  }
-  return 1;
+  if (buffer == nullptr || size < morwick::kWordSize) return 0;
+  return morwick::ParseKVR(ctx, morwick::RecordStream(buffer, size)) ? 1 : 0;
 }
 
 void KVRReleaseContext(KVRStatsCxt *ctx) {

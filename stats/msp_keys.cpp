@@ -7,7 +7,7 @@ namespace morwick {
 namespace {
 
 // clang-format off: one row a line
-constexpr std::array<StatsKey, 95> kKeys = {{
+constexpr auto kRows = std::to_array<KeyRow>({
     {4096, "passWithTmodeHard", 1},
     {4097, "passWithTmodeFS1_2b", 1},
     {4098, "passWithTmodeFS1_4b", 1},
@@ -103,17 +103,15 @@ constexpr std::array<StatsKey, 95> kKeys = {{
     {8212, "open_blocks_hist", 4},
     {8213, "random_read_hit_ratio_hist", 6},
     {8214, "active_time_hist", 5},
-}};
+});
 // clang-format on
 
-static_assert(IdsAscend(kKeys));
-static_assert(ArrayKeyCount(kKeys) == 17);
-static_assert(ChecksumIs<TableChecksum(kKeys), 4196365885>());
+using Table = KeyTable<kRows>;
 
-constexpr auto kRowOfId = RowsById<4096, 8214>(kKeys);
+static_assert(ChecksumIs<Table::RowsChecksum(), 4196365885>());
 
 }  // namespace
 
-const StatsKey *FindMSPKey(uint32_t id) { return FindRow<4096>(kKeys, kRowOfId, id); }
+const KeyRow *FindMSPKey(uint32_t id) { return Table::Find(id); }
 
 }  // namespace morwick

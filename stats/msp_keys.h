@@ -7,7 +7,7 @@
 namespace morwick {
 
 // The row of the key, or null for an unknown key.
-const StatsKey *FindMSPKey(uint32_t id);
+const KeyRow *FindMSPKey(uint32_t id);
 
 }  // namespace morwick
 

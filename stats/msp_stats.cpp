@@ -3,63 +3,65 @@
 #include "morwick/msp_stats.h"
 
 #include <algorithm>
+#include <optional>
 
 #include "morwick/error_message.h"
+#include "morwick/little_endian.h"
 #include "stats/entry_list.h"
 #include "stats/msp_keys.h"
 
-using morwick::StatsKey;
-
+namespace morwick {
 namespace {
 
 constexpr uint32_t kHeaderSize = 4;
 constexpr uint32_t kElementSize = 4;
-constexpr uint32_t kEndKey = 0x2FFF;
+constexpr uint32_t kEndId = 0x2FFF;
 
-// Adds as many whole elements as both the key and the record have. False when they could not be
-// added; `added` is their number.
-bool AddRecord(GenericParserCxt *context, const StatsKey &key, const uint8_t *payload,
-               uint32_t length, uint32_t *added) {
-  if (length != key.elements * kElementSize) {
+// Adds as many whole elements as both the key and the record have and returns their number; nothing
+// when they could not all be added.
+std::optional<uint32_t> AddRecord(GenericParserCxt *context, const KeyRow &key,
+                                  const uint8_t *payload, uint32_t length) {
+  if (length != key.elementCount * kElementSize) {
     SetAPIErrorMessage(
         "KVRMSPParseBufferToCxt: %s(%u): cfg %u elements; (%u*4) cfg bytes != (%d) buffer bytes",
-        key.name.data(), key.id, key.elements, key.elements, static_cast<int>(length));
+        key.name.data(), key.id, key.elementCount, key.elementCount, static_cast<int>(length));
   }
-  *added = std::min(length / kElementSize, key.elements);
-  if (morwick::AppendElements(context, morwick::EntryName(key.name), payload, kElementSize,
-                              *added)) {
-    return true;
-  }
+  const uint32_t count = std::min(length / kElementSize, key.elementCount);
+  if (AppendElements(context, EntryName(key.name), payload, kElementSize, count)) return count;
   SetAPIErrorMessage("KVRMSPParseBufferToCxt: %s(%u): Error adding %u elements to context",
-                     key.name.data(), key.id, key.elements);
-  return false;
+                     key.name.data(), key.id, key.elementCount);
+  return std::nullopt;
 }
 
-}  // namespace
-
-uint64_t KVRMSPParseBufferToCxt(GenericParserCxt *ctx, const void *buffer, uint64_t size) {
-  auto left = static_cast<uint32_t>(size);
-  if (buffer == nullptr || left == 0) {
-    SetAPIErrorMessage("KVRMSPParseBufferToCxt: Passed in invalid buffer or empty buffer");
-    return 0;
-  }
-  const auto *position = static_cast<const uint8_t *>(buffer);
-  uint32_t elements = 0;
+uint32_t ParseMSP(GenericParserCxt *context, const uint8_t *position, uint32_t left) {
+  uint32_t count = 0;
   while (left >= kHeaderSize) {
-    const uint32_t id = morwick::LoadLittleEndian<uint16_t>(position);
-    const uint32_t length = morwick::LoadLittleEndian<uint16_t>(position + 2);
+    const uint32_t id = LoadLittleEndian16(position);
+    const uint32_t length = LoadLittleEndian16(position + 2);
     position += kHeaderSize;
     left -= kHeaderSize;
     if (length == 0) continue;  // a filler, whatever its key
-    if (id == kEndKey || length > left) break;
+    if (id == kEndId || length > left) break;
     // Skip records (0x2FFE) have no row and are stepped over as unknown keys are.
-    if (const StatsKey *key = morwick::FindMSPKey(id)) {
-      uint32_t added = 0;
-      if (!AddRecord(ctx, *key, position, length, &added)) break;
-      elements += added;
+    if (const KeyRow *key = FindMSPKey(id)) {
+      const std::optional<uint32_t> added = AddRecord(context, *key, position, length);
+      if (!added) break;
+      count += *added;
     }
     position += length;
     left -= length;
   }
-  return elements;
+  return count;
+}
+
+}  // namespace
+}  // namespace morwick
+
+uint64_t KVRMSPParseBufferToCxt(GenericParserCxt *ctx, const void *buffer, uint64_t size) {
+  const auto size32 = static_cast<uint32_t>(size);
+  if (buffer == nullptr || size32 == 0) {
+    SetAPIErrorMessage("KVRMSPParseBufferToCxt: Passed in invalid buffer or empty buffer");
+    return 0;
+  }
+  return morwick::ParseMSP(ctx, static_cast<const uint8_t *>(buffer), size32);
 }

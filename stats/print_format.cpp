@@ -3,146 +3,75 @@
 #include "stats/print_format.h"
 
 #include <algorithm>
+#include <cstdio>
 
 namespace morwick {
 namespace {
 
-// Larger numbers are taken for this one: no buffer is as large, and sums of it do not overflow.
+// Larger numbers are taken for this one: no buffer is as large, and none overflows.
 constexpr uint64_t kHuge = 1000000000000000000;
+constexpr uint64_t kPlainWidth = 8;
 
-// Walks over a format.
-class FormatReader {
- public:
-  explicit FormatReader(std::string_view format) : rest_(format) {}
-
-  bool AtEnd() const { return rest_.empty(); }
-
-  // Takes plain text up to the next conversion or the end; a doubled % stands for one.
-  ShortText TakeText() {
-    ShortText text;
-    while (!rest_.empty()) {
-      const bool percent = rest_.front() == '%';
-      if (percent && !rest_.starts_with("%%")) break;
-      text.Append(rest_.front());
-      rest_.remove_prefix(percent ? 2 : 1);
-    }
-    return text;
+// Takes plain text up to the next conversion or the end; a doubled % stands for one.
+FormatText TakeText(std::string_view *rest) {
+  FormatText text;
+  while (!rest->empty()) {
+    const bool percent = rest->front() == '%';
+    if (percent && !rest->starts_with("%%")) break;
+    text.characters[text.length++] = rest->front();
+    rest->remove_prefix(percent ? 2 : 1);
   }
+  return text;
+}
 
-  // Takes the conversion that is next. Its type is NUL when the format ends in the middle of it.
-  Conversion TakeConversion() {
-    Conversion conversion;
-    rest_.remove_prefix(1);
-    while (TakeFlag(&conversion)) {
-    }
-    conversion.width = TakeNumber();
-    if (rest_.starts_with('.')) {
-      rest_.remove_prefix(1);
-      conversion.hasPrecision = true;
-      conversion.precision = TakeNumber();
-    }
-    if (!rest_.empty()) {
-      conversion.type = rest_.front();
-      rest_.remove_prefix(1);
-    }
-    return conversion;
+uint64_t TakeNumber(std::string_view *rest) {
+  uint64_t number = 0;
+  for (; !rest->empty() && rest->front() >= '0' && rest->front() <= '9'; rest->remove_prefix(1)) {
+    number = std::min(number * 10 + static_cast<uint64_t>(rest->front() - '0'), kHuge);
   }
+  return number;
+}
 
- private:
-  bool TakeFlag(Conversion *conversion) {
-    if (rest_.empty()) return false;
-    switch (rest_.front()) {
-      case '-': conversion->left = true; break;
-      case '0': conversion->zeros = true; break;
-      case '+': conversion->plus = true; break;
-      case ' ': conversion->blank = true; break;
-      case '#': conversion->alternate = true; break;
-      default: return false;
-    }
-    rest_.remove_prefix(1);
-    return true;
+// Takes the conversion that is next, when it is of one of the types.
+bool TakeConversion(std::string_view *rest, std::string_view types, Conversion *conversion) {
+  const std::string_view start = *rest;
+  rest->remove_prefix(1);
+  const size_t flagCount = std::min(rest->find_first_not_of("-0+ #"), rest->size());
+  const std::string_view flags = rest->substr(0, flagCount);
+  rest->remove_prefix(flagCount);
+  const uint64_t width = TakeNumber(rest);
+  const bool hasPrecision = rest->starts_with('.');
+  uint64_t precision = 0;
+  if (hasPrecision) {
+    rest->remove_prefix(1);
+    precision = TakeNumber(rest);
   }
+  if (rest->empty() || types.find(rest->front()) == std::string_view::npos) return false;
+  const char type = rest->front();
+  rest->remove_prefix(1);
 
-  uint64_t TakeNumber() {
-    uint64_t number = 0;
-    for (; !rest_.empty() && rest_.front() >= '0' && rest_.front() <= '9'; rest_.remove_prefix(1)) {
-      number = std::min(number * 10 + static_cast<uint64_t>(rest_.front() - '0'), kHuge);
-    }
-    return number;
-  }
-
-  std::string_view rest_;
-};
-
-// The parts of a converted number, in print order: sign or base, zeros, digits, in a field.
-bool AppendField(BoundedWriter &writer, const Conversion &conversion, std::string_view prefix,
-                 uint64_t zeros, std::string_view digits) {
-  const uint64_t length = prefix.size() + zeros + digits.size();
-  const uint64_t padding = conversion.width > length ? conversion.width - length : 0;
-  if (!writer.Fits(length + padding)) return false;
-  if (!conversion.left) writer.Fill(' ', padding);
-  writer.Append(prefix);
-  writer.Fill('0', zeros);
-  writer.Append(digits);
-  if (conversion.left) writer.Fill(' ', padding);
+  start.copy(conversion->text, start.size() - rest->size());
+  // A precision is a least number of digits, but a largest number of characters of a text.
+  conversion->least = std::max(width, type == 's' ? 0 : precision);
+  conversion->plain =
+      !hasPrecision && (type == 's' ? width == 0
+                                    : type == 'u' && width <= kPlainWidth &&
+                                          flags.find('-') == std::string_view::npos);
+  conversion->pad = flags.find('0') == std::string_view::npos ? ' ' : '0';
+  conversion->width = static_cast<uint32_t>(std::clamp<uint64_t>(width, 1, kPlainWidth));
   return true;
 }
 
-// A number in base 8 or 16.
-std::string_view Digits(uint32_t value, uint32_t shift, const char *symbols, char *end) {
-  char *start = end;
-  for (; value != 0 || start == end; value >>= shift)
-    *--start = symbols[value & ((1U << shift) - 1)];
-  return {start, end};
+bool AppendText(BoundedWriter &writer, const FormatText &text) {
+  return writer.AppendFirst(text.characters, text.length);
 }
 
-bool AppendPlain(BoundedWriter &writer, const Conversion &conversion, uint32_t value) {
-  const auto width = std::max<uint32_t>(static_cast<uint32_t>(conversion.width), 1);
-  return writer.AppendPadded(value, width, conversion.zeros ? '0' : ' ');
-}
-
-bool AppendNumber(BoundedWriter &writer, const Conversion &conversion, uint32_t value) {
-  char text[kDecimalRoom];
-  std::string_view digits;
-  std::string_view prefix;
-  switch (conversion.type) {
-    case 'd':
-    case 'i': {
-      const bool negative = static_cast<int32_t>(value) < 0;
-      prefix = negative ? "-" : conversion.plus ? "+" : conversion.blank ? " " : "";
-      digits = {text, WriteDecimal(text, negative ? 0U - value : value)};
-      break;
-    }
-    case 'o': digits = Digits(value, 3, "01234567", std::end(text)); break;
-    case 'x': digits = Digits(value, 4, "0123456789abcdef", std::end(text)); break;
-    case 'X': digits = Digits(value, 4, "0123456789ABCDEF", std::end(text)); break;
-    default: digits = {text, WriteDecimal(text, value)}; break;
-  }
-  // A precision is a least number of digits; at 0, the number 0 has none.
-  if (conversion.hasPrecision && conversion.precision == 0 && value == 0) digits = "";
-  uint64_t zeros = conversion.precision > digits.size() ? conversion.precision - digits.size() : 0;
-  if (conversion.alternate) {
-    if (conversion.type == 'o' && zeros == 0 && !digits.starts_with('0')) zeros = 1;
-    if (conversion.type == 'x' && value != 0) prefix = "0x";
-    if (conversion.type == 'X' && value != 0) prefix = "0X";
-  }
-  // Zeros up to the width, unless something else decides how many digits there are.
-  const uint64_t length = prefix.size() + zeros + digits.size();
-  if (conversion.zeros && !conversion.left && !conversion.hasPrecision &&
-      conversion.width > length) {
-    zeros += conversion.width - length;
-  }
-  return AppendField(writer, conversion, prefix, zeros, digits);
-}
-
-// Prints the plain texts of the format and hands each conversion on.
-template <typename AppendArgument>
-bool Print(BoundedWriter &writer, const PrintFormat &format, AppendArgument append) {
-  if (!writer.Append(format.texts[0])) return false;
-  for (size_t i = 0; i < format.conversionCount; ++i) {
-    if (!append(format.conversions[i], i) || !writer.Append(format.texts[i + 1])) return false;
-  }
-  return true;
+// As printf prints it; but what cannot fit is not begun, for its padding alone may take seconds.
+template <typename Argument>
+bool AppendFormatted(BoundedWriter &writer, const Conversion &conversion, Argument argument) {
+  return writer.AppendPrinted([&](char *room, size_t size) {
+    return size > conversion.least ? std::snprintf(room, size, conversion.text, argument) : -1;
+  });
 }
 
 }  // namespace
@@ -151,32 +80,37 @@ bool ReadPrintFormat(std::string_view text, Arguments arguments, PrintFormat *fo
   const std::string_view types = arguments == Arguments::kOneText ? "s" : "diuoxX";
   const size_t most = arguments == Arguments::kTwoNumbers ? 2 : 1;
   *format = {};
-  FormatReader reader(text);
-  format->texts[0] = reader.TakeText();
-  while (!reader.AtEnd()) {
-    const Conversion conversion = reader.TakeConversion();
-    if (format->conversionCount == most || types.find(conversion.type) == std::string_view::npos) {
+  format->texts[0] = TakeText(&text);
+  while (!text.empty()) {
+    if (format->conversionCount == most ||
+        !TakeConversion(&text, types, &format->conversions[format->conversionCount])) {
       return false;
     }
-    format->conversions[format->conversionCount] = conversion;
-    format->texts[++format->conversionCount] = reader.TakeText();
+    format->texts[++format->conversionCount] = TakeText(&text);
   }
   return true;
 }
 
 bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,
                   std::span<const uint32_t> numbers) {
-  return Print(writer, format, [&](const Conversion &conversion, size_t index) {
-    return conversion.IsPlain() ? AppendPlain(writer, conversion, numbers[index])
-                                : AppendNumber(writer, conversion, numbers[index]);
-  });
+  if (!AppendText(writer, format.texts[0])) return false;
+  for (size_t i = 0; i < format.conversionCount; ++i) {
+    const Conversion &conversion = format.conversions[i];
+    const bool appended = conversion.plain
+                              ? writer.AppendPadded(numbers[i], conversion.width, conversion.pad)
+                              : AppendFormatted(writer, conversion, numbers[i]);
+    if (!appended || !AppendText(writer, format.texts[i + 1])) return false;
+  }
+  return true;
 }
 
-bool PrintText(BoundedWriter &writer, const PrintFormat &format, std::string_view text) {
-  return Print(writer, format, [&](const Conversion &conversion, size_t) {
-    const uint64_t length = conversion.hasPrecision ? conversion.precision : text.size();
-    return AppendField(writer, conversion, "", 0, text.substr(0, length));
-  });
+bool PrintText(BoundedWriter &writer, const PrintFormat &format, const char *text) {
+  if (!AppendText(writer, format.texts[0])) return false;
+  if (format.conversionCount == 0) return true;
+  const Conversion &conversion = format.conversions[0];
+  const bool appended =
+      conversion.plain ? writer.Append(text) : AppendFormatted(writer, conversion, text);
+  return appended && AppendText(writer, format.texts[1]);
 }
 
 }  // namespace morwick

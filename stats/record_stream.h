@@ -5,15 +5,15 @@
 
 #include <cstdint>
 
-#include "stats/byte_order.h"
+#include "morwick/little_endian.h"
 
 namespace morwick {
 
 constexpr uint32_t kWordSize = 8;
-constexpr uint32_t kHighestKey = 0x30000000;  // a header with a key above it is bad
+constexpr uint32_t kHighestId = 0x30000000;  // a header with a key id above it is bad
 
 struct Record {
-  uint32_t key;
+  uint32_t id;
   uint32_t length;         // of the payload, in words
   const uint8_t *payload;  // just past the header; not more than `wordsLeft` words may be read
 };
@@ -29,8 +29,8 @@ class RecordStream {
 
   // Takes the header at the position. There must be a word left.
   Record TakeHeader() {
-    const Record record = {LoadLittleEndian<uint32_t>(position_),
-                           LoadLittleEndian<uint32_t>(position_ + 4), position_ + kWordSize};
+    const Record record = {LoadLittleEndian32(position_), LoadLittleEndian32(position_ + 4),
+                           position_ + kWordSize};
     Skip(1);
     return record;
   }

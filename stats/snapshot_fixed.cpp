@@ -4,13 +4,12 @@
 #include <iterator>
 #include <utility>
 
+#include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
 #include "stats/bounded_writer.h"
-#include "stats/byte_order.h"
 #include "stats/snapshot_legend.h"
 
-using morwick::BoundedWriter;
-
+namespace morwick {
 namespace {
 
 // What of a field is printed.
@@ -109,8 +108,8 @@ template <Column kColumn>
 char *WriteColumn(char *end, const uint8_t *record) {
   std::memcpy(end, kColumn.label, kLabelRoom);
   end += std::string_view(kColumn.label).size();
-  const auto value = morwick::LoadLittleEndian<uint32_t>(record + kColumn.offset);
-  return morwick::WritePadded(end, PartOf(value, kColumn.part), kColumn.width, kColumn.pad);
+  const auto value = LoadLittleEndian32(record + kColumn.offset);
+  return WritePadded(end, PartOf(value, kColumn.part), kColumn.width, kColumn.pad);
 }
 
 template <size_t... kIndices>
@@ -120,28 +119,33 @@ char *WriteColumns(char *end, const uint8_t *record, std::index_sequence<kIndice
 }
 
 // Writes the record's line and returns its length.
-size_t WriteLine(char (&line)[kLineRoom + morwick::kPaddedRoom], const uint8_t *record) {
+size_t WriteLine(char (&line)[kLineRoom + kPaddedRoom], const uint8_t *record) {
   char *end = WriteColumns(line, record, std::make_index_sequence<std::size(kColumns)>());
   *end++ = '\n';
   return static_cast<size_t>(end - line);
 }
 
+// False when the text does not fit.
+bool RenderFixed(BoundedWriter &writer, const uint8_t *record, uint32_t recordCount) {
+  if (!writer.Append(kSnapshotLegend)) return false;
+  for (uint32_t i = 0; i < recordCount; ++i, record += sizeof(SnapshotRecord)) {
+    char line[kLineRoom + kPaddedRoom];
+    const size_t length = WriteLine(line, record);
+    if (!writer.Append({line, length})) return false;
+  }
+  return writer.Append("\n");
+}
+
 }  // namespace
+}  // namespace morwick
 
 uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t snapshotSize, char *output,
                                 uint64_t *outputSize) {
   if (output == nullptr || outputSize == nullptr) return 0;
   const auto recordCount = static_cast<uint32_t>(snapshotSize / sizeof(SnapshotRecord));
   if (snapshot == nullptr && recordCount > 0) return 0;
-  BoundedWriter writer(output, *outputSize);
-  if (!writer.Append(morwick::kSnapshotLegend)) return 0;
-  const auto *record = static_cast<const uint8_t *>(snapshot);
-  for (uint32_t i = 0; i < recordCount; ++i, record += sizeof(SnapshotRecord)) {
-    char line[kLineRoom + morwick::kPaddedRoom];
-    const size_t length = WriteLine(line, record);
-    if (!writer.Append({line, length})) return 0;
-  }
-  if (!writer.Append("\n")) return 0;
+  morwick::BoundedWriter writer(output, *outputSize);
+  if (!morwick::RenderFixed(writer, static_cast<const uint8_t *>(snapshot), recordCount)) return 0;
   writer.EndAt(writer.length());
   *outputSize = writer.length();
   return 1;

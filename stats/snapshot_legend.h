@@ -8,7 +8,9 @@
 
 namespace morwick {
 
-// clang-format off: one line of the text a line (the C line has no end of its own)
+// Published letter for letter, misspelling and missing line end (behind C) included: readers search
+// for it.
+// clang-format off: one line of the text a line
 inline constexpr std::string_view kSnapshotLegend =
     "Key: \n"
     "T   - Timestamp\n"

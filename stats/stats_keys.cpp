@@ -7,7 +7,7 @@ namespace morwick {
 namespace {
 
 // clang-format off: one row a line
-constexpr std::array<StatsKey, 568> kKeys = {{
+constexpr auto kRows = std::to_array<KeyRow>({
     {1, "version", 1},
     {2, "hostWriteXacts", 1},
     {3, "hostReadXacts", 1},
@@ -576,17 +576,15 @@ constexpr std::array<StatsKey, 568> kKeys = {{
     {649, "raidParityGCUnc", 1},
     {657, "AbortSkip_MPBXProbational", 1},
     {659, "raidVerificationReads", 1},
-}};
+});
 // clang-format on
 
-static_assert(IdsAscend(kKeys));
-static_assert(ArrayKeyCount(kKeys) == 100);
-static_assert(ChecksumIs<TableChecksum(kKeys), 1567143984>());
+using Table = KeyTable<kRows>;
 
-constexpr auto kRowOfId = RowsById<1, 659>(kKeys);
+static_assert(ChecksumIs<Table::RowsChecksum(), 1567143984>());
 
 }  // namespace
 
-const StatsKey *FindStatsKey(uint32_t id) { return FindRow<1>(kKeys, kRowOfId, id); }
+const KeyRow *FindStatsKey(uint32_t id) { return Table::Find(id); }
 
 }  // namespace morwick

@@ -7,7 +7,7 @@
 namespace morwick {
 
 // The row of the key id, or null for an unknown id.
-const StatsKey *FindStatsKey(uint32_t id);
+const KeyRow *FindStatsKey(uint32_t id);
 
 }  // namespace morwick
 

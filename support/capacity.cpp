@@ -48,7 +48,6 @@ uint64_t roundSig(uint64_t value, uint64_t sig) {
 
 uint32_t GetUserCapacityInGB(uint32_t megabytes) {
   if (megabytes >= 1376256 && megabytes < 1770496) return 1536;
-  if (megabytes == 0) return 0;
-  const auto highestBit = std::bit_width(megabytes);  // counted from 1
+  const auto highestBit = std::bit_width(megabytes);  // counted from 1; 0 for 0
   return static_cast<uint32_t>((uint64_t{1} << highestBit) / 1024);
 }

@@ -36,7 +36,9 @@ void Use(const std::string &way, uint32_t held = 0) {
     for (int time = 0; time < 2; ++time) closeKVRConnection(&record);
     EXPECT_TRUE(record.service == 0 && record.connection == 0 && record.exporter == row);
   }
-  for (NandExporter &exporter : nand_exporters) exporter.service = exporter.connection = 0;
+  for (NandExporter *each = nand_exporters; each->className != nullptr; ++each) {
+    each->service = each->connection = 0;
+  }
   std::cout << (good ? "good, row " : "failed, row ") << row - nand_exporters << "\n";
 }
 

@@ -16,7 +16,7 @@
 namespace {
 
 constexpr auto kFixed = KVRParseSnapshotBuffer;
-constexpr auto kInplace = KVRParseSnapshotBufferWithInplaceParser;
+constexpr auto kDescribed = KVRParseSnapshotBufferWithInplaceParser;
 
 // What a call left behind.
 struct Rendered {
@@ -46,7 +46,7 @@ Rendered Render(const std::string &snapshot, uint64_t capacity, const std::strin
   const uint64_t result =
       header.empty()
           ? kFixed(records.data() + 1, snapshot.size(), output, &size)
-          : kInplace(records.data() + 1, snapshot.size(), output, &size, layout.data() + 1, &state);
+          : kDescribed(records.data() + 1, snapshot.size(), output, &size, layout.data() + 1, &state);
   EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
   return {result, size, capacity == 0 ? "" : output, state};
 }
@@ -92,7 +92,7 @@ std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fiel
   return text.substr(kBanner.size());
 }
 
-TEST(InplaceSnapshotTest, PrintsWhatDescriptorsAskFor) {
+TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
   std::ifstream cases(CASES "/descriptors.txt");
   Fields fields;
   std::string expected;
@@ -114,7 +114,7 @@ TEST(InplaceSnapshotTest, PrintsWhatDescriptorsAskFor) {
 }
 
 // Every conversion that passes the check prints what the C library prints.
-TEST(InplaceSnapshotTest, PrintsNumbersAsPrintfDoes) {
+TEST(DescribedSnapshotTest, PrintsNumbersAsPrintfDoes) {
   std::mt19937 random(1);
   const auto pick = [&](std::string_view from) { return from[random() % from.size()]; };
   for (int round = 0; round < 20000; ++round) {
@@ -162,7 +162,7 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
   return {1, completed.size() + 1, completed, state};
 }
 
-TEST(InplaceSnapshotTest, KeepsTheRulesCallAfterCall) {
+TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
   const std::string records(reinterpret_cast<const char *>(kWords), kSize);
   const std::string legend = Render("", 1338).text;  // no room for the line end behind it
   // What the header says where no record is printed: the numbers and the text, and a table nowhere.
@@ -200,14 +200,14 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   uint32_t state = 7;
   EXPECT_EQ(kFixed(nullptr, 252, output, &size), 0U);
   EXPECT_EQ(kFixed(output, 0, nullptr, &size) + kFixed(output, 0, output, nullptr), 0U);
-  EXPECT_EQ(kInplace(output, 36, nullptr, &size, header.data(), &state), 0U);
-  EXPECT_EQ(kInplace(output, 36, output, nullptr, header.data(), &state), 0U);
-  EXPECT_EQ(kInplace(output, 36, output, &none, header.data(), &state), 0U);
-  EXPECT_EQ(kInplace(output, 36, output, &size, nullptr, &state), 0U);
-  EXPECT_EQ(kInplace(output, 36, output, &size, header.data(), nullptr), 0U);
+  EXPECT_EQ(kDescribed(output, 36, nullptr, &size, header.data(), &state), 0U);
+  EXPECT_EQ(kDescribed(output, 36, output, nullptr, header.data(), &state), 0U);
+  EXPECT_EQ(kDescribed(output, 36, output, &none, header.data(), &state), 0U);
+  EXPECT_EQ(kDescribed(output, 36, output, &size, nullptr, &state), 0U);
+  EXPECT_EQ(kDescribed(output, 36, output, &size, header.data(), nullptr), 0U);
   EXPECT_STREQ(output, "untouched");
   EXPECT_TRUE(size == sizeof output && state == 7);
-  EXPECT_EQ(kInplace(nullptr, 36, output, &size, header.data(), &(state = 0)), 1U);
+  EXPECT_EQ(kDescribed(nullptr, 36, output, &size, header.data(), &(state = 0)), 1U);
   // Of so many records, kept to 32 bits, there is none; nothing may be read.
   EXPECT_EQ(kFixed(nullptr, uint64_t{252} << 32, output, &(size = sizeof output)), 1U);
   EXPECT_EQ(size, 1338U);

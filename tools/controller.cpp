@@ -2,8 +2,6 @@
 
 #include "tools/controller.h"
 
-#include <endian.h>
-
 #include <algorithm>
 #include <array>
 #include <cstdio>
@@ -13,7 +11,6 @@
 namespace tools {
 namespace {
 
-constexpr uint32_t kConnectionType = 0;
 constexpr size_t kFirstRoom = 64 << 10;
 constexpr size_t kMostRoom = 16 << 20;
 
@@ -42,7 +39,7 @@ uint32_t FindService(const NandExporter &row) {
 // Connects and gives the service back; the connection stays open without it.
 int32_t Open(uint32_t service, uint32_t *connection) {
   *connection = 0;
-  const int32_t result = OpenService(service, kConnectionType, connection);
+  const int32_t result = OpenService(service, kNandConnectionType, connection);
   ReleaseObject(service);
   return result;
 }
@@ -115,7 +112,7 @@ std::optional<std::string> Controller::Read(const BufferKind &kind) {
     return std::nullopt;
   }
   const Request request = {
-      .command = htole32((row_->*kind.selectors)()->second), .argument = 0, .reserved = {}};
+      .command = LittleEndian32((row_->*kind.selectors)()->second), .argument = 0, .reserved = {}};
   std::string reply;
   // A reply that fills the room may have been cut: it is asked for again with twice the room.
   for (size_t room = kFirstRoom; room <= kMostRoom; room *= 2) {

@@ -2,7 +2,7 @@
 
 #include "tools/records.h"
 
-#include "tools/little_endian.h"
+#include "morwick/little_endian.h"
 
 namespace tools {
 namespace {
@@ -29,8 +29,10 @@ StatisticsEnd FindEnd(std::string_view stream, std::string_view dump) {
   uint64_t offset = 0;
   while (dump.size() - offset >= format.header) {
     const bool wide = format.header == 8;
-    const uint32_t key = wide ? Load32(dump, offset) : Load16(dump, offset);
-    const uint32_t length = wide ? Load32(dump, offset + 4) : Load16(dump, offset + 2);
+    const uint32_t key =
+        wide ? LoadLittleEndian32(&dump[offset]) : LoadLittleEndian16(&dump[offset]);
+    const uint32_t length =
+        wide ? LoadLittleEndian32(&dump[offset + 4]) : LoadLittleEndian16(&dump[offset + 2]);
     const uint64_t payload = offset + format.header;
     const uint64_t needed = uint64_t{length} * format.unit;
     const uint64_t left = dump.size() - payload;

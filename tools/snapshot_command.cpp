@@ -6,7 +6,6 @@
 
 #include "tools/commands.h"
 #include "tools/controller.h"
-#include "tools/little_endian.h"
 #include "tools/options.h"
 #include "tools/snapshot_columns.h"
 #include "tools/snapshot_header.h"
@@ -75,7 +74,8 @@ Snapshot Prepare(const Options &options) {
   if (snapshot.status != kGood || !snapshot.header) return snapshot;
   std::string wrong = CheckSnapshotHeader(*snapshot.header);
   if (wrong.empty() && (options.format != "normal" || options.summary)) {
-    const uint32_t recordSize = Load32(*snapshot.header, offsetof(SnapshotHeader, recordSize));
+    const uint32_t recordSize =
+        LoadLittleEndian32(&(*snapshot.header)[offsetof(SnapshotHeader, recordSize)]);
     if (recordSize != sizeof(SnapshotRecord)) {
       wrong = "record size " + std::to_string(recordSize) + " is not that of the fixed layout, " +
               std::to_string(sizeof(SnapshotRecord));
@@ -113,7 +113,8 @@ bool PrintCsv(Output &output, SnapshotRecords &records) {
   return ForEachRecord(output, records, [&](std::string_view record) {
     for (const SnapshotColumn &column : kSnapshotColumns) {
       char digits[16];
-      const char *end = std::to_chars(digits, std::end(digits), Load32(record, column.offset)).ptr;
+      const char *end =
+          std::to_chars(digits, std::end(digits), LoadLittleEndian32(&record[column.offset])).ptr;
       output.Write({digits, static_cast<size_t>(end - digits)});
       output.Put(separator(column));
     }
@@ -130,7 +131,7 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
   const bool good = ForEachRecord(output, records, [&](std::string_view record) {
     json.BeginArray();
     for (const SnapshotColumn &column : kSnapshotColumns) {
-      json.Number(Load32(record, column.offset));
+      json.Number(LoadLittleEndian32(&record[column.offset]));
     }
     json.EndArray();
   });
@@ -142,9 +143,10 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
 Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &output, Json *json) {
   if (snapshot.status != kGood) return snapshot.status;
   const bool text = options.format == "normal" && !options.summary;
-  const size_t recordSize = text && snapshot.header
-                                ? Load32(*snapshot.header, offsetof(SnapshotHeader, recordSize))
-                                : sizeof(SnapshotRecord);
+  const size_t recordSize =
+      text && snapshot.header
+          ? LoadLittleEndian32(&(*snapshot.header)[offsetof(SnapshotHeader, recordSize)])
+          : sizeof(SnapshotRecord);
   std::optional<Input> input;
   if (!options.live) input.emplace(options.file);
   size_t taken = 0;

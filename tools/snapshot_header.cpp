@@ -4,14 +4,12 @@
 
 #include <cstddef>
 
+#include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
-#include "tools/little_endian.h"
 
 namespace tools {
 namespace {
 
-constexpr uint32_t kFirstTextVersion = 6;   // the first one whose banner is the header's text
-constexpr uint64_t kDescriptorsOffset = 8;  // in the table, behind the count
 constexpr uint32_t kLargestRecord = 1 << 20;
 
 }  // namespace
@@ -25,19 +23,21 @@ std::string CheckSnapshotHeader(std::string_view file) {
     return "a header of " + std::to_string(file.size()) + " bytes is shorter than " +
            std::to_string(sizeof(SnapshotHeader));
   }
-  const uint32_t recordSize = Load32(file, offsetof(SnapshotHeader, recordSize));
+  const uint32_t recordSize = LoadLittleEndian32(&file[offsetof(SnapshotHeader, recordSize)]);
   if (recordSize == 0 || recordSize > kLargestRecord) {
     return "record size " + std::to_string(recordSize) + " is not between 1 and " +
            std::to_string(kLargestRecord);
   }
-  if (Load32(file, offsetof(SnapshotHeader, formatVersion)) >= kFirstTextVersion &&
+  if (LoadLittleEndian32(&file[offsetof(SnapshotHeader, formatVersion)]) >=
+          kSnapshotFirstTextVersion &&
       file.find('\0', sizeof(SnapshotHeader)) == std::string_view::npos) {
     return "the text at offset " + std::to_string(sizeof(SnapshotHeader)) + " has no end";
   }
-  const uint64_t table = Load32(file, offsetof(SnapshotHeader, descriptorTableOffset));
-  if (table + kDescriptorsOffset > file.size()) return wrong("descriptor table offset", table);
-  const uint32_t count = Load32(file, table);
-  if (table + kDescriptorsOffset + uint64_t{count} * sizeof(SnapshotFieldDescriptor) >
+  const uint64_t table = LoadLittleEndian32(&file[offsetof(SnapshotHeader, descriptorTableOffset)]);
+  if (table + sizeof(SnapshotDescriptorTable) > file.size())
+    return wrong("descriptor table offset", table);
+  const uint32_t count = LoadLittleEndian32(&file[table]);
+  if (table + sizeof(SnapshotDescriptorTable) + uint64_t{count} * sizeof(SnapshotFieldDescriptor) >
       file.size()) {
     return wrong("descriptor count", count);
   }

@@ -7,8 +7,8 @@
 #include <cstddef>
 #include <cstdio>
 
+#include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
-#include "tools/little_endian.h"
 
 namespace tools {
 namespace {
@@ -45,16 +45,16 @@ void Member(Json &json, std::string_view key, std::optional<double> number) {
 
 void SnapshotSummary::Operations::Add(std::string_view record, size_t operations, size_t host,
                                       size_t nand) {
-  const uint32_t timestamp = Load32(record, offsetof(SnapshotRecord, timestamp));
-  hostSectors += Load32(record, host);
-  nandSectors += Load32(record, nand);
+  const uint32_t timestamp = LoadLittleEndian32(&record[offsetof(SnapshotRecord, timestamp)]);
+  hostSectors += LoadLittleEndian32(&record[host]);
+  nandSectors += LoadLittleEndian32(&record[nand]);
   uint64_t operationsHere = 0;
   uint64_t latencyHere = 0;
   for (size_t k = 0; k < kPriorities; ++k) {
     const std::string_view triple = record.substr(operations + k * sizeof(SnapshotOperations));
-    operationsHere += Load32(triple, offsetof(SnapshotOperations, count));
-    latencyHere += Load32(triple, offsetof(SnapshotOperations, totalLatency));
-    const uint32_t most = Load32(triple, offsetof(SnapshotOperations, maxLatency));
+    operationsHere += LoadLittleEndian32(&triple[offsetof(SnapshotOperations, count)]);
+    latencyHere += LoadLittleEndian32(&triple[offsetof(SnapshotOperations, totalLatency)]);
+    const uint32_t most = LoadLittleEndian32(&triple[offsetof(SnapshotOperations, maxLatency)]);
     if (most > 0 && (!maximum || most > maximum->latency)) maximum = {timestamp, double(most)};
   }
   count += operationsHere;

@@ -2,15 +2,13 @@
 
 #include "tools/snapshot_text.h"
 
-#include <endian.h>
-
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
 #include <vector>
 
+#include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
-#include "tools/little_endian.h"
 
 namespace tools {
 namespace {
@@ -27,7 +25,7 @@ class DescribedText {
   DescribedText(Output &output, const std::string &header)
       : output_(output),
         header_(header),
-        recordSize_(Load32(header, offsetof(SnapshotHeader, recordSize))),
+        recordSize_(LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)])),
         text_(kLeastRoom) {}
 
   // Prints the records of a block; in front of it lies room of one record. False when writing has
@@ -66,7 +64,7 @@ class DescribedText {
 
  private:
   void SetRecordCount(uint32_t count) {
-    const uint32_t stored = htole32(count);
+    const uint32_t stored = LittleEndian32(count);
     std::memcpy(&header_[offsetof(SnapshotHeader, recordCount)], &stored, sizeof stored);
   }
 
@@ -109,8 +107,8 @@ bool PrintFixedText(Output &output, SnapshotRecords &records) {
 
 Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::string &header,
                           const std::string &name, const std::string &headerName) {
-  const uint32_t recordSize = Load32(header, offsetof(SnapshotHeader, recordSize));
-  const uint32_t recordCount = Load32(header, offsetof(SnapshotHeader, recordCount));
+  const uint32_t recordSize = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)]);
+  const uint32_t recordCount = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordCount)]);
   const uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
   DescribedText text(output, header);
   Status status = kGood;

@@ -20,6 +20,9 @@
 extern "C" {
 #endif
 
+/* The type of every connection that library and daemon open; OpenService (platform.h) takes it. */
+enum { kNandConnectionType = 0 };
+
 /*
  * What openKVRConnection fills. The record is the caller's, who fills it with zeros before its
  * first use; its handles are closeKVRConnection's.

@@ -70,7 +70,7 @@ typedef struct NandExporter {
  * The rows in search order, then the terminating row. Reading needs no lock; only
  * findNandExporterNew writes to it (two handle fields), and it must not run on two threads at once.
  */
-MORWICK_EXPORT extern NandExporter nand_exporters[4];
+MORWICK_EXPORT extern NandExporter nand_exporters[];
 
 /* The request numbers, initialised statically and never written by the library. */
 MORWICK_EXPORT extern SelectorPair statsSelector;

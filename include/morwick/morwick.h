@@ -8,6 +8,7 @@
 #include "morwick/exporter.h"
 #include "morwick/ftl_stats.h"
 #include "morwick/kvr_stats.h"
+#include "morwick/little_endian.h"
 #include "morwick/msp_stats.h"
 #include "morwick/parser_context.h"
 #include "morwick/platform.h"

@@ -67,20 +67,26 @@ typedef struct SnapshotRecord {
  *     offset                         size     content
  *     0                              36       SnapshotHeader
  *     36                             any      the header text, ended by a NUL
- *     descriptorTableOffset          4        descriptor count
- *     descriptorTableOffset + 4      4        without meaning
+ *     descriptorTableOffset          8        SnapshotDescriptorTable
  *     descriptorTableOffset + 8      28 each  SnapshotFieldDescriptor, in print order
  */
 typedef struct SnapshotHeader {
   uint32_t unused1;
-  uint32_t
-      formatVersion;    /* below 6: the banner is the built-in legend, otherwise the header text */
-  uint32_t recordSize;  /* bytes from one record to the next */
-  uint32_t recordCount; /* the last one is never printed */
+  uint32_t formatVersion; /* decides what the banner is */
+  uint32_t recordSize;    /* bytes from one record to the next */
+  uint32_t recordCount;   /* the last one is never printed */
   uint32_t unused2[2];
   uint32_t descriptorTableOffset;
   uint32_t unused3[2];
 } SnapshotHeader;
+
+/* Below this format version the banner is the built-in legend, from it on the header text. */
+enum { kSnapshotFirstTextVersion = 6 };
+
+typedef struct SnapshotDescriptorTable {
+  uint32_t descriptorCount;
+  uint32_t unused;
+} SnapshotDescriptorTable;
 
 /*
  * One field of a record and how to print it. Kinds: 0 and 1 a 32-bit number; 2 a 32-bit number in
