@@ -27,6 +27,7 @@ int64_t wallClock = 0;  // in milliseconds since 1970; 0 for the real one
 }  // namespace
 
 // Takes the place of the platform's, for the wall clock.
+// NOLINTNEXTLINE(readability-inconsistent-declaration-parameter-name): the C library's are reserved
 extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
   if (clock != CLOCK_REALTIME || wallClock == 0) {
     return static_cast<int>(syscall(SYS_clock_gettime, clock, time));
@@ -36,6 +37,12 @@ extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
 }
 
 namespace {
+
+constexpr int32_t kBadHandle = 0x101;
+constexpr int32_t kBadArgument = 0x102;
+constexpr int32_t kRefused = 0x103;
+constexpr int32_t kDeviceError = 0x104;
+constexpr int32_t kNotOffered = 0x105;
 
 // A file in memory, by its name in the one folder where all of them are.
 std::string File(const std::string &text) {
@@ -54,8 +61,8 @@ uint32_t Find(const char *className = "KVRStorage") {
 
 uint32_t Connect(const char *className = "KVRStorage") {
   const uint32_t service = Find(className);
-  uint32_t connection = 0;
-  EXPECT_NE(OpenService(service, 1, &connection), 0);
+  uint32_t connection = 1;
+  EXPECT_EQ(OpenService(service, 1, &connection), kBadArgument);
   EXPECT_EQ(connection, 0U);
   EXPECT_EQ(OpenService(service, 0, &connection), 0);
   EXPECT_EQ(ReleaseObject(service), 0);
@@ -71,12 +78,11 @@ std::string Read(uint32_t connection, uint32_t method, uint32_t command) {
   return reply;
 }
 
-constexpr int32_t kBadArgument = 0x102;
-constexpr int32_t kDeviceError = 0x104;
-constexpr int32_t kNotOffered = 0x105;
-
 // Each line sends one request; what has gone before it counts. A room of 99 is more than there is.
 TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
+  int fifo[2] = {};
+  ASSERT_EQ(pipe(fifo), 0);
+  ASSERT_EQ(write(fifo[1], "0123456789rest", 14), 14);
   Play(
       "[[controller]]\nclass = 'KVRStorage'\nvanish = [2]\npending = 3\nfail_request = [3]\n"
       "fail_read = [5]\nshort_read = [8, 19]\nmsp = '" +
@@ -84,12 +90,11 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
       "', '" + File("third") + "']\nsnapshot = '" + File("") +
       "'\nsnapshot_header = '/'\n"
       "defects = [\"/no\\n\\u007f\", '" +
-      File("never") + "']\ntelemetry = '/dev/zero'\n");
+      File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
   const uint32_t connection = Connect();
   const std::string none;
   const struct {
-    uint32_t method, command, argument;
-    size_t size, room;
+    uint32_t method, command, argument, size, room;
     int32_t result;
     std::string reply;
     uint32_t beyond = 0;  // in the bytes that are to be 0, from the front or from behind
@@ -126,7 +131,7 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
       {8, 11, 0, 24, 99, kNotOffered, none},
       {8, 15, 0, 24, 99, kDeviceError, none},
       {8, 15, 0, 24, 99, kDeviceError, none},
-      {8, 17, 0, 24, 10, 0, std::string(10, '\0')},
+      {8, 17, 0, 24, 10, 0, "0123456789"},
       {8, 13, 0, 24, 99, 0, "th"},
       {8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
   };
@@ -148,13 +153,14 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
             "platform_tests: '/': Is a directory\n"
             "platform_tests: '/no\\x0a\\x7f': No such file or directory\n"
             "platform_tests: '/no\\x0a\\x7f': No such file or directory\n");
+  std::string rest(99, '\0');
+  EXPECT_EQ(read(fifo[0], rest.data(), rest.size()), 4) << "what there was no room for";
   EXPECT_EQ(CloseService(connection), 0);
   EXPECT_EQ(Find(), 0U) << "the second look-up finds it gone";
 }
 
 TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
-  const std::string scenario = std::getenv("GRELLON_SCENARIO");
-  const std::string examples = scenario.substr(0, scenario.rfind('/')) + "/../../examples/";
+  setenv("GRELLON_SCENARIO", SOURCE "/packaging/scenarios/statistics.toml", 1);
   const uint32_t connection = Connect("VeltoQRN3NVMeController");
   const struct {
     uint32_t command;
@@ -166,7 +172,7 @@ TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
                {145, "snapshot_header.bin"}};
   for (const auto &[command, file] : cases) {
     std::ostringstream dump;
-    dump << std::ifstream(examples + file).rdbuf();
+    dump << std::ifstream(std::string(SOURCE "/examples/") + file).rdbuf();
     EXPECT_EQ(Read(connection, 9, command), dump.str()) << file;
   }
   CloseService(connection);
@@ -178,9 +184,12 @@ std::vector<uint64_t> Values(const ContextNode *node) {
   return values;
 }
 
+struct Statistics {
+  std::vector<uint64_t> ftl, msp;
+};
+
 // What the controller makes of its statistics, through all three parsers.
-void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
-                     std::vector<uint64_t> *mspValues) {
+Statistics CheckStatistics(uint32_t connection) {
   const std::string statistics = Read(connection, 9, 13);
   const std::string mspStatistics = Read(connection, 9, 221);
   const auto size = static_cast<uint32_t>(statistics.size());
@@ -192,11 +201,10 @@ void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
   const uint64_t mspCount =
       KVRMSPParseBufferToCxt(&msp, mspStatistics.data(), mspStatistics.size());
   EXPECT_EQ(GlobalAPIErrorMessage, nullptr) << GlobalAPIErrorMessage;
-  *ftlValues = Values(ftl.valuesHead);
-  *mspValues = Values(msp.valuesHead);
-  EXPECT_EQ(ftlValues->size(), ftlCount);
-  EXPECT_EQ(mspValues->size(), mspCount);
-  EXPECT_EQ(Values(kvr.valuesHead), *ftlValues);
+  Statistics values = {.ftl = Values(ftl.valuesHead), .msp = Values(msp.valuesHead)};
+  EXPECT_EQ(values.ftl.size(), ftlCount);
+  EXPECT_EQ(values.msp.size(), mspCount);
+  EXPECT_EQ(Values(kvr.valuesHead), values.ftl);
   const uint64_t summary[] = {kvr.exportVersion,
                               kvr.numVirtualBlocks,
                               kvr.blocksPerVirtualBlock,
@@ -216,9 +224,12 @@ void CheckStatistics(uint32_t connection, std::vector<uint64_t> *ftlValues,
                               kvr.maxHighEnduranceBlockErases,
                               kvr.readCountHisto[4]};
   EXPECT_EQ(std::count(std::begin(summary), std::end(summary), 0), 0);
+  EXPECT_TRUE(
+      std::is_sorted(std::begin(kvr.readCountHisto), std::end(kvr.readCountHisto), std::greater()));
   KVRReleaseContext(&kvr);
   ReleaseGenericParserCxt(&ftl);
   ReleaseGenericParserCxt(&msp);
+  return values;
 }
 
 // What the controller makes of its snapshot: sensible numbers, and by its header the same lines as
@@ -266,29 +277,32 @@ void CheckSnapshot(uint32_t connection, uint32_t lastSecond) {
 TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
   setenv("GRELLON_SCENARIO", "", 1);  // as if it were unset
   const uint32_t connection = Connect("VeltoQRN3NVMeController");
-  const int64_t powerOn = 1704067200000;
-  std::vector<uint64_t> ftl, msp, ftlBefore, mspBefore;
-  int64_t ageBefore = 0;
-  for (const int64_t time : {int64_t{1}, powerOn + 120'000, powerOn + 120'100, powerOn + 3'599'999,
-                             powerOn + 3'600'000, int64_t{8'000'000'000'000}}) {
-    wallClock = time;
-    const int64_t age = std::max<int64_t>(time - powerOn, 120'000);
-    CheckStatistics(connection, &ftl, &msp);
+  const uint64_t powerOn = 1704067200000;
+  const auto notLess = [](const std::vector<uint64_t> &values,
+                          const std::vector<uint64_t> &before) {
+    return std::equal(values.begin(), values.end(), before.begin(), std::greater_equal());
+  };
+  Statistics before;
+  uint64_t ageBefore = 0;
+  for (const uint64_t time :
+       {uint64_t{1}, powerOn + 120'000, powerOn + 120'100, powerOn + 3'599'999, powerOn + 3'600'000,
+        uint64_t{8'000'000'000'000}}) {
+    wallClock = static_cast<int64_t>(time);
+    const uint64_t age = std::max(time, powerOn + 120'000) - powerOn;
+    Statistics now = CheckStatistics(connection);
     CheckSnapshot(connection, static_cast<uint32_t>(age / 1000));
-    EXPECT_EQ(ftl[9], static_cast<uint64_t>((powerOn + age) / 1000)) << "the calendar time";
-    EXPECT_EQ(ftl[10], static_cast<uint64_t>(age / 3'600'000)) << "the hours";
-    EXPECT_EQ(msp[0], std::min<uint64_t>(900'000 + age / 90, 4294967295));
+    EXPECT_EQ(now.ftl.at(9), (powerOn + age) / 1000) << "the calendar time";
+    EXPECT_EQ(now.ftl.at(10), age / 3'600'000) << "the hours";
+    EXPECT_EQ(now.msp.at(0), std::min<uint64_t>(900'000 + age / 90, 4294967295));
     if (ageBefore != 0) {
-      EXPECT_EQ(ftl != ftlBefore, age > ageBefore);
-      EXPECT_EQ(msp != mspBefore, age > ageBefore);
-      EXPECT_TRUE(std::equal(ftl.begin(), ftl.end(), ftlBefore.begin(), std::greater_equal()));
-      EXPECT_TRUE(std::equal(msp.begin(), msp.end(), mspBefore.begin(), std::greater_equal()));
+      EXPECT_EQ(now.ftl != before.ftl, age > ageBefore);
+      EXPECT_EQ(now.msp != before.msp, age > ageBefore);
+      EXPECT_TRUE(notLess(now.ftl, before.ftl) && notLess(now.msp, before.msp));
     }
-    ftlBefore = ftl;
-    mspBefore = msp;
+    before = std::move(now);
     ageBefore = age;
   }
-  for (const uint32_t command : {13, 221, 22, 145}) {
+  for (const uint32_t command : {13U, 221U, 22U, 145U}) {
     const uint32_t request[6] = {command};
     std::string reply(101, '#');
     size_t size = 99;
@@ -296,7 +310,7 @@ TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
     EXPECT_EQ(size, 99U);
     EXPECT_EQ(reply, Read(connection, 9, command).substr(0, 99) + "##");
   }
-  for (const uint32_t command : {11, 15, 17}) {
+  for (const uint32_t command : {11U, 15U, 17U}) {
     const uint32_t request[6] = {command};
     size_t size = 99;
     EXPECT_EQ(CallStructMethod(connection, 9, request, sizeof request, nullptr, &size),
@@ -307,24 +321,31 @@ TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
 }
 
 TEST(SimulatedPlatformTest, RefusesAndReportsBadHandles) {
-  Play("[[controller]]\nclass = 'KVRStorage'\n");
+  Play("[[controller]]\nclass = 'KVRStorage'\nrefuse_open = [2]\nfail_close = [2]\n");
+  EXPECT_EQ(ServiceMatching(nullptr), nullptr);
+  EXPECT_EQ(GetMatchingService(nullptr), 0U);
   const uint32_t service = Find();
   uint32_t connection = 0;
-  OpenService(service, 0, &connection);
-  ASSERT_NE(connection, 0U);
+  uint32_t second = 1;
+  size_t size = 99;
+  EXPECT_EQ(OpenService(service, 0, &connection), 0);
+  EXPECT_EQ(OpenService(service, 0, &second), kRefused);
+  EXPECT_EQ(second, 0U);
+  EXPECT_EQ(OpenService(service, 0, &second), 0);
   testing::internal::CaptureStderr();
-  EXPECT_NE(CloseService(service), 0);
-  EXPECT_NE(ReleaseObject(connection + 1), 0);
+  EXPECT_EQ(CloseService(service), kBadHandle);
+  EXPECT_EQ(ReleaseObject(second + 1), kBadHandle);
   EXPECT_EQ(CloseService(connection), 0);
-  EXPECT_NE(CloseService(connection), 0);
+  EXPECT_EQ(CloseService(second), kDeviceError);
+  EXPECT_EQ(CloseService(second), kBadHandle);
+  EXPECT_EQ(CallStructMethod(connection, 8, nullptr, 0, nullptr, &size), kBadHandle);
   EXPECT_EQ(ReleaseObject(service), 0);
-  EXPECT_NE(OpenService(service, 0, &connection), 0);
-  EXPECT_NE(CloseService(0), 0);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(),
-            "connection " + std::to_string(service) + " is of another kind\n" + "service " +
-                std::to_string(service + 2) + " is unknown\n" + "connection " +
-                std::to_string(service + 1) + " is already released\n" + "service " +
-                std::to_string(service) + " is already released\n");
+  EXPECT_EQ(OpenService(service, 0, &connection), kBadHandle);
+  EXPECT_EQ(CloseService(0), kBadHandle);
+  EXPECT_EQ(
+      testing::internal::GetCapturedStderr(),
+      "connection 1 is of another kind\nservice 4 is unknown\nconnection 3 is already released\n"
+      "connection 2 is already released\nservice 1 is already released\n");
 }
 
 TEST(SimulatedPlatformTest, ReportsHandlesLeftOpenAtExit) {

@@ -17,7 +17,7 @@ namespace simulated {
 namespace {
 
 constexpr uint64_t kFirstPowerOn = 1704067200;  // 2024, in seconds since 1970
-constexpr uint64_t kHour = 3600 * 1000;         // in milliseconds
+constexpr uint64_t kHour = 3'600'000;           // in milliseconds
 
 // What is known at the first power-on, and what each hour adds. An array is a histogram: each
 // element has half of what the one before it has.
@@ -244,8 +244,9 @@ uint64_t Now() {
   const int64_t now =
       std::chrono::duration_cast<milliseconds>(std::chrono::system_clock::now().time_since_epoch())
           .count();
-  const auto powerOn = static_cast<int64_t>(kFirstPowerOn * 1000);
-  return static_cast<uint64_t>(std::max<int64_t>(now - powerOn, kIntervalCount * 1000));
+  constexpr auto kPowerOn = static_cast<int64_t>(kFirstPowerOn * 1000);
+  constexpr int64_t kIntervals = int64_t{kIntervalCount} * 1000;
+  return static_cast<uint64_t>(std::max(now - kPowerOn, kIntervals));
 }
 
 }  // namespace
