@@ -1,31 +1,32 @@
 # shellcheck shell=bash
-# bash completion for morwick
+# bash completion for morwick. What there is to complete stands in the program's own help.
 
 _morwick() {
-  local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
-  local command=${COMP_WORDS[1]} words=""
-  case $previous in
-    -s | --stream) words="kvr ftl msp" ;;
-    -c | --controller)
-      words="VeltoQRN3NVMeController VeltoEmbeddedNVMeController KVRStorage"
+  local program=$1 current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
+  local command=${COMP_WORDS[1]} help line=""
+  # bash takes --option=value for three words.
+  if [ "$current" = = ]; then
+    current=""
+  elif [ "$previous" = = ]; then
+    previous=${COMP_WORDS[COMP_CWORD - 2]}
+  fi
+  if [ "$COMP_CWORD" -eq 1 ] || [ "$command" = help ]; then
+    help=$("$program" --help)
+    line="{$(sed -n '1,/^Subcommands:/d; s/^  \([a-z]*\).*/\1/p' <<<"$help")}"
+  else
+    help=$("$program" help "$command" 2>/dev/null) || return
+    # The line of the option that wants a value, or else of what comes without one.
+    line=$(grep -E "^  (-.,)?$previous [A-Z]{2}|^  $previous,--[a-z-]+ [A-Z]{2}" <<<"$help") ||
+      line=$(grep -E '^  (FILE|OLD|STREAM)' <<<"$help")
+  fi
+  case $current:$line in
+    -*) mapfile -t COMPREPLY < <(compgen -W "$(grep -oE -- '--[a-z-]+' <<<"$help")" -- "$current") ;;
+    *"{"*"}"*)
+      line=${line#*\{}
+      mapfile -t COMPREPLY < <(compgen -W "$(tr , ' ' <<<"${line%%\}*}")" -- "$current")
       ;;
-    -o | --output-format)
-      [ "$command" = stats ] && words="normal json prometheus" || words="normal csv"
-      ;;
-    *)
-      case $COMP_CWORD:$command in
-        1:*) words="find stats snapshot capacity --help --version" ;;
-        *:stats) words="--stream --controller --output-format --help" ;;
-        *:snapshot) words="--header --output-format --help" ;;
-        *) words="--help" ;;
-      esac
-      if [[ $COMP_CWORD -gt 1 && $current != -* ]]; then
-        mapfile -t COMPREPLY < <(compgen -f -- "$current")
-        return
-      fi
-      ;;
+    *FILE* | *OLD*) mapfile -t COMPREPLY < <(compgen -f -- "$current") && compopt -o filenames ;;
   esac
-  mapfile -t COMPREPLY < <(compgen -W "$words" -- "$current")
 }
 
-complete -o filenames -F _morwick morwick
+complete -F _morwick morwick

@@ -13,7 +13,15 @@ export LD_PRELOAD=
 
 # With pauses a thousand times shorter; the sanitizer would rather be preloaded before them.
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
-morwick() { "$MORWICK" "$@"; }
+# What it prints as JSON is kept, and checked at the end.
+morwick() {
+  case " $* " in *" json "*) ;; *) "$MORWICK" "$@"; return ;; esac
+  "$MORWICK" "$@" >object
+  local status=$?
+  cat object >>objects
+  cat object
+  return $status
+}
 grellon() { "$GRELLON" "$@"; }
 scenario() { printf %b "$1" >scenario.toml && export GRELLON_SCENARIO=scenario.toml; }
 # The 32-bit little-endian numbers, one after the other.
@@ -50,4 +58,11 @@ while IFS= read -r -u 9 line; do
   esac
 done 9<"$session" >played
 [ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
-diff "$session" played && echo "as expected"
+diff "$session" played || exit 1
+[ ! -s objects ] || python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
+import json, jsonschema, sys
+validator = jsonschema.Draft202012Validator(json.load(open(sys.argv[1])))
+for line in open(sys.argv[2]):
+    validator.validate(json.loads(line))
+END
+echo "as expected"

@@ -1,16 +1,64 @@
-// morwick capacity.
+// morwick capacity: advertised capacities.
+
+#include <memory>
 
 #include "morwick/capacity.h"
 #include "tools/commands.h"
+#include "tools/json.h"
+#include "tools/options.h"
+#include "tools/text.h"
 
 namespace tools {
+namespace {
 
-Status CapacityCommand(const std::vector<uint32_t> &megabytes) {
+struct Options {
+  std::vector<uint32_t> megabytes;
+  std::string format;
+};
+
+void PrintJson(Output &output, const Options &options) {
+  Json json(output, "capacity");
+  json.Key("capacities");
+  json.BeginArray();
+  for (const uint32_t megabytes : options.megabytes) {
+    json.BeginObject();
+    json.Member("megabytes", megabytes);
+    json.Member("gigabytes", GetUserCapacityInGB(megabytes));
+    json.EndObject();
+  }
+  json.EndArray();
+  json.Finish(kGood);
+}
+
+Status PrintCapacities(const Options &options) {
   Output output;
-  for (const uint32_t capacity : megabytes) {
-    output.Write(std::to_string(GetUserCapacityInGB(capacity)) + "\n");
+  if (options.format == "json") {
+    PrintJson(output, options);
+  } else {
+    for (const uint32_t megabytes : options.megabytes) {
+      output.Write(std::to_string(GetUserCapacityInGB(megabytes)) + "\n");
+    }
   }
   return output.Finish(kGood);
+}
+
+}  // namespace
+
+void AddCapacity(CLI::App &app, Action *action) {
+  CLI::App *command =
+      app.add_subcommand("capacity", "Print advertised capacities in GB for capacities in MB");
+  const auto options = std::make_shared<Options>();
+  const auto take = [=](const std::vector<std::string> &texts) {
+    for (const std::string &text : texts) {
+      const std::optional<uint64_t> number = ParseNumber(text, UINT32_MAX);
+      if (!number) throw CLI::ValidationError("MB", text + " is no whole number up to 4294967295");
+      options->megabytes.push_back(static_cast<uint32_t>(*number));
+    }
+  };
+  command->add_option_function<std::vector<std::string>>("MB", take, "Capacities in megabytes")
+      ->required();
+  AddFormat(command, &options->format, {"normal", "json"});
+  command->callback([=] { *action = [=] { return PrintCapacities(*options); }; });
 }
 
 }  // namespace tools

@@ -1,34 +1,29 @@
-// The sub-commands of morwick. Each returns the exit status.
+// The sub-commands of morwick, each in a file of its own: one declaration and one entry here.
 #ifndef TOOLS_COMMANDS_H
 #define TOOLS_COMMANDS_H
 
-#include <cstdint>
-#include <string>
-#include <vector>
+#include <CLI/CLI.hpp>
+#include <functional>
 
 #include "tools/io.h"
 
 namespace tools {
 
-// Finds and opens the controller, says what it is and offers, closes it.
-Status FindCommand();
+// What a sub-command does once its options are read; the exit status comes of it.
+using Action = std::function<Status()>;
 
-struct StatsOptions {
-  std::string file;
-  std::string stream;      // kvr, ftl or msp
-  std::string controller;  // class name; the first row of the table when empty
-  std::string format = "normal";
+// Each adds its sub-command and, when that is what was asked for, sets the action.
+void AddFind(CLI::App &app, Action *action);
+void AddStats(CLI::App &app, Action *action);
+void AddDiff(CLI::App &app, Action *action);
+void AddWatch(CLI::App &app, Action *action);
+void AddSnapshot(CLI::App &app, Action *action);
+void AddRead(CLI::App &app, Action *action);
+void AddCapacity(CLI::App &app, Action *action);
+
+constexpr void (*kCommands[])(CLI::App &, Action *) = {
+    AddFind, AddStats, AddDiff, AddWatch, AddSnapshot, AddRead, AddCapacity,
 };
-Status StatsCommand(const StatsOptions &options);
-
-struct SnapshotOptions {
-  std::string file;
-  std::string header;  // the fixed layout when empty
-  std::string format = "normal";
-};
-Status SnapshotCommand(const SnapshotOptions &options);
-
-Status CapacityCommand(const std::vector<uint32_t> &megabytes);
 
 }  // namespace tools
 

@@ -1,49 +1,92 @@
-// morwick find.
+// morwick find: which controllers there are and what they offer.
 
-#include <unistd.h>
+#include <memory>
 
-#include <cstdio>
-
-#include "morwick/morwick.h"
 #include "tools/commands.h"
+#include "tools/controller.h"
+#include "tools/json.h"
+#include "tools/options.h"
 
 namespace tools {
 namespace {
 
-// Sends standard output to standard error while it lives: what the library prints on the way to a
-// connection is not the data that was asked for.
-class OutputAside {
- public:
-  OutputAside() : output_(dup(STDOUT_FILENO)) { dup2(STDERR_FILENO, STDOUT_FILENO); }
-  ~OutputAside() {
-    std::fflush(stdout);
-    dup2(output_, STDOUT_FILENO);
-    close(output_);
-  }
-  OutputAside(const OutputAside &) = delete;
-  OutputAside &operator=(const OutputAside &) = delete;
+struct Finding {
+  const NandExporter *row;
+  Presence presence;
 
- private:
-  int output_;
+  std::string_view State() const {
+    return !presence.present ? "absent" : presence.opened ? "present" : "refusing";
+  }
 };
+
+// One line a class, the states below each other.
+void PrintNormal(Output &output, const std::vector<Finding> &findings) {
+  size_t width = 0;
+  for (const Finding &finding : findings) {
+    width = std::max(width, std::string_view(finding.row->className).size());
+  }
+  for (const Finding &finding : findings) {
+    std::string line = finding.row->className;
+    line.resize(width, ' ');
+    line += " : " + std::string(finding.State());
+    if (finding.presence.present && !finding.presence.opened) {
+      line += ", result " + Hexadecimal(finding.presence.result);
+    }
+    line += ", offers";
+    for (const BufferKind &kind : BufferKinds()) {
+      if (finding.row->*kind.selectors != nullptr) line += " " + std::string(kind.name);
+    }
+    output.Write(line + "\n");
+  }
+}
+
+void PrintJson(Output &output, const std::vector<Finding> &findings, Status status) {
+  Json json(output, "find");
+  json.Key("controllers");
+  json.BeginArray();
+  for (const Finding &finding : findings) {
+    json.BeginObject();
+    json.Member("class", finding.row->className);
+    json.Member("state", finding.State());
+    if (finding.presence.present) {
+      json.Member("result", static_cast<uint32_t>(finding.presence.result));
+    }
+    json.Key("offers");
+    json.BeginArray();
+    for (const BufferKind &kind : BufferKinds()) {
+      if (finding.row->*kind.selectors != nullptr) json.PlainText(kind.name);
+    }
+    json.EndArray();
+    json.EndObject();
+  }
+  json.EndArray();
+  json.Finish(status);
+}
+
+Status Find(const std::string &format) {
+  std::vector<Finding> findings;
+  Status status = kBadData;
+  for (const NandExporter &row : KnownControllers()) {
+    findings.push_back({&row, Probe(row)});
+    if (findings.back().presence.opened) status = kGood;
+  }
+  Output output;
+  if (format == "json") {
+    PrintJson(output, findings, status);
+  } else {
+    PrintNormal(output, findings);
+  }
+  return output.Finish(status);
+}
 
 }  // namespace
 
-Status FindCommand() {
-  KVRConnection connection = {};
-  {
-    const OutputAside aside;
-    if (openKVRConnection(&connection) == 0) return kBadData;  // the library has said why
-  }
-  const NandExporter &row = *connection.exporter;
-  std::string text = "controller : " + std::string(row.className) + "\nstatistics :";
-  if (row.parseBufferToCxt != nullptr) text += " kvr";
-  if (row.ftlParseBufferToCxt != nullptr) text += " ftl";
-  if (row.mspParseBufferToCxt != nullptr) text += " msp";
-  closeKVRConnection(&connection);
-  Output output;
-  output.Write(text + "\n");
-  return output.Finish(kGood);
+void AddFind(CLI::App &app, Action *action) {
+  CLI::App *command =
+      app.add_subcommand("find", "Say which controllers there are and what they offer");
+  const auto format = std::make_shared<std::string>();
+  AddFormat(command, format.get(), {"normal", "json"});
+  command->callback([=] { *action = [=] { return Find(*format); }; });
 }
 
 }  // namespace tools

@@ -3,122 +3,232 @@
 #include "tools/io.h"
 
 #include <fcntl.h>
+#include <poll.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <chrono>
+#include <csignal>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
+#include <filesystem>
+
+#include "tools/text.h"
 
 namespace tools {
 namespace {
 
-constexpr size_t kBlockSize = 1 << 20;
+constexpr size_t kBlockSize = 64 << 10;
+constexpr rlim_t kMemoryLimit = 1 << 30;
 
-// Closes what it opened, and not standard input.
-class InputFile {
- public:
-  explicit InputFile(const std::string &file)
-      : descriptor_(file == "-" ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC)) {}
-  ~InputFile() {
-    if (descriptor_ > STDIN_FILENO) close(descriptor_);
+int outputDescriptor = STDOUT_FILENO;
+std::vector<Message> messages;
+
+// True when it is worth trying again what failed with errno.
+bool CanTryAgain(int descriptor, short events) {
+  if (errno == EINTR) return true;
+  if (errno != EAGAIN && errno != EWOULDBLOCK) return false;
+  pollfd wait = {descriptor, events, 0};  // somebody made it non-blocking
+  return poll(&wait, 1, -1) > 0 || errno == EINTR;
+}
+
+// Writes everything, or returns what went wrong.
+int WriteAll(int descriptor, std::string_view bytes) {
+  while (!bytes.empty()) {
+    const ssize_t count = write(descriptor, bytes.data(), bytes.size());
+    if (count >= 0) {
+      bytes.remove_prefix(static_cast<size_t>(count));
+    } else if (!CanTryAgain(descriptor, POLLOUT)) {
+      return errno;
+    }
   }
-  InputFile(const InputFile &) = delete;
-  InputFile &operator=(const InputFile &) = delete;
+  return 0;
+}
 
-  int descriptor() const { return descriptor_; }
+void Say(const char *severity, const std::string &subject, const std::string &reason) {
+  messages.push_back({severity, subject + ": " + reason});
+  PrintLine(messages.back().text);
+}
 
-  // Of a regular file; 0 where it cannot be known.
-  uint64_t Size() const {
-    struct stat status = {};
-    const bool regular = fstat(descriptor_, &status) == 0 && S_ISREG(status.st_mode);
-    return regular ? static_cast<uint64_t>(status.st_size) : 0;
-  }
-
- private:
-  int descriptor_;
-};
-
-// A line on the terminal that is written over again and again, from the first second on.
-class Progress {
- public:
-  Progress(const std::string &file, uint64_t size) : name_(DisplayName(file)), size_(size) {}
-  ~Progress() {
-    if (shown_) std::fputs("\r\033[K", stderr);
-  }
-  Progress(const Progress &) = delete;
-  Progress &operator=(const Progress &) = delete;
-
-  void Show(uint64_t read) {
-    const auto now = std::chrono::steady_clock::now();
-    if (now < next_ || !terminal_) return;
-    next_ = now + std::chrono::milliseconds(200);
-    shown_ = true;
-    const std::string total = size_ == 0 ? "" : " of " + std::to_string(size_ >> 10);
-    std::fprintf(stderr, "\rmorwick: %s: %llu%s KiB read", name_.c_str(),
-                 static_cast<unsigned long long>(read >> 10), total.c_str());
-  }
-
- private:
-  std::string name_;
-  uint64_t size_;
-  bool terminal_ = isatty(STDERR_FILENO) != 0;
-  bool shown_ = false;
-  std::chrono::steady_clock::time_point next_ =
-      std::chrono::steady_clock::now() + std::chrono::seconds(1);
-};
+int64_t MillisecondsNow() {
+  using std::chrono::steady_clock;
+  return std::chrono::duration_cast<std::chrono::milliseconds>(
+             steady_clock::now().time_since_epoch())
+      .count();
+}
 
 }  // namespace
 
-void Complain(const std::string &subject, const std::string &reason) {
-  std::fprintf(stderr, "morwick: %s: %s\n", subject.c_str(), reason.c_str());
+void PrepareStreams() {
+  // Reading only: a write to a stream that was closed still fails.
+  int descriptor = 0;
+  do {
+    descriptor = open("/dev/null", O_RDONLY);
+  } while (descriptor >= 0 && descriptor <= STDERR_FILENO);
+  if (descriptor >= 0) close(descriptor);
+
+  outputDescriptor = fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+  dup2(STDERR_FILENO, STDOUT_FILENO);
+  std::setvbuf(stdout, nullptr, _IONBF, 0);
+  std::signal(SIGPIPE, SIG_IGN);
 }
+
+void LimitMemory() {
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)  // these need all there is
+  rlimit limit = {};
+  if (getrlimit(RLIMIT_AS, &limit) != 0 || limit.rlim_cur <= kMemoryLimit) return;
+  limit.rlim_cur = kMemoryLimit;
+  setrlimit(RLIMIT_AS, &limit);
+#endif
+}
+
+void PrintLine(const std::string &text) {
+  const bool terminal = isatty(STDERR_FILENO) != 0;
+  std::fprintf(stderr, "morwick: %s\n", terminal ? Printable(text).c_str() : text.c_str());
+}
+
+void Complain(const std::string &subject, const std::string &reason) {
+  Say("error", subject, reason);
+}
+
+void Note(const std::string &subject, const std::string &reason) { Say("note", subject, reason); }
+
+const std::vector<Message> &Messages() { return messages; }
+
+void ForgetMessages() { messages.clear(); }
 
 std::string DisplayName(const std::string &file) { return file == "-" ? "standard input" : file; }
 
-std::optional<std::string> ReadInput(const std::string &file, uint64_t limit) {
-  const InputFile input(file);
-  const auto fail = [&](const std::string &reason) {
-    Complain(DisplayName(file), reason);
-    return std::nullopt;
-  };
-  const std::string tooLarge = "larger than " + std::to_string(limit) + " bytes";
-  if (input.descriptor() < 0) return fail(std::strerror(errno));
-  if (input.Size() > limit) return fail(tooLarge);
-
-  std::string bytes;
-  ssize_t count = 1;
-  std::optional<int> error;
-  {
-    Progress progress(file, input.Size());
-    while (count > 0 && bytes.size() <= limit) {
-      const size_t size = bytes.size();
-      bytes.resize(size + kBlockSize);
-      do {
-        count = read(input.descriptor(), bytes.data() + size, kBlockSize);
-      } while (count < 0 && errno == EINTR);
-      if (count < 0) error = errno;
-      bytes.resize(size + static_cast<size_t>(count > 0 ? count : 0));
-      progress.Show(bytes.size());
-    }
+Input::Input(const std::string &file)
+    : name_(DisplayName(file)),
+      descriptor_(file == "-" ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC)) {
+  if (descriptor_ < 0) error_ = errno;
+  if (isatty(STDERR_FILENO) != 0) nextProgress_ = MillisecondsNow() + 1000;
+  struct stat status = {};
+  if (fstat(descriptor_, &status) == 0 && S_ISREG(status.st_mode)) {
+    size_ = static_cast<uint64_t>(status.st_size);
   }
-  if (error) return fail(std::strerror(*error));
-  if (bytes.size() > limit) return fail(tooLarge);
-  return bytes;
 }
 
-bool Output::Write(std::string_view text) {
-  if (error_ == 0 && std::fwrite(text.data(), 1, text.size(), stdout) != text.size())
-    error_ = errno;
+Input::~Input() {
+  ClearProgress();
+  if (descriptor_ > STDIN_FILENO) close(descriptor_);
+}
+
+std::optional<size_t> Input::Read(char *bytes, size_t room) {
+  while (error_ == 0) {
+    const ssize_t count = read(descriptor_, bytes, room);
+    if (count >= 0) {
+      read_ += static_cast<size_t>(count);
+      ShowProgress();
+      return static_cast<size_t>(count);
+    }
+    if (!CanTryAgain(descriptor_, POLLIN)) error_ = errno;
+  }
+  Refuse(std::strerror(error_));
+  return std::nullopt;
+}
+
+void Input::Refuse(const std::string &reason) {
+  ClearProgress();
+  Complain(name_, reason);
+}
+
+// A line on the terminal that is written over again and again.
+void Input::ShowProgress() {
+  if (nextProgress_ == INT64_MAX || MillisecondsNow() < nextProgress_) return;
+  nextProgress_ = MillisecondsNow() + 200;
+  progressShown_ = true;
+  const std::string total = size_ == 0 ? "" : " of " + std::to_string(size_ >> 10);
+  std::fprintf(stderr, "\rmorwick: %s: %llu%s KiB read", Printable(name_).c_str(),
+               static_cast<unsigned long long>(read_ >> 10), total.c_str());
+}
+
+void Input::ClearProgress() {
+  if (progressShown_) std::fputs("\r\033[K", stderr);
+  progressShown_ = false;
+}
+
+std::optional<std::string> ReadInput(const std::string &file, uint64_t limit) {
+  Input input(file);
+  std::string bytes;
+  for (uint64_t length = input.size(); length <= limit; length = bytes.size()) {
+    const size_t size = bytes.size();
+    bytes.resize(size + kBlockSize);
+    const std::optional<size_t> count = input.Read(bytes.data() + size, kBlockSize);
+    if (!count) return std::nullopt;
+    bytes.resize(size + *count);
+    if (*count == 0) return bytes;
+  }
+  input.Refuse("larger than " + std::to_string(limit) + " bytes");
+  return std::nullopt;
+}
+
+bool WriteFile(const std::string &file, std::string_view bytes) {
+  const auto fail = [&](int error) {
+    Complain(file, std::strerror(error));
+    return false;
+  };
+  std::error_code failure;
+  const std::filesystem::path target = std::filesystem::weakly_canonical(file, failure);
+  if (failure) return fail(failure.value());
+  const auto type = std::filesystem::status(target, failure).type();
+  if (type != std::filesystem::file_type::regular &&
+      type != std::filesystem::file_type::not_found) {
+    const int descriptor = open(file.c_str(), O_WRONLY | O_CLOEXEC);
+    if (descriptor < 0) return fail(errno);
+    const int error = WriteAll(descriptor, bytes);
+    close(descriptor);
+    return error == 0 || fail(error);
+  }
+
+  std::string beside = target.string() + ".XXXXXX";
+  const int descriptor = mkostemp(beside.data(), O_CLOEXEC);
+  if (descriptor < 0) return fail(errno);
+  const mode_t mask = umask(0);
+  umask(mask);
+  int error = WriteAll(descriptor, bytes);
+  if (error == 0 && fchmod(descriptor, 0666 & ~mask) != 0) error = errno;
+  if (error == 0 && fsync(descriptor) != 0) error = errno;
+  if (close(descriptor) != 0 && error == 0) error = errno;
+  if (error == 0 && rename(beside.c_str(), target.c_str()) != 0) error = errno;
+  if (error == 0) return true;
+  unlink(beside.c_str());
+  return fail(error);
+}
+
+Output::Output() : terminal_(OutputIsTerminal()) {}
+
+bool Output::Flush() {
+  const size_t length = length_;
+  length_ = 0;
+  return WriteOut({buffer_, length});
+}
+
+bool Output::WriteRoundTheBuffer(std::string_view text) {
+  return Flush() && (text.size() > kRoom ? WriteOut(text) : Write(text));
+}
+
+bool Output::WriteOut(std::string_view bytes) {
+  if (error_ != 0) return false;
+  error_ =
+      terminal_ ? WriteAll(outputDescriptor, Printable(bytes)) : WriteAll(outputDescriptor, bytes);
   return error_ == 0;
 }
 
 Status Output::Finish(Status status) {
-  if (std::fflush(stdout) != 0 && error_ == 0) error_ = errno;
-  if (error_ == 0) return status;
+  if (Flush()) return status;
+  if (error_ == EPIPE) {
+    std::signal(SIGPIPE, SIG_DFL);
+    std::raise(SIGPIPE);
+  }
   Complain("standard output", std::strerror(error_));
   return kBadData;
 }
+
+bool OutputIsTerminal() { return isatty(outputDescriptor) != 0; }
 
 }  // namespace tools

@@ -1,83 +1,100 @@
 // morwick: the command for people and scripts that work with controller statistics.
 
 #include <CLI/CLI.hpp>
-#include <csignal>
-#include <exception>
-#include <sstream>
+#include <memory>
+#include <new>
 
 #include "tools/commands.h"
 
+namespace tools {
 namespace {
 
-using tools::Status;
+bool memoryRefused = false;
 
-void AddFormat(CLI::App *command, std::string *format, const std::vector<std::string> &choices) {
-  command->add_option("-o,--output-format", *format, "How to print")
-      ->check(CLI::IsMember(choices))
-      ->capture_default_str();
+// Streams swallow the exception, and what they print is cut: at the end it is known all the same.
+void RefuseMemory() {
+  memoryRefused = true;
+  throw std::bad_alloc();
+}
+
+Status Print(const std::string &text) {
+  Output output;
+  output.Write(text);
+  return output.Finish(kGood);
+}
+
+Status RefuseUsage(const std::string &reason) {
+  PrintLine(reason + " (see morwick --help)");
+  return kBadUsage;
+}
+
+const CLI::App *FindCommand(const CLI::App &app, const std::string &name) {
+  for (const CLI::App *command : app.get_subcommands({})) {
+    if (command->get_name() == name) return command;
+  }
+  return nullptr;
+}
+
+std::string KnownCommands(const CLI::App &app) {
+  std::string known;
+  for (const CLI::App *command : app.get_subcommands({})) {
+    known += (known.empty() ? "" : ", ") + command->get_name();
+  }
+  return known;
+}
+
+// morwick help [COMMAND]
+void AddHelp(CLI::App &app, Action *action) {
+  CLI::App *help = app.add_subcommand("help", "Say what a sub-command does and takes");
+  const auto name = std::make_shared<std::string>();
+  help->add_option("COMMAND", *name, "The sub-command");
+  help->callback([=, &app] {
+    const CLI::App *subject = name->empty() ? help->get_parent() : FindCommand(app, *name);
+    if (subject == nullptr) throw CLI::ValidationError(*name, "not one of " + KnownCommands(app));
+    *action = [=] { return Print(subject->help(name->empty() ? "" : "morwick")); };
+  });
 }
 
 Status Run(int argc, char **argv) {
   CLI::App app("Finds storage controllers and turns what they report into text.", "morwick");
-  app.set_version_flag("--version", "morwick " MORWICK_VERSION);
+  app.set_version_flag("--version",
+                       "morwick " MORWICK_VERSION " (platform " MORWICK_PLATFORM_NAME ")");
   app.require_subcommand(1);
+  Action action;
+  for (const auto add : kCommands) add(app, &action);
+  AddHelp(app, &action);
 
-  const CLI::App *find =
-      app.add_subcommand("find", "Find the controller and say which statistics it offers");
-
-  CLI::App *stats = app.add_subcommand("stats", "Print the statistics in a dump");
-  tools::StatsOptions statsOptions;
-  stats->add_option("FILE", statsOptions.file, "The dump; - for standard input")->required();
-  stats->add_option("-s,--stream", statsOptions.stream, "Which statistics the dump holds")
-      ->check(CLI::IsMember({"kvr", "ftl", "msp"}))
-      ->required();
-  stats->add_option("-c,--controller", statsOptions.controller,
-                    "Class of the controller that it was read from (the first one known)");
-  AddFormat(stats, &statsOptions.format, {"normal", "json", "prometheus"});
-
-  CLI::App *snapshot = app.add_subcommand("snapshot", "Print a snapshot, one line an interval");
-  tools::SnapshotOptions snapshotOptions;
-  snapshot->add_option("FILE", snapshotOptions.file, "The snapshot; - for standard input")
-      ->required();
-  CLI::Option *header = snapshot->add_option("--header", snapshotOptions.header,
-                                             "The snapshot header that describes its layout");
-  AddFormat(snapshot, &snapshotOptions.format, {"normal", "csv"});
-
-  CLI::App *capacity =
-      app.add_subcommand("capacity", "Print advertised capacities in GB for capacities in MB");
-  std::vector<uint32_t> megabytes;
-  capacity->add_option("MB", megabytes, "Capacities in megabytes")->required();
-
+  const std::string first = argc > 1 ? argv[1] : "";
+  if (!first.starts_with('-') && FindCommand(app, first) == nullptr) {
+    return RefuseUsage((first.empty() ? "a sub-command is needed, one of "
+                                      : "'" + first + "' is no sub-command, those are ") +
+                       KnownCommands(app));
+  }
   try {
     app.parse(argc, argv);
-    if (header->count() > 0 && snapshotOptions.format == "csv") {
-      throw CLI::ValidationError("--header", "csv is for the fixed layout only");
-    }
-  } catch (const CLI::Success &success) {  // --help, --version
-    std::ostringstream text;
-    app.exit(success, text);
-    tools::Output output;
-    output.Write(text.str());
-    return output.Finish(tools::kGood);
+  } catch (const CLI::CallForHelp &) {
+    return Print(app.help());
+  } catch (const CLI::CallForVersion &version) {
+    return Print(version.what() + std::string("\n"));
   } catch (const CLI::Error &error) {
-    std::fprintf(stderr, "morwick: %s (see morwick --help)\n", error.what());
-    return tools::kBadUsage;
+    return RefuseUsage(error.what());
   }
-
-  if (find->parsed()) return tools::FindCommand();
-  if (stats->parsed()) return tools::StatsCommand(statsOptions);
-  if (snapshot->parsed()) return tools::SnapshotCommand(snapshotOptions);
-  return tools::CapacityCommand(megabytes);
+  return action();
 }
 
 }  // namespace
+}  // namespace tools
 
 int main(int argc, char **argv) {
-  std::signal(SIGPIPE, SIG_IGN);  // a closed pipe is an error like any other
+  tools::PrepareStreams();
+  tools::LimitMemory();
+  std::set_new_handler(tools::RefuseMemory);
+  tools::Status status = tools::kBadData;
   try {
-    return Run(argc, argv);
-  } catch (const std::exception &error) {  // out of memory, before all
-    std::fprintf(stderr, "morwick: %s\n", error.what());
-    return tools::kBadUsage;
+    status = tools::Run(argc, argv);
+  } catch (const std::bad_alloc &) {
   }
+  if (!tools::memoryRefused) return status;
+  std::fputs("morwick: out of memory\n", stderr);
+  return tools::kBadData;
 }

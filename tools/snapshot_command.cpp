@@ -1,161 +1,233 @@
-// morwick snapshot: prints a snapshot as the library's text or as CSV.
+// morwick snapshot: prints a snapshot as the library's text, as CSV or JSON, or what it says as a
+// whole.
 
-#include <algorithm>
+#include <charconv>
+#include <memory>
 
-#include "morwick/morwick.h"
 #include "tools/commands.h"
+#include "tools/controller.h"
+#include "tools/little_endian.h"
+#include "tools/options.h"
+#include "tools/snapshot_columns.h"
 #include "tools/snapshot_header.h"
-#include "tools/words.h"
+#include "tools/snapshot_records.h"
+#include "tools/snapshot_summary.h"
+#include "tools/snapshot_text.h"
 
 namespace tools {
 namespace {
 
-// Snapshots go through buffers of fixed size, however long they are.
-constexpr uint64_t kRecordsAtOnce = 1000;
-constexpr uint64_t kTextRoom = 2048 + kRecordsAtOnce * 1024;  // legend and longest lines
-constexpr size_t kBufferSize = 64 << 10;
+constexpr uint64_t kLargestHeader = 1 << 20;
 
-uint64_t RecordCount(const std::string &snapshot) {
-  return snapshot.size() / sizeof(SnapshotRecord);
-}
+struct Options {
+  std::string file;
+  bool live = true;
+  std::string header;
+  bool described = false;  // by the file `header`
+  bool fixed = false;
+  std::string className;
+  std::string format;
+  bool summary = false;
+};
 
-// The library's text of some records: legend, lines and an empty line.
-std::string Render(const char *records, uint64_t size) {
-  std::string text(kTextRoom, '\0');
-  uint64_t length = text.size();
-  if (KVRParseSnapshotBuffer(records, size, text.data(), &length) == 0) length = 0;
-  text.resize(length);
-  return text;
-}
-
-// The text of the whole, put together from parts: the legend only once, the empty line at the end.
-void PrintFixed(Output &output, const std::string &snapshot) {
-  std::string legend = Render(nullptr, 0);
-  legend.pop_back();
-  output.Write(legend);
-  for (uint64_t first = 0; first < RecordCount(snapshot); first += kRecordsAtOnce) {
-    const uint64_t count = std::min(kRecordsAtOnce, RecordCount(snapshot) - first);
-    std::string text =
-        Render(snapshot.data() + first * sizeof(SnapshotRecord), count * sizeof(SnapshotRecord));
-    text.pop_back();
-    if (!output.Write(std::string_view(text).substr(legend.size()))) return;
-  }
-  output.Write("\n");
-}
-
-std::string Milliseconds(uint32_t microseconds) {
-  const std::string hundredths = std::to_string(microseconds % 1000 / 10);
-  return std::to_string(microseconds / 1000) + (hundredths.size() < 2 ? ".0" : ".") + hundredths;
-}
-
-constexpr char kCsvHeader[] =
-    "T,E,HR,HW,NR,NW,TH,GC,W,BI,BU,V,BF_fragments,BF_high_water,P,H_normal,H_extreme,"
-    "X_succeeded,X_failed,L_age,L_interval,C_min,C_max,S,U,"
-    "RO_0,RO_1,RO_2,RO_3,RL_0,RL_1,RL_2,RL_3,RM_0,RM_1,RM_2,RM_3,"
-    "WO_0,WO_1,WO_2,WO_3,WL_0,WL_1,WL_2,WL_3,WM_0,WM_1,WM_2,WM_3\n";
-
-// One row, its fields in the order of the header row.
-std::string CsvRow(const SnapshotRecord &record) {
-  const uint32_t beforeTime[] = {record.timestamp,  record.erasedBands, record.hostReads,
-                                 record.hostWrites, record.nandReads,   record.nandWrites};
-  const uint32_t behindTime[] = {
-      record.collectedSectors, record.wearLevelBands,     record.intermediatePendingErase,
-      record.userPendingErase, record.freeNodes,          record.bufferFragments,
-      record.bufferHighWater,  record.preemptPercent,     record.qosDelaysNormal,
-      record.qosDelaysExtreme, record.expeditesSucceeded, record.expeditesFailed,
-      record.oldestCommandAge, record.qosInterval,        record.commandTagsMin,
-      record.commandTagsMax,   record.freeSegments,       record.hostUnmaps};
-  std::string row;
-  for (const uint32_t value : beforeTime) row += std::to_string(value) + ",";
-  row += Milliseconds(record.hysteresisTime);
-  for (const uint32_t value : behindTime) row += "," + std::to_string(value);
-  for (const auto *operations : {record.reads, record.writes}) {
-    for (const auto part : {&SnapshotOperations::count, &SnapshotOperations::totalLatency,
-                            &SnapshotOperations::maxLatency}) {
-      for (int k = 0; k < 4; ++k) row += "," + std::to_string(operations[k].*part);
-    }
-  }
-  return row + "\n";
-}
-
-void PrintCsv(Output &output, const std::string &snapshot) {
-  output.Write(kCsvHeader);
-  for (uint64_t i = 0; i < RecordCount(snapshot); ++i) {
-    const auto bytes = std::string_view(snapshot).substr(i * sizeof(SnapshotRecord));
-    if (!output.Write(CsvRow(ReadWords<SnapshotRecord>(bytes)))) return;
-  }
-}
-
-Status FixedLayout(const SnapshotOptions &options, const std::string &snapshot) {
-  Output output;
-  if (options.format == "csv") {
-    PrintCsv(output, snapshot);
-  } else {
-    PrintFixed(output, snapshot);
-  }
-  const uint64_t rest = snapshot.size() % sizeof(SnapshotRecord);
-  if (rest == 0) return output.Finish(kGood);
-  Complain(DisplayName(options.file),
-           "the last " + std::to_string(rest) + " bytes are not a whole record");
-  return output.Finish(kBadData);
-}
-
-Status DescribedLayout(const SnapshotOptions &options, const std::string &snapshot,
-                       const std::string &header) {
-  const std::string name = DisplayName(options.file);
-  const uint32_t recordCount = ReadWords<SnapshotHeader>(header).recordCount;
-  const uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
-  Output output;
+// A snapshot that is about to be printed.
+struct Snapshot {
+  Source source;
+  std::string name;                   // in complaints
+  std::optional<std::string> header;  // none: the fixed layout
+  std::string headerName;
+  std::string bytes;  // of a controller
   Status status = kGood;
-  std::string buffer(kBufferSize, '\0');
-  uint32_t state = 0;
-  for (bool done = false; !done;) {
-    const uint32_t start = state;
-    uint64_t size = buffer.size();
-    done = KVRParseSnapshotBufferWithInplaceParser(snapshot.data(), snapshot.size(), buffer.data(),
-                                                   &size, header.data(), &state) == 1;
-    if (!output.Write({buffer.data(), size - 1})) break;
-    if (done) break;
-    if (state == start) {
-      Complain(DisplayName(options.header), "the text does not fit a buffer of 64 KiB");
-      return output.Finish(kBadData);
-    }
-    // The buffer was full at a record and passed it over: once more, with the buffer to itself.
-    if (size > 1) {
-      --state;
-    } else {
-      Complain(name, "record " + std::to_string(state - 1) + " does not fit a buffer of 64 KiB");
-      status = kBadData;
+};
+
+// Reads snapshot and header through one connection.
+void ReadLive(const Options &options, Snapshot *snapshot) {
+  const BufferKind &snapshotKind = *FindBufferKind("snapshot");
+  const BufferKind &headerKind = *FindBufferKind("snapshot_header");
+  Controller controller(options.className, std::string(snapshotKind.name));
+  snapshot->source.kind = "controller";
+  snapshot->source.name = controller.row() == nullptr ? options.className : controller.name();
+  snapshot->name = controller.name() + ": " + std::string(snapshotKind.name);
+  snapshot->headerName = controller.name() + ": " + std::string(headerKind.name);
+  snapshot->status = kBadData;
+  if (!controller.connected()) return;
+  if (!options.described && !options.fixed && controller.Offers(headerKind)) {
+    snapshot->header = controller.Read(headerKind);
+    if (!snapshot->header) return;
+  }
+  std::optional<std::string> bytes = controller.Read(snapshotKind);
+  if (!bytes) return;
+  snapshot->bytes = std::move(*bytes);
+  snapshot->status = kGood;
+}
+
+// Everything but the records of a file.
+Snapshot Prepare(const Options &options) {
+  Snapshot snapshot;
+  snapshot.source = {"file", options.file};
+  snapshot.name = DisplayName(options.file);
+  if (options.live) ReadLive(options, &snapshot);
+  if (snapshot.status == kGood && options.described) {
+    snapshot.headerName = DisplayName(options.header);
+    snapshot.header = ReadInput(options.header, kLargestHeader);
+    if (!snapshot.header) snapshot.status = kBadUsage;
+  }
+  if (snapshot.status != kGood || !snapshot.header) return snapshot;
+  std::string wrong = CheckSnapshotHeader(*snapshot.header);
+  if (wrong.empty() && (options.format != "normal" || options.summary)) {
+    const uint32_t recordSize = Load32(*snapshot.header, offsetof(SnapshotHeader, recordSize));
+    if (recordSize != sizeof(SnapshotRecord)) {
+      wrong = "record size " + std::to_string(recordSize) + " is not that of the fixed layout, " +
+              std::to_string(sizeof(SnapshotRecord));
     }
   }
-  if (status == kGood && state < last) {
-    Complain(name, "ends after " + std::to_string(state) + " of " + std::to_string(last) +
-                       " records that the header promises");
+  if (!wrong.empty()) {
+    Complain(snapshot.headerName, wrong);
+    snapshot.status = kBadData;
+  }
+  return snapshot;
+}
+
+// Calls `print` with each record until it returns false; false when reading has failed.
+template <typename PrintRecord>
+bool ForEachRecord(Output &output, SnapshotRecords &records, PrintRecord print) {
+  for (;;) {
+    const auto block = records.Next();
+    if (!block) return false;
+    if (block->empty()) return true;
+    for (size_t at = 0; at < block->size(); at += sizeof(SnapshotRecord)) {
+      print(block->substr(at, sizeof(SnapshotRecord)));
+    }
+    if (!output.Flush()) return true;
+  }
+}
+
+bool PrintCsv(Output &output, SnapshotRecords &records) {
+  const auto separator = [](const SnapshotColumn &column) {
+    return &column == &*std::rbegin(kSnapshotColumns) ? '\n' : ',';
+  };
+  for (const SnapshotColumn &column : kSnapshotColumns) {
+    output.Write(column.name);
+    output.Put(separator(column));
+  }
+  return ForEachRecord(output, records, [&](std::string_view record) {
+    for (const SnapshotColumn &column : kSnapshotColumns) {
+      char digits[16];
+      const char *end = std::to_chars(digits, std::end(digits), Load32(record, column.offset)).ptr;
+      output.Write({digits, static_cast<size_t>(end - digits)});
+      output.Put(separator(column));
+    }
+  });
+}
+
+bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
+  json.Key("columns");
+  json.BeginArray();
+  for (const SnapshotColumn &column : kSnapshotColumns) json.PlainText(column.name);
+  json.EndArray();
+  json.Key("rows");
+  json.BeginArray();
+  const bool good = ForEachRecord(output, records, [&](std::string_view record) {
+    json.BeginArray();
+    for (const SnapshotColumn &column : kSnapshotColumns) {
+      json.Number(Load32(record, column.offset));
+    }
+    json.EndArray();
+  });
+  json.EndArray();
+  return good;
+}
+
+// Prints in the format that was asked for.
+Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &output, Json *json) {
+  if (snapshot.status != kGood) return snapshot.status;
+  const bool text = options.format == "normal" && !options.summary;
+  const size_t recordSize = text && snapshot.header
+                                ? Load32(*snapshot.header, offsetof(SnapshotHeader, recordSize))
+                                : sizeof(SnapshotRecord);
+  std::optional<Input> input;
+  if (!options.live) input.emplace(options.file);
+  size_t taken = 0;
+  const auto read = [&](char *bytes, size_t room) -> std::optional<size_t> {
+    if (input) return input->Read(bytes, room);
+    const size_t count = snapshot.bytes.copy(bytes, room, taken);
+    taken += count;
+    return count;
+  };
+  SnapshotRecords records(read, recordSize);
+  if (!records.Load()) return kBadUsage;
+  if (records.empty()) {
+    Complain(snapshot.name, "there is nothing in it");
+    return kBadData;
+  }
+  Status status = kGood;
+  bool good = true;
+  if (options.summary) {
+    SnapshotSummary summary;
+    good = ForEachRecord(output, records, [&](std::string_view record) { summary.Add(record); });
+    if (json == nullptr) {
+      summary.Print(output);
+    } else {
+      summary.Print(*json);
+    }
+  } else if (json != nullptr) {
+    good = PrintRows(output, *json, records);
+  } else if (options.format == "csv") {
+    good = PrintCsv(output, records);
+  } else if (snapshot.header) {
+    status =
+        PrintDescribedText(output, records, *snapshot.header, snapshot.name, snapshot.headerName);
+  } else {
+    good = PrintFixedText(output, records);
+  }
+  if (!good) return kBadUsage;
+  if (records.rest() > 0 && !(text && snapshot.header)) {
+    Complain(snapshot.name,
+             "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
     status = kBadData;
   }
+  return status;
+}
+
+Status Print(const Options &options) {
+  const Snapshot snapshot = Prepare(options);
+  Output output;
+  if (options.format != "json") {
+    return output.Finish(PrintRecords(options, snapshot, output, nullptr));
+  }
+  Json json(output, "snapshot", {snapshot.source});
+  const Status status = PrintRecords(options, snapshot, output, &json);
+  json.Finish(status);
   return output.Finish(status);
 }
 
 }  // namespace
 
-Status SnapshotCommand(const SnapshotOptions &options) {
-  std::optional<std::string> header = std::string();
-  if (!options.header.empty()) {
-    header = ReadInput(options.header);
-    if (!header) return kBadUsage;
-    if (const std::string wrong = CheckSnapshotHeader(*header); !wrong.empty()) {
-      Complain(DisplayName(options.header), wrong);
-      return kBadData;
+void AddSnapshot(CLI::App &app, Action *action) {
+  CLI::App *command =
+      app.add_subcommand("snapshot", "Print a snapshot of a controller, or of a file");
+  const auto options = std::make_shared<Options>();
+  CLI::Option *file =
+      command->add_option("FILE", options->file, "A snapshot; - for standard input")->type_name("");
+  CLI::Option *header =
+      command->add_option("--header", options->header, "The header that describes its layout")
+          ->type_name("FILE");
+  command->add_flag("--fixed", options->fixed, "In the fixed layout, whatever header there is")
+      ->excludes(header);
+  command->add_flag("--summary", options->summary, "What it says as a whole");
+  AddController(command, &options->className, "Read from this one instead of the first");
+  AddFormat(command, &options->format, {"normal", "json", "csv"});
+  command->callback([=] {
+    options->live = file->count() == 0;
+    options->described = header->count() > 0;
+    if (options->summary && options->format == "csv") {
+      throw CLI::ValidationError("--summary", "is not printed as csv");
     }
-  }
-  const std::optional<std::string> snapshot = ReadInput(options.file);
-  if (!snapshot) return kBadUsage;
-  if (snapshot->empty()) {
-    Complain(DisplayName(options.file), "the file is empty");
-    return kBadData;
-  }
-  return options.header.empty() ? FixedLayout(options, *snapshot)
-                                : DescribedLayout(options, *snapshot, *header);
+    if (options->file == "-" && options->header == "-") {
+      throw CLI::ValidationError("--header", "standard input can be read only once");
+    }
+    *action = [=] { return Print(*options); };
+  });
 }
 
 }  // namespace tools

@@ -2,14 +2,17 @@
 
 #include "tools/snapshot_header.h"
 
+#include <cstddef>
+
 #include "morwick/snapshot.h"
-#include "tools/words.h"
+#include "tools/little_endian.h"
 
 namespace tools {
 namespace {
 
 constexpr uint32_t kFirstTextVersion = 6;   // the first one whose banner is the header's text
 constexpr uint64_t kDescriptorsOffset = 8;  // in the table, behind the count
+constexpr uint32_t kLargestRecord = 1 << 20;
 
 }  // namespace
 
@@ -22,15 +25,18 @@ std::string CheckSnapshotHeader(std::string_view file) {
     return "a header of " + std::to_string(file.size()) + " bytes is shorter than " +
            std::to_string(sizeof(SnapshotHeader));
   }
-  const SnapshotHeader header = ReadWords<SnapshotHeader>(file);
-  if (header.recordSize == 0) return "record size 0 is too small";
-  if (header.formatVersion >= kFirstTextVersion &&
+  const uint32_t recordSize = Load32(file, offsetof(SnapshotHeader, recordSize));
+  if (recordSize == 0 || recordSize > kLargestRecord) {
+    return "record size " + std::to_string(recordSize) + " is not between 1 and " +
+           std::to_string(kLargestRecord);
+  }
+  if (Load32(file, offsetof(SnapshotHeader, formatVersion)) >= kFirstTextVersion &&
       file.find('\0', sizeof(SnapshotHeader)) == std::string_view::npos) {
     return "the text at offset " + std::to_string(sizeof(SnapshotHeader)) + " has no end";
   }
-  const uint64_t table = header.descriptorTableOffset;
+  const uint64_t table = Load32(file, offsetof(SnapshotHeader, descriptorTableOffset));
   if (table + kDescriptorsOffset > file.size()) return wrong("descriptor table offset", table);
-  const auto count = ReadWords<uint32_t>(file.substr(table));
+  const uint32_t count = Load32(file, table);
   if (table + kDescriptorsOffset + uint64_t{count} * sizeof(SnapshotFieldDescriptor) >
       file.size()) {
     return wrong("descriptor count", count);

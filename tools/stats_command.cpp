@@ -1,220 +1,213 @@
-// morwick stats: parses a dump through the slots of a row and prints its entries.
+// morwick stats: prints the statistics of a controller or in a dump.
 
 #include <algorithm>
-#include <cstring>
-#include <map>
-#include <nlohmann/json.hpp>
-#include <utility>
+#include <memory>
 
-#include "morwick/morwick.h"
 #include "tools/commands.h"
+#include "tools/options.h"
+#include "tools/statistics.h"
 
 namespace tools {
 namespace {
 
-using Json = nlohmann::ordered_json;
-using Entries = std::vector<std::pair<std::string, uint64_t>>;
-
-// What a parser made of the dump.
-struct Statistics {
-  uint64_t result = 0;  // as the parser returned it
-  std::string problem;  // what a person should know; empty when all is well
-  Entries summary;      // KVR only; readCountHisto is apart
-  std::vector<uint64_t> readCountHisto;
-  Entries entries;
+struct Options {
+  std::string file;
+  bool live = true;
+  std::string stream;
+  std::string className;
+  std::string format;
+  bool summary = false;
+  bool inFull = false;
 };
 
-template <typename Context>
-Entries EntriesOf(const Context &context) {
-  Entries entries;
-  const ContextNode *value = context.valuesHead;
-  for (const ContextNode *name = context.namesHead; name != nullptr; name = name->next) {
-    entries.emplace_back(name->text, value->value);
+// "name[0..9]" for an array; as many characters as it has.
+size_t LabelLength(const EntryGroup &group) {
+  if (!group.IsArray()) return group.base.size();
+  return group.base.size() + std::string_view("[0..]").size() +
+         std::to_string(group.count - 1).size();
+}
+
+void PrintLabel(Output &output, std::string_view label, size_t length, size_t width) {
+  static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');
+  output.Write(label);
+  output.Write(std::string_view(blanks).substr(0, width - length));
+  output.Write(" : ");
+}
+
+// An array in one line.
+void PrintGroups(Output &output, const Statistics &statistics) {
+  size_t width = 0;
+  for (EntryReader reader(statistics); !reader.AtEnd();) {
+    width = std::max(width, LabelLength(reader.TakeGroup()));
+  }
+  for (EntryReader reader(statistics); !reader.AtEnd();) {
+    const EntryGroup group = reader.TakeGroup();
+    if (group.IsArray()) {
+      const std::string label =
+          std::string(group.base) + "[0.." + std::to_string(group.count - 1) + "]";
+      PrintLabel(output, label, label.size(), width);
+    } else {
+      PrintLabel(output, group.base, group.base.size(), width);
+    }
+    const ContextNode *value = group.value;
+    for (size_t i = 0; i < group.count; ++i, value = value->next) {
+      if (i > 0) output.Put(' ');
+      output.Write(value->text);
+    }
+    output.Put('\n');
+  }
+}
+
+void PrintEntries(Output &output, const Statistics &statistics) {
+  size_t width = 0;
+  for (const ContextNode *name = statistics.names(); name != nullptr; name = name->next) {
+    width = std::max(width, std::string_view(name->text).size());
+  }
+  const ContextNode *value = statistics.values();
+  for (const ContextNode *name = statistics.names(); name != nullptr; name = name->next) {
+    PrintLabel(output, name->text, std::string_view(name->text).size(), width);
+    output.Write(value->text);
+    output.Put('\n');
     value = value->next;
   }
-  return entries;
 }
 
-Entries SummaryOf(const KVRStatsCxt &context) {
-  return {
-      {"exportVersion", context.exportVersion},
-      {"numVirtualBlocks", context.numVirtualBlocks},
-      {"blocksPerVirtualBlock", context.blocksPerVirtualBlock},
-      {"pagesPerVirtualBlock", context.pagesPerVirtualBlock},
-      {"bytesPerPage", context.bytesPerPage},
-      {"hostReads", context.hostReads},
-      {"hostWrites", context.hostWrites},
-      {"numFreeVirtualBlocks", context.numFreeVirtualBlocks},
-      {"wearLevMoves", context.wearLevMoves},
-      {"nandReads", context.nandReads},
-      {"nandWrites", context.nandWrites},
-      {"bandErases", context.bandErases},
-      {"IND_pool_free", context.IND_pool_free},
-      {"IND_pool_count", context.IND_pool_count},
-      {"utilFormatTime", context.utilFormatTime},
-      {"numSleepOps", context.numSleepOps},
-      {"maxHighEnduranceBlockErases", context.maxHighEnduranceBlockErases},
+void PrintSummary(Output &output, const Statistics &statistics) {
+  const std::vector<SummaryField> fields = SummaryOf(statistics);
+  size_t width = 0;
+  for (const SummaryField &field : fields) width = std::max(width, field.name.size());
+  for (const SummaryField &field : fields) {
+    PrintLabel(output, field.name, field.name.size(), width);
+    for (size_t i = 0; i < field.values.size(); ++i) {
+      output.Write((i > 0 ? " " : "") + std::to_string(field.values[i]));
+    }
+    output.Put('\n');
+  }
+}
+
+void PrintCsv(Output &output, const Statistics &statistics) {
+  output.Write("name,value\n");
+  const ContextNode *value = statistics.values();
+  for (const ContextNode *name = statistics.names(); name != nullptr; name = name->next) {
+    output.Write(name->text);
+    output.Put(',');
+    output.Write(value->text);
+    output.Put('\n');
+    value = value->next;
+  }
+}
+
+void PrintJsonSummary(Json &json, const Statistics &statistics) {
+  json.Key("summary");
+  json.BeginObject();
+  for (const auto &[name, values] : SummaryOf(statistics)) {
+    json.Key(name);
+    if (values.size() > 1) json.BeginArray();
+    for (const uint64_t value : values) json.Number(value);
+    if (values.size() > 1) json.EndArray();
+  }
+  json.EndObject();
+}
+
+// One value, or the list of an array's; as texts too where a number is too large for a double.
+void PrintJsonValues(Json &json, const EntryGroup &group) {
+  const auto each = [&](auto print) {
+    if (group.IsArray()) json.BeginArray();
+    const ContextNode *value = group.value;
+    for (size_t i = 0; i < group.count; ++i, value = value->next) print(*value);
+    if (group.IsArray()) json.EndArray();
   };
+  bool exact = true;
+  json.Key(group.IsArray() ? "values" : "value");
+  each([&](const ContextNode &value) {
+    json.Digits(value.text);
+    exact = exact && value.value <= kLargestExact;
+  });
+  if (exact) return;
+  json.Key(group.IsArray() ? "values_s" : "value_s");
+  each([&](const ContextNode &value) { json.PlainText(value.text); });
 }
 
-Statistics ParseKVR(const NandExporter &row, const std::string &dump) {
-  KVRStatsCxt context = {};
-  Statistics statistics;
-  statistics.result = static_cast<uint64_t>(
-      row.parseBufferToCxt(&context, dump.data(), static_cast<uint32_t>(dump.size())));
-  statistics.summary = SummaryOf(context);
-  statistics.readCountHisto.assign(std::begin(context.readCountHisto),
-                                   std::end(context.readCountHisto));
-  statistics.entries = EntriesOf(context);
-  row.releaseContext(&context);
-  if (statistics.result == 0) {
-    statistics.problem = "a bad record ends the statistics after " +
-                         std::to_string(statistics.entries.size()) + " entries";
+void PrintJsonEntries(Json &json, const Statistics &statistics) {
+  json.Key("entries");
+  json.BeginArray();
+  for (EntryReader reader(statistics); !reader.AtEnd();) {
+    const EntryGroup group = reader.TakeGroup();
+    json.BeginObject();
+    json.Key("name");
+    json.PlainText(group.base);
+    PrintJsonValues(json, group);
+    json.EndObject();
   }
-  return statistics;
+  json.EndArray();
 }
 
-// For the parsers that fill a generic context and leave messages.
-template <typename Parser, typename Size>
-Statistics ParseGeneric(const NandExporter &row, Parser parser, const std::string &dump,
-                        Size size) {
-  GenericParserCxt context = {};
-  Statistics statistics;
-  statistics.result = parser(&context, dump.data(), size);
-  statistics.entries = EntriesOf(context);
-  row.releaseGenericParserCxt(&context);
-  if (GlobalAPIErrorMessage != nullptr) {
-    statistics.problem = GetAPIErrorMessage();
-  } else if (statistics.entries.empty()) {
-    statistics.problem = "no statistics found";
+Status PrintJson(Output &output, const Options &options, const Dump &dump,
+                 const Statistics *statistics) {
+  Json json(output, "stats", {dump.source});
+  json.Member("stream", options.stream);
+  Status status = dump.status;
+  if (statistics != nullptr) {
+    json.Member("result", statistics->result());
+    if (options.stream == "kvr") PrintJsonSummary(json, *statistics);
+    PrintJsonEntries(json, *statistics);
+    status = statistics->Judge(dump);
   }
-  return statistics;
+  json.Finish(status);
+  return status;
 }
 
-Statistics Parse(const NandExporter &row, const std::string &stream, const std::string &dump) {
-  Statistics statistics;
-  if (dump.empty()) {
-    statistics.problem = "the file is empty";
-  } else if (stream == "kvr") {
-    statistics = ParseKVR(row, dump);
-  } else if (stream == "ftl") {
-    statistics =
-        ParseGeneric(row, row.ftlParseBufferToCxt, dump, static_cast<uint32_t>(dump.size()));
+Status PrintText(Output &output, const Options &options, const Dump &dump,
+                 const Statistics &statistics) {
+  if (options.format == "csv") {
+    PrintCsv(output, statistics);
+  } else if (options.summary) {
+    PrintSummary(output, statistics);
+  } else if (options.inFull) {
+    PrintEntries(output, statistics);
   } else {
-    statistics = ParseGeneric(row, row.mspParseBufferToCxt, dump, uint64_t{dump.size()});
+    PrintGroups(output, statistics);
   }
-  // The 64-bit parsers pass over what is no whole word; a dump that ends so was cut.
-  const size_t rest = stream == "msp" ? 0 : dump.size() % sizeof(uint64_t);
-  if (statistics.problem.empty() && rest != 0) {
-    statistics.problem = "the last " + std::to_string(rest) + " bytes are not a whole word";
-  }
-  return statistics;
+  output.Flush();
+  return statistics.Judge(dump);
 }
 
-// The table's row of the class, or the first one. Null, after a complaint, for an unknown class.
-const NandExporter *FindRow(const std::string &className) {
-  const NandExporter *row = nand_exporters;
-  if (className.empty()) return row;
-  std::string known;
-  for (; row->className != nullptr; ++row) {
-    if (className == row->className) return row;
-    known += std::string(known.empty() ? "" : ", ") + row->className;
+Status Print(const Options &options) {
+  const Dump dump = options.live ? ReadDumpLive(options.stream, options.className)
+                                 : ReadDumpFile(options.file, options.stream, options.className);
+  std::optional<Statistics> statistics;
+  if (dump.status == kGood) statistics.emplace(dump, options.stream);
+  Output output;
+  Status status = dump.status;
+  if (options.format == "json") {
+    status = PrintJson(output, options, dump, statistics ? &*statistics : nullptr);
+  } else if (statistics) {
+    status = PrintText(output, options, dump, *statistics);
   }
-  Complain("--controller " + className, "not one of " + known);
-  return nullptr;
-}
-
-bool PrintAligned(Output &output, const Entries &entries, size_t width) {
-  for (const auto &[name, value] : entries) {
-    const std::string padding(width - std::min(width, name.size()), ' ');
-    if (!output.Write(name + padding + " : " + std::to_string(value) + "\n")) return false;
-  }
-  return true;
-}
-
-size_t LongestName(const Entries &entries) {
-  size_t longest = 0;
-  for (const auto &entry : entries) longest = std::max(longest, entry.first.size());
-  return longest;
-}
-
-void PrintNormal(Output &output, Statistics statistics) {
-  for (size_t i = 0; i < statistics.readCountHisto.size(); ++i) {
-    statistics.summary.emplace_back("readCountHisto" + std::to_string(i),
-                                    statistics.readCountHisto[i]);
-  }
-  const size_t width = std::max(LongestName(statistics.summary), LongestName(statistics.entries));
-  if (!statistics.summary.empty()) {
-    output.Write("Summary\n");
-    PrintAligned(output, statistics.summary, width);
-    output.Write("\nStatistics\n");
-  }
-  PrintAligned(output, statistics.entries, width);
-}
-
-void PrintJson(Output &output, const Statistics &statistics, const StatsOptions &options,
-               const NandExporter &row) {
-  Json json;
-  json["file"] = options.file;
-  json["controller"] = row.className;
-  json["stream"] = options.stream;
-  json["result"] = statistics.result;
-  json["message"] = nullptr;
-  if (GlobalAPIErrorMessage != nullptr) json["message"] = GetAPIErrorMessage();
-  if (!statistics.summary.empty()) {
-    for (const auto &[name, value] : statistics.summary) json["summary"][name] = value;
-    json["summary"]["readCountHisto"] = statistics.readCountHisto;
-  }
-  json["entries"] = Json::array();
-  for (const auto &[name, value] : statistics.entries) {
-    json["entries"].push_back({{"name", name}, {"value", value}});
-  }
-  // A file's name may be any bytes; those that are not UTF-8 are replaced.
-  output.Write(json.dump(2, ' ', false, Json::error_handler_t::replace) + "\n");
-}
-
-void PrintPrometheus(Output &output, const Statistics &statistics, const StatsOptions &options,
-                     const NandExporter &row) {
-  output.Write(
-      "# HELP morwick_statistic A statistic that the storage controller reports.\n"
-      "# TYPE morwick_statistic gauge\n");
-  // One sample a name: the last value, at the place of the first.
-  std::map<std::string_view, uint64_t> last;
-  for (const auto &[name, value] : statistics.entries) last[name] = value;
-  for (const auto &[name, value] : statistics.entries) {
-    const auto sample = last.extract(name);
-    if (sample.empty()) continue;
-    output.Write("morwick_statistic{controller=\"" + std::string(row.className) + "\",stream=\"" +
-                 options.stream + "\",name=\"" + name + "\"} " + std::to_string(sample.mapped()) +
-                 "\n");
-  }
+  return output.Finish(status);
 }
 
 }  // namespace
 
-Status StatsCommand(const StatsOptions &options) {
-  const NandExporter *row = FindRow(options.controller);
-  if (row == nullptr) return kBadUsage;
-  const std::string name = DisplayName(options.file);
-  if (options.stream == "msp" && row->mspParseBufferToCxt == nullptr) {
-    Complain(name, std::string(row->className) + " has no MSP statistics");
-    return kBadUsage;
-  }
-  // The parsers take 32-bit sizes.
-  const std::optional<std::string> dump = ReadInput(options.file, UINT32_MAX);
-  if (!dump) return kBadUsage;
-  const Statistics statistics = Parse(*row, options.stream, *dump);
-
-  Output output;
-  if (options.format == "json") {
-    PrintJson(output, statistics, options, *row);
-  } else if (options.format == "prometheus") {
-    PrintPrometheus(output, statistics, options, *row);
-  } else {
-    PrintNormal(output, statistics);
-  }
-  if (!statistics.problem.empty()) Complain(name, statistics.problem);
-  return output.Finish(statistics.problem.empty() ? kGood : kBadData);
+void AddStats(CLI::App &app, Action *action) {
+  CLI::App *command =
+      app.add_subcommand("stats", "Print the statistics of a controller, or in a dump");
+  const auto options = std::make_shared<Options>();
+  CLI::Option *file =
+      command->add_option("FILE", options->file, "A dump; - for standard input")->type_name("");
+  AddStream(command, &options->stream);
+  AddController(command, &options->className,
+                "Read from this one instead of the first; with FILE, where the dump is from");
+  command->add_flag("--summary", options->summary, "Only the main figures; kvr only");
+  command->add_flag("--long", options->inFull, "Each element of an array on a line of its own");
+  AddFormat(command, &options->format, {"normal", "json", "csv"});
+  command->callback([=] {
+    options->live = file->count() == 0;
+    if (options->summary && (options->stream != "kvr" || options->format != "normal")) {
+      throw CLI::ValidationError("--summary", "is for kvr and normal output");
+    }
+    *action = [=] { return Print(*options); };
+  });
 }
 
 }  // namespace tools

@@ -1,0 +1,46 @@
+// What changed between two readings of the same statistics.
+#ifndef TOOLS_CHANGES_H
+#define TOOLS_CHANGES_H
+
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "tools/statistics.h"
+
+namespace tools {
+
+// One entry in both readings, or in one only: the other is null then.
+struct Change {
+  std::string_view name;
+  const ContextNode *old;
+  const ContextNode *now;
+
+  // What is remarkable: "backwards", "appeared", "vanished", or nothing.
+  std::string_view Remark() const;
+  // now - old, in decimal with a sign when it is negative; empty when one of them is missing.
+  std::string Difference() const;
+  // The difference by second.
+  std::optional<double> Rate(double seconds) const;
+};
+
+// In the order of the later reading, then what vanished. The n-th entry of a name is compared with
+// the n-th of that name. Entries that did not change are left out unless `all` is wanted. The
+// changes live as long as both statistics.
+std::vector<Change> FindChanges(const Statistics &old, const Statistics &now, bool all);
+
+// A table with columns for name, old, new, difference, rate where the time between the readings is
+// known, and remark.
+void PrintChanges(Output &output, const std::vector<Change> &changes,
+                  std::optional<double> seconds);
+
+// The members "seconds" and "changes".
+void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<double> seconds);
+
+// With three decimals, for tables.
+std::string RateText(double rate);
+
+}  // namespace tools
+
+#endif

@@ -1,0 +1,145 @@
+// Reads buffers from a controller through its driver.
+
+#include "tools/controller.h"
+
+#include <endian.h>
+
+#include <algorithm>
+#include <array>
+#include <cstdio>
+
+#include "tools/io.h"
+
+namespace tools {
+namespace {
+
+constexpr uint32_t kConnectionType = 0;
+constexpr size_t kFirstRoom = 64 << 10;
+constexpr size_t kMostRoom = 16 << 20;
+
+// The shape of every request; a buffer is read with an argument of 0.
+struct Request {
+  uint32_t command;
+  uint32_t argument;
+  uint8_t reserved[16];
+};
+static_assert(sizeof(Request) == 24);
+
+constexpr BufferKind kBufferKinds[] = {
+    {"statistics", &NandExporter::getStatsSelectors},
+    {"msp", &NandExporter::getMSPStatsSelectors},
+    {"snapshot", &NandExporter::getSnapshotSelectors},
+    {"snapshot_header", &NandExporter::getSnapshotHeaderSelectors},
+    {"band", &NandExporter::getBandStatsSelectors},
+    {"defects", &NandExporter::getDefectsListSelectors},
+    {"telemetry", &NandExporter::getTelemetryListSelectors},
+};
+
+uint32_t FindService(const NandExporter &row) {
+  return GetMatchingService(ServiceMatching(row.className));
+}
+
+// Connects and gives the service back; the connection stays open without it.
+int32_t Open(uint32_t service, uint32_t *connection) {
+  *connection = 0;
+  const int32_t result = OpenService(service, kConnectionType, connection);
+  ReleaseObject(service);
+  return result;
+}
+
+}  // namespace
+
+std::span<const BufferKind> BufferKinds() { return kBufferKinds; }
+
+const BufferKind *FindBufferKind(std::string_view name) {
+  if (name == "kvr" || name == "ftl") name = "statistics";
+  const auto *found = std::ranges::find(kBufferKinds, name, &BufferKind::name);
+  return found == std::end(kBufferKinds) ? nullptr : found;
+}
+
+std::string Hexadecimal(int32_t result) {
+  std::array<char, 16> text;
+  std::snprintf(text.data(), text.size(), "0x%x", static_cast<uint32_t>(result));
+  return text.data();
+}
+
+std::span<NandExporter> KnownControllers() {
+  size_t count = 0;
+  while (nand_exporters[count].className != nullptr) ++count;
+  return {nand_exporters, count};
+}
+
+NandExporter *FindRow(std::string_view className) {
+  for (NandExporter &row : KnownControllers()) {
+    if (className == row.className) return &row;
+  }
+  return nullptr;
+}
+
+Presence Probe(const NandExporter &row) {
+  const uint32_t service = FindService(row);
+  if (service == 0) return {};
+  uint32_t connection = 0;
+  const int32_t result = Open(service, &connection);
+  if (connection != 0) CloseService(connection);
+  return {true, connection != 0, result};
+}
+
+Controller::Controller(const std::string &className, const std::string &what) {
+  NandExporter *row = FindRow(className);
+  const uint32_t service = row == nullptr ? findNandExporter(&row) : FindService(*row);
+  if (service == 0) {
+    Complain(className.empty() ? what : className + ": " + what,
+             className.empty() ? "no controller is present" : "it is not present");
+    return;
+  }
+  row_ = row;
+  const int32_t result = Open(service, &connection_);
+  if (connection_ == 0) {
+    Complain(name() + ": " + what, "the connection was refused, result " + Hexadecimal(result));
+  }
+}
+
+Controller::~Controller() {
+  if (connection_ == 0) return;
+  if (const int32_t result = CloseService(connection_); result != 0) {
+    Note(name(), "closing the connection failed, result " + Hexadecimal(result));
+  }
+}
+
+std::optional<std::string> Controller::Read(const BufferKind &kind) {
+  const std::string subject = name() + ": " + std::string(kind.name);
+  if (!Offers(kind)) {
+    Complain(subject, "this controller does not offer it");
+    return std::nullopt;
+  }
+  const Request request = {
+      .command = htole32((row_->*kind.selectors)()->second), .argument = 0, .reserved = {}};
+  std::string reply;
+  // A reply that fills the room may have been cut: it is asked for again with twice the room.
+  for (size_t room = kFirstRoom; room <= kMostRoom; room *= 2) {
+    reply.resize(room);
+    size_t size = room;
+    const int32_t result = CallStructMethod(connection_, row_->methodSelector, &request,
+                                            sizeof request, reply.data(), &size);
+    if (result != 0) {
+      Complain(subject, "reading failed, result " + Hexadecimal(result));
+      return std::nullopt;
+    }
+    if (size < room) {
+      reply.resize(size);
+      return reply;
+    }
+  }
+  Complain(subject, "reading failed, the reply fills " + std::to_string(kMostRoom) + " bytes");
+  return std::nullopt;
+}
+
+std::optional<std::string> ReadFromController(std::string *className, const BufferKind &kind) {
+  Controller controller(*className, std::string(kind.name));
+  if (controller.row() != nullptr) *className = controller.name();
+  if (!controller.connected()) return std::nullopt;
+  return controller.Read(kind);
+}
+
+}  // namespace tools

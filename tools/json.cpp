@@ -1,0 +1,52 @@
+// The JSON frame: what every object begins and ends with.
+
+#include "tools/json.h"
+
+#include "tools/text.h"
+
+namespace tools {
+
+Json::Json(Output &output, std::string_view command, const std::vector<Source> &sources)
+    : stream_{output} {
+  BeginObject();
+  Key("format_version");
+  BeginArray();
+  Number(1U);
+  Number(0U);
+  EndArray();
+  Member("morwick", MORWICK_VERSION);
+  Member("platform", MORWICK_PLATFORM_NAME);
+  Member("command", command);
+  if (sources.empty()) return;
+  Key("source");
+  BeginObject();
+  for (const Source &source : sources) {
+    if (source.name.empty()) {
+      Key(source.kind);
+      Null();
+    } else {
+      Member(source.kind, source.name);
+    }
+  }
+  EndObject();
+}
+
+void Json::Text(std::string_view text) { PlainText(ValidText(text)); }
+
+void Json::Finish(Status status) {
+  Key("messages");
+  BeginArray();
+  for (const Message &message : Messages()) {
+    BeginObject();
+    Member("severity", message.severity);
+    Member("text", message.text);
+    EndObject();
+  }
+  EndArray();
+  ForgetMessages();
+  Member("status", static_cast<uint32_t>(status));
+  EndObject();
+  stream_.output.Put('\n');
+}
+
+}  // namespace tools

@@ -1,0 +1,51 @@
+// What several sub-commands share in their options.
+
+#include "tools/options.h"
+
+#include "tools/controller.h"
+#include "tools/text.h"
+
+namespace tools {
+
+void AddFormat(CLI::App *command, std::string *format, const std::vector<std::string> &choices) {
+  *format = choices.front();
+  command->add_option("-o,--output-format", *format, "How to print")
+      ->check(CLI::IsMember(choices))
+      ->capture_default_str();
+}
+
+void AddStream(CLI::App *command, std::string *stream) {
+  command->add_option("-s,--stream", *stream, "Which statistics")
+      ->check(CLI::IsMember({"kvr", "ftl", "msp"}))
+      ->required();
+}
+
+void AddController(CLI::App *command, std::string *className, const std::string &description) {
+  std::vector<std::string> known;
+  for (const NandExporter &row : KnownControllers()) known.emplace_back(row.className);
+  command->add_option("-c,--controller", *className, description)->check(CLI::IsMember(known));
+}
+
+CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds,
+                        const std::string &description) {
+  const auto take = [=](const std::string &text) {
+    const std::optional<double> value = ParseSeconds(text);
+    if (!value) throw CLI::ValidationError(name, text + " is no number of seconds");
+    *seconds = *value;
+  };
+  return command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
+}
+
+CLI::Option *AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
+                       const std::string &description) {
+  const auto take = [=](const std::string &text) {
+    const std::optional<uint64_t> value = ParseNumber(text, most);
+    if (!value) {
+      throw CLI::ValidationError(name, text + " is no whole number up to " + std::to_string(most));
+    }
+    *number = *value;
+  };
+  return command->add_option_function<std::string>(name, take, description)->type_name("NUMBER");
+}
+
+}  // namespace tools

@@ -1,0 +1,56 @@
+// morwick read: saves a buffer as the controller gave it.
+
+#include <memory>
+
+#include "tools/commands.h"
+#include "tools/controller.h"
+#include "tools/options.h"
+
+namespace tools {
+namespace {
+
+struct Options {
+  std::string kind;
+  std::string file;  // standard output when not named
+  std::string className;
+};
+
+Status Read(const Options &options) {
+  if (options.file.empty() && OutputIsTerminal()) {
+    Complain("standard output", "is a terminal; name a file with -w");
+    return kBadUsage;
+  }
+  std::string className = options.className;
+  const std::optional<std::string> bytes =
+      ReadFromController(&className, *FindBufferKind(options.kind));
+  if (!bytes) return kBadData;
+  if (!options.file.empty()) return WriteFile(options.file, *bytes) ? kGood : kBadData;
+  Output output;
+  output.Write(*bytes);
+  return output.Finish(kGood);
+}
+
+}  // namespace
+
+void AddRead(CLI::App &app, Action *action) {
+  CLI::App *command = app.add_subcommand("read", "Save a buffer of a controller as it came");
+  const auto options = std::make_shared<Options>();
+  std::vector<std::string> kinds;
+  for (const BufferKind &kind : BufferKinds()) kinds.emplace_back(kind.name);
+  kinds.insert(kinds.end(), {"kvr", "ftl"});
+  command->add_option("STREAM", options->kind, "Which buffer")
+      ->check(CLI::IsMember(kinds))
+      ->required();
+  CLI::Option *file =
+      command->add_option("-w,--write", options->file, "Write to a file, whole or not at all")
+          ->type_name("FILE");
+  AddController(command, &options->className, "Read from this one instead of the first");
+  command->callback([=] {
+    if (file->count() > 0 && options->file.empty()) {
+      throw CLI::ValidationError("--write", "a file needs a name");
+    }
+    *action = [=] { return Read(*options); };
+  });
+}
+
+}  // namespace tools

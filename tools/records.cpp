@@ -1,0 +1,56 @@
+// Walks the records of a dump by the layouts that kvr_stats.h and msp_stats.h draw.
+
+#include "tools/records.h"
+
+#include "tools/little_endian.h"
+
+namespace tools {
+namespace {
+
+// What sets the two formats apart, and the parsers of the first.
+struct Format {
+  uint64_t header;  // in bytes
+  uint64_t unit;    // that lengths are counted in, in bytes
+  uint32_t endKey;  // 0: there is none
+  uint32_t highestKey;
+  bool fillers;  // a record of length 0 is one, whatever its key
+};
+
+constexpr Format kKVR = {8, 8, 0, 0x30000000, false};
+constexpr Format kFTL = {8, 8, 0xFFFF, 0x30000000, true};
+constexpr Format kMSP = {4, 1, 0x2FFF, UINT16_MAX, true};
+
+std::string Record(uint32_t key) { return "the record there (key " + std::to_string(key) + ") "; }
+
+}  // namespace
+
+StatisticsEnd FindEnd(std::string_view stream, std::string_view dump) {
+  const Format &format = stream == "kvr" ? kKVR : stream == "ftl" ? kFTL : kMSP;
+  uint64_t offset = 0;
+  while (dump.size() - offset >= format.header) {
+    const bool wide = format.header == 8;
+    const uint32_t key = wide ? Load32(dump, offset) : Load16(dump, offset);
+    const uint32_t length = wide ? Load32(dump, offset + 4) : Load16(dump, offset + 2);
+    const uint64_t payload = offset + format.header;
+    const uint64_t needed = uint64_t{length} * format.unit;
+    const uint64_t left = dump.size() - payload;
+    if (length > 0 || !format.fillers) {
+      if (key == format.endKey && format.endKey != 0) {
+        return {offset, "", needed < left ? left - needed : 0};
+      }
+      if (key > format.highestKey) return {offset, Record(key) + "has no valid key", 0};
+      if (needed > left) {
+        return {offset,
+                Record(key) + "needs " + std::to_string(needed) + " bytes, and " +
+                    std::to_string(left) + " are left",
+                0};
+      }
+    }
+    offset = payload + needed;
+  }
+  const uint64_t rest = dump.size() - offset;
+  if (rest == 0) return {offset, "", 0};
+  return {offset, "the rest, " + std::to_string(rest) + " bytes, is no whole header", 0};
+}
+
+}  // namespace tools

@@ -1,0 +1,42 @@
+// The records of a snapshot, in blocks, as they arrive.
+
+#include "tools/snapshot_records.h"
+
+#include <algorithm>
+#include <cstring>
+
+namespace tools {
+namespace {
+
+constexpr size_t kBlockSize = 64 << 10;
+
+}  // namespace
+
+SnapshotRecords::SnapshotRecords(ReadBytes read, size_t recordSize)
+    : read_(std::move(read)),
+      recordSize_(recordSize),
+      buffer_(recordSize + std::max(kBlockSize, recordSize), '\0') {}
+
+bool SnapshotRecords::Load() {
+  // What is no whole record yet goes to the front.
+  char *front = buffer_.data() + recordSize_;
+  filled_ -= used_;
+  std::memmove(front, front + used_, filled_);
+  used_ = 0;
+  while (filled_ < recordSize_) {
+    const auto count = read_(front + filled_, buffer_.size() - recordSize_ - filled_);
+    if (!count) return false;
+    if (*count == 0) break;
+    filled_ += *count;
+    total_ += *count;
+  }
+  return true;
+}
+
+std::optional<std::string_view> SnapshotRecords::Next() {
+  if (!Load()) return std::nullopt;
+  used_ = filled_ / recordSize_ * recordSize_;
+  return std::string_view(buffer_).substr(recordSize_, used_);
+}
+
+}  // namespace tools

@@ -1,0 +1,42 @@
+// The records of a snapshot, in blocks, as they arrive.
+#ifndef TOOLS_SNAPSHOT_RECORDS_H
+#define TOOLS_SNAPSHOT_RECORDS_H
+
+#include <cstdint>
+#include <functional>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace tools {
+
+class SnapshotRecords {
+ public:
+  // Reads at most `room` bytes, none at the end. Without a value, reading has failed.
+  using ReadBytes = std::function<std::optional<size_t>(char *bytes, size_t room)>;
+
+  SnapshotRecords(ReadBytes read, size_t recordSize);
+
+  // Reads until there is a whole record, or the end. False when reading has failed.
+  bool Load();
+
+  // The next block of whole records, empty at the end. In front of it lies room of one record,
+  // which may be read. Without a value, reading has failed.
+  std::optional<std::string_view> Next();
+
+  // At the end: bytes that are no whole record, and whether there were no bytes at all.
+  size_t rest() const { return filled_; }
+  bool empty() const { return total_ == 0; }
+
+ private:
+  ReadBytes read_;
+  size_t recordSize_;
+  std::string buffer_;
+  size_t filled_ = 0;  // behind the room of one record
+  size_t used_ = 0;    // of what is filled, the block that was handed out
+  uint64_t total_ = 0;
+};
+
+}  // namespace tools
+
+#endif

@@ -1,0 +1,23 @@
+// Snapshots as the library's text, block by block, however long they are.
+#ifndef TOOLS_SNAPSHOT_TEXT_H
+#define TOOLS_SNAPSHOT_TEXT_H
+
+#include <string>
+#include <string_view>
+
+#include "tools/io.h"
+#include "tools/snapshot_records.h"
+
+namespace tools {
+
+// In the fixed layout: legend, lines, an empty line. False when reading or writing has failed.
+bool PrintFixedText(Output &output, SnapshotRecords &records);
+
+// In the layout of a header that has passed its check. Complains about records that are missing or
+// too long, with the names of snapshot and header.
+Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::string &header,
+                          const std::string &name, const std::string &headerName);
+
+}  // namespace tools
+
+#endif

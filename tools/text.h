@@ -1,0 +1,27 @@
+// Texts and numbers that come from outside.
+#ifndef TOOLS_TEXT_H
+#define TOOLS_TEXT_H
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace tools {
+
+// For a terminal: each control character but the line end, and what is not UTF-8, becomes a
+// question mark.
+std::string Printable(std::string_view text);
+
+// For JSON: what is not UTF-8 becomes the replacement character.
+std::string ValidText(std::string_view text);
+
+// A whole number of decimal digits and nothing else, at most `most`.
+std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most);
+
+// A number of seconds, 0 or more, such as 2 or 0.25.
+std::optional<double> ParseSeconds(std::string_view text);
+
+}  // namespace tools
+
+#endif
