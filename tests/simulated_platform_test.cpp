@@ -5,10 +5,14 @@
 #include <gtest/gtest.h>
 #include <sys/mman.h>
 #include <sys/syscall.h>
+#include <syslog.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <chrono>
+#include <cmath>
+#include <cstdarg>
+#include <cstdio>
 #include <cstdlib>
 #include <ctime>
 #include <fstream>
@@ -23,18 +27,33 @@
 namespace {
 
 int64_t wallClock = 0;  // in milliseconds since 1970; 0 for the real one
+std::string systemLog;
 
 }  // namespace
 
+// Take the place of the system's log.
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
+extern "C" MORWICK_EXPORT void openlog(const char *identity, int, int facility) {
+  systemLog = identity + ("/" + std::to_string(facility));
+}
+extern "C" MORWICK_EXPORT void syslog(int priority, const char *format, ...) {
+  char text[100];
+  va_list arguments;
+  va_start(arguments, format);
+  std::vsnprintf(text, sizeof text, format, arguments);
+  va_end(arguments);
+  systemLog += " " + std::to_string(priority) + ":" + text;
+}
+
 // Takes the place of the platform's, for the wall clock.
-// NOLINTNEXTLINE(readability-inconsistent-declaration-parameter-name): the C library's are reserved
-extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
+extern "C" MORWICK_EXPORT int clock_gettime(clockid_t clock, timespec *time) noexcept {
   if (clock != CLOCK_REALTIME || wallClock == 0) {
     return static_cast<int>(syscall(SYS_clock_gettime, clock, time));
   }
   *time = {.tv_sec = wallClock / 1000, .tv_nsec = wallClock % 1000 * 1'000'000};
   return 0;
 }
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
 
 namespace {
 
@@ -138,12 +157,13 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
   testing::internal::CaptureStderr();
   int line = 0;
   for (const auto &[method, command, argument, size, room, result, reply, beyond] : cases) {
+    ++line;
     const uint32_t request[6] = {command, argument, beyond & 1, 0, 0, beyond & ~1U};
     std::string buffer(room + 1, '#');
     size_t replySize = room;
     EXPECT_EQ(CallStructMethod(connection, method, request, size, buffer.data(), &replySize),
               result)
-        << "line " << ++line;
+        << "line " << line;
     EXPECT_EQ(buffer.substr(0, replySize), reply) << "line " << line;
     EXPECT_EQ(buffer.find_first_not_of({"#\0", 2}, replySize), std::string::npos)
         << "line " << line;
@@ -176,6 +196,14 @@ TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
     EXPECT_EQ(Read(connection, 9, command), dump.str()) << file;
   }
   CloseService(connection);
+}
+
+TEST(SimulatedPlatformTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
+  Play("");
+  testing::internal::CaptureStderr();
+  for (const char *text : {"100%", "line\n", ""}) SystemLog("%s", text);
+  EXPECT_EQ(systemLog, "grellon/" + std::to_string(LOG_DAEMON) + " 5:100% 5:line\n 5:");
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "grellon: 100%\ngrellon: line\ngrellon: \n");
 }
 
 std::vector<uint64_t> Values(const ContextNode *node) {
@@ -302,6 +330,13 @@ TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
     before = std::move(now);
     ageBefore = age;
   }
+  for (const char left : {'\1', '\0'}) {
+    const uint32_t request[6] = {39, 1025};
+    std::string reply(4, '#');
+    size_t size = reply.size();
+    EXPECT_EQ(CallStructMethod(connection, 9, request, sizeof request, reply.data(), &size), 0);
+    EXPECT_EQ(reply[0], left) << "two units are pending";
+  }
   for (const uint32_t command : {13U, 221U, 22U, 145U}) {
     const uint32_t request[6] = {command};
     std::string reply(101, '#');
@@ -422,10 +457,26 @@ TEST(SimulatedSchedulerDeathTest, RunsAndResumesOnSchedule) {
   for (const auto &[schedule, journal] : cases) {
     EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), checkIn + journal) << schedule;
   }
+  EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), testing::ExitedWithCode(0),
+              "^$")
+      << "no activity";
   setenv("FORGETFUL", "", 1);
   EXPECT_EXIT(PlaySchedule("first_run_after = 0"), testing::ExitedWithCode(0),
               checkIn + "state 2 nnnn, the run did not end its transaction\n$");
   unsetenv("FORGETFUL");
+}
+
+TEST(SimulatedSchedulerDeathTest, WaitsASecondBeforeRunsAndTwoBeforeResuming) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  const auto elapsed = [](const std::string &schedule) {
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), "");
+    return std::lround(
+        std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
+  };
+  EXPECT_EQ(elapsed("interval = 0\nresume_after = 0"), 1);
+  EXPECT_EQ(elapsed("runs = 2\nfirst_run_after = 0"), 1);
+  EXPECT_EQ(elapsed("first_run_after = 0\ndefer_at_check = [1]"), 2);
 }
 
 TEST(SimulatedSchedulerDeathTest, WaitsFractionsOfSeconds) {

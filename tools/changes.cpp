@@ -5,8 +5,9 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <cstdio>
 #include <unordered_map>
+
+#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -101,12 +102,6 @@ std::vector<Change> FindChanges(const Statistics &old, const Statistics &now, bo
   return changes;
 }
 
-std::string RateText(double rate) {
-  std::array<char, 64> text;
-  std::snprintf(text.data(), text.size(), "%.3f", rate);
-  return text.data();
-}
-
 void PrintChanges(Output &output, const std::vector<Change> &changes,
                   std::optional<double> seconds) {
   if (changes.empty()) return;
@@ -115,7 +110,7 @@ void PrintChanges(Output &output, const std::vector<Change> &changes,
     const std::optional<double> rate = seconds ? change.Rate(*seconds) : std::nullopt;
     rows.push_back({std::string(change.name), change.old == nullptr ? "" : change.old->text,
                     change.now == nullptr ? "" : change.now->text, change.Difference(),
-                    rate ? RateText(*rate) : "", std::string(change.Remark())});
+                    rate ? ThreeDecimals(*rate) : "", std::string(change.Remark())});
   }
   PrintRows(output, rows);
 }

@@ -38,9 +38,6 @@ void PrintChanges(Output &output, const std::vector<Change> &changes,
 // The members "seconds" and "changes".
 void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<double> seconds);
 
-// With three decimals, for tables.
-std::string RateText(double rate);
-
 }  // namespace tools
 
 #endif

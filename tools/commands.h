@@ -19,10 +19,11 @@ void AddDiff(CLI::App &app, Action *action);
 void AddWatch(CLI::App &app, Action *action);
 void AddSnapshot(CLI::App &app, Action *action);
 void AddRead(CLI::App &app, Action *action);
+void AddMetrics(CLI::App &app, Action *action);
 void AddCapacity(CLI::App &app, Action *action);
 
 constexpr void (*kCommands[])(CLI::App &, Action *) = {
-    AddFind, AddStats, AddDiff, AddWatch, AddSnapshot, AddRead, AddCapacity,
+    AddFind, AddStats, AddDiff, AddWatch, AddSnapshot, AddRead, AddMetrics, AddCapacity,
 };
 
 }  // namespace tools

@@ -85,7 +85,7 @@ Presence Probe(const NandExporter &row) {
   return {true, connection != 0, result};
 }
 
-Controller::Controller(const std::string &className, const std::string &what) {
+Controller::Controller(const std::string &className, const std::string &what) : name_(className) {
   NandExporter *row = FindRow(className);
   const uint32_t service = row == nullptr ? findNandExporter(&row) : FindService(*row);
   if (service == 0) {
@@ -94,21 +94,22 @@ Controller::Controller(const std::string &className, const std::string &what) {
     return;
   }
   row_ = row;
+  name_ = row->className;
   const int32_t result = Open(service, &connection_);
   if (connection_ == 0) {
-    Complain(name() + ": " + what, "the connection was refused, result " + Hexadecimal(result));
+    Complain(name_ + ": " + what, "the connection was refused, result " + Hexadecimal(result));
   }
 }
 
 Controller::~Controller() {
   if (connection_ == 0) return;
   if (const int32_t result = CloseService(connection_); result != 0) {
-    Note(name(), "closing the connection failed, result " + Hexadecimal(result));
+    Note(name_, "closing the connection failed, result " + Hexadecimal(result));
   }
 }
 
 std::optional<std::string> Controller::Read(const BufferKind &kind) {
-  const std::string subject = name() + ": " + std::string(kind.name);
+  const std::string subject = name_ + ": " + std::string(kind.name);
   if (!Offers(kind)) {
     Complain(subject, "this controller does not offer it");
     return std::nullopt;
@@ -133,13 +134,6 @@ std::optional<std::string> Controller::Read(const BufferKind &kind) {
   }
   Complain(subject, "reading failed, the reply fills " + std::to_string(kMostRoom) + " bytes");
   return std::nullopt;
-}
-
-std::optional<std::string> ReadFromController(std::string *className, const BufferKind &kind) {
-  Controller controller(*className, std::string(kind.name));
-  if (controller.row() != nullptr) *className = controller.name();
-  if (!controller.connected()) return std::nullopt;
-  return controller.Read(kind);
 }
 
 }  // namespace tools

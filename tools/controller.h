@@ -56,8 +56,8 @@ class Controller {
   // The row of the controller; null when none was found.
   const NandExporter *row() const { return row_; }
 
-  // The class, for messages.
-  std::string name() const { return row_ == nullptr ? "" : row_->className; }
+  // The class; the one that was asked for, if any, while none was found.
+  const std::string &name() const { return name_; }
 
   bool Offers(const BufferKind &kind) const { return row_->*kind.selectors != nullptr; }
 
@@ -65,12 +65,10 @@ class Controller {
   std::optional<std::string> Read(const BufferKind &kind);
 
  private:
+  std::string name_;
   const NandExporter *row_ = nullptr;
   uint32_t connection_ = 0;
 };
-
-// One buffer, the connection closed again; `className` is set to that of the controller found.
-std::optional<std::string> ReadFromController(std::string *className, const BufferKind &kind);
 
 }  // namespace tools
 

@@ -5,6 +5,7 @@
 #include "tools/changes.h"
 #include "tools/commands.h"
 #include "tools/options.h"
+#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -28,7 +29,7 @@ void PrintCsv(Output &output, const std::vector<Change> &changes, std::optional<
     if (change.old != nullptr) output.Write(change.old->text);
     output.Put(',');
     if (change.now != nullptr) output.Write(change.now->text);
-    output.Write("," + change.Difference() + "," + (rate ? RateText(*rate) : "") + "," +
+    output.Write("," + change.Difference() + "," + (rate ? ThreeDecimals(*rate) : "") + "," +
                  std::string(change.Remark()) + "\n");
   }
 }

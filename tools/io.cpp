@@ -167,7 +167,7 @@ std::optional<std::string> ReadInput(const std::string &file, uint64_t limit) {
   return std::nullopt;
 }
 
-bool WriteFile(const std::string &file, std::string_view bytes) {
+bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mode_t> mode) {
   const auto fail = [&](int error) {
     Complain(file, std::strerror(error));
     return false;
@@ -191,7 +191,7 @@ bool WriteFile(const std::string &file, std::string_view bytes) {
   const mode_t mask = umask(0);
   umask(mask);
   int error = WriteAll(descriptor, bytes);
-  if (error == 0 && fchmod(descriptor, 0666 & ~mask) != 0) error = errno;
+  if (error == 0 && fchmod(descriptor, mode.value_or(0666 & ~mask)) != 0) error = errno;
   if (error == 0 && fsync(descriptor) != 0) error = errno;
   if (close(descriptor) != 0 && error == 0) error = errno;
   if (error == 0 && rename(beside.c_str(), target.c_str()) != 0) error = errno;

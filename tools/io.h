@@ -2,6 +2,8 @@
 #ifndef TOOLS_IO_H
 #define TOOLS_IO_H
 
+#include <sys/types.h>
+
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -76,9 +78,11 @@ class Input {
 // than `limit` bytes.
 std::optional<std::string> ReadInput(const std::string &file, uint64_t limit);
 
-// Writes a file whole or not at all: beside it first, then renamed. What is no regular file (a
-// device, a pipe) is written directly. False after a complaint.
-bool WriteFile(const std::string &file, std::string_view bytes);
+// Writes a file whole or not at all: beside it first, then renamed, with that mode or as the umask
+// gives it. What is no regular file (a device, a pipe) is written directly. False after a
+// complaint.
+bool WriteFile(const std::string &file, std::string_view bytes,
+               std::optional<mode_t> mode = std::nullopt);
 
 // Standard output, checked: nothing is cut silently. It has a buffer and takes no memory else. To a
 // terminal no control characters are written.

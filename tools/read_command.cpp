@@ -20,9 +20,11 @@ Status Read(const Options &options) {
     Complain("standard output", "is a terminal; name a file with -w");
     return kBadUsage;
   }
-  std::string className = options.className;
-  const std::optional<std::string> bytes =
-      ReadFromController(&className, *FindBufferKind(options.kind));
+  std::optional<std::string> bytes;
+  {
+    Controller controller(options.className, options.kind);  // closed before anything is written
+    if (controller.connected()) bytes = controller.Read(*FindBufferKind(options.kind));
+  }
   if (!bytes) return kBadData;
   if (!options.file.empty()) return WriteFile(options.file, *bytes) ? kGood : kBadData;
   Output output;

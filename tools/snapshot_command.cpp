@@ -46,7 +46,7 @@ void ReadLive(const Options &options, Snapshot *snapshot) {
   const BufferKind &headerKind = *FindBufferKind("snapshot_header");
   Controller controller(options.className, std::string(snapshotKind.name));
   snapshot->source.kind = "controller";
-  snapshot->source.name = controller.row() == nullptr ? options.className : controller.name();
+  snapshot->source.name = controller.name();
   snapshot->name = controller.name() + ": " + std::string(snapshotKind.name);
   snapshot->headerName = controller.name() + ": " + std::string(headerKind.name);
   snapshot->status = kBadData;

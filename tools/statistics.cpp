@@ -7,7 +7,6 @@
 #include <charconv>
 #include <cstddef>
 
-#include "tools/controller.h"
 #include "tools/records.h"
 
 namespace tools {
@@ -42,10 +41,9 @@ Dump ReadDumpFile(const std::string &file, std::string_view stream, const std::s
   return dump;
 }
 
-Dump ReadDumpLive(std::string_view stream, const std::string &className) {
+Dump ReadDump(Controller &controller, std::string_view stream) {
   Dump dump;
-  Controller controller(className, std::string(stream));
-  dump.source = {"controller", controller.row() == nullptr ? className : controller.name()};
+  dump.source = {"controller", controller.name()};
   dump.subject = controller.name() + ": " + std::string(stream);
   dump.row = controller.row();
   dump.status = kBadData;
@@ -55,6 +53,11 @@ Dump ReadDumpLive(std::string_view stream, const std::string &className) {
     dump.status = kGood;
   }
   return dump;
+}
+
+Dump ReadDumpLive(std::string_view stream, const std::string &className) {
+  Controller controller(className, std::string(stream));
+  return ReadDump(controller, stream);
 }
 
 Statistics::Statistics(const Dump &dump, std::string_view stream)

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "morwick/morwick.h"
+#include "tools/controller.h"
 #include "tools/io.h"
 #include "tools/json.h"
 
@@ -31,6 +32,9 @@ Dump ReadDumpFile(const std::string &file, std::string_view stream, const std::s
 
 // Reads it from the controller of the class, or the first that is present.
 Dump ReadDumpLive(std::string_view stream, const std::string &className);
+
+// Reads it through a connection that is there.
+Dump ReadDump(Controller &controller, std::string_view stream);
 
 // The lists of a dump, parsed through its row's slots.
 class Statistics {

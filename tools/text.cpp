@@ -3,8 +3,9 @@
 #include "tools/text.h"
 
 #include <algorithm>
+#include <array>
 #include <charconv>
-#include <cmath>
+#include <cstdio>
 
 namespace tools {
 namespace {
@@ -66,6 +67,12 @@ std::optional<double> ParseSeconds(std::string_view text) {
   const bool whole = error == std::errc() && end == text.data() + text.size();
   if (!whole || !(seconds >= 0 && seconds <= kMost)) return std::nullopt;
   return seconds;
+}
+
+std::string ThreeDecimals(double number) {
+  std::array<char, 400> text;  // the largest doubles have 309 digits
+  std::snprintf(text.data(), text.size(), "%.3f", number);
+  return text.data();
 }
 
 }  // namespace tools

@@ -22,6 +22,9 @@ std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most);
 // A number of seconds, 0 or more, such as 2 or 0.25.
 std::optional<double> ParseSeconds(std::string_view text);
 
+// For tables and series: 12.345.
+std::string ThreeDecimals(double number);
+
 }  // namespace tools
 
 #endif

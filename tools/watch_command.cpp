@@ -12,6 +12,7 @@
 #include "tools/changes.h"
 #include "tools/commands.h"
 #include "tools/options.h"
+#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -79,7 +80,7 @@ volatile sig_atomic_t StopSignals::stopped_ = 0;
 
 // Since the epoch.
 std::string Seconds(system_clock::time_point time) {
-  return RateText(std::chrono::duration<double>(time.time_since_epoch()).count());
+  return ThreeDecimals(std::chrono::duration<double>(time.time_since_epoch()).count());
 }
 
 std::string LocalTime(system_clock::time_point time) {
@@ -98,7 +99,7 @@ void PrintCsv(Output &output, const Reading &now, const std::vector<Change> &cha
     const std::optional<double> rate = change.Rate(seconds);
     output.Write(time + "," + std::string(change.name) + "," +
                  (change.now == nullptr ? "" : change.now->text) + "," + change.Difference() + "," +
-                 (rate ? RateText(*rate) : "") + "\n");
+                 (rate ? ThreeDecimals(*rate) : "") + "\n");
   }
 }
 
@@ -120,7 +121,7 @@ void PrintBlock(Output &output, const Options &options, const Reading *old, cons
   } else if (seconds && options.format == "csv") {
     PrintCsv(output, now, changes, *seconds);
   } else if (seconds) {
-    output.Write(LocalTime(now.time) + ", " + RateText(*seconds) + " s\n");
+    output.Write(LocalTime(now.time) + ", " + ThreeDecimals(*seconds) + " s\n");
     PrintChanges(output, changes, seconds);
     output.Write("\n");
   }

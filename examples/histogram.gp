@@ -1,0 +1,22 @@
+# Draws a histogram, an array of the statistics:
+#   morwick stats -s kvr -o csv > stats.csv
+#   gnuplot -e "csv='stats.csv'; name='hostReadLogHisto'" histogram.gp > histogram.png
+if (!exists("csv")) csv = "stats.csv"
+if (!exists("name")) name = "hostReadLogHisto"
+set datafile separator ","
+set terminal pngcairo size 900,420
+set title name
+set xlabel "element"
+set ylabel "count"
+set logscale y
+set grid y
+set style fill solid 0.6
+set boxwidth 0.8
+unset key
+
+# The element's number stands behind the name; other names are left out.
+number(text) = text[strlen(name) + 1:*]
+element(text) = text[1:strlen(name)] eq name && number(text) eq sprintf("%d", int(number(text) . "")) \
+    ? int(number(text)) : NaN
+
+plot csv using (element(stringcolumn(1))):2 skip 1 with boxes
