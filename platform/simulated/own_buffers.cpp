@@ -37,29 +37,29 @@ struct Counter {
 
 // clang-format off: one row a line
 constexpr Counter kStatistics[] = {
-    {53, 1, 5, 0},                   // export version
-    {52, 1, 4096, 0},                // virtual blocks,
-    {51, 1, 8, 0},                   // blocks in each,
-    {50, 1, 1152, 0},                // pages in each of these,
-    {49, 1, 16384, 0},               // bytes in each of these
-    {48, 1, 312, 0},                 // free virtual blocks
-    {12, 1, 870, 0},                 // indirection pool, free
-    {13, 1, 1024, 0},                // indirection pool
-    {56, 1, kFirstPowerOn, 0},       // time of formatting
+    {53, 1, 5, 0},                           // export version
+    {52, 1, 4096, 0},                        // virtual blocks,
+    {51, 1, 8, 0},                           // blocks in each,
+    {50, 1, 1152, 0},                        // pages in each of these,
+    {49, 1, 16384, 0},                       // bytes in each of these
+    {48, 1, 312, 0},                         // free virtual blocks
+    {12, 1, 870, 0},                         // indirection pool, free
+    {13, 1, 1024, 0},                        // indirection pool
+    {56, 1, kFirstPowerOn, 0},               // time of formatting
     {57, 1, kFirstPowerOn, 3600, kByClock},  // calendar time
     {34, 1, 0, 1, kByClock},                 // hours powered on
-    {10, 1, 3, 0},                   // boots
-    {4, 1, 20'000'000, 3'168'000},   // host writes, 4k sectors
-    {7, 1, 50'000'000, 7'488'000},   // host reads
-    {18, 1, 30'000'000, 4'752'000},  // NAND writes
-    {19, 1, 60'000'000, 9'072'000},  // NAND reads
-    {20, 1, 814, 129},               // band erases
-    {17, 1, 6, 2},                   // wear-level moves
-    {45, 1, 12, 1},                  // erases of the block that had most of them
-    {28, 1, 40, 30},                 // sleeps
-    {14, 10, 4'000'000, 600'000},    // host writes by size
-    {15, 10, 9'000'000, 900'000},    // host reads by size
-    {265, 5, 70'000, 9'000},         // read counts
+    {10, 1, 3, 0},                           // boots
+    {4, 1, 20'000'000, 3'168'000},           // host writes, 4k sectors
+    {7, 1, 50'000'000, 7'488'000},           // host reads
+    {18, 1, 30'000'000, 4'752'000},          // NAND writes
+    {19, 1, 60'000'000, 9'072'000},          // NAND reads
+    {20, 1, 814, 129},                       // band erases
+    {17, 1, 6, 2},                           // wear-level moves
+    {45, 1, 12, 1},                          // erases of the block that had most of them
+    {28, 1, 40, 30},                         // sleeps
+    {14, 10, 4'000'000, 600'000},            // host writes by size
+    {15, 10, 9'000'000, 900'000},            // host reads by size
+    {265, 5, 70'000, 9'000},                 // read counts
 };
 
 constexpr Counter kMspStatistics[] = {
