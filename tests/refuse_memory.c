@@ -1,0 +1,44 @@
+#define _GNU_SOURCE
+
+// Preloaded into a process under attack: refuses the allocation with the number in REFUSE, counted
+// from 1, and leaves the number of all allocations in the file named by ALLOCATIONS.
+
+#include <dlfcn.h>
+#include <errno.h>
+#include <stdatomic.h>
+#include <stdio.h>
+#include <stdlib.h>
+
+static atomic_ulong count;
+static unsigned long refused;
+
+void *__libc_malloc(size_t size);
+void *__libc_calloc(size_t number, size_t size);
+void *__libc_realloc(void *block, size_t size);
+
+static int Refuses(void) {
+  if (++count != refused) return 0;
+  errno = ENOMEM;
+  return 1;
+}
+
+void *malloc(size_t size) { return Refuses() ? NULL : __libc_malloc(size); }
+
+void *calloc(size_t number, size_t size) { return Refuses() ? NULL : __libc_calloc(number, size); }
+
+void *realloc(void *block, size_t size) { return Refuses() ? NULL : __libc_realloc(block, size); }
+
+__attribute__((constructor)) static void Begin(void) {
+  const char *number = getenv("REFUSE");
+  refused = number == NULL ? 0 : strtoul(number, NULL, 10);
+  count = 0;
+}
+
+__attribute__((destructor)) static void End(void) {
+  const char *name = getenv("ALLOCATIONS");
+  const unsigned long total = count;
+  FILE *file = name == NULL ? NULL : fopen(name, "w");
+  if (file == NULL) return;
+  fprintf(file, "%lu", total);
+  fclose(file);
+}
