@@ -24,9 +24,7 @@ static int Refuses(void) {
 
 void *malloc(size_t size) { return Refuses() ? NULL : __libc_malloc(size); }
 
-void *calloc(size_t number, size_t size) {
-  return Refuses() ? NULL : __libc_calloc(number, size);
-}
+void *calloc(size_t number, size_t size) { return Refuses() ? NULL : __libc_calloc(number, size); }
 
 void *realloc(void *block, size_t size) { return Refuses() ? NULL : __libc_realloc(block, size); }
 

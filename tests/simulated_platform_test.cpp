@@ -2,21 +2,25 @@
 // controller makes up is good for every parser. The simulated scheduler. Each test in a process of
 // its own, with a scenario of its own.
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/mman.h>
+#include <sys/socket.h>
 #include <sys/syscall.h>
-#include <syslog.h>
+#include <sys/un.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <chrono>
 #include <cmath>
-#include <cstdarg>
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <ctime>
 #include <fstream>
 #include <functional>
+#include <regex>
 #include <set>
 #include <sstream>
 #include <string>
@@ -28,21 +32,20 @@ namespace {
 
 int64_t wallClock = 0;  // in milliseconds since 1970; 0 for the real one
 std::string systemLog;
+bool systemLogIsFull = false;
 
 }  // namespace
 
-// Take the place of the system's log.
+// Takes the place of the system's log.
 // NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
-extern "C" MORWICK_EXPORT void openlog(const char *identity, int, int facility) {
-  systemLog = identity + ("/" + std::to_string(facility));
-}
-extern "C" MORWICK_EXPORT void syslog(int priority, const char *format, ...) {
-  char text[100];
-  va_list arguments;
-  va_start(arguments, format);
-  std::vsnprintf(text, sizeof text, format, arguments);
-  va_end(arguments);
-  systemLog += " " + std::to_string(priority) + ":" + text;
+extern "C" MORWICK_EXPORT ssize_t sendto(int, const void *text, size_t size, int flags,
+                                         const sockaddr *log, socklen_t) {
+  EXPECT_STREQ(reinterpret_cast<const sockaddr_un *>(log)->sun_path, "/dev/log");
+  EXPECT_NE(flags & MSG_DONTWAIT, 0);
+  errno = EAGAIN;
+  if (systemLogIsFull) return -1;
+  systemLog.append(static_cast<const char *>(text), size).push_back('\n');
+  return static_cast<ssize_t>(size);
 }
 
 // Takes the place of the platform's, for the wall clock.
@@ -202,8 +205,89 @@ TEST(SimulatedPlatformTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
   Play("");
   testing::internal::CaptureStderr();
   for (const char *text : {"100%", "line\n", ""}) SystemLog("%s", text);
-  EXPECT_EQ(systemLog, "grellon/" + std::to_string(LOG_DAEMON) + " 5:100% 5:line\n 5:");
   EXPECT_EQ(testing::internal::GetCapturedStderr(), "grellon: 100%\ngrellon: line\ngrellon: \n");
+  // Facility daemon, level notice.
+  const std::regex head("<29>[A-Z][a-z]{2} [ 123][0-9] [0-9]{2}(:[0-9]{2}){2} grellon\\[" +
+                        std::to_string(getpid()) + "\\]: ");
+  EXPECT_EQ(std::regex_replace(systemLog, head, "-"), "-100%\n-line\n-\n");
+}
+
+// All lines in their order but for one gap, which is told of.
+void CheckOneGap(const std::string &log, unsigned long lines) {
+  std::istringstream stream(log);
+  std::string line;
+  unsigned long next = 1;
+  int gaps = 0;
+  while (std::getline(stream, line)) {
+    std::string text = line.substr(std::min(line.size(), line.find(": ") + 2));
+    if (text.ends_with('\r')) text.pop_back();
+    if (text.starts_with("line ")) {
+      EXPECT_EQ(text, "line " + std::to_string(next++));
+    } else {
+      const unsigned long dropped = std::strtoul(text.c_str(), nullptr, 10);
+      EXPECT_EQ(text, std::to_string(dropped) + " lines of the log were dropped");
+      next += dropped;
+      ++gaps;
+    }
+  }
+  EXPECT_EQ(next, lines + 1);
+  EXPECT_EQ(gaps, 1);
+}
+
+// Nobody reads standard error or the system's log, and then somebody does.
+void CheckFullLog(int reader, int writer) {
+  Play("");
+  fcntl(reader, F_SETFL, O_NONBLOCK);
+  const int standardError = dup(STDERR_FILENO);
+  dup2(writer, STDERR_FILENO);
+  std::string log;
+  const auto readLog = [&] {
+    std::string some(4096, '\0');
+    for (ssize_t size = 0; (size = read(reader, some.data(), some.size())) > 0; usleep(1000)) {
+      log.append(some, 0, static_cast<size_t>(size));
+    }
+  };
+  systemLogIsFull = true;
+  alarm(20);  // in case it waits
+  unsigned line = 0;
+  while (line < 20'000) SystemLog("line %u", ++line);
+  systemLogIsFull = false;
+  for (; line < 20'100; readLog()) SystemLog("line %u", ++line);
+  alarm(0);
+  EXPECT_EQ(fcntl(STDERR_FILENO, F_GETFL) & O_NONBLOCK, 0) << "others write there too";
+  dup2(standardError, STDERR_FILENO);
+  CheckOneGap(log, line);
+  CheckOneGap(systemLog, line);
+}
+
+TEST(SimulatedPlatformTest, NeverWaitsForAPipe) {
+  int ends[2] = {};
+  ASSERT_EQ(pipe(ends), 0);
+  CheckFullLog(ends[0], ends[1]);
+}
+
+TEST(SimulatedPlatformTest, NeverWaitsForASocket) {
+  int ends[2] = {};
+  ASSERT_EQ(socketpair(AF_UNIX, SOCK_STREAM, 0, ends), 0);
+  CheckFullLog(ends[0], ends[1]);
+}
+
+TEST(SimulatedPlatformTest, NeverWaitsForATerminal) {
+  const int terminal = posix_openpt(O_RDWR | O_NOCTTY);
+  ASSERT_EQ(grantpt(terminal) | unlockpt(terminal), 0);
+  CheckFullLog(terminal, open(ptsname(terminal), O_RDWR | O_NOCTTY));
+}
+
+TEST(SimulatedPlatformTest, LeavesSignalsToATool) {
+  Play("[[controller]]\nclass = 'KVRStorage'\n");
+  CloseService(Connect());
+  sigset_t blocked;
+  pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
+  for (const int signal : {SIGHUP, SIGINT, SIGTERM, SIGUSR1, SIGPIPE, SIGXFSZ}) {
+    struct sigaction action = {};
+    sigaction(signal, nullptr, &action);
+    EXPECT_TRUE(action.sa_handler == SIG_DFL && sigismember(&blocked, signal) == 0) << signal;
+  }
 }
 
 std::vector<uint64_t> Values(const ContextNode *node) {
@@ -321,7 +405,9 @@ TEST(SimulatedPlatformTest, MakesWhatEveryParserUnderstands) {
     CheckSnapshot(connection, static_cast<uint32_t>(age / 1000));
     EXPECT_EQ(now.ftl.at(9), (powerOn + age) / 1000) << "the calendar time";
     EXPECT_EQ(now.ftl.at(10), age / 3'600'000) << "the hours";
-    EXPECT_EQ(now.msp.at(0), std::min<uint64_t>(900'000 + age / 90, 4294967295));
+    const double angle = static_cast<double>(age % 60'000) / 60'000 * 2 * std::acos(-1);
+    const uint64_t busy = age + static_cast<uint64_t>(std::llround(5000 * std::sin(angle)));
+    EXPECT_EQ(now.msp.at(0), std::min<uint64_t>(900'000 + busy / 90, 4294967295));
     if (ageBefore != 0) {
       EXPECT_EQ(now.ftl != before.ftl, age > ageBefore);
       EXPECT_EQ(now.msp != before.msp, age > ageBefore);

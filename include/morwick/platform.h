@@ -6,11 +6,12 @@
  * PORTING. A platform is a folder under platform/ whose CMakeLists.txt makes the library target
  * `morwick-platform`, which defines every function below with C linkage. Configure with
  * -DMORWICK_PLATFORM=FOLDER; nothing else of the tree names a platform. Of the tree a platform
- * includes this header and its own files. The target is built without exceptions and without
- * run-time type information unless the folder's CMakeLists.txt says otherwise; no exception may
+ * includes this header and its own files. A folder's CMakeLists.txt that calls morwick_plain_cxx
+ * builds it without exceptions and without run-time type information; in any case no exception may
  * leave a function. Tests hold for any platform but where tests/CMakeLists.txt asks for
  * `simulated`: the unit tests (they bring a platform of their own), the header and export checks,
- * and the package tests. platform/simulated/ is the example, with controllers that are made up.
+ * the package tests, and tests/sessions/FOLDER.session if there is one. platform/none/ is the
+ * smallest one, without controllers; platform/simulated/ has some that are made up.
  *
  * THREADS. Driver calls and SystemLog may come from any thread, several at once. The functions of
  * the activity are called as each comment says. No function may call back into the library but
@@ -18,7 +19,7 @@
  *
  * MEMORY. A function that gets no memory answers with its failure. Nothing but SystemLog,
  * RegisterActivity and RunMainQueue may end the process: a tool that looks for a controller is not
- * to die of it.
+ * to die of it. Nor may anything but these three change how the process handles signals.
  */
 #ifndef MORWICK_PLATFORM_H
 #define MORWICK_PLATFORM_H
@@ -122,7 +123,8 @@ MORWICK_EXPORT void RunMainQueue(void) __attribute__((noreturn));
 
 /*
  * Writes one message, formatted as printf does, to the system log at the default level. With that
- * level masked nothing is formatted. The text may bring a line end of its own.
+ * level masked nothing is formatted. The text may bring a line end of its own. Never waits for
+ * whoever reads the log: what there is no room for is lost, and later messages say how much was.
  */
 MORWICK_EXPORT void SystemLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
 

@@ -6,7 +6,9 @@
 #include <cstdio>
 #include <cstring>
 #include <map>
+#include <memory>
 #include <mutex>
+#include <new>
 #include <optional>
 #include <string>
 #include <vector>
@@ -15,10 +17,6 @@
 #include "platform/simulated/files.h"
 #include "platform/simulated/own_buffers.h"
 #include "platform/simulated/scenario.h"
-
-struct MatchingRequest {
-  std::string className;
-};
 
 namespace simulated {
 namespace {
@@ -30,6 +28,7 @@ enum Result : int32_t {
   kRefused = 0x103,
   kDeviceError = 0x104,
   kNotOffered = 0x105,
+  kNoMemory = 0x106,
 };
 
 constexpr size_t kRequestSize = 24;  // command, argument, zeros
@@ -56,9 +55,17 @@ struct Handle {
   HandleKind kind;
   Device *device;
 };
+using Handles = std::map<uint32_t, Handle>;
 
 const char *NameOf(HandleKind kind) {
   return kind == HandleKind::kService ? "service" : "connection";
+}
+
+// Memory for one handle.
+Handles::node_type MakeRoom() {
+  Handles one;
+  one[0] = {};
+  return one.extract(0);
 }
 
 uint32_t LoadWord(const void *bytes, size_t offset) {
@@ -91,12 +98,12 @@ class Drivers {
     }
   }
 
-  uint32_t Find(const std::string &className) {
+  uint32_t Find(const std::string &className, Handles::node_type room) {
     const std::lock_guard lock(mutex_);
     for (Device &device : devices_) {
       if (device.controller->className != className) continue;
       if (device.controller->vanish.Hits(++device.lookups)) return 0;
-      return Issue(HandleKind::kService, &device);
+      return Issue(std::move(room), {HandleKind::kService, &device});
     }
     return 0;
   }
@@ -108,7 +115,7 @@ class Drivers {
     if (device == nullptr) return kBadHandle;
     if (device->controller->refuseOpen.Hits(++device->opens)) return kRefused;
     if (type != 0) return kBadArgument;
-    *connection = Issue(HandleKind::kConnection, device);
+    *connection = Issue(MakeRoom(), {HandleKind::kConnection, device});
     return kSuccess;
   }
 
@@ -194,8 +201,10 @@ class Drivers {
   }
 
   // Numbers are never used twice, so that a late use of a handle cannot hit another one.
-  uint32_t Issue(HandleKind kind, Device *device) {
-    open_[++lastHandle_] = {kind, device};
+  uint32_t Issue(Handles::node_type room, Handle handle) {
+    room.key() = ++lastHandle_;
+    room.mapped() = handle;
+    open_.insert(std::move(room));
     return lastHandle_;
   }
 
@@ -215,35 +224,63 @@ class Drivers {
 
   std::mutex mutex_;
   std::vector<Device> devices_;
-  std::map<uint32_t, Handle> open_;
+  Handles open_;
   uint32_t lastHandle_ = 0;
 };
+
+// Answers a contract function; without memory for the answer, with the failure.
+template <typename Answer, typename Function>
+Answer OrFailure(Answer failure, Function answer) {
+  try {
+    return answer();
+  } catch (const std::bad_alloc &) {
+    return failure;
+  }
+}
 
 }  // namespace
 }  // namespace simulated
 
 using simulated::Drivers;
+using simulated::OrFailure;
+
+// Brings the memory for the handle, so that only the making of a request may fail for want of it.
+struct MatchingRequest {
+  std::string className;
+  simulated::Handles::node_type room;
+};
 
 MatchingRequest *ServiceMatching(const char *className) {
-  return className == nullptr ? nullptr : new MatchingRequest{className};
+  return OrFailure<MatchingRequest *>(nullptr, [=]() -> MatchingRequest * {
+    if (className == nullptr) return nullptr;
+    Drivers::Instance();
+    return new MatchingRequest{className, simulated::MakeRoom()};
+  });
 }
 
 uint32_t GetMatchingService(MatchingRequest *request) {
-  if (request == nullptr) return 0;
-  const std::string className = std::move(request->className);
-  delete request;
-  return Drivers::Instance().Find(className);
+  const std::unique_ptr<MatchingRequest> owned(request);
+  return owned == nullptr ? 0 : Drivers::Instance().Find(owned->className, std::move(owned->room));
 }
 
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
-  return Drivers::Instance().Open(service, type, connection);
+  return OrFailure<int32_t>(simulated::kNoMemory,
+                            [=] { return Drivers::Instance().Open(service, type, connection); });
 }
 
-int32_t CloseService(uint32_t connection) { return Drivers::Instance().Close(connection); }
+int32_t CloseService(uint32_t connection) {
+  return OrFailure<int32_t>(simulated::kNoMemory,
+                            [=] { return Drivers::Instance().Close(connection); });
+}
 
-int32_t ReleaseObject(uint32_t service) { return Drivers::Instance().Release(service); }
+int32_t ReleaseObject(uint32_t service) {
+  return OrFailure<int32_t>(simulated::kNoMemory,
+                            [=] { return Drivers::Instance().Release(service); });
+}
 
 int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
                          size_t inputSize, void *reply, size_t *replySize) {
-  return Drivers::Instance().Call(connection, selector, input, inputSize, reply, replySize);
+  return OrFailure<int32_t>(simulated::kNoMemory, [=] {
+    return Drivers::Instance().Call(connection, selector, input, inputSize, reply, replySize);
+  });
 }

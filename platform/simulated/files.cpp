@@ -3,35 +3,40 @@
 #include "platform/simulated/files.h"
 
 #include <errno.h>
+#include <fcntl.h>
+#include <unistd.h>
 
-#include <cctype>
 #include <cstdio>
-#include <memory>
 
 namespace simulated {
 
 int ReadFile(const char *path, void *bytes, size_t room, size_t *size) {
-  const std::unique_ptr<FILE, int (*)(FILE *)> file(std::fopen(path, "rb"), std::fclose);
-  if (file == nullptr) return errno;
-  std::setvbuf(file.get(), nullptr, _IONBF, 0);  // a buffer would be filled beyond the room
-  *size = std::fread(bytes, 1, room, file.get());
-  // A directory opens but cannot be read.
-  return std::ferror(file.get()) == 0 ? 0 : errno;
+  const int file = open(path, O_RDONLY | O_CLOEXEC);
+  if (file < 0) return errno;
+  ssize_t got = 1;
+  for (*size = 0; got > 0 && *size<room; *size += got> 0 ? static_cast<size_t>(got) : 0) {
+    got = read(file, static_cast<char *>(bytes) + *size, room - *size);
+  }
+  const int error = got < 0 ? errno : 0;  // a directory opens but cannot be read
+  close(file);
+  return error;
 }
 
-std::string Quoted(std::string_view text) {
-  std::string quoted = "'";
+std::string Printable(std::string_view text) {
+  std::string printable;
   for (const char c : text) {
     const auto byte = static_cast<unsigned char>(c);
-    if (std::iscntrl(byte) == 0) {
-      quoted += c;
+    if (byte >= ' ' && byte <= '~') {
+      printable += c;
     } else {
       constexpr char kDigits[] = "0123456789abcdef";
-      quoted.append("\\x").append(1, kDigits[byte >> 4]).append(1, kDigits[byte & 15]);
+      printable.append("\\x").append(1, kDigits[byte >> 4]).append(1, kDigits[byte & 15]);
     }
   }
-  return quoted + "'";
+  return printable;
 }
+
+std::string Quoted(std::string_view text) { return "'" + Printable(text) + "'"; }
 
 void Complain(const std::string &reason) {
   std::fprintf(stderr, "%s: %s\n", program_invocation_short_name, reason.c_str());

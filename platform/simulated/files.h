@@ -12,7 +12,10 @@ namespace simulated {
 // 0, or the number of the error.
 int ReadFile(const char *path, void *bytes, size_t room, size_t *size);
 
-// Text from outside, in quotes and without characters that would end the line.
+// Text from outside, without characters that would end a line or steer a terminal.
+std::string Printable(std::string_view text);
+
+// The same in quotes.
 std::string Quoted(std::string_view text);
 
 // One line on standard error, after the program's name.

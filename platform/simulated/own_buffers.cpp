@@ -1,5 +1,6 @@
 // Statistics, snapshot and snapshot header of a controller that is made up: it was first powered on
-// at a fixed time, and everything follows from the time since then. All numbers are little-endian.
+// at a fixed time, and everything follows from the time since then. Its load swells and ebbs within
+// a minute. All numbers are little-endian.
 
 #include "platform/simulated/own_buffers.h"
 
@@ -8,7 +9,9 @@
 #include <algorithm>
 #include <array>
 #include <chrono>
+#include <cmath>
 #include <limits>
+#include <numbers>
 #include <string_view>
 
 #include "platform/simulated/scenario.h"
@@ -18,41 +21,45 @@ namespace {
 
 constexpr uint64_t kFirstPowerOn = 1704067200;  // 2024, in seconds since 1970
 constexpr uint64_t kHour = 3'600'000;           // in milliseconds
+constexpr uint64_t kMinute = 60'000;
+constexpr double kSwing = 5'000;
 
-// What is known at the first power-on, and what each hour adds. An array is a histogram: each
-// element has half of what the one before it has.
+// What is known at the first power-on, and what each hour adds: of the clock, or of the load. An
+// array is a histogram: each element has half of what the one before it has.
+enum Pace { kByLoad, kByClock };
 struct Counter {
   uint32_t key;
   uint32_t elements;
   uint64_t start;
   uint64_t growth;
+  Pace pace = kByLoad;
 };
 
 // clang-format off: one row a line
 constexpr Counter kStatistics[] = {
-    {53, 1, 5, 0},                   // export version
-    {52, 1, 4096, 0},                // virtual blocks,
-    {51, 1, 8, 0},                   // blocks in each,
-    {50, 1, 1152, 0},                // pages in each of these,
-    {49, 1, 16384, 0},               // bytes in each of these
-    {48, 1, 312, 0},                 // free virtual blocks
-    {12, 1, 870, 0},                 // indirection pool, free
-    {13, 1, 1024, 0},                // indirection pool
-    {56, 1, kFirstPowerOn, 0},       // time of formatting
-    {57, 1, kFirstPowerOn, 3600},    // calendar time
-    {34, 1, 0, 1},                   // hours powered on
-    {10, 1, 3, 0},                   // boots
-    {4, 1, 20'000'000, 3'168'000},   // host writes, 4k sectors
-    {7, 1, 50'000'000, 7'488'000},   // host reads
-    {18, 1, 30'000'000, 4'752'000},  // NAND writes
-    {19, 1, 60'000'000, 9'072'000},  // NAND reads
-    {20, 1, 814, 129},               // band erases
-    {17, 1, 6, 2},                   // wear-level moves
-    {45, 1, 12, 1},                  // erases of the block that had most of them
-    {28, 1, 40, 30},                 // sleeps
-    {14, 10, 4'000'000, 600'000},    // host writes by size
-    {15, 10, 9'000'000, 900'000},    // host reads by size
-    {265, 5, 70'000, 9'000},         // read counts
+    {53, 1, 5, 0},                           // export version
+    {52, 1, 4096, 0},                        // virtual blocks,
+    {51, 1, 8, 0},                           // blocks in each,
+    {50, 1, 1152, 0},                        // pages in each of these,
+    {49, 1, 16384, 0},                       // bytes in each of these
+    {48, 1, 312, 0},                         // free virtual blocks
+    {12, 1, 870, 0},                         // indirection pool, free
+    {13, 1, 1024, 0},                        // indirection pool
+    {56, 1, kFirstPowerOn, 0},               // time of formatting
+    {57, 1, kFirstPowerOn, 3600, kByClock},  // calendar time
+    {34, 1, 0, 1, kByClock},                 // hours powered on
+    {10, 1, 3, 0},                           // boots
+    {4, 1, 20'000'000, 3'168'000},           // host writes, 4k sectors
+    {7, 1, 50'000'000, 7'488'000},           // host reads
+    {18, 1, 30'000'000, 4'752'000},          // NAND writes
+    {19, 1, 60'000'000, 9'072'000},          // NAND reads
+    {20, 1, 814, 129},                       // band erases
+    {17, 1, 6, 2},                           // wear-level moves
+    {45, 1, 12, 1},                          // erases of the block that had most of them
+    {28, 1, 40, 30},                         // sleeps
+    {14, 10, 4'000'000, 600'000},            // host writes by size
+    {15, 10, 9'000'000, 900'000},            // host reads by size
+    {265, 5, 70'000, 9'000},                 // read counts
 };
 
 constexpr Counter kMspStatistics[] = {
@@ -134,8 +141,25 @@ class Reply {
   size_t size_ = 0;
 };
 
+// Where in the load's minute a time is, in milliseconds, as an angle.
+double PhaseAt(uint64_t time) {
+  return 2 * std::numbers::pi * static_cast<double>(time % kMinute) / kMinute;
+}
+
+// The time that counters go by. It runs up to five seconds ahead of the clock and behind it, and
+// never back: the load is what it gains in a second.
+uint64_t BusyTime(uint64_t time) {
+  return time + static_cast<uint64_t>(std::llround(kSwing * std::sin(PhaseAt(time))));
+}
+
+// The load at a time, 1 on average: the slope of the above.
+double LoadAt(uint64_t time) {
+  return 1 + 2 * std::numbers::pi * kSwing / kMinute * std::cos(PhaseAt(time));
+}
+
 // Hours apart from the rest of one: growth times milliseconds could run past 64 bits.
-uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t time) {
+uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
+  const uint64_t time = counter.pace == kByClock ? clock : BusyTime(clock);
   const uint64_t grown = time / kHour * counter.growth + time % kHour * counter.growth / kHour;
   return (counter.start + grown) >> element;
 }
@@ -160,14 +184,13 @@ void AppendMspStatistics(uint64_t time, Reply *reply) {
   }
 }
 
-// The interval that ended in the given second: a load that swells and ebbs within a minute, and
-// slow writes for eight seconds out of two minutes.
+// The interval that ended in the given second, with slow writes for eight seconds out of two
+// minutes.
 void AppendInterval(uint32_t second, Reply *reply) {
   std::array<uint32_t, kIntervalSize / sizeof(uint32_t)> interval = {};
   const auto set = [&](uint32_t offset, uint32_t value) { interval[offset / 4] = value; };
   const uint32_t noise = second * 2654435761U >> 28;  // 0 to 15
-  const uint32_t minute = second % 60;
-  const uint32_t load = 40 + 2 * std::min(minute, 60 - minute) + noise;
+  const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{second} * 1000)) + noise;
   const uint32_t slowness = second % 120 < 8 ? 10 : 1;
   const auto setOperations = [&](uint32_t offset, uint32_t count, uint32_t latency) {
     set(offset, count);
@@ -190,7 +213,7 @@ void AppendInterval(uint32_t second, Reply *reply) {
   set(116, hostReads + collected);
   set(120, hostWrites + collected);
   set(124, collected);
-  set(132, minute == 0 ? 1 : 0);
+  set(132, second % 60 == 0 ? 1 : 0);
   set(144, 3 + noise % 4);
   set(148, 16 + noise % 3);
   set(156, 1230 * slowness + 10 * noise);

@@ -27,37 +27,87 @@ pending = 2
 )";
 
 constexpr double kLongestSeconds = 1e6;
-constexpr size_t kLargestFile = 1 << 20;
+constexpr size_t kLargestFile = 64 << 10;
+constexpr size_t kDeepest = 64;
 
-// The first error found, with the place it was found at.
-class Report {
- public:
-  explicit Report(const std::string &file) : file_(file) {}
-
-  void Add(const toml::source_region &where, const std::string &reason) {
-    if (!text_.empty()) return;
-    text_ = file_ + ":" + std::to_string(where.begin.line) + ": " + reason;
-  }
-  const std::string &text() const { return text_; }
-
- private:
-  const std::string &file_;
-  std::string text_;
+// What a scenario is refused for: the first error, and the line that it is in.
+struct BadScenario {
+  size_t line;
+  std::string reason;
 };
 
+[[noreturn]] void Refuse(const toml::source_region &where, const std::string &reason) {
+  throw BadScenario{.line = where.begin.line, .reason = reason};
+}
+
+// Refuses what the TOML library cannot be given: for some characters beyond ASCII its tables run
+// into undefined behaviour.
+void CheckCharacters(std::string_view text) {
+  size_t line = 1;
+  for (const char c : text) {
+    if (static_cast<unsigned char>(c) > 127)
+      throw BadScenario{line, "a character that is not ASCII"};
+    if (c == '\n') ++line;
+  }
+}
+
+// Where the comment or the string ends that begins at `at`.
+size_t EndOfText(std::string_view text, size_t at) {
+  const char begin = text[at];
+  if (begin == '#') return std::min(text.find('\n', at), text.size());
+  const bool lines = text.substr(at, 3) == std::string(3, begin);
+  const std::string_view end = text.substr(at, lines ? 3 : 1);
+  for (at += end.size(); at < text.size(); ++at) {
+    if (text[at] == '\n' && !lines) return at;
+    if (text.substr(at, end.size()) == end) {
+      at += end.size();
+      // Up to two more belong to the string.
+      return lines ? std::min(text.find_first_not_of(begin, at), text.size()) : at;
+    }
+    if (text[at] == '\\' && begin == '"') ++at;
+  }
+  return text.size();
+}
+
+// The same for nesting, by brackets or by the dots of a key: each level takes some of its stack.
+void CheckDepth(std::string_view text) {
+  size_t depth = 0;
+  std::vector<size_t> outside;  // of each bracket that is open
+  for (size_t at = 0; at < text.size(); ++at) {
+    switch (text[at]) {
+      case '#':
+      case '"':
+      case '\'': at = EndOfText(text, at) - 1; break;
+      case '[':
+      case '{': outside.push_back(depth); [[fallthrough]];
+      case '.': ++depth; break;
+      case ']':
+      case '}':
+        depth = outside.empty() ? 0 : outside.back();
+        if (!outside.empty()) outside.pop_back();
+        break;
+      case ',':
+      case '\n': depth = outside.empty() ? 0 : outside.back() + 1; break;
+      default: break;
+    }
+    if (depth > kDeepest) {
+      const auto line =
+          1 + std::count(text.begin(), text.begin() + static_cast<ptrdiff_t>(at), '\n');
+      throw BadScenario{static_cast<size_t>(line),
+                        "deeper than " + std::to_string(kDeepest) + " levels"};
+    }
+  }
+}
+
 // One table of the file. Each Read takes one key and leaves the target alone when the key is
-// absent; whatever no Read has asked for is unknown.
+// absent; whatever none has asked for is unknown.
 class TableReader {
  public:
-  TableReader(const toml::table &table, Report &report) : table_(table), report_(report) {}
-  TableReader(const TableReader &) = delete;
-  TableReader &operator=(const TableReader &) = delete;
+  explicit TableReader(const toml::table &table) : table_(table) {}
 
-  ~TableReader() {
+  void RefuseOtherKeys() const {
     for (const auto &[key, node] : table_) {
-      if (!known_.contains(key.str())) {
-        report_.Add(key.source(), "unknown key " + Quoted(key.str()));
-      }
+      if (!known_.contains(key.str())) Refuse(key.source(), "unknown key " + Quoted(key.str()));
     }
   }
 
@@ -84,7 +134,7 @@ class TableReader {
     const toml::node *node = Find(key);
     if (node == nullptr) return;
     const toml::array *array = node->as_array();
-    if (array == nullptr) return Reject(*node, key, "must be a list of whole numbers");
+    if (array == nullptr) Reject(*node, key, "must be a list of whole numbers");
     for (const toml::node &element : *array) {
       ReadNumber(element, key, least, &target->emplace_back());
     }
@@ -101,10 +151,10 @@ class TableReader {
   void Read(std::string_view key, std::chrono::milliseconds *target) {
     const toml::node *node = Find(key);
     if (node == nullptr) return;
-    if (!node->is_number()) return Reject(*node, key, "must be a number of seconds");
+    if (!node->is_number()) Reject(*node, key, "must be a number of seconds");
     const double seconds = node->value<double>().value_or(-1);
     if (!(seconds >= 0 && seconds <= kLongestSeconds)) {
-      return Reject(*node, key, "must be between 0 and 1000000 seconds");
+      Reject(*node, key, "must be between 0 and 1000000 seconds");
     }
     *target = std::chrono::milliseconds(std::llround(seconds * 1000));
   }
@@ -122,43 +172,40 @@ class TableReader {
  private:
   static constexpr const char *kNotFiles = "must be a file or a list of files";
 
-  void ReadFileName(const toml::node &node, std::string_view key, std::string_view folder,
-                    std::vector<std::string> *target) {
+  static void ReadFileName(const toml::node &node, std::string_view key, std::string_view folder,
+                           std::vector<std::string> *target) {
     const std::string name = node.value_exact<std::string>().value_or("");
-    if (name.empty() || name.find('\0') != std::string::npos) return Reject(node, key, kNotFiles);
+    if (name.empty() || name.find('\0') != std::string::npos) Reject(node, key, kNotFiles);
     target->push_back(name[0] == '/' ? name : std::string(folder) + name);
   }
 
-  void Reject(const toml::node &node, std::string_view key, const std::string &reason) {
-    report_.Add(node.source(), Quoted(key) + " " + reason);
+  [[noreturn]] static void Reject(const toml::node &node, std::string_view key,
+                                  const std::string &reason) {
+    Refuse(node.source(), Quoted(key) + " " + reason);
   }
 
-  void ReadNumber(const toml::node &node, std::string_view key, uint32_t least, uint32_t *target) {
+  static void ReadNumber(const toml::node &node, std::string_view key, uint32_t least,
+                         uint32_t *target) {
     const auto value = node.value_exact<int64_t>();
-    if (!value) return Reject(node, key, "must be a whole number");
+    if (!value) Reject(node, key, "must be a whole number");
     if (*value < least || *value > std::numeric_limits<uint32_t>::max()) {
-      return Reject(node, key, "must be between " + std::to_string(least) + " and 4294967295");
+      Reject(node, key, "must be between " + std::to_string(least) + " and 4294967295");
     }
     *target = static_cast<uint32_t>(*value);
   }
 
   const toml::table &table_;
-  Report &report_;
   std::set<std::string_view> known_;
 };
 
-void ReadController(const toml::table &table, std::string_view folder, Report &report,
-                    Controller *controller) {
-  TableReader reader(table, report);
-  if (const toml::node *name = reader.Find("class"); name == nullptr) {
-    report.Add(table.source(), "'class' is missing");
-  } else if (!name->is_string()) {
-    report.Add(name->source(), "'class' must be text");
-  } else {
-    controller->className = name->value_or(std::string());
-    if (RequestMethod(controller->className) == 0) {
-      report.Add(name->source(), "unknown controller class " + Quoted(controller->className));
-    }
+void ReadController(const toml::table &table, std::string_view folder, Controller *controller) {
+  TableReader reader(table);
+  const toml::node *name = reader.Find("class");
+  if (name == nullptr) Refuse(table.source(), "'class' is missing");
+  if (!name->is_string()) Refuse(name->source(), "'class' must be text");
+  controller->className = name->value_or(std::string());
+  if (RequestMethod(controller->className) == 0) {
+    Refuse(name->source(), "unknown controller class " + Quoted(controller->className));
   }
   reader.Read("pending", &controller->pending);
   reader.Read("vanish", &controller->vanish);
@@ -170,25 +217,26 @@ void ReadController(const toml::table &table, std::string_view folder, Report &r
   for (const auto &[key, command] : kBuffers) {
     reader.Read(key, &controller->files[command], folder);
   }
+  reader.RefuseOtherKeys();
 }
 
-void ReadControllers(const toml::node &node, std::string_view folder, Report &report,
+void ReadControllers(const toml::node &node, std::string_view folder,
                      std::vector<Controller> *controllers) {
   const toml::array *array = node.as_array();
-  if (array == nullptr) return report.Add(node.source(), "'controller' must be [[controller]]");
+  if (array == nullptr) Refuse(node.source(), "'controller' must be [[controller]]");
   for (const toml::node &element : *array) {
-    if (!element.is_table()) return report.Add(element.source(), "a controller must be a table");
-    ReadController(*element.as_table(), folder, report, &controllers->emplace_back());
-    const std::string &className = controllers->back().className;
-    if (std::count_if(controllers->begin(), controllers->end(),
-                      [&](const Controller &other) { return other.className == className; }) > 1) {
-      report.Add(element.source(), "a second controller of class " + Quoted(className));
+    if (!element.is_table()) Refuse(element.source(), "a controller must be a table");
+    Controller controller;
+    ReadController(*element.as_table(), folder, &controller);
+    for (const Controller &other : *controllers) {
+      if (other.className != controller.className) continue;
+      Refuse(element.source(), "a second controller of class " + Quoted(other.className));
     }
+    controllers->push_back(std::move(controller));
   }
 }
 
-void ReadSchedule(const toml::table &table, Report &report, Schedule *schedule) {
-  TableReader reader(table, report);
+void ReadSchedule(TableReader &reader, Schedule *schedule) {
   reader.Read("runs", &schedule->runs);
   reader.Read("first_run_after", &schedule->firstRunAfter);
   reader.Read("interval", &schedule->interval);
@@ -196,26 +244,22 @@ void ReadSchedule(const toml::table &table, Report &report, Schedule *schedule) 
   reader.Read("defer_at_check", &schedule->deferAtCheck, 0);
 }
 
-void ReadScenario(const toml::table &table, std::string_view folder, Report &report,
-                  Scenario *scenario) {
-  TableReader reader(table, report);
+void ReadScenario(const toml::table &table, std::string_view folder, Scenario *scenario) {
+  TableReader reader(table);
   const auto subtable = [&](std::string_view key, auto read) {
     const toml::node *node = reader.Find(key);
     if (node == nullptr) return;
-    if (!node->is_table()) {
-      return report.Add(node->source(), Quoted(key) + " must be a table");
-    }
-    read(*node->as_table());
+    if (!node->is_table()) Refuse(node->source(), Quoted(key) + " must be a table");
+    TableReader subreader(*node->as_table());
+    read(subreader);
+    subreader.RefuseOtherKeys();
   };
-  subtable("log", [&](const toml::table &log) {
-    TableReader(log, report).Read("enabled", &scenario->logEnabled);
-  });
-  subtable("schedule", [&](const toml::table &schedule) {
-    ReadSchedule(schedule, report, &scenario->schedule);
-  });
+  subtable("log", [&](TableReader &log) { log.Read("enabled", &scenario->logEnabled); });
+  subtable("schedule", [&](TableReader &schedule) { ReadSchedule(schedule, &scenario->schedule); });
   if (const toml::node *controllers = reader.Find("controller")) {
-    ReadControllers(*controllers, folder, report, &scenario->controllers);
+    ReadControllers(*controllers, folder, &scenario->controllers);
   }
+  reader.RefuseOtherKeys();
 }
 
 std::optional<Scenario> LoadScenario() {
@@ -228,9 +272,9 @@ std::optional<Scenario> LoadScenario() {
     text.resize(kLargestFile + 1);
     size_t size = 0;
     if (const int number = ReadFile(file, text.data(), text.size(), &size); number != 0) {
-      error = std::string(file) + ": " + std::strerror(number);
+      error = Printable(file) + ": " + std::strerror(number);
     } else if (size > kLargestFile) {
-      error = std::string(file) + ": larger than a mebibyte";
+      error = Printable(file) + ": larger than " + std::to_string(kLargestFile >> 10) + " KiB";
     }
     text.resize(size);
   }
@@ -255,36 +299,25 @@ uint32_t RequestMethod(std::string_view className) {
 
 bool ParseScenario(std::string_view text, const std::string &file, Scenario *scenario,
                    std::string *error) {
-  Report report(file);
-  // The TOML library's tables of characters beyond ASCII run into undefined behaviour for some.
-  size_t line = 1;
-  for (const char c : text) {
-    if (static_cast<unsigned char>(c) > 127) {
-      *error = file + ":" + std::to_string(line) + ": a character that is not ASCII";
-      return false;
-    }
-    if (c == '\n') ++line;
+  const auto refuse = [&](size_t line, std::string_view reason) {
+    *error = Printable(file) + ":" + std::to_string(line) + ": " + Printable(reason);
+    return false;
+  };
+  try {
+    CheckCharacters(text);
+    CheckDepth(text);
+    ReadScenario(toml::parse(text), file.substr(0, file.rfind('/') + 1), scenario);
+    return true;
+  } catch (const BadScenario &bad) {
+    return refuse(bad.line, bad.reason);
+  } catch (const toml::parse_error &bad) {
+    return refuse(bad.source().begin.line, bad.description());
   }
-  const toml::parse_result result = toml::parse(text);
-  if (result) {
-    const std::string folder = file.substr(0, file.rfind('/') + 1);
-    ReadScenario(result.table(), folder, report, scenario);
-  } else {
-    report.Add(result.error().source(), std::string(result.error().description()));
-  }
-  *error = report.text();
-  return error->empty();
 }
 
 const Scenario *TheScenario() {
   static const std::optional<Scenario> scenario = LoadScenario();
   return scenario ? &*scenario : nullptr;
-}
-
-const Scenario &RequireScenario() {
-  const Scenario *scenario = TheScenario();
-  if (scenario == nullptr) std::exit(2);
-  return *scenario;
 }
 
 }  // namespace simulated

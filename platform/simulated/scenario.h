@@ -87,9 +87,6 @@ bool ParseScenario(std::string_view text, const std::string &file, Scenario *sce
 // the built-in one. Null for a bad file, about which there is one line on standard error.
 const Scenario *TheScenario();
 
-// The same where there is no going on without one: a bad file ends the process with status 2.
-const Scenario &RequireScenario();
-
 }  // namespace simulated
 
 #endif

@@ -1,22 +1,16 @@
 // The background-activity scheduler and the main queue. A worker thread checks the activity in and
 // runs it on schedule; the main thread waits for signals.
 
-#include <pthread.h>
-#include <unistd.h>
-
 #include <condition_variable>
-#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <mutex>
-#include <string>
 #include <thread>
 
 #include "morwick/platform.h"
-#include "platform/simulated/scenario.h"
+#include "platform/simulated/process.h"
 
 struct Activity {
-  std::string identifier;
   ActivityHandler handler = nullptr;
   int state = 0;
 };
@@ -35,9 +29,7 @@ class Scheduler {
     return scheduler;
   }
 
-  void Register(const char *identifier, ActivityHandler handler) {
-    activity_ = {.identifier = identifier, .handler = handler};
-  }
+  void Register(ActivityHandler handler) { activity_.handler = handler; }
 
   int State(const Activity &activity) {
     const std::lock_guard lock(mutex_);
@@ -64,27 +56,23 @@ class Scheduler {
     inTransaction_ = false;
   }
 
-  // Runs the activity until the schedule ends or a signal asks to stop. Signals are blocked before
-  // the worker starts, so that they reach sigwait and never interrupt a pause of the activity.
-  void Run() {
-    sigset_t signals;
-    sigemptyset(&signals);
-    for (const int signal : {SIGUSR1, SIGTERM, SIGINT}) sigaddset(&signals, signal);
-    pthread_sigmask(SIG_BLOCK, &signals, nullptr);
-    std::thread worker([this] {
-      RunSchedule();
-      kill(getpid(), SIGTERM);  // the schedule's end stops the main queue like a user
+  // Runs the activity until the schedule ends or a signal asks to stop.
+  void Run(const Schedule &schedule) {
+    ForgetYield();
+    std::thread worker([&] {
+      RunSchedule(schedule);
+      Stop();  // the schedule's end stops the main queue like a user
     });
-    int signal = 0;
+    bool stop;
     do {
-      sigwait(&signals, &signal);
-      Yield(signal != SIGUSR1);
-    } while (signal == SIGUSR1);
+      stop = WaitToStop();
+      Yield(stop);
+    } while (!stop);
     worker.join();
   }
 
  private:
-  // SIGUSR1 between two runs finds no activity to yield and means nothing.
+  // A wish to yield between two runs finds no activity to yield and means nothing.
   void Yield(bool stop) {
     const std::lock_guard lock(mutex_);
     yieldWanted_ = true;
@@ -92,11 +80,10 @@ class Scheduler {
     wakeUp_.notify_all();
   }
 
-  void RunSchedule() {
+  void RunSchedule(const Schedule &schedule) {
     if (activity_.handler == nullptr) return;
     Enter(kActivityStateCheckIn);
     activity_.handler(&activity_);
-    const Schedule &schedule = RequireScenario().schedule;
     auto delay = schedule.firstRunAfter;
     size_t run = 0;
     for (uint32_t left = schedule.runs; left > 0 && WaitFor(delay); ++run) {
@@ -151,9 +138,9 @@ class Scheduler {
 
 using simulated::Scheduler;
 
-void RegisterActivity(const char *identifier, ActivityCriteria criteria, ActivityHandler handler) {
-  simulated::RequireScenario();
-  if (criteria == kActivityCheckIn) Scheduler::Instance().Register(identifier, handler);
+void RegisterActivity(const char *, ActivityCriteria criteria, ActivityHandler handler) {
+  simulated::TakeProcess();
+  if (criteria == kActivityCheckIn) Scheduler::Instance().Register(handler);
 }
 
 int GetActivityState(Activity *activity) { return Scheduler::Instance().State(*activity); }
@@ -167,9 +154,13 @@ bool SetActivityState(Activity *activity, int state) {
 void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
 
 void RunMainQueue() {
-  simulated::RequireScenario();
+  const simulated::Schedule &schedule = simulated::TakeProcess().schedule;
   // Lines that the library prints belong between the lines of the log, not behind them all.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
-  Scheduler::Instance().Run();
+  try {
+    Scheduler::Instance().Run(schedule);
+  } catch (...) {
+    simulated::EndWithoutMemory();  // no thread was to be had
+  }
   std::exit(EXIT_SUCCESS);
 }

@@ -1,53 +1,203 @@
-// The system log: syslog, and standard error too for a person who runs the process in the
-// foreground.
+// The system log: the system's socket for it, and standard error too for a person who runs the
+// process in the foreground. Nothing here ever waits for whoever reads them.
 
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/un.h>
 #include <syslog.h>
+#include <unistd.h>
 
-#include <csignal>
+#include <algorithm>
+#include <array>
+#include <cerrno>
 #include <cstdarg>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <string>
+#include <ctime>
+#include <mutex>
 
 #include "morwick/platform.h"
-#include "platform/simulated/scenario.h"
+#include "platform/simulated/process.h"
 
 namespace simulated {
 namespace {
+
+constexpr size_t kLongestMessage = 1024;
+using Line = std::array<char, kLongestMessage + 64>;
+
+// Where lines go. What there is no room for now waits, in a bounded space; lines beyond that, and
+// those that cannot be written at all, are dropped and counted.
+class Output {
+ public:
+  void Add(const char *message) {
+    Flush();
+    if (dropped_ > 0 || !Put(message)) ++dropped_;
+  }
+
+  // True when nothing waits any more.
+  bool Flush() {
+    while (waitingSize_ > 0) {
+      const size_t length = std::strlen(waiting_.data());
+      const ssize_t written = Write(waiting_.data(), length);
+      if (written == 0) return false;
+      if (written < 0) ++dropped_;
+      // What is left of a line that was written in part goes on waiting.
+      const bool done = written < 0 || static_cast<size_t>(written) == length;
+      const size_t gone = done ? length + 1 : static_cast<size_t>(written);
+      waitingSize_ -= gone;
+      std::memmove(waiting_.data(), waiting_.data() + gone, waitingSize_);
+    }
+    if (dropped_ > 0) {
+      std::array<char, 64> message;
+      std::snprintf(message.data(), message.size(), "%llu lines of the log were dropped", dropped_);
+      if (Put(message.data())) dropped_ = 0;
+    }
+    return waitingSize_ == 0;
+  }
+
+ protected:
+  ~Output() = default;
+
+ private:
+  // Makes a line of a message; returns its length.
+  virtual int Format(const char *message, Line *line) = 0;
+
+  // Returns how much was written, 0 when there is no room now, or -1 when there will be none.
+  virtual ssize_t Write(const char *text, size_t length) = 0;
+
+  // False when the line is lost.
+  bool Put(const char *message) {
+    Line line;
+    const auto length = static_cast<size_t>(Format(message, &line));
+    const ssize_t written = waitingSize_ > 0 ? 0 : Write(line.data(), length);
+    if (written < 0) return false;
+    const size_t left = length - static_cast<size_t>(written);
+    if (left == 0) return true;
+    if (left >= waiting_.size() - waitingSize_) return false;
+    std::copy_n(line.data() + written, left + 1, waiting_.data() + waitingSize_);
+    waitingSize_ += left + 1;
+    return true;
+  }
+
+  std::array<char, 16 << 10> waiting_ = {};  // lines, each with its NUL
+  size_t waitingSize_ = 0;
+  unsigned long long dropped_ = 0;
+};
+
+class SystemSocket : public Output {
+  int Format(const char *message, Line *line) override {
+    const time_t now = std::time(nullptr);
+    tm local = {};
+    localtime_r(&now, &local);
+    std::array<char, 32> stamp;
+    std::strftime(stamp.data(), stamp.size(), "%b %e %T", &local);
+    return std::snprintf(line->data(), line->size(), "<%d>%s grellon[%d]: %s",
+                         LOG_DAEMON | LOG_NOTICE, stamp.data(), getpid(), message);
+  }
+
+  // Not connected, so that a log that is started anew finds its next reader.
+  ssize_t Write(const char *text, size_t length) override {
+    static constexpr sockaddr_un kReader = {.sun_family = AF_UNIX, .sun_path = "/dev/log"};
+    const ssize_t written = sendto(socket_, text, length, MSG_DONTWAIT | MSG_NOSIGNAL,
+                                   reinterpret_cast<const sockaddr *>(&kReader), sizeof kReader);
+    return written < 0 && errno == EAGAIN ? 0 : written;
+  }
+
+  const int socket_ = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+};
+
+class StandardError : public Output {
+  int Format(const char *message, Line *line) override {
+    return std::snprintf(line->data(), line->size(), "grellon: %s\n", message);
+  }
+
+  ssize_t Write(const char *text, size_t length) override {
+    ssize_t written = send(descriptor_, text, length, MSG_DONTWAIT | MSG_NOSIGNAL);
+    if (written < 0 && errno == ENOTSOCK) {
+      pollfd room = {.fd = descriptor_, .events = POLLOUT, .revents = 0};
+      if (poll(&room, 1, 0) == 0) return 0;
+      written = write(descriptor_, text, length);
+    }
+    return written < 0 && errno == EAGAIN ? 0 : written;
+  }
+
+  // A pipe or a terminal that others write to as well can be full again between poll and write. It
+  // is opened once more to be written without waiting: the others may want to wait, and what is set
+  // on the descriptor that they share would be theirs too.
+  static int Open() {
+    struct stat stream = {};
+    if (fstat(STDERR_FILENO, &stream) == 0 && (S_ISFIFO(stream.st_mode) || isatty(STDERR_FILENO))) {
+      const int own = open("/proc/self/fd/2", O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+      if (own >= 0) return own;
+    }
+    return STDERR_FILENO;
+  }
+
+  const int descriptor_ = Open();
+};
 
 // The journal names the stream it reads from a service; what goes there would be logged twice.
 bool StandardErrorIsTheJournal() {
   const char *journal = std::getenv("JOURNAL_STREAM");
   struct stat stream = {};
-  return journal != nullptr && fstat(fileno(stderr), &stream) == 0 &&
-         std::to_string(stream.st_dev) + ":" + std::to_string(stream.st_ino) == journal;
+  if (journal == nullptr || fstat(STDERR_FILENO, &stream) != 0) return false;
+  std::array<char, 64> name;
+  std::snprintf(name.data(), name.size(), "%ju:%ju", uintmax_t{stream.st_dev},
+                uintmax_t{stream.st_ino});
+  return std::strcmp(name.data(), journal) == 0;
 }
 
-struct Log {
-  Log() : foreground(!StandardErrorIsTheJournal()) {
-    std::signal(SIGPIPE, SIG_IGN);  // nobody reading is no reason to leave a connection open
-    openlog("grellon", LOG_PID, LOG_DAEMON);
-    if (!RequireScenario().logEnabled) setlogmask(LOG_UPTO(LOG_WARNING));
+class Log {
+ public:
+  explicit Log(bool enabled) : enabled_(enabled) {}
+  Log(const Log &) = delete;
+  Log &operator=(const Log &) = delete;
+
+  // A second for what waits.
+  ~Log() {
+    for (int tries = 100; tries > 0 && !Flush(); --tries) usleep(10'000);
   }
-  bool foreground;
+
+  bool enabled() const { return enabled_; }
+
+  void Add(const char *message) {
+    const std::lock_guard lock(mutex_);
+    socket_.Add(message);
+    if (foreground_) error_.Add(message);
+  }
+
+ private:
+  bool Flush() {
+    const bool socketDone = socket_.Flush();
+    return error_.Flush() && socketDone;
+  }
+
+  const bool enabled_;
+  const bool foreground_ = !StandardErrorIsTheJournal();
+  std::mutex mutex_;
+  SystemSocket socket_;
+  StandardError error_;
 };
 
 }  // namespace
 }  // namespace simulated
 
 void SystemLog(const char *format, ...) {
-  static const simulated::Log log;
-  if ((setlogmask(0) & LOG_MASK(LOG_NOTICE)) == 0) return;
-  char message[1024];
+  static simulated::Log log(simulated::TakeProcess().logEnabled);
+  if (!log.enabled()) return;
+  std::array<char, simulated::kLongestMessage> message;
   va_list arguments;
   va_start(arguments, format);
-  std::vsnprintf(message, sizeof message, format, arguments);
+  std::vsnprintf(message.data(), message.size(), format, arguments);
   va_end(arguments);
-  syslog(LOG_NOTICE, "%s", message);
-  if (!log.foreground) return;
   // Some messages end their line themselves.
-  const bool complete = message[0] != '\0' && message[std::strlen(message) - 1] == '\n';
-  std::fprintf(stderr, "grellon: %s%s", message, complete ? "" : "\n");
+  if (const size_t length = std::strlen(message.data());
+      length > 0 && message[length - 1] == '\n') {
+    message[length - 1] = '\0';
+  }
+  log.Add(message.data());
 }
