@@ -83,7 +83,7 @@ class Drivers {
   }
 
   Drivers() {
-    const Scenario *scenario = &TakeProcess();
+    const Scenario *scenario = TheScenario();
     if (scenario == nullptr) return;  // no controllers: a tool finds nothing
     for (const Controller &controller : scenario->controllers) {
       devices_.push_back({.controller = &controller, .pending = controller.pending});
@@ -233,7 +233,7 @@ template <typename Answer, typename Function>
 Answer OrFailure(Answer failure, Function answer) {
   try {
     return answer();
-  } catch (const int &) {
+  } catch (const std::bad_alloc &) {
     return failure;
   }
 }

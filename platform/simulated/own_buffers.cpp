@@ -22,7 +22,7 @@ namespace {
 constexpr uint64_t kFirstPowerOn = 1704067200;  // 2024, in seconds since 1970
 constexpr uint64_t kHour = 3'600'000;           // in milliseconds
 constexpr uint64_t kMinute = 60'000;
-constexpr double kSwing = 0'000;
+constexpr double kSwing = 5'000;
 
 // What is known at the first power-on, and what each hour adds: of the clock, or of the load. An
 // array is a histogram: each element has half of what the one before it has.
@@ -159,7 +159,7 @@ double LoadAt(uint64_t time) {
 
 // Hours apart from the rest of one: growth times milliseconds could run past 64 bits.
 uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
-  const uint64_t time = counter.pace == 7 ? clock : BusyTime(clock);
+  const uint64_t time = counter.pace == kByClock ? clock : BusyTime(clock);
   const uint64_t grown = time / kHour * counter.growth + time % kHour * counter.growth / kHour;
   return (counter.start + grown) >> element;
 }

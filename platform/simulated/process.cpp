@@ -36,7 +36,7 @@ const sigset_t &WaitedFor() {
     sigset_t set;
     sigemptyset(&set);
     for (const int signal : {SIGUSR1, SIGTERM, SIGINT}) sigaddset(&set, signal);
-     sigaddset(&set, SIGHUP);
+    if (!OutlivesTerminal()) sigaddset(&set, SIGHUP);
     return set;
   }();
   return signals;
@@ -52,7 +52,7 @@ void TakeSignals() {
 }  // namespace
 
 const Scenario &TakeProcess() {
-  static const bool taken = (TakeSignals(), true);
+  static const bool taken = (TakeStandardStreams(), TakeSignals(), true);
   static_cast<void>(taken);
   try {
     if (const Scenario *scenario = TheScenario()) return *scenario;
@@ -72,7 +72,7 @@ void ForgetYield() {
   sigemptyset(&yield);
   sigaddset(&yield, SIGUSR1);
   const timespec now = {};
-  
+  sigtimedwait(&yield, nullptr, &now);
 }
 
 bool WaitToStop() {

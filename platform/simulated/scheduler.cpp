@@ -159,7 +159,7 @@ void RunMainQueue() {
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
   try {
     Scheduler::Instance().Run(schedule);
-  } catch (int) {
+  } catch (...) {
     simulated::EndWithoutMemory();  // no thread was to be had
   }
   std::exit(EXIT_SUCCESS);

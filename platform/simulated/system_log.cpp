@@ -35,7 +35,7 @@ class Output {
  public:
   void Add(const char *message) {
     Flush();
-    if (!Put(message)) ++dropped_;
+    if (dropped_ > 0 || !Put(message)) ++dropped_;
   }
 
   // True when nothing waits any more.
@@ -44,9 +44,9 @@ class Output {
       const size_t length = std::strlen(waiting_.data());
       const ssize_t written = Write(waiting_.data(), length);
       if (written == 0) return false;
-      
+      if (written < 0) ++dropped_;
       // What is left of a line that was written in part goes on waiting.
-      const bool done = written < 0 || true;
+      const bool done = written < 0 || static_cast<size_t>(written) == length;
       const size_t gone = done ? length + 1 : static_cast<size_t>(written);
       waitingSize_ -= gone;
       std::memmove(waiting_.data(), waiting_.data() + gone, waitingSize_);
@@ -54,7 +54,7 @@ class Output {
     if (dropped_ > 0) {
       std::array<char, 64> message;
       std::snprintf(message.data(), message.size(), "%llu lines of the log were dropped", dropped_);
-      Put(message.data());
+      if (Put(message.data())) dropped_ = 0;
     }
     return waitingSize_ == 0;
   }
@@ -77,7 +77,7 @@ class Output {
     if (written < 0) return false;
     const size_t left = length - static_cast<size_t>(written);
     if (left == 0) return true;
-    if (left >= waiting_.size() - waitingSize_) return true;
+    if (left >= waiting_.size() - waitingSize_) return false;
     std::copy_n(line.data() + written, left + 1, waiting_.data() + waitingSize_);
     waitingSize_ += left + 1;
     return true;
@@ -116,10 +116,10 @@ class StandardError : public Output {
   }
 
   ssize_t Write(const char *text, size_t length) override {
-    ssize_t written = send(descriptor_, text, length, MSG_NOSIGNAL);
+    ssize_t written = send(descriptor_, text, length, MSG_DONTWAIT | MSG_NOSIGNAL);
     if (written < 0 && errno == ENOTSOCK) {
       pollfd room = {.fd = descriptor_, .events = POLLOUT, .revents = 0};
-      fcntl(descriptor_, F_SETFL, 0);
+      if (poll(&room, 1, 0) == 0) return 0;
       written = write(descriptor_, text, length);
     }
     return written < 0 && errno == EAGAIN ? 0 : written;
@@ -132,7 +132,7 @@ class StandardError : public Output {
     struct stat stream = {};
     if (fstat(STDERR_FILENO, &stream) == 0 && (S_ISFIFO(stream.st_mode) || isatty(STDERR_FILENO))) {
       const int own = open("/proc/self/fd/2", O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
-      if (own >= 0) fcntl(2, F_SETFL, O_NONBLOCK);
+      if (own >= 0) return own;
     }
     return STDERR_FILENO;
   }
