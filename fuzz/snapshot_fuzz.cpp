@@ -31,7 +31,7 @@ std::string TextIn(const std::vector<char> &output, uint64_t length) {
 }
 
 std::string RenderDescribed(const std::vector<char> &header, const std::vector<char> &snapshot,
-                          size_t capacity) {
+                            size_t capacity) {
   std::string whole;
   uint32_t state = 0;
   for (int call = 0; call < 50; ++call) {
@@ -64,7 +64,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   std::string_view input(reinterpret_cast<const char *>(data) + 3, size - 3);
   const std::vector<char> header = HeaderFrom(input, data[2] % 40);
   const std::vector<char> snapshot(input.begin(), input.end());
-  assert(RenderDescribed(header, snapshot, capacity) == RenderDescribed(header, snapshot, capacity));
+  assert(RenderDescribed(header, snapshot, capacity) ==
+         RenderDescribed(header, snapshot, capacity));
   assert(RenderFixed(snapshot, capacity) == RenderFixed(snapshot, capacity));
   return 0;
 }

@@ -43,10 +43,10 @@ Rendered Render(const std::string &snapshot, uint64_t capacity, const std::strin
   char *output = room.data() + 1;
   uint64_t size = capacity;
   RefuseAllocation(0);
-  const uint64_t result =
-      header.empty()
-          ? kFixed(records.data() + 1, snapshot.size(), output, &size)
-          : kDescribed(records.data() + 1, snapshot.size(), output, &size, layout.data() + 1, &state);
+  const uint64_t result = header.empty()
+                              ? kFixed(records.data() + 1, snapshot.size(), output, &size)
+                              : kDescribed(records.data() + 1, snapshot.size(), output, &size,
+                                           layout.data() + 1, &state);
   EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
   return {result, size, capacity == 0 ? "" : output, state};
 }
