@@ -50,9 +50,8 @@ class KeyTable {
   // For each id from the first to the last the number of its row, counted from 1; 0 without one.
   static constexpr auto kPlaceOfId = [] {
     std::array<uint16_t, kRows.back().id - kFirst + 1> places = {};
-    for (size_t row = 0; row < kRows.size(); ++row) {
-      places[kRows[row].id - kFirst] = static_cast<uint16_t>(row + 1);
-    }
+    uint16_t place = 0;
+    for (const KeyRow &row : kRows) places[row.id - kFirst] = ++place;
     return places;
   }();
 };

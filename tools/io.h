@@ -119,7 +119,7 @@ class Output {
   bool terminal_;
   int error_ = 0;
   size_t length_ = 0;
-  char buffer_[kRoom];
+  char buffer_[kRoom] = {};
 };
 
 // Whether data goes to a terminal.

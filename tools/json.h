@@ -68,7 +68,7 @@ class Json {
   }
 
   Stream stream_;
-  char room_[4096];  // for the writer's stack, which so takes no memory from the heap
+  char room_[4096] = {};  // for the writer's stack, which so takes no memory from the heap
   Memory memory_{room_, sizeof room_};
   rapidjson::Writer<Stream, rapidjson::UTF8<>, rapidjson::UTF8<>, Memory> writer_{stream_,
                                                                                   &memory_};

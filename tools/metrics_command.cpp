@@ -91,8 +91,9 @@ Reading Read(const std::string &stream, ReadDump readDump) {
 
 std::vector<Reading> ReadFiles(const Options &options) {
   std::vector<Reading> readings;
-  for (const auto &[stream, file] : options.files) {
-    readings.push_back(Read(stream, [&] { return ReadDumpFile(file, stream, options.className); }));
+  for (const auto &pair : options.files) {
+    const auto readFile = [&] { return ReadDumpFile(pair.second, pair.first, options.className); };
+    readings.push_back(Read(pair.first, readFile));
   }
   return readings;
 }

@@ -146,8 +146,9 @@ bool StandardErrorIsTheJournal() {
   struct stat stream = {};
   if (journal == nullptr || fstat(STDERR_FILENO, &stream) != 0) return false;
   std::array<char, 64> name;
-  std::snprintf(name.data(), name.size(), "%ju:%ju", uintmax_t{stream.st_dev},
-                uintmax_t{stream.st_ino});
+  std::snprintf(name.data(), name.size(), "%llu:%llu",
+                static_cast<unsigned long long>(stream.st_dev),
+                static_cast<unsigned long long>(stream.st_ino));
   return std::strcmp(name.data(), journal) == 0;
 }
 
