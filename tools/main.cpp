@@ -1,6 +1,8 @@
 // morwick: the command for people and scripts that work with controller statistics.
 
 #include <CLI/CLI.hpp>
+#include <cstdio>
+#include <exception>
 #include <memory>
 #include <new>
 
@@ -92,7 +94,8 @@ int main(int argc, char **argv) {
   tools::Status status = tools::kBadData;
   try {
     status = tools::Run(argc, argv);
-  } catch (const std::bad_alloc &) {
+  } catch (const std::exception &error) {
+    if (!tools::memoryRefused) std::fprintf(stderr, "morwick: %s\n", error.what());
   }
   if (!tools::memoryRefused) return status;
   std::fputs("morwick: out of memory\n", stderr);

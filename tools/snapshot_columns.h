@@ -16,18 +16,6 @@ struct SnapshotColumn {
 };
 
 #define FIELD(name) offsetof(SnapshotRecord, name)
-#define PRIORITIES(letter, operations)                                                        \
-  {letter "O_0", FIELD(operations[0].count)}, {letter "O_1", FIELD(operations[1].count)},     \
-      {letter "O_2", FIELD(operations[2].count)}, {letter "O_3", FIELD(operations[3].count)}, \
-      {letter "L_0", FIELD(operations[0].totalLatency)},                                      \
-      {letter "L_1", FIELD(operations[1].totalLatency)},                                      \
-      {letter "L_2", FIELD(operations[2].totalLatency)},                                      \
-      {letter "L_3", FIELD(operations[3].totalLatency)},                                      \
-      {letter "M_0", FIELD(operations[0].maxLatency)},                                        \
-      {letter "M_1", FIELD(operations[1].maxLatency)},                                        \
-      {letter "M_2", FIELD(operations[2].maxLatency)}, {                                      \
-    letter "M_3", FIELD(operations[3].maxLatency)                                             \
-  }
 
 constexpr SnapshotColumn kSnapshotColumns[] = {
     {"T", FIELD(timestamp)},
@@ -55,11 +43,32 @@ constexpr SnapshotColumn kSnapshotColumns[] = {
     {"C_max", FIELD(commandTagsMax)},
     {"S", FIELD(freeSegments)},
     {"U", FIELD(hostUnmaps)},
-    PRIORITIES("R", reads),
-    PRIORITIES("W", writes),
+    {"RO_0", FIELD(reads[0].count)},
+    {"RO_1", FIELD(reads[1].count)},
+    {"RO_2", FIELD(reads[2].count)},
+    {"RO_3", FIELD(reads[3].count)},
+    {"RL_0", FIELD(reads[0].totalLatency)},
+    {"RL_1", FIELD(reads[1].totalLatency)},
+    {"RL_2", FIELD(reads[2].totalLatency)},
+    {"RL_3", FIELD(reads[3].totalLatency)},
+    {"RM_0", FIELD(reads[0].maxLatency)},
+    {"RM_1", FIELD(reads[1].maxLatency)},
+    {"RM_2", FIELD(reads[2].maxLatency)},
+    {"RM_3", FIELD(reads[3].maxLatency)},
+    {"WO_0", FIELD(writes[0].count)},
+    {"WO_1", FIELD(writes[1].count)},
+    {"WO_2", FIELD(writes[2].count)},
+    {"WO_3", FIELD(writes[3].count)},
+    {"WL_0", FIELD(writes[0].totalLatency)},
+    {"WL_1", FIELD(writes[1].totalLatency)},
+    {"WL_2", FIELD(writes[2].totalLatency)},
+    {"WL_3", FIELD(writes[3].totalLatency)},
+    {"WM_0", FIELD(writes[0].maxLatency)},
+    {"WM_1", FIELD(writes[1].maxLatency)},
+    {"WM_2", FIELD(writes[2].maxLatency)},
+    {"WM_3", FIELD(writes[3].maxLatency)},
 };
 
-#undef PRIORITIES
 #undef FIELD
 
 }  // namespace tools

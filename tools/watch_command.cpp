@@ -49,7 +49,7 @@ class StopSignals {
   StopSignals() {
     struct sigaction action = {};
     action.sa_handler = [](int) { stopped_ = 1; };
-    action.sa_flags = SA_RESETHAND;
+    action.sa_flags = static_cast<int>(SA_RESETHAND);
     sigemptyset(&signals_);
     for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
       sigaction(signal, &action, nullptr);

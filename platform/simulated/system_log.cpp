@@ -130,7 +130,8 @@ class StandardError : public Output {
   // on the descriptor that they share would be theirs too.
   static int Open() {
     struct stat stream = {};
-    if (fstat(STDERR_FILENO, &stream) == 0 && (S_ISFIFO(stream.st_mode) || isatty(STDERR_FILENO))) {
+    if (fstat(STDERR_FILENO, &stream) == 0 &&
+        (S_ISFIFO(stream.st_mode) || isatty(STDERR_FILENO) != 0)) {
       const int own = open("/proc/self/fd/2", O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
       if (own >= 0) return own;
     }
