@@ -6,11 +6,11 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
-#include <fstream>
 #include <sstream>
 
 #include "morwick/exporter.h"
 #include "morwick/platform.h"
+#include "tests/case_file.h"
 
 struct MatchingRequest {
   std::string className;
@@ -89,17 +89,16 @@ std::string Play(const Script &script, const std::function<void()> &body) {
 }
 
 void PlayCases(const std::string &file, const std::function<void(Script &)> &body) {
-  std::ifstream cases(CASES "/" + file);
-  EXPECT_EQ(cases.peek(), '=') << file;
-  for (std::string line; std::getline(cases, line);) {
-    SCOPED_TRACE(line);
+  CaseFile cases(file);
+  for (std::string line; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where() + " " + line);
     Script script;
-    while (std::getline(cases, line) && line != "->") {
+    while (cases.NextRaw(&line) && line != "->") {
       const size_t colon = line.find(": ");
       script[line.substr(0, colon)] = line.substr(colon + 2);
     }
     std::string expected;
-    while (cases.peek() != '=' && std::getline(cases, line)) expected += line + "\n";
+    while (cases.Peek() != '=' && cases.NextRaw(&line)) expected += line + "\n";
     EXPECT_EQ(Play(script, [&] { body(script); }), expected);
   }
 }

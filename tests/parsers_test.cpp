@@ -1,14 +1,12 @@
-// The three statistics parsers, the generic context and the error message.
+// The three statistics parsers and the generic context.
 
 #include <gtest/gtest.h>
 
-#include <barrier>
-#include <fstream>
-#include <set>
 #include <sstream>
-#include <thread>
 
+#include "tests/case_file.h"
 #include "tests/heap.h"
+#include "tests/message.h"
 #include "tests/parsing.h"
 
 namespace {
@@ -41,17 +39,10 @@ std::string Stream(Kind kind, const std::string &notation) {
   return bytes;
 }
 
-std::string TakeMessage() {
-  std::string message = GetAPIErrorMessage();
-  std::free(GlobalAPIErrorMessage);
-  GlobalAPIErrorMessage = nullptr;
-  return message;
-}
-
 // Parses once, unaligned, into contexts that hold an entry already, while the allocation with the
-// number `refused` fails. "-context" or "-data" behind the kind: a null pointer takes its place.
-// What can be seen afterwards, as text; nothing is left behind.
-std::string Parse(const std::string &how, const std::string &stream, size_t refused = 0) {
+// number `refused` fails. `how` is the kind, with "-context" or "-data" behind it where a null
+// pointer takes their place. What can be seen afterwards, as text; nothing is left behind.
+std::string Parse(const std::string &how, const std::string &stream, size_t refused) {
   const auto kind = static_cast<Kind>(std::string("KFMA").find(how[0]));
   const std::string bytes = Stream(kind, stream);
   const std::vector<char> buffer = Unaligned(bytes);
@@ -62,8 +53,8 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   contexts.kvr.parseMarker = 5;
   RefuseAllocation(refused);
   const uint64_t result =
-      ParseInto(how.ends_with("-context ") ? nullptr : &contexts, kind,
-                how.ends_with("-data ") ? nullptr : buffer.data() + 1, bytes.size());
+      ParseInto(how.ends_with("-context") ? nullptr : &contexts, kind,
+                how.ends_with("-data") ? nullptr : buffer.data() + 1, bytes.size());
   RefuseAllocation(0);
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
@@ -71,7 +62,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   const uint32_t version = contexts.kvr.exportVersion;
   if (version != 99) seen += ", version " + std::to_string(version);
   if (const std::string message = TakeMessage(); message != "NA") seen += ", " + message;
-  EXPECT_EQ(contexts.kvr.parseMarker, kind == kKVR && !how.ends_with("-context ") ? -1 : 5);
+  EXPECT_EQ(contexts.kvr.parseMarker, kind == kKVR && !how.ends_with("-context") ? -1 : 5);
   for (int time = 0; time < 2; ++time) {
     KVRReleaseContext(&contexts.kvr);
     ReleaseGenericParserCxt(&contexts.generic);
@@ -81,20 +72,33 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   return seen;
 }
 
+// What stands before the next bar, without the blanks around it.
+std::string TakeColumn(std::istringstream &columns) {
+  std::string column;
+  std::getline(columns, column, '|');
+  const size_t first = std::min(column.find_first_not_of(' '), column.size());
+  return column.substr(first, column.find_last_not_of(' ') + 1 - first);
+}
+
 TEST(ParsersTest, ReadGoodAndBadStreams) {
-  std::ifstream cases(CASES "/streams.txt");
-  EXPECT_TRUE(cases);
-  for (std::string line; std::getline(cases, line);) {
-    if (line.empty() || line.starts_with('#')) continue;
-    SCOPED_TRACE(line);
+  CaseFile cases("streams.txt");
+  for (std::string line; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where());
     std::istringstream columns(line);
-    std::string how, stream, seen;
-    std::getline(std::getline(std::getline(columns, how, '|'), stream, '|') >> std::ws, seen);
-    // An entry takes two allocations, for its value and its name; without one, none is refused.
+    std::string how = TakeColumn(columns);
+    const std::string stream = TakeColumn(columns);
+    const std::string seen = "validLbas=1 " + TakeColumn(columns);
     const size_t mark = how.find('!');
-    const size_t entry = mark == std::string::npos ? 0 : std::stoul(how.substr(mark + 1));
-    EXPECT_EQ(Parse(how, stream, 2 * entry - 1), "validLbas=1 " + seen);
-    EXPECT_EQ(Parse(how, stream, 2 * entry), "validLbas=1 " + seen);
+    if (mark == std::string::npos) {
+      EXPECT_EQ(Parse(how, stream, 0), seen);
+      continue;
+    }
+    // An entry takes two allocations, for its value and for its name; each is refused once.
+    const size_t entry = std::stoul(how.substr(mark + 1));
+    how.resize(mark);
+    for (const size_t refused : {2 * entry - 1, 2 * entry}) {
+      EXPECT_EQ(Parse(how, stream, refused), seen);
+    }
   }
 }
 
@@ -136,46 +140,6 @@ TEST(ParserContextTest, CutsNamesAt98Characters) {
     for (int i = 0; i < 12345; ++i) expected += (name + std::to_string(i)).substr(0, 98) + "=1 ";
     EXPECT_EQ(Entries(context).text, expected);
     ReleaseGenericParserCxt(&context);
-  }
-}
-
-TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
-  RefuseAllocation(1);
-  SetAPIErrorMessage("no memory");
-  RefuseAllocation(0);
-  EXPECT_EQ(TakeMessage(), "NA");
-  SetAPIErrorMessage("%s %d", "100%d", 7);
-  SetAPIErrorMessage("second");
-  EXPECT_EQ(TakeMessage(), "100%d 7");
-  for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
-    SetAPIErrorMessage("%s", std::string(length, 'x').c_str());
-    EXPECT_EQ(TakeMessage().size(), length < 1023 ? length : 1023U);
-  }
-}
-
-TEST(ErrorMessageTest, IsOneOfThoseThatEightThreadsReportAtOnce) {
-  for (int round = 0; round < 50; ++round) {
-    std::barrier start(8);
-    std::vector<std::jthread> threads;
-    std::set<std::string> possible;
-    const char *seen[8] = {};  // by each thread, once it has reported
-    for (int i = 0; i < 8; ++i) {
-      const std::string length =
-          std::to_string(i < 3 ? i + 1 : i + 11);  // never the configured ten
-      possible.insert("KVRFTLParseBufferToCxt: hostWriteLogHisto(14): (#10) cfg elements != (" +
-                      length + ") buffer elements");
-      threads.emplace_back([&start, seenHere = &seen[i], length] {
-        const std::string bytes = Stream(kFTL, "14:" + length + " 1.." + length);
-        Contexts contexts = {};
-        start.arrive_and_wait();
-        ParseInto(&contexts, kFTL, bytes.data(), bytes.size());
-        *seenHere = GetAPIErrorMessage();
-        ReleaseGenericParserCxt(&contexts.generic);
-      });
-    }
-    threads.clear();
-    for (const char *message : seen) EXPECT_EQ(message, GetAPIErrorMessage());
-    EXPECT_TRUE(possible.contains(TakeMessage()));
   }
 }
 

@@ -183,6 +183,22 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
   EXPECT_EQ(Find(), 0U) << "the second look-up finds it gone";
 }
 
+// The library's table and the simulated drivers' own list know the same classes and methods.
+TEST(SimulatedPlatformTest, KnowsEachClassOfTheTable) {
+  std::string scenario;
+  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+    scenario += std::string("[[controller]]\nclass = '") + row->className + "'\nband = '" +
+                File(row->className) + "'\n";
+  }
+  Play(scenario);
+  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+    const uint32_t connection = Connect(row->className);
+    EXPECT_EQ(Read(connection, row->methodSelector, row->getBandStatsSelectors()->second),
+              row->className);
+    EXPECT_EQ(CloseService(connection), 0);
+  }
+}
+
 TEST(SimulatedPlatformTest, ServesTheExampleDumps) {
   setenv("GRELLON_SCENARIO", SOURCE "/packaging/scenarios/statistics.toml", 1);
   const uint32_t connection = Connect("VeltoQRN3NVMeController");

@@ -1,16 +1,16 @@
-// Both snapshot renderings, byte for byte and through buffers of every size, and the number
-// helpers.
+// Both snapshot renderings, byte for byte and through buffers of every size.
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstring>
-#include <fstream>
 #include <iomanip>
+#include <numeric>
 #include <random>
 #include <sstream>
 
 #include "morwick/morwick.h"
+#include "tests/case_file.h"
 #include "tests/heap.h"
 
 namespace {
@@ -55,6 +55,20 @@ std::string Bytes(const std::vector<uint32_t> &words) {
   return {reinterpret_cast<const char *>(words.data()), words.size() * 4};
 }
 
+// Word n of the record is n, from 1 on; hysteresis time, word 40, prints in hundredths.
+TEST(FixedSnapshotTest, PrintsEachColumnFromItsPlace) {
+  std::vector<uint32_t> record(63);
+  std::iota(record.begin(), record.end(), 1);
+  record[39] = 123456;
+  const std::string text = Render(Bytes(record), 5000).text;
+  EXPECT_EQ(text.substr(text.find("T=")),
+            "T=0001 E=27 HR=  28 HW=  29 NR=  30 NW=  31 TH=     123.45 GC=  32 W=34 BI= 37 BU= 38"
+            " V=   46 BF=48/49 P= 2 H=42/41 X=51/52 L= 44/ 45 C=54/55 S=  43 U=      53"
+            " RO=  15/  18/  21/  24 RL=     16/     19/     22/     25 RM=   17/   20/   23/   26"
+            " WO=   3/   6/   9/  12 WL=      4/      7/     10/     13 WM=    5/    8/   11/   14"
+            "\n\n");
+}
+
 TEST(FixedSnapshotTest, CutsTheTextAtAnyCapacity) {
   const std::string snapshot = Bytes(std::vector<uint32_t>(126, 123456)) + "part of a record";
   const std::string whole = Render(snapshot, 10000).text;
@@ -93,18 +107,17 @@ std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fiel
 }
 
 TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
-  std::ifstream cases(CASES "/descriptors.txt");
+  CaseFile cases("descriptors.txt");
   Fields fields;
   std::string expected;
-  for (std::string line; std::getline(cases, line);) {
-    if (line.starts_with('#')) continue;
+  for (std::string line; cases.Next(&line);) {
     SnapshotFieldDescriptor field = {};
     std::string format, arrow, text;
     std::istringstream columns(line);
     columns.unsetf(std::ios::dec);  // hexadecimal numbers too
     columns >> field.kind >> field.fieldOffset >> field.fieldSize >> std::quoted(format) >> arrow >>
         std::quoted(text);
-    EXPECT_TRUE(columns) << line;
+    EXPECT_TRUE(columns) << cases.where();
     format.copy(field.format, sizeof field.format);
     fields.push_back(field);
     expected += text + "\n";
@@ -212,14 +225,6 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   EXPECT_EQ(kFixed(nullptr, uint64_t{252} << 32, output, &(size = sizeof output)), 1U);
   EXPECT_EQ(size, 1338U);
   EXPECT_EQ(Render("no field, no line", 500, Header(6, 4, 3, {}), 7), (Rendered{1, 1, "", 7}));
-}
-
-TEST(CapacityTest, RoundsToSignificantDigits) {
-  std::ifstream cases(CASES "/rounding.txt");
-  EXPECT_TRUE(cases);
-  for (uint64_t value, digits, rounded; cases >> value >> digits >> rounded;) {
-    EXPECT_EQ(roundSig(value, digits), rounded) << value << " to " << digits;
-  }
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// The sub-commands of morwick, each in a file of its own: one declaration and one entry here.
+// The sub-commands of morwick, each in a file of its own and one line here.
 #ifndef TOOLS_COMMANDS_H
 #define TOOLS_COMMANDS_H
 
@@ -12,19 +12,21 @@ namespace tools {
 // What a sub-command does once its options are read; the exit status comes of it.
 using Action = std::function<Status()>;
 
-// Each adds its sub-command and, when that is what was asked for, sets the action.
-void AddFind(CLI::App &app, Action *action);
-void AddStats(CLI::App &app, Action *action);
-void AddDiff(CLI::App &app, Action *action);
-void AddWatch(CLI::App &app, Action *action);
-void AddSnapshot(CLI::App &app, Action *action);
-void AddRead(CLI::App &app, Action *action);
-void AddMetrics(CLI::App &app, Action *action);
-void AddCapacity(CLI::App &app, Action *action);
+// The sub-commands, in the order of the help. For each there is a function, AddFind and so on,
+// which adds it to the program and sets the action when it is what was asked for.
+#define FOR_EACH_COMMAND(COMMAND) \
+  COMMAND(Find)                   \
+  COMMAND(Stats)                  \
+  COMMAND(Diff)                   \
+  COMMAND(Watch)                  \
+  COMMAND(Snapshot)               \
+  COMMAND(Read)                   \
+  COMMAND(Metrics)                \
+  COMMAND(Capacity)
 
-constexpr void (*kCommands[])(CLI::App &, Action *) = {
-    AddFind, AddStats, AddDiff, AddWatch, AddSnapshot, AddRead, AddMetrics, AddCapacity,
-};
+#define DECLARE(name) void Add##name(CLI::App &app, Action *action);
+FOR_EACH_COMMAND(DECLARE)
+#undef DECLARE
 
 }  // namespace tools
 

@@ -63,7 +63,9 @@ Status Run(int argc, char **argv) {
                        "morwick " MORWICK_VERSION " (platform " MORWICK_PLATFORM_NAME ")");
   app.require_subcommand(1);
   Action action;
-  for (const auto add : kCommands) add(app, &action);
+#define ADD(name) Add##name(app, &action);
+  FOR_EACH_COMMAND(ADD)
+#undef ADD
   AddHelp(app, &action);
 
   const std::string first = argc > 1 ? argv[1] : "";

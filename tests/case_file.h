@@ -1,0 +1,42 @@
+// A file under tests/cases, line by line: what a failing case is found by is its file and line.
+#ifndef TESTS_CASE_FILE_H
+#define TESTS_CASE_FILE_H
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <string>
+
+class CaseFile {
+ public:
+  explicit CaseFile(const std::string &name) : name_(name), file_(CASES "/" + name) {
+    EXPECT_TRUE(file_) << name;
+  }
+
+  // The next line that is neither empty nor a comment.
+  bool Next(std::string *line) {
+    do {
+      if (!NextRaw(line)) return false;
+    } while (line->empty() || line->starts_with('#'));
+    return true;
+  }
+
+  // The next line, whatever it is.
+  bool NextRaw(std::string *line) {
+    ++number_;
+    return static_cast<bool>(std::getline(file_, *line));
+  }
+
+  // What the next line begins with; NUL at the end.
+  char Peek() { return file_.peek() == EOF ? '\0' : static_cast<char>(file_.peek()); }
+
+  // Of the line that was read last.
+  std::string where() const { return name_ + ":" + std::to_string(number_); }
+
+ private:
+  std::string name_;
+  std::ifstream file_;
+  int number_ = 0;
+};
+
+#endif

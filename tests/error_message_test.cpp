@@ -1,0 +1,65 @@
+// The error message: the first of the process, whole, whoever reports it.
+
+#include "morwick/error_message.h"
+
+#include <gtest/gtest.h>
+
+#include <barrier>
+#include <set>
+#include <thread>
+#include <vector>
+
+#include "tests/heap.h"
+#include "tests/message.h"
+#include "tests/parsing.h"
+
+namespace {
+
+// A record of key 14, whose array has ten elements, with another number of them.
+std::string MismatchedArray(uint32_t length) {
+  std::string bytes(8 + size_t{8} * length, '\1');
+  const uint32_t header[] = {LittleEndian32(14), LittleEndian32(length)};
+  return bytes.replace(0, sizeof header, reinterpret_cast<const char *>(header), sizeof header);
+}
+
+TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
+  RefuseAllocation(1);
+  SetAPIErrorMessage("no memory");
+  RefuseAllocation(0);
+  EXPECT_EQ(TakeMessage(), "NA");
+  SetAPIErrorMessage("%s %d", "100%d", 7);
+  SetAPIErrorMessage("second");
+  EXPECT_EQ(TakeMessage(), "100%d 7");
+  for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
+    SetAPIErrorMessage("%s", std::string(length, 'x').c_str());
+    EXPECT_EQ(TakeMessage().size(), length < 1023 ? length : 1023U);
+  }
+}
+
+TEST(ErrorMessageTest, IsOneOfThoseThatEightThreadsReportAtOnce) {
+  for (int round = 0; round < 50; ++round) {
+    std::barrier start(8);
+    std::vector<std::jthread> threads;
+    std::set<std::string> possible;
+    const char *seen[8] = {};  // by each thread, once it has reported
+    for (int i = 0; i < 8; ++i) {
+      const std::string length =
+          std::to_string(i < 3 ? i + 1 : i + 11);  // never the configured ten
+      possible.insert("KVRFTLParseBufferToCxt: hostWriteLogHisto(14): (#10) cfg elements != (" +
+                      length + ") buffer elements");
+      threads.emplace_back([&start, seenHere = &seen[i], length] {
+        const std::string bytes = MismatchedArray(static_cast<uint32_t>(std::stoul(length)));
+        Contexts contexts = {};
+        start.arrive_and_wait();
+        ParseInto(&contexts, kFTL, bytes.data(), bytes.size());
+        *seenHere = GetAPIErrorMessage();
+        ReleaseGenericParserCxt(&contexts.generic);
+      });
+    }
+    threads.clear();
+    for (const char *message : seen) EXPECT_EQ(message, GetAPIErrorMessage());
+    EXPECT_TRUE(possible.contains(TakeMessage()));
+  }
+}
+
+}  // namespace
