@@ -15,11 +15,9 @@ constexpr int kActivityStateNone = 0;
 
 }  // namespace
 
-struct MatchingRequest {};
-
 MatchingRequest *ServiceMatching(const char *className) {
-  static MatchingRequest request;
-  return className == nullptr ? nullptr : &request;
+  static char request;  // no more is known of it than that it is there
+  return className == nullptr ? nullptr : reinterpret_cast<MatchingRequest *>(&request);
 }
 
 uint32_t GetMatchingService(MatchingRequest *) { return 0; }
