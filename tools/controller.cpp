@@ -4,7 +4,9 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <cstdio>
+#include <new>
 
 #include "tools/io.h"
 
@@ -74,7 +76,9 @@ NandExporter *FindRow(std::string_view className) {
 }
 
 Presence Probe(const NandExporter &row) {
+  errno = 0;
   const uint32_t service = FindService(row);
+  if (service == 0 && errno == ENOMEM) throw std::bad_alloc();
   if (service == 0) return {};
   uint32_t connection = 0;
   const int32_t result = Open(service, &connection);
@@ -82,31 +86,38 @@ Presence Probe(const NandExporter &row) {
   return {true, connection != 0, result};
 }
 
-Controller::Controller(const std::string &className, const std::string &what) : name_(className) {
+// Nothing between finding and keeping a handle may throw.
+Controller::Controller(const std::string &className, const std::string &what)
+    : className_(className) {
   NandExporter *row = FindRow(className);
+  errno = 0;
   const uint32_t service = row == nullptr ? findNandExporter(&row) : FindService(*row);
-  if (service == 0) {
-    Complain(className.empty() ? what : className + ": " + what,
-             className.empty() ? "no controller is present" : "it is not present");
-    return;
-  }
-  row_ = row;
-  name_ = row->className;
-  const int32_t result = Open(service, &connection_);
-  if (connection_ == 0) {
-    Complain(name_ + ": " + what, "the connection was refused, result " + Hexadecimal(result));
+  if (service != 0) {
+    row_ = row;
+    const int32_t result = Open(service, &connection_);
+    if (connection_ != 0) return;
+    Complain(name() + ": " + what, "the connection was refused, result " + Hexadecimal(result));
+  } else if (errno == ENOMEM) {
+    throw std::bad_alloc();
+  } else if (className.empty()) {
+    Complain(what, "no controller is present");
+  } else {
+    Complain(className + ": " + what, "it is not present");
   }
 }
 
 Controller::~Controller() {
   if (connection_ == 0) return;
-  if (const int32_t result = CloseService(connection_); result != 0) {
-    Note(name_, "closing the connection failed, result " + Hexadecimal(result));
+  const int32_t result = CloseService(connection_);
+  if (result == 0) return;
+  try {
+    Note(name(), "closing the connection failed, result " + Hexadecimal(result));
+  } catch (const std::bad_alloc &) {  // main says so
   }
 }
 
 std::optional<std::string> Controller::Read(const BufferKind &kind) {
-  const std::string subject = name_ + ": " + std::string(kind.name);
+  const std::string subject = name() + ": " + std::string(kind.name);
   if (!Offers(kind)) {
     Complain(subject, "this controller does not offer it");
     return std::nullopt;

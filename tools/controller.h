@@ -57,7 +57,7 @@ class Controller {
   const NandExporter *row() const { return row_; }
 
   // The class; the one that was asked for, if any, while none was found.
-  const std::string &name() const { return name_; }
+  std::string name() const { return row_ == nullptr ? className_ : row_->className; }
 
   bool Offers(const BufferKind &kind) const { return row_->*kind.selectors != nullptr; }
 
@@ -65,7 +65,7 @@ class Controller {
   std::optional<std::string> Read(const BufferKind &kind);
 
  private:
-  std::string name_;
+  std::string className_;
   const NandExporter *row_ = nullptr;
   uint32_t connection_ = 0;
 };

@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 #include <cstdio>
+#include <cstdlib>
 #include <exception>
 #include <memory>
 #include <new>
@@ -17,6 +18,14 @@ bool memoryRefused = false;
 void RefuseMemory() {
   memoryRefused = true;
   throw std::bad_alloc();
+}
+
+// Before main the argument parser sets itself up, where nobody would catch the exception.
+[[gnu::constructor(101)]] void EndBeforeMainWithoutMemory() {
+  std::set_new_handler([] {
+    std::fputs("morwick: out of memory\n", stderr);
+    std::_Exit(kBadData);
+  });
 }
 
 Status Print(const std::string &text) {
@@ -96,8 +105,10 @@ int main(int argc, char **argv) {
   tools::Status status = tools::kBadData;
   try {
     status = tools::Run(argc, argv);
+  } catch (const std::bad_alloc &) {
+    tools::memoryRefused = true;
   } catch (const std::exception &error) {
-    if (!tools::memoryRefused) std::fprintf(stderr, "morwick: %s\n", error.what());
+    std::fprintf(stderr, "morwick: %s\n", error.what());
   }
   if (!tools::memoryRefused) return status;
   std::fputs("morwick: out of memory\n", stderr);
