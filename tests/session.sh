@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
-# Plays a session, a file of commands as a person types them ("$ command") and of what they print,
-# indented by four, with the exit status in brackets when it is not 0; fails with the difference.
+# Plays a session, a file of commands as a person types them ("$ command", "> and more of it") and of
+# what they print, indented by four, with the exit status in brackets when it is not 0; fails with the
+# difference.
 # GRELLON, MORWICK, FAST_SLEEP and SOURCE name the programs, the library to preload and the tree.
 # Usage: session.sh SESSION
 set -uo pipefail
@@ -44,19 +45,27 @@ wait_for() {
 }
 stop() { SECONDS=0; kill "-$1" "$pid"; wait "$pid"; echo "status $?, $([ $SECONDS -le 6 ] && echo "in time" || echo "after $SECONDS s")"; }
 
-while IFS= read -r -u 9 line; do
-  case $line in
-    '$ '*)
-      printf '%s\n' "$line"
-      eval "${line#\$ }" >output 2>&1 </dev/null
-      status=$?
-      sed 's/^/    /' output
-      [ $status -eq 0 ] || echo "    [$status]"
-      ;;
-    '    '*) ;;
-    *) printf '%s\n' "$line" ;;
-  esac
-done 9<"$session" >played
+perform() {
+  [ -n "$command" ] || return
+  eval "$command" >output 2>&1 </dev/null
+  local status=$?
+  sed 's/^/    /' output
+  [ $status -eq 0 ] || echo "    [$status]"
+  command=
+}
+command=
+{
+  while IFS= read -r -u 9 line; do
+    case $line in
+      '$ '*) perform; command=${line#\$ } ;;
+      '> '*) command+=$'\n'${line#> } ;;
+      '    '*) continue ;;
+      *) perform ;;
+    esac
+    printf '%s\n' "$line"
+  done 9<"$session"
+  perform
+} >played
 [ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
 diff "$session" played || exit 1
 [ ! -s objects ] || python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
