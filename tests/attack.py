@@ -1,5 +1,5 @@
-"""Attacks the programs of the release build, as scripts/attack says, and ends with a table. A finding
-is printed with the command that repeats it; then the status is 1."""
+"""Attacks the programs of the release build, as scripts/attack says, and ends with a table. A
+finding is printed with the command that repeats it; the status is 1 then."""
 import itertools, json, os, random, re, resource, select, shlex, shutil, signal, subprocess, sys
 import tempfile, threading, time
 from concurrent.futures import ThreadPoolExecutor
@@ -55,7 +55,7 @@ OUTPUTS = {  # what a shell does with those of "$@"
     "full": '"$@" > /dev/full', "both full": '"$@" > /dev/full 2>&1',
     "gone": '{ sleep 0.05; "$@"; } | true', "both gone": '{ sleep 0.05; "$@" 2>&1; } | true',
     "slow": '"$@" | { sleep 0.05; cat; }',
-    "unread": 'mkfifo full; exec 9<>full; rm full; timeout 0.1 cat /dev/zero >&9; "$@" >/dev/null 2>&9'}
+    "unread": 'mkfifo full; exec 9<>full; rm full; timeout 0.1 cat /dev/zero >&9; "$@" 2>&9'}
 
 most_memory = 1 << 20  # KiB that no process has exceeded: 1 GiB at first
 thread = threading.local()
@@ -110,22 +110,23 @@ def run(program, scenario, draw=None, sent=(), ends=(), **environment):
         errors.seek(0)
         result.output, result.errors = output.read(MOST_OUTPUT), errors.read()
     result.file = take("out")
-    stray = [name for name in os.listdir(folder()) if name.startswith("out.") and take(name) is not None]
     memory = resource.getrusage(resource.RUSAGE_CHILDREN).ru_maxrss
-    for what, found in {
-            f"leaves {stray}": stray, "misuses a handle": HANDLES.search(result.errors),
-            f"takes {memory} KiB": memory > most_memory,
-            "is killed": not 0 <= result.status < 128 and result.status not in result.deaths}.items():
-        result.fault = result.fault or (what if found else None)
-    most_memory = max(most_memory, memory)
+    if memory > most_memory:
+        most_memory, result.fault = memory, f"takes {memory} KiB"
+    if not 0 <= result.status < 128 and result.status not in result.deaths:
+        result.fault = result.fault or "is killed"
+    if HANDLES.search(result.errors):
+        result.fault = "misuses a handle"
+    if [name for name in os.listdir(folder()) if name.startswith("out.") and take(name)]:
+        result.fault = "leaves a file beside the one it writes"
     return result
 
 
 def same(program, one, other):
     """But for times, and rates that are reckoned from them."""
-    if one and other and {"watch", "metrics"} & set(program):
-        one, other = (re.sub(rb"\d+([-:.]\d+)+", b"", text.replace(b" ", b"")) for text in (one, other))
-    return one == other
+    if {"watch", "metrics"}.isdisjoint(program) or None in (one, other):
+        return one == other
+    return len({re.sub(rb" +|\d+([-:.]\d+)+", b"", text) for text in (one, other)}) == 1
 
 
 def whole_json(program, output):
@@ -159,19 +160,17 @@ def refuse(program, scenario, number, good):
         result.file is None or b"read_success" in result.file)
 
 
-def signals():
-    return (partial(interrupt, number) for number in range(1000))
-
-
 def interrupt(number):
     draw = random.Random(f"{SEED} signals {number}")
     last = draw.choice(STOP)
     if number % 2 == 0:
+        sent = [*draw.choices(MEANINGLESS, k=draw.randrange(3)), last]
         scenario = draw.choice(("works", "faults-5", "faults-50", "faults-100000"))
-        result = run([GRELLON], scenario, draw, [*draw.choices(MEANINGLESS, k=draw.randrange(3)), last])
-        return result, result.status in result.deaths or result.status == 0 and ended_well(result.errors)
+        result = run([GRELLON], scenario, draw, sent)
+        return result, result.status in result.deaths or (
+            result.status == 0 and ended_well(result.errors))
     if number % 4 == 1:
-        program = [MORWICK, *f"watch -s kvr --every 0.001 -o {draw.choice(('csv', 'json'))}".split()]
+        program = [MORWICK, *"watch -s kvr --every 0.001 -o".split(), draw.choice(("csv", "json"))]
         result = run(program, "live", draw, [last])
         return result, result.status in (0, *result.deaths) and whole_json(program, result.output)
     program = [MORWICK, *draw.choice(("read telemetry -w out", "metrics -w out")).split()]
@@ -196,13 +195,8 @@ def spoil(program, scenario, kind):
     if kind.endswith("gone"):
         result.fault = None
         return result, result.status == 128 + signal.SIGPIPE
-    return result, result.status != 0 and (kind == "both closed" or b"standard output" in (
-        result.errors if kind != "both full" else b"standard output"))
-
-
-def random_bytes():
-    yield many_entries
-    yield from (partial(feed, number) for number in range(10000))
+    return result, result.status != 0 and (
+        kind.startswith("both") or b"standard output" in result.errors)
 
 
 def many_entries():
@@ -213,7 +207,7 @@ def many_entries():
 
 def feed(number):
     draw = random.Random(f"{SEED} bytes {number}")
-    fill({name: mutated(draw, good) if draw.random() < 0.5 else good for name, good in GOOD.items()})
+    fill({name: draw.choice((good, mutated(draw, good))) for name, good in GOOD.items()})
     program, scenario = draw.choice(PROGRAMS + [([GRELLON], "faults-50")] * 9)
     if program == [GRELLON]:
         result = run(program, scenario, draw, (signal.SIGUSR1, signal.SIGTERM))
@@ -221,7 +215,8 @@ def feed(number):
             result.status == 2 and result.errors.count(b"\n") == 1)
     if number % 8 == 0:  # at a terminal
         result = run(["script", "-qec", shlex.join(program), "/dev/null"], scenario)
-        return result, not CONTROL.search(result.output.replace(b"\r\n", b"\n").decode(errors="replace"))
+        text = result.output.replace(b"\r\n", b"\n").decode(errors="replace")
+        return result, not CONTROL.search(text)
     result = run(program, scenario)
     return result, whole_json(program, result.output) and (
         result.status == 0 or result.status < 3 and result.errors + result.output != b"")
@@ -242,9 +237,9 @@ def mutated(draw, good):
     return bytes(text)
 
 
-def carry_out(attack, pool):
+def carry_out(attack, jobs, pool):
     """Returns the number of runs, of findings, and the longest time, in seconds."""
-    jobs, end, numbers = list(attack()), float("inf"), itertools.count()
+    jobs, end, numbers = list(jobs), float("inf"), itertools.count()
     if SECONDS > 0:
         random.Random(SEED).shuffle(jobs)
         end = time.monotonic() + SECONDS / 4
@@ -255,9 +250,9 @@ def carry_out(attack, pool):
         result, fine = job()
         if fine and not result.fault:
             return result.took, 0
-        kept = f"{ROOT}/{attack.__name__}-{next(numbers)}"
+        kept = f"{ROOT}/{attack}-{next(numbers)}"
         shutil.copytree(folder(), kept)
-        print(f"{attack.__name__}: {result.fault or 'goes wrong'}, status {result.status}:",
+        print(f"{attack}: {result.fault or 'goes wrong'}, status {result.status}:",
               result.command.replace(folder(), kept), flush=True)
         return result.took, 1
 
@@ -269,9 +264,11 @@ shutil.rmtree(ROOT, ignore_errors=True)
 os.makedirs(ROOT)
 print("seed", SEED, flush=True)
 with ThreadPoolExecutor(os.cpu_count()) as workers:
-    table = [(attack.__name__.replace("_", " "), *carry_out(attack, workers))
-             for attack in (refused_memory, signals, outputs, random_bytes)]
-print("attack              runs  findings  worst time")
+    table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
+        "memory": refused_memory(), "signals": (partial(interrupt, n) for n in range(1000)),
+        "outputs": outputs(),
+        "bytes": [many_entries, *(partial(feed, n) for n in range(10000))]}.items()]
+print("attack      runs  findings  worst time")
 for row in table:
-    print("{:16} {:7} {:9} {:9.2f} s".format(*row))
+    print("{:8} {:7} {:9} {:9.2f} s".format(*row))
 sys.exit(any(row[2] for row in table))
