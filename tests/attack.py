@@ -232,7 +232,7 @@ def mutated(draw, good):
         piece = draw.choice((draw.randbytes(draw.choice((1, 4, 16))), text[at:at + 8], b"[", b".a",
                              b"\n", b'"', b"%s%n", b"%9999u\0", b"\x1b[1m\xc2\x9b", b"\0\0\0\x80",
                              b"\xff\xff\xff\xff", b"\0\0\0\0", b"\1\0\0\0"))
-        piece *= draw.choice((1, 1, 1, 500))
+        piece *= draw.choice((1, 1, 1, 500, 30000))
         text[at:at + draw.choice((0, len(piece), 40))] = piece
     return bytes(text)
 
@@ -240,8 +240,8 @@ def mutated(draw, good):
 def carry_out(attack, jobs, pool):
     """Returns the number of runs, of findings, and the longest time, in seconds."""
     jobs, end, numbers = list(jobs), float("inf"), itertools.count()
-    if SECONDS > 0:
-        random.Random(SEED).shuffle(jobs)
+    if SECONDS > 0:  # the first one always
+        jobs[1:] = random.Random(SEED).sample(jobs[1:], len(jobs) - 1)
         end = time.monotonic() + SECONDS / 4
 
     def one(job):
