@@ -53,6 +53,22 @@ void Say(const char *severity, const std::string &subject, const std::string &re
   PrintLine(messages.back().text);
 }
 
+// Writes beside a file what then takes its place, or returns what went wrong.
+int Replace(const std::string &file, std::string_view bytes, std::optional<mode_t> mode) {
+  std::string beside = file + ".XXXXXX";
+  const int descriptor = mkostemp(beside.data(), O_CLOEXEC);
+  if (descriptor < 0) return errno;
+  const mode_t mask = umask(0);
+  umask(mask);
+  int error = WriteAll(descriptor, bytes);
+  if (error == 0 && fchmod(descriptor, mode.value_or(0666 & ~mask)) != 0) error = errno;
+  if (error == 0 && fsync(descriptor) != 0) error = errno;
+  if (close(descriptor) != 0 && error == 0) error = errno;
+  if (error == 0 && rename(beside.c_str(), file.c_str()) != 0) error = errno;
+  if (error != 0) unlink(beside.c_str());
+  return error;
+}
+
 int64_t MillisecondsNow() {
   using std::chrono::steady_clock;
   return std::chrono::duration_cast<std::chrono::milliseconds>(
@@ -185,19 +201,13 @@ bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mo
     return error == 0 || fail(error);
   }
 
-  std::string beside = target.string() + ".XXXXXX";
-  const int descriptor = mkostemp(beside.data(), O_CLOEXEC);
-  if (descriptor < 0) return fail(errno);
-  const mode_t mask = umask(0);
-  umask(mask);
-  int error = WriteAll(descriptor, bytes);
-  if (error == 0 && fchmod(descriptor, mode.value_or(0666 & ~mask)) != 0) error = errno;
-  if (error == 0 && fsync(descriptor) != 0) error = errno;
-  if (close(descriptor) != 0 && error == 0) error = errno;
-  if (error == 0 && rename(beside.c_str(), target.c_str()) != 0) error = errno;
-  if (error == 0) return true;
-  unlink(beside.c_str());
-  return fail(error);
+  // A signal waits meanwhile: if it ends the command, nothing is left beside the file.
+  sigset_t all, before;
+  sigfillset(&all);
+  sigprocmask(SIG_BLOCK, &all, &before);
+  const int error = Replace(target, bytes, mode);
+  sigprocmask(SIG_SETMASK, &before, nullptr);
+  return error == 0 || fail(error);
 }
 
 Output::Output() : terminal_(OutputIsTerminal()) {}

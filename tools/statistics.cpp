@@ -2,6 +2,8 @@
 
 #include "tools/statistics.h"
 
+#include <sys/mman.h>
+
 #include <algorithm>
 #include <cerrno>
 #include <charconv>
@@ -11,6 +13,8 @@
 
 namespace tools {
 namespace {
+
+constexpr size_t kReserve = 8 << 20;
 
 static_assert(offsetof(KVRStatsCxt, namesHead) == offsetof(GenericParserCxt, namesHead));
 static_assert(offsetof(KVRStatsCxt, valuesHead) == offsetof(GenericParserCxt, valuesHead));
@@ -64,6 +68,8 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
     : row_(dump.row), stream_(stream) {
   const bool messageBefore = GlobalAPIErrorMessage != nullptr;
   const auto size = static_cast<uint32_t>(dump.bytes.size());
+  // After a parse that took all the memory that there is, what it gave is to be printed.
+  void *reserve = mmap(nullptr, kReserve, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
   errno = 0;
   if (stream == "kvr") {
     result_ = static_cast<uint64_t>(row_->parseBufferToCxt(&context_.kvr, dump.bytes.data(), size));
@@ -73,6 +79,7 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
     result_ = row_->mspParseBufferToCxt(&context_.generic, dump.bytes.data(), size);
   }
   outOfMemory_ = errno == ENOMEM;  // the heap's own word: not every parser reports each refusal
+  if (reserve != MAP_FAILED) munmap(reserve, kReserve);
   if (GlobalAPIErrorMessage != nullptr && !messageBefore) message_ = GetAPIErrorMessage();
 }
 

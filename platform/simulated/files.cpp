@@ -4,6 +4,7 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <poll.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -39,6 +40,8 @@ std::string Printable(std::string_view text) {
 std::string Quoted(std::string_view text) { return "'" + Printable(text) + "'"; }
 
 void Complain(const std::string &reason) {
+  pollfd room = {.fd = STDERR_FILENO, .events = POLLOUT, .revents = 0};
+  if (poll(&room, 1, 1000) == 0) return;
   std::fprintf(stderr, "%s: %s\n", program_invocation_short_name, reason.c_str());
 }
 

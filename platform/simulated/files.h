@@ -18,7 +18,8 @@ std::string Printable(std::string_view text);
 // The same in quotes.
 std::string Quoted(std::string_view text);
 
-// One line on standard error, after the program's name.
+// One line on standard error, after the program's name. Whoever does not read it is given a second:
+// the process may be one that no signal ends by now.
 void Complain(const std::string &reason);
 
 }  // namespace simulated

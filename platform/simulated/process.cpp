@@ -2,15 +2,15 @@
 
 #include "platform/simulated/process.h"
 
-#include <errno.h>
 #include <fcntl.h>
 #include <signal.h>
 #include <unistd.h>
 
-#include <cstdio>
 #include <cstdlib>
 #include <ctime>
 #include <new>
+
+#include "platform/simulated/files.h"
 
 namespace simulated {
 namespace {
@@ -63,7 +63,7 @@ const Scenario &TakeProcess() {
 }
 
 void EndWithoutMemory() {
-  std::fprintf(stderr, "%s: out of memory\n", program_invocation_short_name);
+  Complain("out of memory");  // short enough to take no memory itself
   std::exit(2);
 }
 

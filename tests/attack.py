@@ -1,0 +1,276 @@
+"""Attacks the programs of the release build, as scripts/attack says, and ends with a table. A
+finding is printed with the command that repeats it; the status is 1 then."""
+import itertools, json, os, random, re, resource, select, shlex, shutil, signal, subprocess, sys
+import tempfile, threading, time
+from concurrent.futures import ThreadPoolExecutor
+from functools import partial
+from types import SimpleNamespace
+
+SECONDS = float(sys.argv[1]) if len(sys.argv) > 1 else 0  # 0: in full
+SEED = sys.argv[2] if len(sys.argv) > 2 else str(time.time_ns())
+ROOT, BUILD = os.path.abspath("build/attack"), os.path.abspath("build/release")
+MORWICK, GRELLON = BUILD + "/tools/morwick", BUILD + "/grellon"
+PRELOAD = f"{BUILD}/tests/librefuse_memory.so {BUILD}/tests/libfast_sleep.so"
+STOP = (signal.SIGTERM, signal.SIGINT, signal.SIGHUP)
+MEANINGLESS = (signal.SIGUSR1, signal.SIGPIPE, signal.SIGXFSZ)
+HANDLES = re.compile(rb"still open|already released| is unknown$|of another kind|did not end", re.M)
+CONTROL = re.compile("[\0-\x09\x0b-\x1f\x7f-\x9f\ufffd]")
+MOST_OUTPUT = 16 << 20
+
+QUICK = b"schedule = { first_run_after = 0, interval = 0.001, resume_after = 0, runs = %d }\n"
+NVME = b"[[controller]]\nclass = 'VeltoQRN3NVMeController'\npending = 3\n"
+FAULTS = b"refuse_open = [1]\nfail_request = [3]\nfail_close = true\nvanish = [4]\n"
+FILES = (b"statistics = ['kvr.bin', 'ftl.bin']\nmsp = 'msp.bin'\nsnapshot = 'snapshot.bin'\n"
+         b"snapshot_header = 'snapshot_header.bin'\ntelemetry = 'kvr.bin'\n")
+GOOD = {"live.toml": NVME + FILES, "works.toml": QUICK % 1 + NVME, "bad.toml": b"a = \n"}
+GOOD |= {f"faults-{runs}.toml": QUICK % runs + NVME + FAULTS for runs in (5, 50, 100000)}
+for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_header.bin"):
+    with open("examples/" + example, "rb") as file:
+        GOOD[example] = file.read() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
+
+COMMANDS = """normal json: find
+normal json csv: stats -s kvr
+normal json csv: stats -s ftl ftl.bin
+normal json csv: stats -s msp
+normal: stats -s kvr --summary
+normal: stats -s kvr --long kvr.bin
+normal json csv: diff -s kvr --seconds 2 kvr.bin ftl.bin
+normal json csv: watch -s kvr --every 0 --count 1
+normal json csv: snapshot
+normal json csv: snapshot snapshot.bin
+normal: snapshot --header snapshot_header.bin snapshot.bin
+normal json: snapshot --summary snapshot.bin
+normal json: capacity 512 30000
+normal json: stats -s kvr missing.bin""".splitlines()
+PROGRAMS = [[MORWICK, *words.split(), "-o", form]
+            for forms, words in (line.split(": ") for line in COMMANDS) for form in forms.split()]
+PROGRAMS += [[MORWICK, *words.split()] for words in (
+    "read kvr", "read band", "read telemetry -w out", "metrics", "metrics -w out --label host=a",
+    "metrics kvr=kvr.bin msp=msp.bin", "help", "help stats", "--help", "--version", "sats")]
+PROGRAMS = [(program, "live") for program in PROGRAMS]
+PROGRAMS += [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
+
+OUTPUTS = {  # what a shell does with those of "$@"
+    "closed": '"$@" >&-', "both closed": '"$@" >&- 2>&-', "errors closed": '"$@" 2>&-',
+    "full": '"$@" > /dev/full', "both full": '"$@" > /dev/full 2>&1',
+    "gone": '{ sleep 0.05; "$@"; } | true', "both gone": '{ sleep 0.05; "$@" 2>&1; } | true',
+    "slow": '"$@" | { sleep 0.05; cat; }',
+    "unread": 'mkfifo full; exec 9<>full; rm full; timeout 0.1 cat /dev/zero >&9; "$@" 2>&9'}
+
+most_memory = 1 << 20  # KiB that no process has exceeded: 1 GiB at first
+thread = threading.local()
+
+
+def folder():
+    """One for each thread, with good files."""
+    if not hasattr(thread, "folder"):
+        thread.folder = tempfile.mkdtemp(dir=ROOT)
+        fill(GOOD)
+    return thread.folder
+
+
+def fill(files):
+    for name, content in files.items():
+        with open(f"{folder()}/{name}", "wb") as target:
+            target.write(content)
+
+
+def take(name):
+    """The content of a file, which is gone then."""
+    if not os.path.exists(f"{folder()}/{name}"):
+        return None
+    with open(f"{folder()}/{name}", "rb") as source:
+        os.remove(source.name)
+        return source.read()
+
+
+def run(program, scenario, draw=None, sent=(), ends=(), **environment):
+    """Runs a program to its end, sending signals at random moments: any before there is a line on
+    standard error may end it, and each of `ends`. `fault` is what no program may do."""
+    global most_memory
+    environment |= {"GRELLON_SCENARIO": scenario + ".toml", "LD_PRELOAD": PRELOAD}
+    result = SimpleNamespace(fault=None, deaths=[-each for each in ends])
+    result.command = "(cd {}; {} {})  # {}".format(
+        folder(), " ".join(f"{name}={shlex.quote(value)}" for name, value in environment.items()),
+        shlex.join(program), " ".join(each.name for each in sent))
+    with tempfile.TemporaryFile() as output, tempfile.TemporaryFile() as errors:
+        process = subprocess.Popen(program, cwd=folder(), env=os.environ | environment,
+                                   stdin=subprocess.DEVNULL, stdout=output, stderr=errors)
+        for each in sent:
+            time.sleep(draw.random() * draw.choice((0.003, 0.01, 0.04)))
+            result.deaths += [] if os.fstat(errors.fileno()).st_size > 0 else [-each]
+            os.kill(process.pid, each)
+        begin, ended = time.monotonic(), os.pidfd_open(process.pid)
+        if not select.select([ended], [], [], 15)[0]:
+            result.fault = "hangs"
+            process.kill()
+        os.close(ended)
+        result.status, result.took = process.wait(), time.monotonic() - begin
+        output.seek(0)
+        errors.seek(0)
+        result.output, result.errors = output.read(MOST_OUTPUT), errors.read()
+    result.file = take("out")
+    memory = resource.getrusage(resource.RUSAGE_CHILDREN).ru_maxrss
+    if memory > most_memory:
+        most_memory, result.fault = memory, f"takes {memory} KiB"
+    if not 0 <= result.status < 128 and result.status not in result.deaths:
+        result.fault = result.fault or "is killed"
+    if HANDLES.search(result.errors):
+        result.fault = "misuses a handle"
+    if [name for name in os.listdir(folder()) if name.startswith("out.") and take(name)]:
+        result.fault = "leaves a file beside the one it writes"
+    return result
+
+
+def same(program, one, other):
+    """But for times, and rates that are reckoned from them."""
+    if {"watch", "metrics"}.isdisjoint(program) or None in (one, other):
+        return one == other
+    return len({re.sub(rb" +|\d+([-:.]\d+)+", b"", text) for text in (one, other)}) == 1
+
+
+def whole_json(program, output):
+    try:
+        return "json" not in program or all(json.loads(line) for line in output.splitlines())
+    except ValueError:
+        return len(output) == MOST_OUTPUT
+
+
+def ended_well(log):
+    return re.search(rb"grellon: (start grellon|(deferring|stopping) grellon daemon)\n$", log) and (
+        log.count(b": opened io service") == log.count(b": closing io service"))
+
+
+def refused_memory():
+    for program, scenario in PROGRAMS:
+        good = run(program, scenario, ALLOCATIONS="count")
+        for number in range(int(take("count"))):
+            yield partial(refuse, program, scenario, number + 1, good)
+
+
+def refuse(program, scenario, number, good):
+    result = run(program, scenario, REFUSE=str(number))
+    named = re.search(rb": out of memory(\n$| after \d+ entries)", result.errors)
+    if program == [GRELLON]:
+        return result, ended_well(result.errors) if result.status == 0 else (
+            result.status == 2 and (named or result.errors == good.errors))
+    if result.status == good.status and same(program, result.output, good.output):
+        return result, same(program, result.file, good.file)
+    return result, result.status == 1 and named and whole_json(program, result.output) and (
+        result.file is None or b"read_success" in result.file)
+
+
+def interrupt(number):
+    draw = random.Random(f"{SEED} signals {number}")
+    last = draw.choice(STOP)
+    if number % 2 == 0:
+        sent = [*draw.choices(MEANINGLESS, k=draw.randrange(3)), last]
+        scenario = draw.choice(("works", "faults-5", "faults-50", "faults-100000"))
+        result = run([GRELLON], scenario, draw, sent)
+        return result, result.status in result.deaths or (
+            result.status == 0 and ended_well(result.errors))
+    if number % 4 == 1:
+        program = [MORWICK, *"watch -s kvr --every 0.001 -o".split(), draw.choice(("csv", "json"))]
+        result = run(program, "live", draw, [last])
+        return result, result.status in (0, *result.deaths) and whole_json(program, result.output)
+    program = [MORWICK, *draw.choice(("read telemetry -w out", "metrics -w out")).split()]
+    result = run(program, "live", draw, [last], STOP)
+    whole = same(program, result.file, run(program, "live").file)
+    return result, whole or result.status in result.deaths and result.file is None
+
+
+def outputs():
+    for (program, scenario), kind in itertools.product(PROGRAMS, OUTPUTS):
+        if program == [GRELLON] or kind != "unread":
+            yield partial(spoil, program, scenario, kind)
+
+
+def spoil(program, scenario, kind):
+    good = run(program, scenario)
+    result = run(["bash", "-o", "pipefail", "-c", OUTPUTS[kind], "bash", *program], scenario)
+    if kind in ("errors closed", "slow"):
+        return result, result.status == good.status and same(program, result.output, good.output)
+    if program == [GRELLON] or not good.output:
+        return result, result.status == good.status
+    if kind.endswith("gone"):
+        result.fault = None
+        return result, result.status == 128 + signal.SIGPIPE
+    return result, result.status != 0 and (
+        kind.startswith("both") or b"standard output" in result.errors)
+
+
+def many_entries():
+    fill({"kvr.bin": b"\x36\0\0\0\0\0\0\0" * 262144})  # each eight bytes make 256 entries
+    result = run([MORWICK, *"stats -s kvr --summary kvr.bin".split()], "live")
+    return result, result.status == 1 and b"out of memory after" in result.errors
+
+
+def feed(number):
+    draw = random.Random(f"{SEED} bytes {number}")
+    fill({name: draw.choice((good, mutated(draw, good))) for name, good in GOOD.items()})
+    program, scenario = draw.choice(PROGRAMS + [([GRELLON], "faults-50")] * 9)
+    if program == [GRELLON]:
+        result = run(program, scenario, draw, (signal.SIGUSR1, signal.SIGTERM))
+        return result, result.status in (0, *result.deaths) or (
+            result.status == 2 and result.errors.count(b"\n") == 1)
+    if number % 8 == 0:  # at a terminal
+        result = run(["script", "-qec", shlex.join(program), "/dev/null"], scenario)
+        text = result.output.replace(b"\r\n", b"\n").decode(errors="replace")
+        return result, not CONTROL.search(text)
+    result = run(program, scenario)
+    return result, whole_json(program, result.output) and (
+        result.status == 0 or result.status < 3 and result.errors + result.output != b"")
+
+
+def mutated(draw, good):
+    if draw.random() < 0.1:
+        return draw.randbytes(draw.choice((0, 1, 40, 70000)))
+    text = bytearray(good)
+    for _ in range(draw.choice((1, 1, 3, 20))):
+        at = draw.randrange(len(text) + 1)
+        at -= at % draw.choice((1, 4))
+        piece = draw.choice((draw.randbytes(draw.choice((1, 4, 16))), text[at:at + 8], b"[", b".a",
+                             b"\n", b'"', b"%s%n", b"%9999u\0", b"\x1b[1m\xc2\x9b", b"\0\0\0\x80",
+                             b"\xff\xff\xff\xff", b"\0\0\0\0", b"\1\0\0\0"))
+        piece *= draw.choice((1, 1, 1, 500, 30000))
+        text[at:at + draw.choice((0, len(piece), 40))] = piece
+    return bytes(text)
+
+
+def carry_out(attack, jobs, pool):
+    """Returns the number of runs, of findings, and the longest time, in seconds."""
+    jobs, end, numbers = list(jobs), float("inf"), itertools.count()
+    if SECONDS > 0:  # the first one always
+        jobs[1:] = random.Random(SEED).sample(jobs[1:], len(jobs) - 1)
+        end = time.monotonic() + SECONDS / 4
+
+    def one(job):
+        if time.monotonic() > end:
+            return None
+        result, fine = job()
+        if fine and not result.fault:
+            return result.took, 0
+        kept = f"{ROOT}/{attack}-{next(numbers)}"
+        shutil.copytree(folder(), kept)
+        print(f"{attack}: {result.fault or 'goes wrong'}, status {result.status}:",
+              result.command.replace(folder(), kept), flush=True)
+        return result.took, 1
+
+    times, found = zip(*filter(None, pool.map(one, jobs)))
+    return len(times), sum(found), max(times)
+
+
+for ignored in STOP:  # by whoever runs this in the background, and then by all that it runs
+    signal.signal(ignored, signal.SIG_DFL)
+shutil.rmtree(ROOT, ignore_errors=True)
+os.makedirs(ROOT)
+print("seed", SEED, flush=True)
+with ThreadPoolExecutor(os.cpu_count()) as workers:
+    table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
+        "memory": refused_memory(), "signals": (partial(interrupt, n) for n in range(1000)),
+        "outputs": outputs(),
+        "bytes": [many_entries, *(partial(feed, n) for n in range(10000))]}.items()]
+print("attack      runs  findings  worst time")
+for row in table:
+    print("{:8} {:7} {:9} {:9.2f} s".format(*row))
+sys.exit(any(row[2] for row in table))
