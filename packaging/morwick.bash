@@ -3,12 +3,12 @@
 
 _morwick() {
   local program=$1 current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
-  local command=${COMP_WORDS[1]} help line=""
+  local command=${COMP_WORDS[1]} help line="" before="" suffix=""
   # bash takes --option=value for three words.
   if [ "$current" = = ]; then
-    current=""
+    current="" before==
   elif [ "$previous" = = ]; then
-    previous=${COMP_WORDS[COMP_CWORD - 2]}
+    previous=${COMP_WORDS[COMP_CWORD - 2]} before==
   fi
   if [ "$COMP_CWORD" -eq 1 ] || [ "$command" = help ]; then
     help=$("$program" --help)
@@ -18,12 +18,17 @@ _morwick() {
     # The line of the option that wants a value, or else of what comes without one.
     line=$(grep -E "^  (-.,)?$previous [A-Z]{2}|^  $previous,--[a-z-]+ [A-Z]{2}" <<<"$help") ||
       line=$(grep -E '^  (FILE|OLD|STREAM)' <<<"$help")
+    # Of a pair, words up to the sign, and a file behind it.
+    case $line in
+      *STREAM=FILE*) [ "$before" = = ] && line=FILE || suffix== ;;
+    esac
   fi
   case $current:$line in
     -*) mapfile -t COMPREPLY < <(compgen -W "$(grep -oE -- '--[a-z-]+' <<<"$help")" -- "$current") ;;
     *"{"*"}"*)
       line=${line#*\{}
-      mapfile -t COMPREPLY < <(compgen -W "$(tr , ' ' <<<"${line%%\}*}")" -- "$current")
+      mapfile -t COMPREPLY < <(compgen -S "$suffix" -W "$(tr , ' ' <<<"${line%%\}*}")" -- "$current")
+      [ -z "$suffix" ] || compopt -o nospace
       ;;
     *FILE* | *OLD*) mapfile -t COMPREPLY < <(compgen -f -- "$current") && compopt -o filenames ;;
   esac

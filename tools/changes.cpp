@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <new>
 #include <unordered_map>
 
 #include "tools/text.h"
@@ -48,30 +49,7 @@ void PrintNumber(Json &json, const char *key, const char *textKey, std::string_v
   json.PlainText(digits);
 }
 
-}  // namespace
-
-std::string_view Change::Remark() const {
-  if (old == nullptr) return "appeared";
-  if (now == nullptr) return "vanished";
-  return now->value < old->value ? "backwards" : "";
-}
-
-std::string Change::Difference() const {
-  if (old == nullptr || now == nullptr) return "";
-  if (now->value < old->value) return "-" + std::to_string(old->value - now->value);
-  return std::to_string(now->value - old->value);
-}
-
-std::optional<double> Change::Rate(double seconds) const {
-  if (old == nullptr || now == nullptr) return std::nullopt;
-  const bool backwards = now->value < old->value;
-  const auto difference =
-      static_cast<double>(backwards ? old->value - now->value : now->value - old->value);
-  const double rate = (backwards ? -difference : difference) / seconds;
-  return std::isfinite(rate) ? std::optional(rate) : std::nullopt;
-}
-
-std::vector<Change> FindChanges(const Statistics &old, const Statistics &now, bool all) {
+std::vector<Change> Compare(const Statistics &old, const Statistics &now, bool all) {
   std::unordered_map<std::string_view, Occurrences> before;
   const ContextNode *value = old.values();
   for (const ContextNode *name = old.names(); name != nullptr; name = name->next) {
@@ -100,6 +78,39 @@ std::vector<Change> FindChanges(const Statistics &old, const Statistics &now, bo
     value = value->next;
   }
   return changes;
+}
+
+}  // namespace
+
+std::string_view Change::Remark() const {
+  if (old == nullptr) return "appeared";
+  if (now == nullptr) return "vanished";
+  return now->value < old->value ? "backwards" : "";
+}
+
+std::string Change::Difference() const {
+  if (old == nullptr || now == nullptr) return "";
+  if (now->value < old->value) return "-" + std::to_string(old->value - now->value);
+  return std::to_string(now->value - old->value);
+}
+
+std::optional<double> Change::Rate(double seconds) const {
+  if (old == nullptr || now == nullptr) return std::nullopt;
+  const bool backwards = now->value < old->value;
+  const auto difference =
+      static_cast<double>(backwards ? old->value - now->value : now->value - old->value);
+  const double rate = (backwards ? -difference : difference) / seconds;
+  return std::isfinite(rate) ? std::optional(rate) : std::nullopt;
+}
+
+std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Statistics &now,
+                                               bool all, const std::string &subject) {
+  try {
+    return Compare(old, now, all);
+  } catch (const std::bad_alloc &) {
+    Complain(subject, "out of memory when compared");
+    return std::nullopt;
+  }
 }
 
 void PrintChanges(Output &output, const std::vector<Change> &changes,

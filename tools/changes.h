@@ -27,8 +27,9 @@ struct Change {
 
 // In the order of the later reading, then what vanished. The n-th entry of a name is compared with
 // the n-th of that name. Entries that did not change are left out unless `all` is wanted. The
-// changes live as long as both statistics.
-std::vector<Change> FindChanges(const Statistics &old, const Statistics &now, bool all);
+// changes live as long as both statistics. Null after a complaint: there was no memory for them.
+std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Statistics &now,
+                                               bool all, const std::string &subject);
 
 // A table with columns for name, old, new, difference, rate where the time between the readings is
 // known, and remark.

@@ -88,7 +88,7 @@ Presence Probe(const NandExporter &row) {
 
 // Nothing between finding and keeping a handle may throw.
 Controller::Controller(const std::string &className, const std::string &what)
-    : className_(className) {
+    : className_(className), what_(what) {
   NandExporter *row = FindRow(className);
   errno = 0;
   const uint32_t service = row == nullptr ? findNandExporter(&row) : FindService(*row);
@@ -111,7 +111,7 @@ Controller::~Controller() {
   const int32_t result = CloseService(connection_);
   if (result == 0) return;
   try {
-    Note(name(), "closing the connection failed, result " + Hexadecimal(result));
+    Note(name() + ": " + what_, "closing the connection failed, result " + Hexadecimal(result));
   } catch (const std::bad_alloc &) {  // main says so
   }
 }

@@ -66,6 +66,7 @@ class Controller {
 
  private:
   std::string className_;
+  std::string what_;
   const NandExporter *row_ = nullptr;
   uint32_t connection_ = 0;
 };

@@ -39,23 +39,25 @@ Status Diff(const Options &options) {
   const Dump now = ReadDumpFile(options.newFile, options.stream, options.className);
   Status status = std::max(old.status, now.status);
   std::optional<Statistics> before, after;
-  std::vector<Change> changes;
+  std::optional<std::vector<Change>> changes;
   if (status == kGood) {
     before.emplace(old, options.stream);
     after.emplace(now, options.stream);
-    changes = FindChanges(*before, *after, options.all);
-    status = std::max(before->Judge(old), after->Judge(now));
+    status = before->Judge(old);
+    status = std::max(status, after->Judge(now));
+    changes = FindChanges(*before, *after, options.all, now.subject);
+    if (!changes) status = kBadData;
   }
   Output output;
   if (options.format == "json") {
     Json json(output, "diff", {{"old", options.oldFile}, {"new", options.newFile}});
     json.Member("stream", options.stream);
-    PrintChanges(json, changes, options.seconds);
+    PrintChanges(json, changes.value_or(std::vector<Change>()), options.seconds);
     json.Finish(status);
-  } else if (options.format == "csv") {
-    if (before) PrintCsv(output, changes, options.seconds);
-  } else {
-    PrintChanges(output, changes, options.seconds);
+  } else if (changes && options.format == "csv") {
+    PrintCsv(output, *changes, options.seconds);
+  } else if (changes) {
+    PrintChanges(output, *changes, options.seconds);
   }
   return output.Finish(status);
 }

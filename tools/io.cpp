@@ -23,6 +23,7 @@ namespace {
 
 constexpr size_t kBlockSize = 64 << 10;
 constexpr rlim_t kMemoryLimit = 1 << 30;
+constexpr int kMostLinks = 40;  // the kernel's own limit
 
 int outputDescriptor = STDOUT_FILENO;
 std::vector<Message> messages;
@@ -188,9 +189,12 @@ bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mo
     Complain(file, std::strerror(error));
     return false;
   };
+  // A link stays a link, and what it leads to is made.
   std::error_code failure;
-  const std::filesystem::path target = std::filesystem::weakly_canonical(file, failure);
-  if (failure) return fail(failure.value());
+  std::filesystem::path target = file;
+  for (int links = 0; links < kMostLinks && is_symlink(target, failure); ++links) {
+    target = target.parent_path() / read_symlink(target, failure);
+  }
   const auto type = std::filesystem::status(target, failure).type();
   if (type != std::filesystem::file_type::regular &&
       type != std::filesystem::file_type::not_found) {
@@ -216,6 +220,12 @@ bool Output::Flush() {
   const size_t length = length_;
   length_ = 0;
   return WriteOut({buffer_, length});
+}
+
+bool Output::WaitWithReader(const timespec &time, const sigset_t &mask) {
+  pollfd reader = {outputDescriptor, 0, 0};  // an error is reported unasked
+  if (ppoll(&reader, 1, &time, &mask) > 0) error_ = EPIPE;
+  return error_ == 0;
 }
 
 bool Output::WriteRoundTheBuffer(std::string_view text) {

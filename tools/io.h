@@ -106,6 +106,10 @@ class Output {
   // Writes out what is buffered, for whoever waits for it at the other end of a pipe.
   bool Flush();
 
+  // Waits, under that signal mask, for the time to pass or a signal. False when the reader at the
+  // other end has gone away, which then counts as a failed write.
+  bool WaitWithReader(const timespec &time, const sigset_t &mask);
+
   // Flushes. Complains and turns `status` into kBadData when anything failed; a reader that has
   // gone away ends the process in silence, as it ends other programs.
   Status Finish(Status status);

@@ -78,7 +78,7 @@ Status Run(int argc, char **argv) {
   AddHelp(app, &action);
 
   const std::string first = argc > 1 ? argv[1] : "";
-  if (!first.starts_with('-') && FindCommand(app, first) == nullptr) {
+  if (FindCommand(app, first) == nullptr && app.get_option_no_throw(first) == nullptr) {
     return RefuseUsage((first.empty() ? "a sub-command is needed, one of "
                                       : "'" + first + "' is no sub-command, those are ") +
                        KnownCommands(app));

@@ -6,6 +6,7 @@
 #include <chrono>
 #include <map>
 #include <memory>
+#include <new>
 
 #include "tools/commands.h"
 #include "tools/options.h"
@@ -78,12 +79,16 @@ template <typename ReadDump>
 Reading Read(const std::string &stream, ReadDump readDump) {
   Reading reading = {.stream = stream};
   const auto start = steady_clock::now();
-  const Dump dump = readDump();
-  if (dump.status == kGood) {
-    const Statistics statistics(dump, stream);
-    reading.good = statistics.Judge(dump) == kGood;
-    reading.samples = SamplesOf(statistics);
-    reading.timestamp = dump.source.kind == "file" ? FileTime(dump.source.name) : Now();
+  try {
+    const Dump dump = readDump();
+    if (dump.status == kGood) {
+      const Statistics statistics(dump, stream);
+      reading.samples = SamplesOf(statistics);
+      reading.timestamp = dump.source.kind == "file" ? FileTime(dump.source.name) : Now();
+      reading.good = statistics.Judge(dump) == kGood;
+    }
+  } catch (const std::bad_alloc &) {
+    Complain(stream, "out of memory");
   }
   reading.seconds = std::chrono::duration<double>(steady_clock::now() - start).count();
   return reading;
@@ -245,7 +250,7 @@ void AddMetrics(CLI::App &app, Action *action) {
       ->add_option_function<Texts>("STREAM=FILE",
                                    TakePairs(&options->files, "STREAM=FILE", SplitFile),
                                    "Of dumps instead, such as kvr=FILE")
-      ->type_name("");
+      ->type_name("{kvr,ftl,msp}");
   command
       ->add_option_function<Texts>("--label", TakePairs(&options->labels, "--label", SplitLabel),
                                    "A label for all lines")

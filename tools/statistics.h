@@ -53,6 +53,9 @@ class Statistics {
   // The summary fields; kvr only.
   const KVRStatsCxt &summary() const { return context_.kvr; }
 
+  // Whether entries are missing for want of memory.
+  bool outOfMemory() const { return outOfMemory_; }
+
   // Says what is wrong with the dump, and where its statistics end, if not at its end.
   Status Judge(const Dump &dump) const;
 

@@ -101,10 +101,16 @@ void PrintJsonSummary(Json &json, const Statistics &statistics) {
   json.Key("summary");
   json.BeginObject();
   for (const auto &[name, values] : SummaryOf(statistics)) {
+    const auto each = [&](auto print) {
+      if (values.size() > 1) json.BeginArray();
+      for (const uint64_t value : values) print(value);
+      if (values.size() > 1) json.EndArray();
+    };
     json.Key(name);
-    if (values.size() > 1) json.BeginArray();
-    for (const uint64_t value : values) json.Number(value);
-    if (values.size() > 1) json.EndArray();
+    each([&](uint64_t value) { json.Number(value); });
+    if (std::ranges::max(values) <= kLargestExact) continue;
+    json.Key(std::string(name) + "_s");
+    each([&](uint64_t value) { json.PlainText(std::to_string(value)); });
   }
   json.EndObject();
 }
@@ -198,13 +204,19 @@ void AddStats(CLI::App &app, Action *action) {
   AddStream(command, &options->stream);
   AddController(command, &options->className,
                 "Read from this one instead of the first; with FILE, where the dump is from");
-  command->add_flag("--summary", options->summary, "Only the main figures; kvr only");
-  command->add_flag("--long", options->inFull, "Each element of an array on a line of its own");
+  CLI::Option *summary = command->add_flag("--summary", options->summary, "Only the main figures; kvr and normal output only");
+  command
+      ->add_flag("--long", options->inFull,
+                 "Each element of an array on a line of its own; normal output only")
+      ->excludes(summary);
   AddFormat(command, &options->format, {"normal", "json", "csv"});
   command->callback([=] {
     options->live = file->count() == 0;
     if (options->summary && (options->stream != "kvr" || options->format != "normal")) {
       throw CLI::ValidationError("--summary", "is for kvr and normal output");
+    }
+    if (options->inFull && options->format != "normal") {
+      throw CLI::ValidationError("--long", "is for normal output");
     }
     *action = [=] { return Print(*options); };
   });

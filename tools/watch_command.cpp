@@ -1,13 +1,12 @@
 // morwick watch: what changes between successive readings of a controller.
 
-#include <sys/select.h>
-
 #include <algorithm>
 #include <array>
 #include <chrono>
 #include <csignal>
 #include <ctime>
 #include <memory>
+#include <new>
 
 #include "tools/changes.h"
 #include "tools/commands.h"
@@ -25,7 +24,7 @@ struct Options {
   std::string className;
   std::string format;
   double every = 5;
-  uint64_t count = 0;  // of readings after the first; 0: until a signal
+  uint64_t count = UINT64_MAX;  // of readings after the first
   bool all = false;
 };
 
@@ -36,14 +35,28 @@ struct Reading {
   Dump dump;
   std::optional<Statistics> statistics;  // there are none without a dump
 
-  Reading(const std::string &stream, const std::string &className)
-      : dump(ReadDumpLive(stream, className)) {
-    if (dump.status == kGood) statistics.emplace(dump, stream);
+  Reading(const std::string &stream, const std::string &className) {
+    try {
+      dump = ReadDumpLive(stream, className);
+      if (dump.status == kGood) statistics.emplace(dump, stream);
+    } catch (const std::bad_alloc &) {
+      Complain(stream, "out of memory");
+      dump.status = kBadData;
+    }
+  }
+
+  // Of all that there is in it. Statistics that took all memory are given up again.
+  Status Judge() {
+    if (!statistics) return dump.status;
+    const Status status = statistics->Judge(dump);
+    if (statistics->outOfMemory()) statistics.reset();
+    return status;
   }
 };
 
 // Signals that end the watch are taken where it waits, so that a reading is always whole; a second
-// one of them ends a reading that hangs.
+// one of them ends a reading that hangs. The end of the terminal stays ignored where it was (by
+// nohup); an interrupt does not: a shell has it ignored by whatever it starts in the background.
 class StopSignals {
  public:
   StopSignals() {
@@ -52,23 +65,27 @@ class StopSignals {
     action.sa_flags = static_cast<int>(SA_RESETHAND);
     sigemptyset(&signals_);
     for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+      struct sigaction before = {};
+      sigaction(signal, nullptr, &before);
+      if (signal == SIGHUP && before.sa_handler == SIG_IGN) continue;
       sigaction(signal, &action, nullptr);
       sigaddset(&signals_, signal);
     }
   }
 
-  // False when the watch is to end.
-  bool WaitUntil(SteadyClock::time_point moment) {
+  // False when the watch is to end, for a signal or because nobody reads it any more.
+  bool WaitUntil(SteadyClock::time_point moment, Output &output) {
     sigset_t before;
     sigprocmask(SIG_BLOCK, &signals_, &before);  // none is missed between question and sleep
-    while (stopped_ == 0 && SteadyClock::now() < moment) {
+    bool reader = true;
+    while (stopped_ == 0 && reader && SteadyClock::now() < moment) {
       const auto left = std::chrono::nanoseconds(moment - SteadyClock::now()).count();
       const timespec timeout = {std::max(left, int64_t{0}) / 1000000000,
                                 std::max(left, int64_t{0}) % 1000000000};
-      pselect(0, nullptr, nullptr, nullptr, &timeout, &before);
+      reader = output.WaitWithReader(timeout, before);
     }
     sigprocmask(SIG_SETMASK, &before, nullptr);
-    return stopped_ == 0;
+    return stopped_ == 0 && reader;
   }
 
  private:
@@ -103,13 +120,19 @@ void PrintCsv(Output &output, const Reading &now, const std::vector<Change> &cha
   }
 }
 
-void PrintBlock(Output &output, const Options &options, const Reading *old, const Reading &now,
-                Status status) {
+// Prints what changed since the last good reading, if there was one; returns the status of both.
+Status PrintBlock(Output &output, const Options &options, const Reading *old, const Reading &now,
+                  Status status) {
   std::vector<Change> changes;
   std::optional<double> seconds;
   if (old != nullptr && now.statistics) {
-    changes = FindChanges(*old->statistics, *now.statistics, options.all);
-    seconds = std::chrono::duration<double>(now.moment - old->moment).count();
+    if (auto found =
+            FindChanges(*old->statistics, *now.statistics, options.all, now.dump.subject)) {
+      changes = std::move(*found);
+      seconds = std::chrono::duration<double>(now.moment - old->moment).count();
+    } else {
+      status = kBadData;
+    }
   }
   if (options.format == "json") {
     Json json(output, "watch", {now.dump.source});
@@ -125,6 +148,7 @@ void PrintBlock(Output &output, const Options &options, const Reading *old, cons
     PrintChanges(output, changes, seconds);
     output.Write("\n");
   }
+  return status;
 }
 
 Status Watch(Options options) {
@@ -138,18 +162,13 @@ Status Watch(Options options) {
   auto next = SteadyClock::now();
   for (uint64_t count = 0;; ++count) {
     auto reading = std::make_unique<Reading>(options.stream, options.className);
-    Status status = reading->dump.status;
-    if (reading->statistics) {
-      // Later readings are of the same controller, and need not say again that it was found.
-      options.className = reading->dump.source.name;
-      status = reading->statistics->Judge(reading->dump);
-    }
-    worst = std::max(worst, status);
-    PrintBlock(output, options, last.get(), *reading, status);
+    // Later readings are of the same controller, and need not say again that it was found.
+    if (reading->statistics) options.className = reading->dump.source.name;
+    worst = std::max(worst,
+                     PrintBlock(output, options, last.get(), *reading, reading->Judge()));
     if (reading->statistics) last = std::move(reading);
     next = std::max(next + every, SteadyClock::now());
-    const bool enough = options.count > 0 && count == options.count;
-    if (!output.Flush() || enough || !signals.WaitUntil(next)) break;
+    if (!output.Flush() || count == options.count || !signals.WaitUntil(next, output)) break;
   }
   return output.Finish(worst);
 }

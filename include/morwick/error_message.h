@@ -14,7 +14,11 @@
 extern "C" {
 #endif
 
-/* The stored message, or null before there is one. Read it through GetAPIErrorMessage. */
+/*
+ * The stored message, or null before there is one. Read it through GetAPIErrorMessage. A tool that
+ * wants a message of each call may set it to null while no other thread is in the library: the next
+ * one is stored again, and the text before is the tool's own, to be given to free().
+ */
 MORWICK_EXPORT extern char *GlobalAPIErrorMessage;
 
 /*

@@ -189,13 +189,14 @@ class Drivers {
       Complain(Quoted(files[next]) + ": " + std::strerror(error));
       return kDeviceError;
     }
+    // A reply that fills the room may have been cut, and the same is asked for again with more.
+    const bool cut = size == room;
     if (controller.shortRead.Hits(read)) {
       // Who looks beyond a short reply is not to find the rest of it there.
       std::fill_n(static_cast<char *>(reply) + size / 2, size - size / 2, '\0');
       size /= 2;
     }
-    // A reply that fills the room may have been cut, and the same is asked for again with more.
-    if (size < room && next + 1 < files.size()) ++next;
+    if (!cut && next + 1 < files.size()) ++next;
     *replySize = size;
     return kSuccess;
   }
