@@ -102,7 +102,7 @@ Controller::Controller(const std::string &className, const std::string &what)
   } else if (className.empty()) {
     Complain(what, "no controller is present");
   } else {
-    Complain(className + ": " + what, "it is not present");
+    Complain(className + ": " + what, "the controller is not present");
   }
 }
 

@@ -117,7 +117,10 @@ const std::vector<Message> &Messages() { return messages; }
 
 void ForgetMessages() { messages.clear(); }
 
-std::string DisplayName(const std::string &file) { return file == "-" ? "standard input" : file; }
+std::string DisplayName(const std::string &file) {
+  if (file.empty()) return "''";
+  return file == "-" ? "standard input" : file;
+}
 
 Input::Input(const std::string &file)
     : name_(DisplayName(file)),

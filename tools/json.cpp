@@ -21,7 +21,7 @@ Json::Json(Output &output, std::string_view command, const std::vector<Source> &
   Key("source");
   BeginObject();
   for (const Source &source : sources) {
-    if (source.name.empty()) {
+    if (source.kind == "controller" && source.name.empty()) {
       Key(source.kind);
       Null();
     } else {

@@ -16,7 +16,7 @@ namespace tools {
 // Where the data comes from, or came from.
 struct Source {
   std::string_view kind;  // file, controller
-  std::string name;       // empty while no controller was found
+  std::string name;       // of a controller empty while none was found
 };
 
 class Json {

@@ -34,8 +34,8 @@ Status Print(const std::string &text) {
   return output.Finish(kGood);
 }
 
-Status RefuseUsage(const std::string &reason) {
-  PrintLine(reason + " (see morwick --help)");
+Status RefuseUsage(const std::string &reason, const std::string &help = "--help") {
+  PrintLine(reason + " (see morwick " + help + ")");
   return kBadUsage;
 }
 
@@ -90,7 +90,7 @@ Status Run(int argc, char **argv) {
   } catch (const CLI::CallForVersion &version) {
     return Print(version.what() + std::string("\n"));
   } catch (const CLI::Error &error) {
-    return RefuseUsage(error.what());
+    return RefuseUsage(error.what(), "help " + first);
   }
   return action();
 }

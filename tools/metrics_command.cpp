@@ -256,16 +256,10 @@ void AddMetrics(CLI::App &app, Action *action) {
                                    "A label for all lines")
       ->type_name("KEY=VALUE")
       ->allow_extra_args(false);  // one behind each --label
-  CLI::Option *output = command
-                            ->add_option("-w,--write", options->output,
-                                         "Write to a file, whole or not at all, mode 0644")
-                            ->type_name("FILE");
+  AddWrite(command, &options->output, "Write to a file, whole or not at all, mode 0644");
   AddController(command, &options->className,
                 "Read from this one instead of the first; with files, where they are from");
   command->callback([=] {
-    if (output->count() > 0 && options->output.empty()) {
-      throw CLI::ValidationError("--write", "a file needs a name");
-    }
     if (std::ranges::count(options->files, "-", [](const auto &file) { return file.second; }) > 1) {
       throw CLI::ValidationError("STREAM=FILE", "standard input can be read only once");
     }

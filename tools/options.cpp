@@ -26,6 +26,15 @@ void AddController(CLI::App *command, std::string *className, const std::string 
   command->add_option("-c,--controller", *className, description)->check(CLI::IsMember(known));
 }
 
+void AddWrite(CLI::App *command, std::string *file, const std::string &description) {
+  const auto take = [=](const std::string &name) {
+    if (name.empty()) throw CLI::ValidationError("--write", "a file needs a name");
+    if (name == "-") throw CLI::ValidationError("--write", "standard output goes without it");
+    *file = name;
+  };
+  command->add_option_function<std::string>("-w,--write", take, description)->type_name("FILE");
+}
+
 CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds,
                         const std::string &description) {
   const auto take = [=](const std::string &text) {

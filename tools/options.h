@@ -17,6 +17,9 @@ void AddStream(CLI::App *command, std::string *stream);
 // -c, --controller: a class that the library knows.
 void AddController(CLI::App *command, std::string *className, const std::string &description);
 
+// -w, --write: a file with a name; standard output is what there is without it.
+void AddWrite(CLI::App *command, std::string *file, const std::string &description);
+
 // Seconds, 0 or more, fractions too.
 CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds,
                         const std::string &description);

@@ -43,14 +43,9 @@ void AddRead(CLI::App &app, Action *action) {
   command->add_option("STREAM", options->kind, "Which buffer")
       ->check(CLI::IsMember(kinds))
       ->required();
-  CLI::Option *file =
-      command->add_option("-w,--write", options->file, "Write to a file, whole or not at all")
-          ->type_name("FILE");
+  AddWrite(command, &options->file, "Write to a file, whole or not at all");
   AddController(command, &options->className, "Read from this one instead of the first");
   command->callback([=] {
-    if (file->count() > 0 && options->file.empty()) {
-      throw CLI::ValidationError("--write", "a file needs a name");
-    }
     *action = [=] { return Read(*options); };
   });
 }

@@ -183,6 +183,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     good = PrintFixedText(output, records);
   }
   if (!good) return kBadUsage;
+  if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
   if (records.rest() > 0 && !(text && snapshot.header)) {
     Complain(snapshot.name,
              "the last " + std::to_string(records.rest()) + " bytes are not a whole record");

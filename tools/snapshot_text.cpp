@@ -113,12 +113,14 @@ Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::s
   DescribedText text(output, header);
   Status status = kGood;
   uint32_t dealtWith = 0;
+  bool surplus = false;
   while (dealtWith < last) {
     const auto block = records.Next();
     if (!block) return kBadUsage;
     if (block->empty()) break;
     const auto count =
         static_cast<uint32_t>(std::min<size_t>(block->size() / recordSize, last - dealtWith));
+    surplus = block->size() / recordSize > count;
     const auto passOver = [&](uint32_t index) {
       Complain(name, "record " + std::to_string(dealtWith + index) + " does not fit a text of " +
                          std::to_string(kMostRoom) + " bytes");
@@ -133,6 +135,9 @@ Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::s
     Complain(name, "ends after " + std::to_string(dealtWith) + " of " + std::to_string(last) +
                        " records that " + headerName + " promises");
     status = kBadData;
+  } else if (surplus || !records.Next().value_or("").empty()) {
+    Note(name, "goes on behind the " + std::to_string(last) + " records that " + headerName +
+                   " promises");
   }
   return status;
 }
