@@ -45,9 +45,7 @@ void AddRead(CLI::App &app, Action *action) {
       ->required();
   AddWrite(command, &options->file, "Write to a file, whole or not at all");
   AddController(command, &options->className, "Read from this one instead of the first");
-  command->callback([=] {
-    *action = [=] { return Read(*options); };
-  });
+  command->callback([=] { *action = [=] { return Read(*options); }; });
 }
 
 }  // namespace tools

@@ -204,7 +204,8 @@ void AddStats(CLI::App &app, Action *action) {
   AddStream(command, &options->stream);
   AddController(command, &options->className,
                 "Read from this one instead of the first; with FILE, where the dump is from");
-  CLI::Option *summary = command->add_flag("--summary", options->summary, "Only the main figures; kvr and normal output only");
+  CLI::Option *summary = command->add_flag("--summary", options->summary,
+                                           "Only the main figures; kvr and normal output only");
   command
       ->add_flag("--long", options->inFull,
                  "Each element of an array on a line of its own; normal output only")
