@@ -46,15 +46,17 @@ build are simulated.")
 set(CPACK_DEBIAN_LIBMORWICK1_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/libmorwick1/triggers)
 
 # The scripts of a package that has a service, which may leave files.
-macro(debian_service component service files)
-  string(TOUPPER ${component} name)
-  foreach(file postinst prerm postrm)
-    configure_file(${CMAKE_CURRENT_LIST_DIR}/service/${file}.in debian/${component}/${file} @ONLY)
-    list(APPEND CPACK_DEBIAN_${name}_PACKAGE_CONTROL_EXTRA
-      ${CMAKE_CURRENT_BINARY_DIR}/debian/${component}/${file})
+function(debian_service component service files)
+  set(folder ${CMAKE_CURRENT_BINARY_DIR}/debian/${component})
+  foreach(script postinst prerm postrm)
+    configure_file(${CMAKE_CURRENT_LIST_DIR}/service/${script}.in ${folder}/${script} @ONLY)
+    list(APPEND scripts ${folder}/${script})
   endforeach()
-endmacro()
-debian_service(morwick morwick-metrics "/var/lib/prometheus/node-exporter/morwick.prom*")
+  string(TOUPPER ${component} name)
+  set(CPACK_DEBIAN_${name}_PACKAGE_CONTROL_EXTRA ${scripts} PARENT_SCOPE)
+endfunction()
+debian_service(morwick morwick-metrics
+  "/var/lib/prometheus/node-exporter/morwick.prom /var/lib/prometheus/node-exporter/morwick.prom.??????")
 debian_service(grellon grellon "")
 list(APPEND CPACK_DEBIAN_GRELLON_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/grellon/conffiles)
 
