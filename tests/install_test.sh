@@ -61,10 +61,17 @@ END_OF_PROJECT
 cmake --install "$build" --prefix "$work/installed" >/dev/null
 DESTDIR=$work/root cmake --install "$build" --prefix /usr >/dev/null
 for root in "" "$work/root"; do
+  for service in grellon morwick-metrics; do
+    unit=$(find "${root:-$work/installed}" -name $service.service)
+    program=$root$(sed -n 's/^ExecStart=\([^ ]*\).*/\1/p' "$unit")
+    if ! [ -x "$program" ] || ! [ -f "${unit%service}timer" ]; then
+      echo "$unit starts nothing"
+      exit 1
+    fi
+  done
   unit=$(find "${root:-$work/installed}" -name grellon.service)
-  program=$root$(sed -n 's/^ExecStart=//p' "$unit")
   scenario=$root$(sed -n 's/^Environment=GRELLON_SCENARIO=//p' "$unit")
-  if ! [ -x "$program" ] || ! [ -f "$scenario" ]; then echo "$unit starts nothing"; exit 1; fi
+  [ -f "$scenario" ] || { echo "$unit plays nothing"; exit 1; }
 done
 [ -f "$work/root/etc/grellon/scenario.toml" ]
 
@@ -78,7 +85,7 @@ if [ "$platform" = simulated ]; then
 fi
 (cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
   bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md \
-  morwick/examples/latency.gp) >/dev/null
+  morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/examples/latency.gp) >/dev/null
 build_and_consume "$prefix" given
 
 cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \

@@ -35,15 +35,29 @@ libmorwick.")
 debian_package(morwick utils "${library}"
 "Storage-controller access and statistics - command
 Finds NAND storage controllers and prints their statistics and snapshots, for
-people and for scripts. The controllers of this build are simulated.")
+people and for scripts, and writes them for Prometheus by a timer that is off
+until it is enabled. The controllers of this build are simulated.")
+set(CPACK_DEBIAN_MORWICK_PACKAGE_SUGGESTS prometheus-node-exporter)
 debian_package(grellon admin "${library}"
 "Background BDR work of NAND storage controllers - daemon
 Lets a NAND storage controller carry out its pending BDR work in slices, on AC
 power, by a timer that is off until it is enabled. The controllers of this
 build are simulated.")
 set(CPACK_DEBIAN_LIBMORWICK1_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/libmorwick1/triggers)
-foreach(file conffiles postinst prerm postrm)
-  list(APPEND CPACK_DEBIAN_GRELLON_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/grellon/${file})
-endforeach()
+
+# The scripts of a package that has a service, which may leave files.
+function(debian_service component service files)
+  set(folder ${CMAKE_CURRENT_BINARY_DIR}/debian/${component})
+  foreach(script postinst prerm postrm)
+    configure_file(${CMAKE_CURRENT_LIST_DIR}/service/${script}.in ${folder}/${script} @ONLY)
+    list(APPEND scripts ${folder}/${script})
+  endforeach()
+  string(TOUPPER ${component} name)
+  set(CPACK_DEBIAN_${name}_PACKAGE_CONTROL_EXTRA ${scripts} PARENT_SCOPE)
+endfunction()
+debian_service(morwick morwick-metrics
+  "/var/lib/prometheus/node-exporter/morwick.prom /var/lib/prometheus/node-exporter/morwick.prom.??????")
+debian_service(grellon grellon "")
+list(APPEND CPACK_DEBIAN_GRELLON_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/grellon/conffiles)
 
 include(CPack)
