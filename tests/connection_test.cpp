@@ -58,6 +58,16 @@ TEST(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {
   }
 }
 
+TEST(ConnectionTest, ReleasesAServiceWithoutAConnection) {
+  Play({{"present", "KVRStorage"}}, [] {
+    NandExporter *row = nullptr;
+    const uint32_t service = findNandExporter(&row);
+    row->service = service;
+    ReleaseIOInterfaces(row);
+    row->service = 0;
+  });
+}
+
 TEST(ConnectionTest, PassesOverNullPointers) {
   const std::string outcome = Play({}, [] {
     EXPECT_EQ(findNandExporter(nullptr) + TolkConnect(nullptr), 0U);

@@ -26,6 +26,8 @@ TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
   RefuseAllocation(1);
   SetAPIErrorMessage("no memory");
   RefuseAllocation(0);
+  const char *none = nullptr;
+  SetAPIErrorMessage(none, 7);
   EXPECT_EQ(TakeMessage(), "NA");
   SetAPIErrorMessage("%s %d", "100%d", 7);
   SetAPIErrorMessage("second");

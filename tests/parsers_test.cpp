@@ -116,6 +116,7 @@ TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
   EXPECT_EQ(AddSingleValueToGenericContext(&context, "", nullptr, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", nullptr, 4, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, "abcd", 4, 1), 0);
+  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, nullptr, 4, 0), 1);
   const std::string bytes(65536, 1);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", bytes.data(), 1, 65536), 0);
   EXPECT_EQ(Entries(context).count, 0U);

@@ -143,8 +143,8 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
       {8, 13, 0, 24, 99, kDeviceError, none},
       {8, 13, 1, 24, 99, kBadArgument, none},
       {8, 13, 0, 24, 6, 0, "first"},
-      {8, 13, 0, 24, 3, 0, "2"},  // half of what fills the room does not fill it
-      {8, 13, 0, 24, 5, 0, "third"},
+      {8, 13, 0, 24, 3, 0, "2"},  // half of what fills the room was cut all the same
+      {8, 13, 0, 24, 5, 0, "2nd"},
       {8, 13, 0, 24, 99, 0, "third"},
       {8, 13, 0, 24, 99, 0, "third"},
       {8, 221, 0, 24, 99, 0, "msp"},

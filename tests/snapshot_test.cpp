@@ -1,6 +1,7 @@
 // Both snapshot renderings, byte for byte and through buffers of every size.
 
 #include <gtest/gtest.h>
+#include <sys/mman.h>
 
 #include <algorithm>
 #include <cstring>
@@ -224,7 +225,24 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   // Of so many records, kept to 32 bits, there is none; nothing may be read.
   EXPECT_EQ(kFixed(nullptr, uint64_t{252} << 32, output, &(size = sizeof output)), 1U);
   EXPECT_EQ(size, 1338U);
-  EXPECT_EQ(Render("no field, no line", 500, Header(6, 4, 3, {}), 7), (Rendered{1, 1, "", 7}));
+  // What lies behind a table without fields is none.
+  EXPECT_EQ(Render("no field, no line", 500, Header(6, 4, 3, {}).append(40, '\0')),
+            (Rendered{1, 1, "", 2}));
+}
+
+TEST(DescribedSnapshotTest, ReachesRecordsBeyond4GiB) {
+  constexpr uint64_t kRecord = uint64_t{1} << 31;
+  void *memory = mmap(nullptr, 3 * kRecord, PROT_READ | PROT_WRITE,
+                      MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
+  ASSERT_NE(memory, MAP_FAILED);
+  static_cast<char *>(memory)[2 * kRecord] = 5;
+  const std::string header = Header(6, kRecord, 4, {{0, 9, 0, 0, "N=%u"}});
+  char output[100] = "";
+  uint64_t size = sizeof output;
+  uint32_t state = 0;
+  EXPECT_EQ(kDescribed(memory, 3 * kRecord, output, &size, header.data(), &state), 1U);
+  EXPECT_EQ(output, kBanner + "N=5\n");
+  munmap(memory, 3 * kRecord);
 }
 
 }  // namespace
