@@ -4,6 +4,7 @@
 
 #include <atomic>
 #include <cstdlib>
+#include <thread>
 
 namespace {
 
@@ -52,6 +53,7 @@ void *__wrap_malloc(size_t size) {
 }
 
 void *__wrap_calloc(size_t count, size_t size) {
+  std::this_thread::yield();  // for others to come as far: who meets here is in a race
   return ++allocations == refused ? nullptr : Counted(__real_calloc(count, size));
 }
 

@@ -206,7 +206,7 @@ TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
   }
 }
 
-TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
+TEST(SnapshotTest, TakesNullPointersAndHugeSizes) {
   char output[2000] = "untouched";
   const std::string header = Header(6, 12, 3, kCounting);
   uint64_t size = sizeof output;
@@ -225,24 +225,21 @@ TEST(SnapshotTest, TakesNullPointersAndNoRoom) {
   // Of so many records, kept to 32 bits, there is none; nothing may be read.
   EXPECT_EQ(kFixed(nullptr, uint64_t{252} << 32, output, &(size = sizeof output)), 1U);
   EXPECT_EQ(size, 1338U);
-  // What lies behind a table without fields is none.
-  EXPECT_EQ(Render("no field, no line", 500, Header(6, 4, 3, {}).append(40, '\0')),
-            (Rendered{1, 1, "", 2}));
-}
-
-TEST(DescribedSnapshotTest, ReachesRecordsBeyond4GiB) {
-  constexpr uint64_t kRecord = uint64_t{1} << 31;
-  void *memory = mmap(nullptr, 3 * kRecord, PROT_READ | PROT_WRITE,
+  // A descriptor that is not counted is none.
+  std::string bare = Header(6, 4, 3, {{0, 9, 0, 0, "%u"}});
+  bare[52] = 0;
+  EXPECT_EQ(Render("no field, no line", 500, bare), (Rendered{1, 1, "", 2}));
+  EXPECT_EQ(Render("no field, no line", 500, bare, 7), (Rendered{1, 1, "", 7}));
+  // Of records of 2 GiB, the third lies beyond what 32 bits address.
+  constexpr size_t kGiB = size_t{1} << 30;
+  void *memory = mmap(nullptr, 6 * kGiB, PROT_READ | PROT_WRITE,
                       MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
   ASSERT_NE(memory, MAP_FAILED);
-  static_cast<char *>(memory)[2 * kRecord] = 5;
-  const std::string header = Header(6, kRecord, 4, {{0, 9, 0, 0, "N=%u"}});
-  char output[100] = "";
-  uint64_t size = sizeof output;
-  uint32_t state = 0;
-  EXPECT_EQ(kDescribed(memory, 3 * kRecord, output, &size, header.data(), &state), 1U);
-  EXPECT_EQ(output, kBanner + "N=5\n");
-  munmap(memory, 3 * kRecord);
+  static_cast<char *>(memory)[4 * kGiB] = 9;
+  const std::string huge = Header(6, 2 * kGiB, 4, {{0, 9, 0, 0, "%u"}});
+  EXPECT_EQ(kDescribed(memory, 6 * kGiB, output, &(size = 500), huge.data(), &(state = 2)), 1U);
+  EXPECT_STREQ(output, "9\n");
+  munmap(memory, 6 * kGiB);
 }
 
 }  // namespace
