@@ -6,9 +6,9 @@ _morwick() {
   local command=${COMP_WORDS[1]} help line="" before="" suffix=""
   # bash takes --option=value for three words.
   if [ "$current" = = ]; then
-    current="" before==
+    current="" before="="
   elif [ "$previous" = = ]; then
-    previous=${COMP_WORDS[COMP_CWORD - 2]} before==
+    previous=${COMP_WORDS[COMP_CWORD - 2]} before="="
   fi
   if [ "$COMP_CWORD" -eq 1 ] || [ "$command" = help ]; then
     help=$("$program" --help)
@@ -20,7 +20,7 @@ _morwick() {
       line=$(grep -E '^  (FILE|OLD|STREAM)' <<<"$help")
     # Of a pair, words up to the sign, and a file behind it.
     case $line in
-      *STREAM=FILE*) [ "$before" = = ] && line=FILE || suffix== ;;
+      *STREAM=FILE*) [ "$before" = = ] && line=FILE || suffix="=" ;;
     esac
   fi
   case $current:$line in
