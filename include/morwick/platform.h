@@ -17,10 +17,10 @@
  * the activity are called as each comment says. No function may call back into the library but
  * through the handler that RegisterActivity was given.
  *
- * MEMORY. A function that gets no memory answers with its failure, and with errno ENOMEM, which stands
- * for no other failure. Nothing but SystemLog,
- * RegisterActivity and RunMainQueue may end the process: a tool that looks for a controller is not
- * to die of it. Nor may anything but these three change how the process handles signals.
+ * MEMORY. A function that gets no memory answers with its failure, and with errno ENOMEM, which
+ * stands for no other failure. Nothing but SystemLog, RegisterActivity and RunMainQueue may end the
+ * process: a tool that looks for a controller is not to die of it. Nor may anything but these three
+ * change how the process handles signals.
  */
 #ifndef MORWICK_PLATFORM_H
 #define MORWICK_PLATFORM_H
