@@ -14,12 +14,14 @@ export LD_PRELOAD=
 
 # With pauses a thousand times shorter; the sanitizer would rather be preloaded before them.
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
-# What it prints as JSON is kept, and checked at the end.
+# What it prints as JSON is kept, and checked at the end, as is what it says about open handles.
 morwick() {
   case " $* " in *" json "*) ;; *) "$MORWICK" "$@"; return ;; esac
-  "$MORWICK" "$@" >object
+  "$MORWICK" "$@" >object 2>errors
   local status=$?
   cat object >>objects
+  cat errors >>complaints
+  cat errors >&2
   cat object
   return $status
 }
@@ -68,6 +70,7 @@ command=
 } >played
 [ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
 diff "$session" played || exit 1
+! grep -s -e "still open" -e "already released" complaints || exit 1
 [ ! -s objects ] || python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
 import json, jsonschema, sys
 validator = jsonschema.Draft202012Validator(json.load(open(sys.argv[1])))
