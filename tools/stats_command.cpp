@@ -100,16 +100,16 @@ void PrintCsv(Output &output, const Statistics &statistics) {
 void PrintJsonSummary(Json &json, const Statistics &statistics) {
   json.Key("summary");
   json.BeginObject();
-  for (const auto &[name, values] : SummaryOf(statistics)) {
+  for (const SummaryField &field : SummaryOf(statistics)) {
     const auto each = [&](auto print) {
-      if (values.size() > 1) json.BeginArray();
-      for (const uint64_t value : values) print(value);
-      if (values.size() > 1) json.EndArray();
+      if (field.values.size() > 1) json.BeginArray();
+      for (const uint64_t value : field.values) print(value);
+      if (field.values.size() > 1) json.EndArray();
     };
-    json.Key(name);
+    json.Key(field.name);
     each([&](uint64_t value) { json.Number(value); });
-    if (std::ranges::max(values) <= kLargestExact) continue;
-    json.Key(std::string(name) + "_s");
+    if (std::ranges::max(field.values) <= kLargestExact) continue;
+    json.Key(std::string(field.name) + "_s");
     each([&](uint64_t value) { json.PlainText(std::to_string(value)); });
   }
   json.EndObject();
