@@ -39,14 +39,8 @@ void PrintRows(Output &output, const std::vector<Row> &rows) {
   }
 }
 
-// A number and, where a double does not hold it, its text twin.
-void PrintNumber(Json &json, const char *key, const char *textKey, std::string_view digits,
-                 uint64_t magnitude) {
-  json.Key(key);
-  json.Digits(digits);
-  if (magnitude <= kLargestExact) return;
-  json.Key(textKey);
-  json.PlainText(digits);
+void PrintNumber(Json &json, const char *key, uint64_t magnitude, std::string_view digits) {
+  json.Numbers(key, false, [&](auto print) { print(magnitude, digits); });
 }
 
 std::vector<Change> Compare(const Statistics &old, const Statistics &now, bool all) {
@@ -135,17 +129,12 @@ void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<
     json.BeginObject();
     json.Key("name");
     json.PlainText(change.name);
-    if (change.old != nullptr) {
-      PrintNumber(json, "old", "old_s", change.old->text, change.old->value);
-    }
-    if (change.now != nullptr) {
-      PrintNumber(json, "new", "new_s", change.now->text, change.now->value);
-    }
+    if (change.old != nullptr) PrintNumber(json, "old", change.old->value, change.old->text);
+    if (change.now != nullptr) PrintNumber(json, "new", change.now->value, change.now->text);
     if (const std::string difference = change.Difference(); !difference.empty()) {
       const uint64_t old = change.old->value;
       const uint64_t now = change.now->value;
-      PrintNumber(json, "difference", "difference_s", difference,
-                  now < old ? old - now : now - old);
+      PrintNumber(json, "difference", now < old ? old - now : now - old, difference);
     }
     if (const std::optional<double> rate = seconds ? change.Rate(*seconds) : std::nullopt) {
       json.Key("rate");

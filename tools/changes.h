@@ -27,7 +27,8 @@ struct Change {
 
 // In the order of the later reading, then what vanished. The n-th entry of a name is compared with
 // the n-th of that name. Entries that did not change are left out unless `all` is wanted. The
-// changes live as long as both statistics. Null after a complaint: there was no memory for them.
+// changes live as long as both statistics. Null after a complaint about `subject`, what the later
+// reading is called: there was no memory for them.
 std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Statistics &now,
                                                bool all, const std::string &subject);
 

@@ -4,7 +4,9 @@
 
 #include <sys/types.h>
 
+#include <csignal>
 #include <cstdint>
+#include <ctime>
 #include <optional>
 #include <string>
 #include <string_view>

@@ -7,6 +7,7 @@
 
 #include <concepts>
 #include <cstdint>
+#include <string>
 #include <string_view>
 
 #include "tools/io.h"
@@ -18,6 +19,10 @@ struct Source {
   std::string_view kind;  // file, controller
   std::string name;       // of a controller empty while none was found
 };
+
+// Numbers above it lose their last digits in readers that take all numbers for doubles; a text twin
+// stands beside them.
+constexpr uint64_t kLargestExact = uint64_t{1} << 53;
 
 class Json {
  public:
@@ -50,6 +55,26 @@ class Json {
     Number(number);
   }
 
+  // Numbers by that key, in an array or as the one that there is; once more as texts where one of
+  // them is too large for a double. `each` hands each value and its digits to what it is given.
+  template <typename Each>
+  void Numbers(std::string_view key, bool array, Each each) {
+    const auto print = [&](auto printOne) {
+      if (array) BeginArray();
+      each(printOne);
+      if (array) EndArray();
+    };
+    bool exact = true;
+    Key(key);
+    print([&](uint64_t value, std::string_view digits) {
+      Digits(digits);
+      exact = exact && value <= kLargestExact;
+    });
+    if (exact) return;
+    Key(std::string(key) + "_s");
+    print([&](uint64_t, std::string_view digits) { PlainText(digits); });
+  }
+
   // Ends the object with the messages so far, which are forgotten then, and the status.
   void Finish(Status status);
 
@@ -73,10 +98,6 @@ class Json {
   rapidjson::Writer<Stream, rapidjson::UTF8<>, rapidjson::UTF8<>, Memory> writer_{stream_,
                                                                                   &memory_};
 };
-
-// Numbers above it lose their last digits in readers that take all numbers for doubles; a text twin
-// stands beside them.
-constexpr uint64_t kLargestExact = uint64_t{1} << 53;
 
 }  // namespace tools
 

@@ -113,14 +113,14 @@ Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::s
   DescribedText text(output, header);
   Status status = kGood;
   uint32_t dealtWith = 0;
-  bool surplus = false;
+  bool more = false;  // than the header promises
   while (dealtWith < last) {
     const auto block = records.Next();
     if (!block) return kBadUsage;
     if (block->empty()) break;
     const auto count =
         static_cast<uint32_t>(std::min<size_t>(block->size() / recordSize, last - dealtWith));
-    surplus = block->size() / recordSize > count;
+    more = block->size() / recordSize > count;
     const auto passOver = [&](uint32_t index) {
       Complain(name, "record " + std::to_string(dealtWith + index) + " does not fit a text of " +
                          std::to_string(kMostRoom) + " bytes");
@@ -134,8 +134,14 @@ Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::s
   if (dealtWith < last) {
     Complain(name, "ends after " + std::to_string(dealtWith) + " of " + std::to_string(last) +
                        " records that " + headerName + " promises");
-    status = kBadData;
-  } else if (surplus || !records.Next().value_or("").empty()) {
+    return kBadData;
+  }
+  if (!more) {
+    const auto block = records.Next();
+    if (!block) return kBadUsage;
+    more = !block->empty();
+  }
+  if (more) {
     Note(name, "goes on behind the " + std::to_string(last) + " records that " + headerName +
                    " promises");
   }

@@ -68,8 +68,6 @@ Dump ReadDumpLive(std::string_view stream, const std::string &className) {
 
 Statistics::Statistics(const Dump &dump, std::string_view stream)
     : row_(dump.row), stream_(stream) {
-  // The library keeps its first message only; here each dump has its own.
-  char *const messageBefore = std::exchange(GlobalAPIErrorMessage, nullptr);
   const auto size = static_cast<uint32_t>(dump.bytes.size());
   // After a parse that took all the memory that there is, what it gave is to be printed.
   void *reserve = mmap(nullptr, kReserve, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
@@ -84,7 +82,8 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
   outOfMemory_ = errno == ENOMEM;  // the heap's own word: not every parser reports each refusal
   if (reserve != MAP_FAILED) munmap(reserve, kReserve);
   if (GlobalAPIErrorMessage != nullptr) message_ = GetAPIErrorMessage();
-  std::free(std::exchange(GlobalAPIErrorMessage, messageBefore));
+  // The library keeps its first message only; here each dump has its own.
+  std::free(std::exchange(GlobalAPIErrorMessage, nullptr));
 }
 
 Statistics::~Statistics() {

@@ -101,37 +101,18 @@ void PrintJsonSummary(Json &json, const Statistics &statistics) {
   json.Key("summary");
   json.BeginObject();
   for (const SummaryField &field : SummaryOf(statistics)) {
-    const auto each = [&](auto print) {
-      if (field.values.size() > 1) json.BeginArray();
-      for (const uint64_t value : field.values) print(value);
-      if (field.values.size() > 1) json.EndArray();
-    };
-    json.Key(field.name);
-    each([&](uint64_t value) { json.Number(value); });
-    if (std::ranges::max(field.values) <= kLargestExact) continue;
-    json.Key(std::string(field.name) + "_s");
-    each([&](uint64_t value) { json.PlainText(std::to_string(value)); });
+    json.Numbers(field.name, field.values.size() > 1, [&](auto print) {
+      for (const uint64_t value : field.values) print(value, std::to_string(value));
+    });
   }
   json.EndObject();
 }
 
-// One value, or the list of an array's; as texts too where a number is too large for a double.
 void PrintJsonValues(Json &json, const EntryGroup &group) {
-  const auto each = [&](auto print) {
-    if (group.IsArray()) json.BeginArray();
+  json.Numbers(group.IsArray() ? "values" : "value", group.IsArray(), [&](auto print) {
     const ContextNode *value = group.value;
-    for (size_t i = 0; i < group.count; ++i, value = value->next) print(*value);
-    if (group.IsArray()) json.EndArray();
-  };
-  bool exact = true;
-  json.Key(group.IsArray() ? "values" : "value");
-  each([&](const ContextNode &value) {
-    json.Digits(value.text);
-    exact = exact && value.value <= kLargestExact;
+    for (size_t i = 0; i < group.count; ++i, value = value->next) print(value->value, value->text);
   });
-  if (exact) return;
-  json.Key(group.IsArray() ? "values_s" : "value_s");
-  each([&](const ContextNode &value) { json.PlainText(value.text); });
 }
 
 void PrintJsonEntries(Json &json, const Statistics &statistics) {

@@ -45,7 +45,7 @@ struct Reading {
     }
   }
 
-  // Of all that there is in it. Statistics that took all memory are given up again.
+  // The status of the reading, after complaints. Statistics that took all memory are given up.
   Status Judge() {
     if (!statistics) return dump.status;
     const Status status = statistics->Judge(dump);
@@ -78,11 +78,10 @@ class StopSignals {
     sigset_t before;
     sigprocmask(SIG_BLOCK, &signals_, &before);  // none is missed between question and sleep
     bool reader = true;
-    while (stopped_ == 0 && reader && SteadyClock::now() < moment) {
-      const auto left = std::chrono::nanoseconds(moment - SteadyClock::now()).count();
-      const timespec timeout = {std::max(left, int64_t{0}) / 1000000000,
-                                std::max(left, int64_t{0}) % 1000000000};
-      reader = output.WaitWithReader(timeout, before);
+    int64_t left = 1;  // nanoseconds; without any, signals and reader are asked for all the same
+    while (stopped_ == 0 && reader && left > 0) {
+      left = std::max(std::chrono::nanoseconds(moment - SteadyClock::now()).count(), int64_t{0});
+      reader = output.WaitWithReader({left / 1000000000, left % 1000000000}, before);
     }
     sigprocmask(SIG_SETMASK, &before, nullptr);
     return stopped_ == 0 && reader;
