@@ -78,7 +78,9 @@ Status Run(int argc, char **argv) {
   AddHelp(app, &action);
 
   const std::string first = argc > 1 ? argv[1] : "";
-  if (FindCommand(app, first) == nullptr && app.get_option_no_throw(first) == nullptr) {
+  // Not app.get_option(), which would end the program where memory is refused.
+  const auto isFirst = [&](const CLI::Option *option) { return option->check_name(first); };
+  if (FindCommand(app, first) == nullptr && app.get_options(isFirst).empty()) {
     return RefuseUsage((first.empty() ? "a sub-command is needed, one of "
                                       : "'" + first + "' is no sub-command, those are ") +
                        KnownCommands(app));
