@@ -34,14 +34,11 @@ std::string CheckSnapshotHeader(std::string_view file) {
     return "the text at offset " + std::to_string(sizeof(SnapshotHeader)) + " has no end";
   }
   const uint64_t table = LoadLittleEndian32(&file[offsetof(SnapshotHeader, descriptorTableOffset)]);
-  if (table + sizeof(SnapshotDescriptorTable) > file.size())
-    return wrong("descriptor table offset", table);
+  const uint64_t descriptors = table + sizeof(SnapshotDescriptorTable);
+  if (descriptors > file.size()) return wrong("descriptor table offset", table);
   const uint32_t count = LoadLittleEndian32(&file[table]);
-  if (table + sizeof(SnapshotDescriptorTable) + uint64_t{count} * sizeof(SnapshotFieldDescriptor) >
-      file.size()) {
-    return wrong("descriptor count", count);
-  }
-  return "";
+  const uint64_t end = descriptors + uint64_t{count} * sizeof(SnapshotFieldDescriptor);
+  return end > file.size() ? wrong("descriptor count", count) : "";
 }
 
 }  // namespace tools

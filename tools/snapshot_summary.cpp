@@ -16,12 +16,12 @@ namespace {
 constexpr size_t kSlowest = 5;
 constexpr size_t kPriorities = std::extent_v<decltype(SnapshotRecord::reads)>;
 
-constexpr char kExplanation[] =
-    "Latencies in microseconds. An interval's latency is its mean: total latency by operations, "
-    "of\n"
-    "all priorities. Percentiles are of these means, by nearest rank; intervals without "
-    "operations\n"
-    "are left out. The maximum is of a single operation.\n";
+constexpr char kExplanation[] = R"(
+Latencies in microseconds. An interval's latency is its mean: total latency by operations, of
+all priorities. Percentiles are of these means, by nearest rank; intervals without operations
+are left out. The maximum is of a single operation.
+
+)";
 
 std::string Decimal(std::optional<double> number, const char *format) {
   if (!number) return "-";
@@ -97,7 +97,7 @@ void SnapshotSummary::Add(std::string_view record) {
 }
 
 void SnapshotSummary::Print(Output &output) {
-  output.Write("Intervals: " + std::to_string(intervals_) + "\n" + kExplanation + "\n");
+  output.Write("Intervals: " + std::to_string(intervals_) + kExplanation);
   output.Write("        operations       mean     median        p95        p99    maximum\n");
   for (Operations *each : {&reads_, &writes_}) {
     std::string line(each->name);

@@ -13,8 +13,8 @@ namespace {
 // The length of the UTF-8 sequence that begins the text, or 0 when there is none; `code` is the
 // character it stands for.
 size_t TakeCharacter(std::string_view text, uint32_t *code) {
-  constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800,
-                                 0x10000};  // by length: shorter ones exist below
+  // The least character by length; for those below there are shorter sequences.
+  constexpr uint32_t kLeast[] = {0, 0, 0x80, 0x800, 0x10000};
   const auto byte = [&](size_t i) { return static_cast<unsigned char>(text[i]); };
   const size_t length = byte(0) < 0x80 ? 1 : byte(0) < 0xe0 ? 2 : byte(0) < 0xf0 ? 3 : 4;
   if (text.size() < length || (byte(0) >= 0x80 && byte(0) < 0xc0) || byte(0) >= 0xf8) return 0;

@@ -146,8 +146,9 @@ class Drivers {
       return kBadArgument;
     }
     const auto *request = static_cast<const char *>(input);
-    if (std::any_of(request + kRequestZeros, request + kRequestSize, [](char c) { return c != 0; }))
-      return kBadArgument;
+    const bool zeros =
+        std::all_of(request + kRequestZeros, request + kRequestSize, [](char c) { return c == 0; });
+    if (!zeros) return kBadArgument;
     const uint32_t command = LoadWord(request, 0);
     const uint32_t argument = LoadWord(request, 4);
     if (command == kTaskScheduler) return DoUnit(device, argument, reply, room, replySize);

@@ -14,10 +14,12 @@ namespace simulated {
 int ReadFile(const char *path, void *bytes, size_t room, size_t *size) {
   const int file = open(path, O_RDONLY | O_CLOEXEC);
   if (file < 0) return errno;
-  ssize_t got = 1;
-  for (*size = 0; got > 0 && *size<room; *size += got> 0 ? static_cast<size_t>(got) : 0) {
+  *size = 0;
+  ssize_t got = 0;
+  do {
     got = read(file, static_cast<char *>(bytes) + *size, room - *size);
-  }
+    if (got > 0) *size += static_cast<size_t>(got);
+  } while (got > 0 && *size < room);
   const int error = got < 0 ? errno : 0;  // a directory opens but cannot be read
   close(file);
   return error;

@@ -53,8 +53,8 @@ struct BadScenario {
 void CheckCharacters(std::string_view text) {
   size_t line = 1;
   for (const char c : text) {
-    if (static_cast<unsigned char>(c) > 127)
-      throw BadScenario{line, "a character that is not ASCII"};
+    const bool ascii = static_cast<unsigned char>(c) <= 127;
+    if (!ascii) throw BadScenario{line, "a character that is not ASCII"};
     if (c == '\n') ++line;
   }
 }
