@@ -223,6 +223,9 @@ void AddSnapshot(CLI::App &app, Action *action) {
   command->callback([=] {
     options->live = file->count() == 0;
     options->described = header->count() > 0;
+    if (!options->live && !options->className.empty()) {
+      throw CLI::ValidationError("--controller", "is not asked for what is read from a file");
+    }
     if (options->summary && options->format == "csv") {
       throw CLI::ValidationError("--summary", "is not printed as csv");
     }

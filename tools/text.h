@@ -19,7 +19,7 @@ std::string ValidText(std::string_view text);
 // A whole number of decimal digits and nothing else, at most `most`.
 std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most);
 
-// A number of seconds, 0 or more, such as 2 or 0.25.
+// A number of seconds such as 2 or 0.25, at most 10^9.
 std::optional<double> ParseSeconds(std::string_view text);
 
 // For tables and series: 12.345.
