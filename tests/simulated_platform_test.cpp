@@ -114,6 +114,7 @@ TEST(SimulatedPlatformTest, AnswersTheRightRequestsOnly) {
       "'\nsnapshot_header = '/'\n"
       "defects = [\"/no\\n\\u007f\", '" +
       File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
+  close(STDIN_FILENO);  // a file that is read may well be descriptor 0
   const uint32_t connection = Connect();
   const std::string none;
   const struct {
@@ -405,6 +406,8 @@ void CheckSnapshot(uint32_t connection, uint32_t lastSecond) {
   std::set<uint32_t> operations;
   for (const SnapshotRecord &record : records) {
     EXPECT_EQ(record.timestamp, ++second);
+    const auto *words = reinterpret_cast<const uint32_t *>(&record);
+    EXPECT_LT(*std::max_element(words + 1, words + sizeof record / 4), 1'000'000U);
     EXPECT_GE(record.nandReads, record.hostReads);
     EXPECT_GE(record.nandWrites, record.hostWrites);
     for (const auto &priorities : {record.reads, record.writes}) {
