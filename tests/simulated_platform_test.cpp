@@ -33,7 +33,7 @@ namespace {
 
 int64_t wallClock = 0;  // in milliseconds since 1970; 0 for the real one
 std::string systemLog;
-int systemLogError = 0;
+volatile int systemLogError = 0;
 
 }  // namespace
 
@@ -311,6 +311,23 @@ TEST(SimulatedPlatformTest, NeverWaitsForATerminal) {
   const int terminal = posix_openpt(O_RDWR | O_NOCTTY);
   ASSERT_EQ(grantpt(terminal) | unlockpt(terminal), 0);
   CheckFullLog(terminal, open(ptsname(terminal), O_RDWR | O_NOCTTY));
+}
+
+// The system's log takes lines again a quarter of a second after the end.
+[[noreturn]] void EndWhileTheLogIsFull() {
+  Play("");
+  std::atexit([] { std::fputs(systemLog.c_str(), stderr); });  // after the log's own end
+  std::signal(SIGALRM, [](int) { systemLogError = 0; });
+  systemLogError = EAGAIN;
+  SystemLog("last line");
+  ualarm(250'000, 0);
+  std::exit(0);
+}
+
+TEST(SimulatedPlatformDeathTest, GivesWhatWaitsForTheLogSomeTimeAtTheEnd) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  EXPECT_EXIT(EndWhileTheLogIsFull(), testing::ExitedWithCode(0),
+              "^grellon: last line\n<29>.*: last line\n$");
 }
 
 TEST(SimulatedPlatformTest, LeavesSignalsToATool) {

@@ -39,7 +39,8 @@ CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seco
                         const std::string &description) {
   const auto take = [=](const std::string &text) {
     const std::optional<double> value = ParseSeconds(text);
-    if (!value) throw CLI::ValidationError(name, text + " is no number of seconds up to 1000000000");
+    if (!value)
+      throw CLI::ValidationError(name, text + " is no number of seconds up to 1000000000");
     *seconds = *value;
   };
   return command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
