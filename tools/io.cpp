@@ -195,7 +195,8 @@ bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mo
   // A link stays a link, and what it leads to is made.
   std::error_code failure;
   std::filesystem::path target = file;
-  for (int links = 0; links < kMostLinks && is_symlink(target, failure); ++links) {
+  for (int links = 0; is_symlink(target, failure); ++links) {
+    if (links == kMostLinks) return fail(ELOOP);
     target = target.parent_path() / read_symlink(target, failure);
   }
   const auto type = std::filesystem::status(target, failure).type();
