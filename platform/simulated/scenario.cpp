@@ -91,7 +91,6 @@ void CheckDepth(std::string_view text) {
       case '.': ++depth; break;
       case ']':
       case '}':
-        depth = outside.empty() ? 0 : outside.back();
         if (!outside.empty()) outside.pop_back();
         break;
       case ',':
