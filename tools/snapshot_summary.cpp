@@ -32,8 +32,9 @@ std::string Decimal(std::optional<double> number, const char *format) {
 
 std::string OneDecimal(std::optional<double> number) { return Decimal(number, "%.1f"); }
 
-std::string Right(const std::string &text, size_t width) {
-  return std::string(width - std::min(width, text.size()), ' ') + text;
+// Right-aligned in that width; a blank stands in front of what is wider, too.
+std::string Column(const std::string &text, size_t width) {
+  return std::string(width - std::min(width - 1, text.size()), ' ') + text;
 }
 
 void Member(Json &json, std::string_view key, std::optional<double> number) {
@@ -102,15 +103,15 @@ void SnapshotSummary::Print(Output &output) {
   for (Operations *each : {&reads_, &writes_}) {
     std::string line(each->name);
     line.resize(6, ' ');
-    line += Right(std::to_string(each->count), 12) + Right(OneDecimal(each->Mean()), 11);
+    line += Column(std::to_string(each->count), 12) + Column(OneDecimal(each->Mean()), 11);
     for (const unsigned percent : {50U, 95U, 99U}) {
-      line += Right(OneDecimal(each->Percentile(percent)), 11);
+      line += Column(OneDecimal(each->Percentile(percent)), 11);
     }
     if (each->maximum) {
-      line += Right(Decimal(each->maximum->latency, "%.0f"), 11) +
+      line += Column(Decimal(each->maximum->latency, "%.0f"), 11) +
               " at T=" + std::to_string(each->maximum->timestamp);
     } else {
-      line += Right("-", 11);
+      line += Column("-", 11);
     }
     output.Write(line + "\n");
   }
@@ -118,9 +119,9 @@ void SnapshotSummary::Print(Output &output) {
   for (const Operations *each : {&reads_, &writes_}) {
     std::string line(each->name);
     line.resize(6, ' ');
-    output.Write(line + Right(std::to_string(each->hostSectors), 14) +
-                 Right(std::to_string(each->nandSectors), 14) +
-                 Right(Decimal(each->NandPerHost(), "%.3f"), 12) + "\n");
+    output.Write(line + Column(std::to_string(each->hostSectors), 14) +
+                 Column(std::to_string(each->nandSectors), 14) +
+                 Column(Decimal(each->NandPerHost(), "%.3f"), 12) + "\n");
   }
   output.Write("\nSlowest intervals\n");
   for (const Operations *each : {&reads_, &writes_}) {
