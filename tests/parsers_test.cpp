@@ -31,7 +31,8 @@ std::string Stream(Kind kind, const std::string &notation) {
       put(std::stoull(token.substr(colon + 1), nullptr, 0), width / 2);
     } else {
       uint64_t value = std::stoull(token, nullptr, 0);
-      const uint64_t last = dots == std::string::npos ? value : std::stoull(token.substr(dots + 2));
+      const uint64_t last =
+          dots == std::string::npos ? value : std::stoull(token.substr(dots + 2), nullptr, 0);
       do put(value, width);
       while (value++ != last);
     }
