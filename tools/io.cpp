@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <climits>
 #include <chrono>
 #include <csignal>
 #include <cstdio>
@@ -68,6 +69,16 @@ int Replace(const std::string &file, std::string_view bytes, std::optional<mode_
   if (error == 0 && rename(beside.c_str(), file.c_str()) != 0) error = errno;
   if (error != 0) unlink(beside.c_str());
   return error;
+}
+
+// The descriptor of this process that a link such as /proc/self/fd/1 stands for: what it leads to is
+// to be written through it, and not replaced.
+std::optional<int> OwnDescriptor(const std::filesystem::path &link) {
+  std::error_code failure;
+  if (!equivalent(link.parent_path(), "/proc/self/fd", failure)) return std::nullopt;
+  const std::optional<uint64_t> number = ParseNumber(link.filename().native(), INT_MAX);
+  if (!number) return std::nullopt;
+  return *number == STDOUT_FILENO ? outputDescriptor : static_cast<int>(*number);
 }
 
 int64_t MillisecondsNow() {
@@ -197,6 +208,10 @@ bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mo
   std::filesystem::path target = file;
   for (int links = 0; is_symlink(target, failure); ++links) {
     if (links == kMostLinks) return fail(ELOOP);
+    if (const std::optional<int> own = OwnDescriptor(target)) {
+      const int error = WriteAll(*own, bytes);
+      return error == 0 || fail(error);
+    }
     target = target.parent_path() / read_symlink(target, failure);
   }
   const auto type = std::filesystem::status(target, failure).type();

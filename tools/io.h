@@ -81,8 +81,8 @@ class Input {
 std::optional<std::string> ReadInput(const std::string &file, uint64_t limit);
 
 // Writes a file whole or not at all: beside it first, then renamed, with that mode or as the umask
-// gives it. What is no regular file (a device, a pipe) is written directly. False after a
-// complaint.
+// gives it. What is no regular file (a device, a pipe) is written directly, and so is an open
+// descriptor (/dev/stdout, /dev/fd/3). False after a complaint.
 bool WriteFile(const std::string &file, std::string_view bytes,
                std::optional<mode_t> mode = std::nullopt);
 
