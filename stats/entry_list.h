@@ -3,7 +3,6 @@
 #ifndef STATS_ENTRY_LIST_H
 #define STATS_ENTRY_LIST_H
 
-#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <new>

@@ -13,29 +13,29 @@ namespace morwick {
 namespace {
 
 // Keeps the value of a key that has a summary field.
-void SetSummaryField(KVRStatsCxt *context, int32_t key, const uint8_t *values) {
+void SetSummaryField(KVRStatsCxt *ctx, int32_t key, const uint8_t *values) {
   const auto value = LoadLittleEndian64(values);
   const auto low = static_cast<uint32_t>(value);
   switch (key) {
-    case 4: context->hostWrites = value; break;
-    case 7: context->hostReads = value; break;
-    case 12: context->IND_pool_free = value; break;
-    case 13: context->IND_pool_count = value; break;
-    case 17: context->wearLevMoves = value; break;
-    case 18: context->nandWrites = value; break;
-    case 19: context->nandReads = value; break;
-    case 20: context->bandErases = value; break;
-    case 28: context->numSleepOps = value; break;
-    case 45: context->maxHighEnduranceBlockErases = value; break;
-    case 48: context->numFreeVirtualBlocks = value; break;
-    case 49: context->bytesPerPage = low; break;
-    case 50: context->pagesPerVirtualBlock = low; break;
-    case 51: context->blocksPerVirtualBlock = low; break;
-    case 52: context->numVirtualBlocks = low; break;
-    case 53: context->exportVersion = low; break;
-    case 56: context->utilFormatTime = value; break;
+    case 4: ctx->hostWrites = value; break;
+    case 7: ctx->hostReads = value; break;
+    case 12: ctx->IND_pool_free = value; break;
+    case 13: ctx->IND_pool_count = value; break;
+    case 17: ctx->wearLevMoves = value; break;
+    case 18: ctx->nandWrites = value; break;
+    case 19: ctx->nandReads = value; break;
+    case 20: ctx->bandErases = value; break;
+    case 28: ctx->numSleepOps = value; break;
+    case 45: ctx->maxHighEnduranceBlockErases = value; break;
+    case 48: ctx->numFreeVirtualBlocks = value; break;
+    case 49: ctx->bytesPerPage = low; break;
+    case 50: ctx->pagesPerVirtualBlock = low; break;
+    case 51: ctx->blocksPerVirtualBlock = low; break;
+    case 52: ctx->numVirtualBlocks = low; break;
+    case 53: ctx->exportVersion = low; break;
+    case 56: ctx->utilFormatTime = value; break;
     case 265:
-      for (uint64_t &entry : context->readCountHisto) {
+      for (uint64_t &entry : ctx->readCountHisto) {
         entry = LoadLittleEndian64(values);
         values += kWordSize;
       }

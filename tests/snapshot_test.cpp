@@ -110,7 +110,7 @@ std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fiel
 TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
   CaseFile cases("descriptors.txt");
   Fields fields;
-  std::string expected;
+  std::vector<std::pair<std::string, std::string>> expected;  // texts, by where they stand
   for (std::string line; cases.Next(&line);) {
     SnapshotFieldDescriptor field = {};
     std::string format, arrow, text;
@@ -121,9 +121,15 @@ TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
     EXPECT_TRUE(columns) << cases.where();
     format.copy(field.format, sizeof field.format);
     fields.push_back(field);
-    expected += text + "\n";
+    expected.emplace_back(cases.where(), text);
   }
-  EXPECT_EQ(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, fields), expected + "\n");
+  std::istringstream printed(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, fields));
+  std::string line;
+  for (const auto &[where, text] : expected) {
+    EXPECT_TRUE(std::getline(printed, line)) << where;
+    EXPECT_EQ(line, text) << where;
+  }
+  EXPECT_TRUE(std::getline(printed, line) && line.empty() && printed.peek() == EOF);
   EXPECT_GT(fields.size(), 30U);
 }
 

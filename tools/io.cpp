@@ -9,8 +9,8 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <climits>
 #include <chrono>
+#include <climits>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
@@ -71,8 +71,8 @@ int Replace(const std::string &file, std::string_view bytes, std::optional<mode_
   return error;
 }
 
-// The descriptor of this process that a link such as /proc/self/fd/1 stands for: what it leads to is
-// to be written through it, and not replaced.
+// The descriptor of this process that a link such as /proc/self/fd/1 stands for: what it leads to
+// is to be written through it, and not replaced.
 std::optional<int> OwnDescriptor(const std::filesystem::path &link) {
   std::error_code failure;
   if (!equivalent(link.parent_path(), "/proc/self/fd", failure)) return std::nullopt;

@@ -67,8 +67,8 @@ MORWICK_EXPORT uint32_t GetMatchingService(MatchingRequest *request);
 
 /*
  * Opens a connection of the given type (the library and the daemon know type 0 only) and stores its
- * handle, or 0 on failure, in `*connection`. The connection outlives the service handle; the caller
- * gives it back with CloseService.
+ * handle, or 0 on failure, in `*connection`; the pointer is not null. The connection outlives the
+ * service handle; the caller gives it back with CloseService.
  */
 MORWICK_EXPORT int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection);
 

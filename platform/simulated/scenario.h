@@ -12,7 +12,8 @@
 
 namespace simulated {
 
-// What a request asks for: its first number.
+// What a request asks for: its first number. The simulated drivers have their own copy of all such
+// numbers, and of the classes and their methods, so that a wrong one in the library is noticed.
 enum Command : uint32_t {
   kReadBand = 11,
   kReadStatistics = 13,
