@@ -164,6 +164,7 @@ Status Watch(Options options) {
     // Later readings are of the same controller, and need not say again that it was found.
     if (reading->statistics) options.className = reading->dump.source.name;
     worst = std::max(worst, PrintBlock(output, options, last.get(), *reading, reading->Judge()));
+    ForgetMessages();  // a watch may go on for ever
     if (reading->statistics) last = std::move(reading);
     next = std::max(next + every, SteadyClock::now());
     if (!output.Flush() || count == options.count || !signals.WaitUntil(next, output)) break;
