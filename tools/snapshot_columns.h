@@ -1,5 +1,5 @@
 // The columns of the fixed snapshot layout, in the order of the text: their names for CSV and JSON,
-// and where their numbers lie in a record.
+// and where their numbers lie in a record. A session holds them against the text.
 #ifndef TOOLS_SNAPSHOT_COLUMNS_H
 #define TOOLS_SNAPSHOT_COLUMNS_H
 

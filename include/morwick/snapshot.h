@@ -129,7 +129,8 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * To lose no record, come again for the one that did not fit. After a call that completed lines set
  * `*state` back by one: the record then has the buffer to itself. After a call that completed none,
  * restore the state that it began with (the banner was dropped with the record, and is due again at
- * 0) and give more room. Set back by one instead, it would fail at the same record for ever.
+ * 0) and give more room. Set back by one instead, it would fail at the same record for ever. A
+ * hostile format asks for any room: at a bound leave the state, and the record is passed over.
  *
  *     uint64_t room = 4096;
  *     char *text = malloc(room);
@@ -143,11 +144,15 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  *       if (done) break;
  *       if (size > 1) {
  *         --state;
- *       } else {
+ *       } else if (room < 8388608) {
  *         state = start;
- *         text = realloc(text, room *= 2);
+ *         free(text);
+ *         text = malloc(room *= 2);
+ *       } else if (state == start) {
+ *         break; // the banner does not fit
  *       }
  *     }
+ *     free(text);
  *
  * A null header, output, output size or state and a capacity of 0 get 0, and nothing is touched. A
  * null snapshot is one without records: 1 and the empty text, unless the banner does not fit.

@@ -1,6 +1,7 @@
 // Statistics, snapshot and snapshot header of a controller that is made up: it was first powered on
 // at a fixed time, and everything follows from the time since then. Its load swells and ebbs within
-// a minute. All numbers are little-endian.
+// a minute. All numbers are little-endian. Keys and columns are its own copies, as a controller has
+// them: a wrong one in the library is noticed.
 
 #include "platform/simulated/own_buffers.h"
 
