@@ -199,29 +199,26 @@ std::optional<std::string> ReadInput(const std::string &file, uint64_t limit) {
 }
 
 bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mode_t> mode) {
-  const auto fail = [&](int error) {
-    Complain(file, std::strerror(error));
-    return false;
+  const auto end = [&](int error) {
+    if (error != 0) Complain(file, std::strerror(error));
+    return error == 0;
   };
   // A link stays a link, and what it leads to is made.
   std::error_code failure;
   std::filesystem::path target = file;
   for (int links = 0; is_symlink(target, failure); ++links) {
-    if (links == kMostLinks) return fail(ELOOP);
-    if (const std::optional<int> own = OwnDescriptor(target)) {
-      const int error = WriteAll(*own, bytes);
-      return error == 0 || fail(error);
-    }
+    if (links == kMostLinks) return end(ELOOP);
+    if (const std::optional<int> own = OwnDescriptor(target)) return end(WriteAll(*own, bytes));
     target = target.parent_path() / read_symlink(target, failure);
   }
   const auto type = std::filesystem::status(target, failure).type();
   if (type != std::filesystem::file_type::regular &&
       type != std::filesystem::file_type::not_found) {
     const int descriptor = open(file.c_str(), O_WRONLY | O_CLOEXEC);
-    if (descriptor < 0) return fail(errno);
+    if (descriptor < 0) return end(errno);
     const int error = WriteAll(descriptor, bytes);
     close(descriptor);
-    return error == 0 || fail(error);
+    return end(error);
   }
 
   // A signal waits meanwhile: if it ends the command, nothing is left beside the file.
@@ -230,7 +227,7 @@ bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mo
   sigprocmask(SIG_BLOCK, &all, &before);
   const int error = Replace(target, bytes, mode);
   sigprocmask(SIG_SETMASK, &before, nullptr);
-  return error == 0 || fail(error);
+  return end(error);
 }
 
 Output::Output() : terminal_(OutputIsTerminal()) {}
