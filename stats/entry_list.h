@@ -62,8 +62,8 @@ class EntryName {
 // Appends one entry and returns its name node, or null without a context or without memory for both
 // nodes; nothing is added then.
 template <typename Context>
-ContextNode *AppendEntry(Context *context, const EntryName &name, uint64_t value) {
-  if (context == nullptr) return nullptr;
+ContextNode *AppendEntry(Context *ctx, const EntryName &name, uint64_t value) {
+  if (ctx == nullptr) return nullptr;
   void *valueMemory = std::malloc(sizeof(ContextNode));
   void *nameMemory = std::malloc(sizeof(ContextNode));
   if (valueMemory == nullptr || nameMemory == nullptr) {
@@ -76,15 +76,15 @@ ContextNode *AppendEntry(Context *context, const EntryName &name, uint64_t value
   WriteDecimal(valueNode->text, value);
   valueNode->value = value;
 
-  if (context->namesTail != nullptr && context->valuesTail != nullptr) {
-    context->namesTail->next = nameNode;
-    context->valuesTail->next = valueNode;
+  if (ctx->namesTail != nullptr && ctx->valuesTail != nullptr) {
+    ctx->namesTail->next = nameNode;
+    ctx->valuesTail->next = valueNode;
   } else {
-    context->namesHead = nameNode;
-    context->valuesHead = valueNode;
+    ctx->namesHead = nameNode;
+    ctx->valuesHead = valueNode;
   }
-  context->namesTail = nameNode;
-  context->valuesTail = valueNode;
+  ctx->namesTail = nameNode;
+  ctx->valuesTail = valueNode;
   return nameNode;
 }
 
@@ -101,11 +101,11 @@ inline uint64_t LoadElement(const uint8_t *bytes, uint32_t width) {
 // alone when there is just one. False when an element could not be added; the others are added all
 // the same.
 template <typename Context>
-bool AppendElements(Context *context, const EntryName &name, const uint8_t *elements,
-                    uint32_t width, uint32_t count) {
+bool AppendElements(Context *ctx, const EntryName &name, const uint8_t *bytes, uint32_t width,
+                    uint32_t count) {
   bool allAdded = true;
-  for (uint32_t index = 0; index < count; ++index, elements += width) {
-    ContextNode *node = AppendEntry(context, name, LoadElement(elements, width));
+  for (uint32_t index = 0; index < count; ++index, bytes += width) {
+    ContextNode *node = AppendEntry(ctx, name, LoadElement(bytes, width));
     if (node == nullptr) {
       allAdded = false;
     } else if (count > 1) {
@@ -129,9 +129,9 @@ inline ContextNode *FreeNode(ContextNode *node) {
 // list after the other, the heap hands the nodes of later parses out all over the place, and large
 // parses take six times as long.
 template <typename Context>
-void FreeEntries(Context *context) {
-  ContextNode *names = context->namesHead;
-  ContextNode *values = context->valuesHead;
+void FreeEntries(Context *ctx) {
+  ContextNode *names = ctx->namesHead;
+  ContextNode *values = ctx->valuesHead;
   while (names != nullptr || values != nullptr) {
     values = FreeNode(values);
     names = FreeNode(names);

@@ -69,10 +69,10 @@ bool ParseKVR(KVRStatsCxt *ctx, RecordStream stream) {
     }
     // How many values there are the key says, not the record's length: they may run on into the
     // records behind it, though never past the buffer.
-    const KeyRow *key = FindStatsKey(record.id);
-    if (key != nullptr && key->elementCount <= stream.wordsLeft() &&
-        !KVRAddFieldsToContext(ctx, static_cast<int32_t>(key->id), key->name, record.payload,
-                               key->elementCount)) {
+    const KeyRow *row = FindStatsKey(record.id);
+    if (row != nullptr && row->elementCount <= stream.wordsLeft() &&
+        !KVRAddFieldsToContext(ctx, static_cast<int32_t>(row->id), row->name, record.payload,
+                               row->elementCount)) {
       return false;
     }
     stream.Skip(record.length);

@@ -19,21 +19,21 @@ constexpr uint32_t kEndId = 0x2FFF;
 
 // Adds as many whole elements as both the key and the record have and returns their number; nothing
 // when they could not all be added.
-std::optional<uint32_t> AddRecord(GenericParserCxt *context, const KeyRow &key,
-                                  const uint8_t *payload, uint32_t length) {
-  if (length != key.elementCount * kElementSize) {
+std::optional<uint32_t> AddRecord(GenericParserCxt *ctx, const KeyRow &row, const uint8_t *payload,
+                                  uint32_t length) {
+  if (length != row.elementCount * kElementSize) {
     SetAPIErrorMessage(
         "KVRMSPParseBufferToCxt: %s(%u): cfg %u elements; (%u*4) cfg bytes != (%d) buffer bytes",
-        key.name.data(), key.id, key.elementCount, key.elementCount, static_cast<int>(length));
+        row.name.data(), row.id, row.elementCount, row.elementCount, static_cast<int>(length));
   }
-  const uint32_t count = std::min(length / kElementSize, key.elementCount);
-  if (AppendElements(context, EntryName(key.name), payload, kElementSize, count)) return count;
+  const uint32_t count = std::min(length / kElementSize, row.elementCount);
+  if (AppendElements(ctx, EntryName(row.name), payload, kElementSize, count)) return count;
   SetAPIErrorMessage("KVRMSPParseBufferToCxt: %s(%u): Error adding %u elements to context",
-                     key.name.data(), key.id, key.elementCount);
+                     row.name.data(), row.id, row.elementCount);
   return std::nullopt;
 }
 
-uint32_t ParseMSP(GenericParserCxt *context, const uint8_t *position, uint32_t left) {
+uint32_t ParseMSP(GenericParserCxt *ctx, const uint8_t *position, uint32_t left) {
   uint32_t count = 0;
   while (left >= kHeaderSize) {
     const uint32_t id = LoadLittleEndian16(position);
@@ -43,8 +43,8 @@ uint32_t ParseMSP(GenericParserCxt *context, const uint8_t *position, uint32_t l
     if (length == 0) continue;  // a filler, whatever its key
     if (id == kEndId || length > left) break;
     // Skip records (0x2FFE) have no row and are stepped over as unknown keys are.
-    if (const KeyRow *key = FindMSPKey(id)) {
-      const std::optional<uint32_t> added = AddRecord(context, *key, position, length);
+    if (const KeyRow *row = FindMSPKey(id)) {
+      const std::optional<uint32_t> added = AddRecord(ctx, *row, position, length);
       if (!added) break;
       count += *added;
     }

@@ -31,11 +31,11 @@ typedef SelectorPair *(*SelectorGetter)(void);
  * Parsers append to a zero-filled context that the caller owns and hands to the release function of
  * the same row afterwards. `size` is the buffer's size in bytes.
  */
-typedef int (*KVRStatsParser)(KVRStatsCxt *context, const void *buffer, uint32_t size);
-typedef void (*KVRStatsRelease)(KVRStatsCxt *context);
-typedef uint64_t (*MSPStatsParser)(GenericParserCxt *context, const void *buffer, uint64_t size);
-typedef uint32_t (*FTLStatsParser)(GenericParserCxt *context, const void *buffer, uint32_t size);
-typedef void (*GenericParserRelease)(GenericParserCxt *context);
+typedef int (*KVRStatsParser)(KVRStatsCxt *ctx, const void *buffer, uint32_t size);
+typedef void (*KVRStatsRelease)(KVRStatsCxt *ctx);
+typedef uint64_t (*MSPStatsParser)(GenericParserCxt *ctx, const void *buffer, uint64_t size);
+typedef uint32_t (*FTLStatsParser)(GenericParserCxt *ctx, const void *buffer, uint32_t size);
+typedef void (*GenericParserRelease)(GenericParserCxt *ctx);
 
 /*
  * One row. A slot that the class lacks is null: test a slot before calling it. In the terminating
