@@ -2,6 +2,7 @@
 // that passes its check is used, at the end of its own allocation.
 
 #include <cassert>
+#include <optional>
 #include <vector>
 
 #include "morwick/morwick.h"
@@ -11,12 +12,12 @@
 namespace {
 
 void CheckScenario(std::string_view text) {
-  simulated::Scenario scenario;
   std::string error;
-  const bool good = simulated::ParseScenario(text, "folder/file", &scenario, &error);
-  assert(good ? error.empty() : error.starts_with("folder/file:"));
-  if (!good) return;
-  for (const simulated::Controller &controller : scenario.controllers) {
+  const std::optional<simulated::Scenario> scenario =
+      simulated::ParseScenario(text, "folder/file", &error);
+  assert(scenario ? error.empty() : error.starts_with("folder/file:"));
+  if (!scenario) return;
+  for (const simulated::Controller &controller : scenario->controllers) {
     assert(simulated::RequestMethod(controller.className) != 0);
     assert(controller.files.size() == simulated::kBuffers.size());
     for (const auto &[command, files] : controller.files) {

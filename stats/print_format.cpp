@@ -33,7 +33,7 @@ uint64_t TakeNumber(std::string_view *rest) {
 }
 
 // Takes the conversion that is next, when it is of one of the types.
-bool TakeConversion(std::string_view *rest, std::string_view types, Conversion *conversion) {
+std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_view types) {
   const std::string_view start = *rest;
   rest->remove_prefix(1);
   const size_t flagCount = std::min(rest->find_first_not_of("-0+ #"), rest->size());
@@ -46,20 +46,20 @@ bool TakeConversion(std::string_view *rest, std::string_view types, Conversion *
     rest->remove_prefix(1);
     precision = TakeNumber(rest);
   }
-  if (rest->empty() || types.find(rest->front()) == std::string_view::npos) return false;
+  if (rest->empty() || types.find(rest->front()) == std::string_view::npos) return std::nullopt;
   const char type = rest->front();
   rest->remove_prefix(1);
 
-  start.copy(conversion->text, start.size() - rest->size());
+  Conversion conversion;
+  start.copy(conversion.text, start.size() - rest->size());
   // A precision is a least number of digits, but a largest number of characters of a text.
-  conversion->least = std::max(width, type == 's' ? 0 : precision);
-  conversion->plain =
-      !hasPrecision && (type == 's' ? width == 0
-                                    : type == 'u' && width <= kPlainWidth &&
-                                          flags.find('-') == std::string_view::npos);
-  conversion->pad = flags.find('0') == std::string_view::npos ? ' ' : '0';
-  conversion->width = static_cast<uint32_t>(std::clamp<uint64_t>(width, 1, kPlainWidth));
-  return true;
+  conversion.least = std::max(width, type == 's' ? 0 : precision);
+  conversion.plain = !hasPrecision && (type == 's' ? width == 0
+                                                   : type == 'u' && width <= kPlainWidth &&
+                                                         flags.find('-') == std::string_view::npos);
+  conversion.pad = flags.find('0') == std::string_view::npos ? ' ' : '0';
+  conversion.width = static_cast<uint32_t>(std::clamp<uint64_t>(width, 1, kPlainWidth));
+  return conversion;
 }
 
 bool AppendText(BoundedWriter &writer, const FormatText &text) {
@@ -76,19 +76,19 @@ bool AppendFormatted(BoundedWriter &writer, const Conversion &conversion, Argume
 
 }  // namespace
 
-bool ReadPrintFormat(std::string_view text, Arguments arguments, PrintFormat *format) {
+std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments) {
   const std::string_view types = arguments == Arguments::kOneText ? "s" : "diuoxX";
   const size_t most = arguments == Arguments::kTwoNumbers ? 2 : 1;
-  *format = {};
-  format->texts[0] = TakeText(&text);
+  PrintFormat format;
+  format.texts[0] = TakeText(&text);
   while (!text.empty()) {
-    if (format->conversionCount == most ||
-        !TakeConversion(&text, types, &format->conversions[format->conversionCount])) {
-      return false;
-    }
-    format->texts[++format->conversionCount] = TakeText(&text);
+    if (format.conversionCount == most) return std::nullopt;
+    const std::optional<Conversion> conversion = TakeConversion(&text, types);
+    if (!conversion) return std::nullopt;
+    format.conversions[format.conversionCount] = *conversion;
+    format.texts[++format.conversionCount] = TakeText(&text);
   }
-  return true;
+  return format;
 }
 
 bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,

@@ -4,6 +4,7 @@
 #define STATS_PRINT_FORMAT_H
 
 #include <cstdint>
+#include <optional>
 #include <span>
 #include <string_view>
 
@@ -42,9 +43,9 @@ struct PrintFormat {
 // What a format may ask for.
 enum class Arguments { kOneNumber, kTwoNumbers, kOneText };
 
-// Takes apart a format shorter than kFormatRoom. False when it asks for anything else than (fewer
+// Takes apart a format shorter than kFormatRoom. Nothing when it asks for anything else than (fewer
 // of) these arguments.
-bool ReadPrintFormat(std::string_view text, Arguments arguments, PrintFormat *format);
+std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments);
 
 // Print what printf would. False when it does not fit, at a cost of no more than what fits.
 bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,

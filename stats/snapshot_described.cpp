@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstring>
 #include <iterator>
+#include <optional>
 #include <span>
 
 #include "morwick/little_endian.h"
@@ -59,8 +60,13 @@ Field ReadField(const uint8_t *descriptor, uint32_t recordSize) {
   const auto *text =
       reinterpret_cast<const char *>(descriptor) + offsetof(SnapshotFieldDescriptor, format);
   const std::string_view format(text, strnlen(text, kFormatRoom));
-  if (field.offset + size > recordSize || format.size() == kFormatRoom ||
-      !ReadPrintFormat(format, ArgumentsOf(field.kind), &field.format)) {
+  std::optional<PrintFormat> read;
+  if (field.offset + size <= recordSize && format.size() < kFormatRoom) {
+    read = ReadPrintFormat(format, ArgumentsOf(field.kind));
+  }
+  if (read) {
+    field.format = *read;
+  } else {
     field.kind = Field::kNothing;
   }
   return field;

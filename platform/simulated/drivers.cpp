@@ -31,6 +31,7 @@ enum Result : int32_t {
   kNoMemory = 0x106,
 };
 
+// The driver's own numbers, as a controller has them: a wrong one in the library is noticed.
 constexpr size_t kRequestSize = 24;  // command, argument, zeros
 constexpr size_t kRequestZeros = 8;
 constexpr uint32_t kTaskSchedulerArgument = 1025;
@@ -68,6 +69,7 @@ Handles::node_type MakeRoom() {
   return one.extract(0);
 }
 
+// The library has a load of this kind too; a platform knows of the tree nothing but its contract.
 uint32_t LoadWord(const void *bytes, size_t offset) {
   uint32_t word;
   std::memcpy(&word, static_cast<const char *>(bytes) + offset, sizeof word);

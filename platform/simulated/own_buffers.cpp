@@ -30,7 +30,7 @@ constexpr double kSwing = 5'000;
 enum Pace { kByLoad, kByClock };
 struct Counter {
   uint32_t key;
-  uint32_t elements;
+  uint32_t elementCount;
   uint64_t start;
   uint64_t growth;
   Pace pace = kByLoad;
@@ -168,8 +168,8 @@ uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
 void AppendStatistics(uint64_t time, Reply *reply) {
   for (const Counter &counter : kStatistics) {
     reply->Append(counter.key);
-    reply->Append(counter.elements);
-    for (uint32_t i = 0; i < counter.elements; ++i) reply->Append(ElementAt(counter, i, time));
+    reply->Append(counter.elementCount);
+    for (uint32_t i = 0; i < counter.elementCount; ++i) reply->Append(ElementAt(counter, i, time));
   }
 }
 
@@ -177,8 +177,8 @@ void AppendStatistics(uint64_t time, Reply *reply) {
 void AppendMspStatistics(uint64_t time, Reply *reply) {
   for (const Counter &counter : kMspStatistics) {
     reply->Append(static_cast<uint16_t>(counter.key));
-    reply->Append(static_cast<uint16_t>(counter.elements * sizeof(uint32_t)));
-    for (uint32_t i = 0; i < counter.elements; ++i) {
+    reply->Append(static_cast<uint16_t>(counter.elementCount * sizeof(uint32_t)));
+    for (uint32_t i = 0; i < counter.elementCount; ++i) {
       const uint64_t largest = std::numeric_limits<uint32_t>::max();
       reply->Append(static_cast<uint32_t>(std::min(ElementAt(counter, i, time), largest)));
     }

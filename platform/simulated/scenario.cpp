@@ -251,7 +251,8 @@ void ReadSchedule(TableReader &reader, Schedule *schedule) {
   reader.Read("defer_at_check", &schedule->deferAtCheck, 0);
 }
 
-void ReadScenario(const toml::table &table, std::string_view folder, Scenario *scenario) {
+Scenario ReadScenario(const toml::table &table, std::string_view folder) {
+  Scenario scenario;
   TableReader reader(table);
   const auto subtable = [&](std::string_view key, auto read) {
     const toml::node *node = reader.Find(key);
@@ -261,12 +262,13 @@ void ReadScenario(const toml::table &table, std::string_view folder, Scenario *s
     read(subreader);
     subreader.RefuseOtherKeys();
   };
-  subtable("log", [&](TableReader &log) { log.Read("enabled", &scenario->logEnabled); });
-  subtable("schedule", [&](TableReader &schedule) { ReadSchedule(schedule, &scenario->schedule); });
+  subtable("log", [&](TableReader &log) { log.Read("enabled", &scenario.logEnabled); });
+  subtable("schedule", [&](TableReader &schedule) { ReadSchedule(schedule, &scenario.schedule); });
   if (const toml::node *controllers = reader.Find("controller")) {
-    ReadControllers(*controllers, folder, &scenario->controllers);
+    ReadControllers(*controllers, folder, &scenario.controllers);
   }
   reader.RefuseOtherKeys();
+  return scenario;
 }
 
 std::optional<Scenario> LoadScenario() {
@@ -285,10 +287,10 @@ std::optional<Scenario> LoadScenario() {
     }
     text.resize(size);
   }
-  Scenario scenario;
-  if (error.empty() && ParseScenario(text, file, &scenario, &error)) return scenario;
-  Complain(error);
-  return std::nullopt;
+  std::optional<Scenario> scenario;
+  if (error.empty()) scenario = ParseScenario(text, file, &error);
+  if (!scenario) Complain(error);
+  return scenario;
 }
 
 }  // namespace
@@ -304,11 +306,11 @@ uint32_t RequestMethod(std::string_view className) {
   return 0;
 }
 
-bool ParseScenario(std::string_view text, const std::string &file, Scenario *scenario,
-                   std::string *error) {
+std::optional<Scenario> ParseScenario(std::string_view text, const std::string &file,
+                                      std::string *error) {
   const auto refuse = [&](size_t line, std::string_view reason) {
     *error = Printable(file) + ":" + std::to_string(line) + ": " + Printable(reason);
-    return false;
+    return std::nullopt;
   };
   try {
     CheckCharacters(text);
@@ -317,8 +319,7 @@ bool ParseScenario(std::string_view text, const std::string &file, Scenario *sce
     if (!result) {
       return refuse(result.error().source().begin.line, result.error().description());
     }
-    ReadScenario(result.table(), file.substr(0, file.rfind('/') + 1), scenario);
-    return true;
+    return ReadScenario(result.table(), file.substr(0, file.rfind('/') + 1));
   } catch (const BadScenario &bad) {
     return refuse(bad.line, bad.reason);
   }

@@ -6,6 +6,7 @@
 #include <chrono>
 #include <cstdint>
 #include <map>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -79,10 +80,10 @@ struct Scenario {
 // The driver method that takes the requests for a controller of the class; 0 for an unknown class.
 uint32_t RequestMethod(std::string_view className);
 
-// Parses the text of a scenario file; the files it names are relative to that file. On failure
-// returns false with "FILE:LINE: reason" in `error`. Opens nothing.
-bool ParseScenario(std::string_view text, const std::string &file, Scenario *scenario,
-                   std::string *error);
+// Parses the text of a scenario file; the files it names are relative to that file. Nothing for a
+// bad one, with "FILE:LINE: reason" in `error`. Opens nothing.
+std::optional<Scenario> ParseScenario(std::string_view text, const std::string &file,
+                                      std::string *error);
 
 // The scenario of this process, loaded at the first call: the file that GRELLON_SCENARIO names, or
 // the built-in one. Null for a bad file, about which there is one line on standard error.
