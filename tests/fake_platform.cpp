@@ -6,7 +6,9 @@
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
+#include <memory>
 #include <sstream>
+#include <utility>
 
 #include "morwick/exporter.h"
 #include "morwick/platform.h"
@@ -18,6 +20,9 @@ struct MatchingRequest {
 
 namespace {
 
+const std::set<std::string> kKeys = {"present", "failing",  "failure", "replies",
+                                     "defers",  "commands", "state"};
+
 struct FakePlatform {
   Script script;
   std::string journal;
@@ -25,6 +30,8 @@ struct FakePlatform {
   std::map<std::string, size_t> callsByName;
   std::map<uint32_t, std::string> openHandles;
   uint32_t lastHandle = 0;
+  const NandExporter *row = nand_exporters;  // that was searched for last
+  bool missed = false;                       // and was not there: the search goes on
 };
 
 FakePlatform platform;
@@ -32,6 +39,7 @@ FakePlatform platform;
 template <typename... Parts>
 void Write(const Parts &...parts) {
   std::ostringstream line;
+  if (std::exchange(platform.missed, false)) line << "search broken off\n";
   (line << ... << parts) << "\n";
   platform.journal += line.str();
 }
@@ -67,6 +75,12 @@ uint32_t Issue(const std::string &what) {
   return platform.lastHandle;
 }
 
+// Searches are journalled by what they find, however many rows there are.
+void Miss() {
+  platform.missed = platform.row[1].className != nullptr;
+  if (!platform.missed) Write("find nothing");
+}
+
 void Return(uint32_t handle, const std::string &what) {
   EXPECT_EQ(platform.openHandles[handle], what) << handle << " is not open";
   platform.openHandles.erase(handle);
@@ -88,14 +102,17 @@ std::string Play(const Script &script, const std::function<void()> &body) {
   return printed.empty() ? platform.journal : printed + "\n" + platform.journal;
 }
 
-void PlayCases(const std::string &file, const std::function<void(Script &)> &body) {
+void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
+               const std::function<void(Script &)> &body) {
   CaseFile cases(file);
   for (std::string line; cases.Next(&line);) {
     SCOPED_TRACE(cases.where() + " " + line);
     Script script;
     while (cases.NextRaw(&line) && line != "->") {
       const size_t colon = line.find(": ");
-      script[line.substr(0, colon)] = line.substr(colon + 2);
+      const std::string key = line.substr(0, colon);
+      EXPECT_TRUE(kKeys.contains(key) || ownKeys.contains(key)) << "no such key: " << line;
+      script[key] = line.substr(colon + 2);
     }
     std::string expected;
     while (cases.Peek() != '=' && cases.NextRaw(&line)) expected += line + "\n";
@@ -118,16 +135,23 @@ std::vector<std::string> PlayEveryFailure(Script script, const std::function<voi
 }
 
 MatchingRequest *ServiceMatching(const char *className) {
-  Write("match ", className);
-  if (Fails("match")) return nullptr;
-  return new MatchingRequest{className};
+  const bool begins = className == std::string_view(nand_exporters[0].className);
+  platform.row = begins ? nand_exporters : platform.row + 1;
+  EXPECT_STREQ(className, platform.row->className) << "a search goes row by row";
+  if (!Fails("match")) return new MatchingRequest{className};
+  Miss();
+  return nullptr;
 }
 
 uint32_t GetMatchingService(MatchingRequest *request) {
-  const bool found = Lists("present", request->className) && !Fails("lookup");
-  delete request;
-  const uint32_t service = found ? Issue("service") : 0;
-  Write("look up = ", service);
+  const std::unique_ptr<MatchingRequest> owned(request);
+  if (!Lists("present", request->className) || Fails("lookup")) {
+    Miss();
+    return 0;
+  }
+  platform.missed = false;
+  const uint32_t service = Issue("service");
+  Write("find ", request->className, " = ", service);
   return service;
 }
 

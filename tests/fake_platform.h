@@ -4,6 +4,7 @@
 
 #include <functional>
 #include <map>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -20,8 +21,10 @@ using Script = std::map<std::string, std::string>;
 std::string Play(const Script &script, const std::function<void()> &body);
 
 // Plays the cases of a file under tests/cases, each against what is to come of it. A line "== name"
-// begins a case, "key: value" lines are its script, and behind a line "->" stands the outcome.
-void PlayCases(const std::string &file, const std::function<void(Script &)> &body);
+// begins a case, "key: value" lines are its script, and behind a line "->" stands the outcome. The
+// body has keys of its own.
+void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
+               const std::function<void(Script &)> &body);
 
 // Plays again and again, with every call failing alone and with every other one, and gives back
 // each outcome.

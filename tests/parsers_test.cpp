@@ -96,6 +96,7 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
     }
     // An entry takes two allocations, for its value and for its name; each is refused once.
     const size_t entry = std::stoul(how.substr(mark + 1));
+    ASSERT_GT(entry, 0U) << "entries are counted from 1";
     how.resize(mark);
     for (const size_t refused : {2 * entry - 1, 2 * entry}) {
       EXPECT_EQ(Parse(how, stream, refused), seen);
