@@ -4,7 +4,6 @@
 
 #include <bit>
 #include <cmath>
-#include <cstddef>
 #include <iterator>
 
 namespace {

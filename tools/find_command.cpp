@@ -1,5 +1,6 @@
 // morwick find: which controllers there are and what they offer.
 
+#include <algorithm>
 #include <memory>
 
 #include "tools/commands.h"

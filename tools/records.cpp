@@ -2,6 +2,8 @@
 
 #include "tools/records.h"
 
+#include <algorithm>
+
 #include "morwick/little_endian.h"
 
 namespace tools {
@@ -9,6 +11,7 @@ namespace {
 
 // What sets the two formats apart, and the parsers of the first.
 struct Format {
+  std::string_view stream;
   uint64_t header;  // in bytes
   uint64_t unit;    // that lengths are counted in, in bytes
   uint32_t endKey;  // 0: there is none
@@ -16,16 +19,18 @@ struct Format {
   bool fillers;  // a record of length 0 is one, whatever its key
 };
 
-constexpr Format kKVR = {8, 8, 0, 0x30000000, false};
-constexpr Format kFTL = {8, 8, 0xFFFF, 0x30000000, true};
-constexpr Format kMSP = {4, 1, 0x2FFF, UINT16_MAX, true};
+constexpr Format kFormats[] = {
+    {"kvr", 8, 8, 0, 0x30000000, false},
+    {"ftl", 8, 8, 0xFFFF, 0x30000000, true},
+    {"msp", 4, 1, 0x2FFF, UINT16_MAX, true},
+};
 
 std::string Record(uint32_t key) { return "the record there (key " + std::to_string(key) + ") "; }
 
 }  // namespace
 
 StatisticsEnd FindEnd(std::string_view stream, std::string_view dump) {
-  const Format &format = stream == "kvr" ? kKVR : stream == "ftl" ? kFTL : kMSP;
+  const Format &format = *std::ranges::find(kFormats, stream, &Format::stream);
   uint64_t offset = 0;
   while (dump.size() - offset >= format.header) {
     const bool wide = format.header == 8;

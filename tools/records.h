@@ -14,7 +14,7 @@ struct StatisticsEnd {
   uint64_t surplus = 0;  // bytes behind an end record
 };
 
-// By the rules of the stream's parser: kvr, ftl or msp.
+// By the rules of the parser of the stream, which is kvr, ftl or msp.
 StatisticsEnd FindEnd(std::string_view stream, std::string_view dump);
 
 }  // namespace tools

@@ -76,7 +76,7 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
     result_ = static_cast<uint64_t>(row_->parseBufferToCxt(&context_.kvr, dump.bytes.data(), size));
   } else if (stream == "ftl") {
     result_ = row_->ftlParseBufferToCxt(&context_.generic, dump.bytes.data(), size);
-  } else {
+  } else if (stream == "msp") {
     result_ = row_->mspParseBufferToCxt(&context_.generic, dump.bytes.data(), size);
   }
   outOfMemory_ = errno == ENOMEM;  // the heap's own word: not every parser reports each refusal
