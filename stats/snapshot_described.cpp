@@ -121,10 +121,10 @@ class Fields {
   Field Read(uint32_t index) const { return ReadField(Descriptor(index), recordSize_); }
 
   // Whether the field that tells an empty record lies in the records at all.
-  bool TellEmptyRecords() const { return count_ > 0 && emptyOffset() + kNumberSize <= recordSize_; }
+  bool TellEmptyRecords() const { return count_ > 0 && EmptyOffset() + kNumberSize <= recordSize_; }
 
   bool AreEmpty(const uint8_t *record) const {
-    return LoadLittleEndian32(record + emptyOffset()) == 0;
+    return LoadLittleEndian32(record + EmptyOffset()) == 0;
   }
 
  private:
@@ -135,7 +135,7 @@ class Fields {
   }
 
   // A record is empty when its first described field is 0, whatever the kind of that field.
-  uint64_t emptyOffset() const {
+  uint64_t EmptyOffset() const {
     return LoadLittleEndian32(Descriptor(0) + offsetof(SnapshotFieldDescriptor, fieldOffset));
   }
 

@@ -17,8 +17,7 @@ extern "C" {
 typedef struct GenericParserCxt GenericParserCxt;
 typedef struct KVRStatsCxt KVRStatsCxt;
 
-/* The two numbers of one kind of controller request. In every pair of the library they are equal.
- */
+/* The two numbers of one kind of controller request; equal in every pair of the library. */
 typedef struct SelectorPair {
   uint32_t first;
   uint32_t second;
@@ -42,16 +41,16 @@ typedef void (*GenericParserRelease)(GenericParserCxt *ctx);
  * row every field is zero or null.
  */
 typedef struct NandExporter {
-  const char *className; /* driver class name; null only in the terminating row */
-  const char *matchKey;
-  uint32_t connection; /* written by findNandExporterNew only */
-  uint32_t service;    /* written by findNandExporterNew only */
-  int32_t exporterParamA;
+  const char *className;   /* driver class name; null only in the terminating row */
+  const char *matchKey;    /* the text that the class is matched by, for tools; not read here */
+  uint32_t connection;     /* written by findNandExporterNew only */
+  uint32_t service;        /* written by findNandExporterNew only */
+  int32_t exporterParamA;  /* for tools, as is exporterParamB; not read here */
   uint32_t methodSelector; /* driver method of the task-scheduler request */
   uint32_t exporterParamB;
 
   SelectorGetter getStatsSelectors;
-  SelectorGetter getMSPStatsSelectors; /* first row only */
+  SelectorGetter getMSPStatsSelectors; /* of classes that have MSP statistics */
   SelectorGetter getDefectsListSelectors;
   SelectorGetter getTelemetryListSelectors;
   SelectorGetter getTaskSchedulerSelectors;

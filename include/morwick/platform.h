@@ -43,7 +43,10 @@ typedef enum ActivityCriteria { kActivityCheckIn } ActivityCriteria;
 /* States of an activity that the daemon knows by number; a platform has others of its own. */
 enum { kActivityStateRun = 2, kActivityStateDefer = 3 };
 
-/* The platform's own text for matching a service by property; the third row's `matchKey`. */
+/*
+ * The text for matching a service by property, the same on every platform: it stands in the
+ * exporter table as the `matchKey` of classes that are matched so.
+ */
 #define PLATFORM_PROPERTY_MATCH_KEY "PropertyMatch"
 
 /*
