@@ -28,7 +28,7 @@ consume() {
     expect "$(GRELLON_SCENARIO=$scenarios/statistics.toml "$1" 2>&1; echo "status $?")" \
       "morwick $version $version"$'\n'"$rows"$'\n'"$reading"$'\n'"status 0"
   else
-    expect "$("$1" 2>/dev/null | head -n 4)" "morwick $version $version"$'\n'"$rows"
+    expect "$("$1" 2>/dev/null | head -n $((1 + $(wc -l <<<"$rows"))))" "morwick $version $version"$'\n'"$rows"
   fi
 }
 
@@ -87,6 +87,15 @@ fi
   bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md morwick/docs/morwick.schema.json \
   morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/examples/latency.gp) >/dev/null
 build_and_consume "$prefix" given
+
+# The program that the README shows, built as it says.
+(
+  cd "$work"
+  # shellcheck disable=SC2016  # no commands
+  sed -n '/^```c$/,/^```$/{/^```/d;p}' "$source/README.md" >example.c
+  eval "$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md") $flags"
+  expect "$(./a.out "$prefix/share/morwick/examples/kvr.bin")" "123456789 sectors written"
+)
 
 cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \
   -DCMAKE_C_FLAGS="$flags" -DCMAKE_CXX_FLAGS="$flags" >/dev/null
