@@ -74,8 +74,7 @@ Snapshot Prepare(const Options &options) {
   if (snapshot.status != kGood || !snapshot.header) return snapshot;
   std::string wrong = CheckSnapshotHeader(*snapshot.header);
   if (wrong.empty() && (options.format != "normal" || options.summary)) {
-    const uint32_t recordSize =
-        LoadLittleEndian32(&(*snapshot.header)[offsetof(SnapshotHeader, recordSize)]);
+    const uint32_t recordSize = LoadSnapshotHeader(*snapshot.header).recordSize;
     if (recordSize != sizeof(SnapshotRecord)) {
       wrong = "record size " + std::to_string(recordSize) + " is not that of the fixed layout, " +
               std::to_string(sizeof(SnapshotRecord));
@@ -143,10 +142,9 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
 Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &output, Json *json) {
   if (snapshot.status != kGood) return snapshot.status;
   const bool text = options.format == "normal" && !options.summary;
-  const size_t recordSize =
-      text && snapshot.header
-          ? LoadLittleEndian32(&(*snapshot.header)[offsetof(SnapshotHeader, recordSize)])
-          : sizeof(SnapshotRecord);
+  const size_t recordSize = text && snapshot.header
+                                ? LoadSnapshotHeader(*snapshot.header).recordSize
+                                : sizeof(SnapshotRecord);
   std::optional<Input> input;
   if (!options.live) input.emplace(options.file);
   size_t taken = 0;

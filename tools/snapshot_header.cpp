@@ -1,11 +1,10 @@
-// Checks snapshot headers.
+// Reads and checks snapshot headers.
 
 #include "tools/snapshot_header.h"
 
 #include <cstddef>
 
 #include "morwick/little_endian.h"
-#include "morwick/snapshot.h"
 
 namespace tools {
 namespace {
@@ -23,22 +22,31 @@ std::string CheckSnapshotHeader(std::string_view file) {
     return "a header of " + std::to_string(file.size()) + " bytes is shorter than " +
            std::to_string(sizeof(SnapshotHeader));
   }
-  const uint32_t recordSize = LoadLittleEndian32(&file[offsetof(SnapshotHeader, recordSize)]);
-  if (recordSize == 0 || recordSize > kLargestRecord) {
-    return "record size " + std::to_string(recordSize) + " is not between 1 and " +
+  const SnapshotHeader header = LoadSnapshotHeader(file);
+  if (header.recordSize == 0 || header.recordSize > kLargestRecord) {
+    return "record size " + std::to_string(header.recordSize) + " is not between 1 and " +
            std::to_string(kLargestRecord);
   }
-  if (LoadLittleEndian32(&file[offsetof(SnapshotHeader, formatVersion)]) >=
-          kSnapshotFirstTextVersion &&
+  if (header.formatVersion >= kSnapshotFirstTextVersion &&
       file.find('\0', sizeof(SnapshotHeader)) == std::string_view::npos) {
     return "the text at offset " + std::to_string(sizeof(SnapshotHeader)) + " has no end";
   }
-  const uint64_t table = LoadLittleEndian32(&file[offsetof(SnapshotHeader, descriptorTableOffset)]);
+  const uint64_t table = header.descriptorTableOffset;
   const uint64_t descriptors = table + sizeof(SnapshotDescriptorTable);
   if (descriptors > file.size()) return wrong("descriptor table offset", table);
   const uint32_t count = LoadLittleEndian32(&file[table]);
   const uint64_t end = descriptors + uint64_t{count} * sizeof(SnapshotFieldDescriptor);
   return end > file.size() ? wrong("descriptor count", count) : "";
+}
+
+SnapshotHeader LoadSnapshotHeader(std::string_view file) {
+  const auto number = [&](size_t offset) { return LoadLittleEndian32(&file[offset]); };
+  SnapshotHeader header = {};
+  header.formatVersion = number(offsetof(SnapshotHeader, formatVersion));
+  header.recordSize = number(offsetof(SnapshotHeader, recordSize));
+  header.recordCount = number(offsetof(SnapshotHeader, recordCount));
+  header.descriptorTableOffset = number(offsetof(SnapshotHeader, descriptorTableOffset));
+  return header;
 }
 
 }  // namespace tools

@@ -1,15 +1,20 @@
-// Checks a snapshot header that comes from a file before the library is trusted with it.
+// Reads a snapshot header, and checks it before the library is trusted with it.
 #ifndef TOOLS_SNAPSHOT_HEADER_H
 #define TOOLS_SNAPSHOT_HEADER_H
 
 #include <string>
 #include <string_view>
 
+#include "morwick/snapshot.h"
+
 namespace tools {
 
 // Empty when text, descriptor table and descriptors lie inside the file; otherwise which field is
 // wrong, and its value.
 std::string CheckSnapshotHeader(std::string_view file);
+
+// The numbers that a file of at least the header's size begins with.
+SnapshotHeader LoadSnapshotHeader(std::string_view file);
 
 }  // namespace tools
 

@@ -9,6 +9,7 @@
 
 #include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
+#include "tools/snapshot_header.h"
 
 namespace tools {
 namespace {
@@ -25,7 +26,7 @@ class DescribedText {
   DescribedText(Output &output, const std::string &header)
       : output_(output),
         header_(header),
-        recordSize_(LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)])),
+        recordSize_(LoadSnapshotHeader(header).recordSize),
         text_(kLeastRoom) {}
 
   // Prints the records of a block; in front of it lies room of one record. False when writing has
@@ -51,13 +52,8 @@ class DescribedText {
       if (done) return true;
       // The record that did not fit comes again, with the room to itself or, when it had that
       // already, with more of it.
-      const uint32_t failed = state == 0 ? next : next + state - before - 1;
-      if (size == 1 && !GrowText()) {
-        passedOver(failed);
-        next = failed + 1;
-      } else if (size > 1) {
-        next = failed;
-      }
+      if (state > 0) next += state - before - 1;
+      if (size == 1 && !GrowText()) passedOver(next++);
     }
     return true;
   }
@@ -107,9 +103,8 @@ bool PrintFixedText(Output &output, SnapshotRecords &records) {
 
 Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::string &header,
                           const std::string &name, const std::string &headerName) {
-  const uint32_t recordSize = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)]);
-  const uint32_t recordCount = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordCount)]);
-  const uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
+  const SnapshotHeader numbers = LoadSnapshotHeader(header);
+  const uint32_t last = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;
   DescribedText text(output, header);
   Status status = kGood;
   uint32_t dealtWith = 0;
@@ -118,15 +113,16 @@ Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::s
     const auto block = records.Next();
     if (!block) return kBadUsage;
     if (block->empty()) break;
-    const auto count =
-        static_cast<uint32_t>(std::min<size_t>(block->size() / recordSize, last - dealtWith));
-    more = block->size() / recordSize > count;
+    const auto count = static_cast<uint32_t>(
+        std::min<size_t>(block->size() / numbers.recordSize, last - dealtWith));
+    more = block->size() / numbers.recordSize > count;
     const auto passOver = [&](uint32_t index) {
       Complain(name, "record " + std::to_string(dealtWith + index) + " does not fit a text of " +
                          std::to_string(kMostRoom) + " bytes");
       status = kBadData;
     };
-    if (!text.Print(block->substr(0, size_t{count} * recordSize), passOver) || !output.Flush()) {
+    if (!text.Print(block->substr(0, size_t{count} * numbers.recordSize), passOver) ||
+        !output.Flush()) {
       return status;
     }
     dealtWith += count;
