@@ -19,9 +19,6 @@ class BoundedWriter {
 
   uint64_t length() const { return static_cast<uint64_t>(position_ - start_); }
 
-  // True while a piece of this length fits.
-  bool Fits(uint64_t length) const { return free_ > length; }
-
   // Appends the piece. When it does not fit, as much of it as does, ended by a NUL, and returns
   // false.
   bool Append(std::string_view piece) {
@@ -66,6 +63,8 @@ class BoundedWriter {
   void EndAt(uint64_t length) { start_[length] = '\0'; }
 
  private:
+  bool Fits(uint64_t length) const { return free_ > length; }
+
   bool Advance(size_t length) {
     position_ += length;
     free_ -= length;

@@ -8,8 +8,6 @@
 namespace morwick {
 namespace {
 
-// Larger numbers are taken for this one: no buffer is as large, and none overflows.
-constexpr uint64_t kHuge = 1000000000000000000;
 constexpr uint64_t kPlainWidth = 8;
 
 // Takes plain text up to the next conversion or the end; a doubled % stands for one.
@@ -24,10 +22,11 @@ FormatText TakeText(std::string_view *rest) {
   return text;
 }
 
+// A format has no room for a number that 64 bits do not hold.
 uint64_t TakeNumber(std::string_view *rest) {
   uint64_t number = 0;
   for (; !rest->empty() && rest->front() >= '0' && rest->front() <= '9'; rest->remove_prefix(1)) {
-    number = std::min(number * 10 + static_cast<uint64_t>(rest->front() - '0'), kHuge);
+    number = number * 10 + static_cast<uint64_t>(rest->front() - '0');
   }
   return number;
 }

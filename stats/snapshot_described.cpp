@@ -103,33 +103,27 @@ bool AppendBanner(BoundedWriter &writer, const HeaderNumbers &numbers, const cha
          writer.Append("\n");
 }
 
-// The fields of a line, from the header's descriptor table.
-class Fields {
+// The header's descriptor table.
+class DescriptorTable {
  public:
-  Fields(const uint8_t *table, uint32_t recordSize)
+  DescriptorTable(const uint8_t *table, uint32_t recordSize)
       : descriptors_(table + sizeof(SnapshotDescriptorTable)),
         count_(LoadLittleEndian32(table)),
-        recordSize_(recordSize) {
-    for (uint32_t i = 0; i < std::min(count_, kReadyFields); ++i) ready_[i] = Read(i);
-  }
+        recordSize_(recordSize) {}
 
-  // The first fields, which are read once a call instead of once a record: half the time.
-  std::span<const Field> ready() const { return {ready_, std::min(count_, kReadyFields)}; }
-
-  // The others, one by one.
   uint32_t count() const { return count_; }
   Field Read(uint32_t index) const { return ReadField(Descriptor(index), recordSize_); }
 
   // Whether the field that tells an empty record lies in the records at all.
-  bool TellEmptyRecords() const { return count_ > 0 && EmptyOffset() + kNumberSize <= recordSize_; }
+  bool TellsEmptyRecords() const {
+    return count_ > 0 && EmptyOffset() + kNumberSize <= recordSize_;
+  }
 
-  bool AreEmpty(const uint8_t *record) const {
+  bool IsEmpty(const uint8_t *record) const {
     return LoadLittleEndian32(record + EmptyOffset()) == 0;
   }
 
  private:
-  static constexpr uint32_t kReadyFields = 32;
-
   const uint8_t *Descriptor(uint32_t index) const {
     return descriptors_ + sizeof(SnapshotFieldDescriptor) * size_t{index};
   }
@@ -142,7 +136,22 @@ class Fields {
   const uint8_t *descriptors_;
   uint32_t count_;
   uint32_t recordSize_;
-  Field ready_[kReadyFields];
+};
+
+// The first fields of a line, which are read once a call instead of once a record: half the time.
+class ReadyFields {
+ public:
+  explicit ReadyFields(const DescriptorTable &table) : count_(std::min(table.count(), kMost)) {
+    for (uint32_t i = 0; i < count_; ++i) fields_[i] = table.Read(i);
+  }
+
+  std::span<const Field> fields() const { return {fields_, count_}; }
+
+ private:
+  static constexpr uint32_t kMost = 32;
+
+  uint32_t count_;
+  Field fields_[kMost];
 };
 
 // One value of each priority's triple, after its label.
@@ -180,12 +189,13 @@ bool AppendField(BoundedWriter &writer, const Field &field, const uint8_t *recor
   return true;
 }
 
-bool AppendLine(BoundedWriter &writer, const Fields &fields, const uint8_t *record) {
-  for (const Field &field : fields.ready()) {
+bool AppendLine(BoundedWriter &writer, std::span<const Field> ready, const DescriptorTable &table,
+                const uint8_t *record) {
+  for (const Field &field : ready) {
     if (!AppendField(writer, field, record)) return false;
   }
-  for (auto i = static_cast<uint32_t>(fields.ready().size()); i < fields.count(); ++i) {
-    if (!AppendField(writer, fields.Read(i), record)) return false;
+  for (auto i = static_cast<uint32_t>(ready.size()); i < table.count(); ++i) {
+    if (!AppendField(writer, table.Read(i), record)) return false;
   }
   return writer.Append("\n");
 }
@@ -206,15 +216,17 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   if (*state >= last) return {0, true};
 
   // Only now: a header without a record to print needs no descriptor table.
-  const Fields fields(header + numbers.descriptorTableOffset, numbers.recordSize);
+  const DescriptorTable table(header + numbers.descriptorTableOffset, numbers.recordSize);
   // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
-  if (!fields.TellEmptyRecords()) *state = last;
+  if (!table.TellsEmptyRecords()) *state = last;
+  std::optional<ReadyFields> ready;  // once there is a record to print
   uint64_t completed = 0;
   while (*state < last) {
     const uint8_t *record = snapshot + uint64_t{numbers.recordSize} * *state;
     ++*state;
-    if (fields.AreEmpty(record)) continue;
-    if (!AppendLine(writer, fields, record)) return {completed, false};
+    if (table.IsEmpty(record)) continue;
+    if (!ready) ready.emplace(table);
+    if (!AppendLine(writer, ready->fields(), table, record)) return {completed, false};
     completed = writer.length();
   }
   return {completed, true};

@@ -236,6 +236,9 @@ TEST(SnapshotTest, TakesNullPointersAndHugeSizes) {
   bare[52] = 0;
   EXPECT_EQ(Render("no field, no line", 500, bare), (Rendered{1, 1, "", 2}));
   EXPECT_EQ(Render("no field, no line", 500, bare, 7), (Rendered{1, 1, "", 7}));
+  // Of a snapshot without a record to print no descriptor is read but the first.
+  bare[52] = 9;
+  EXPECT_EQ(Render(std::string(8, '\0'), 500, bare, 1), (Rendered{1, 1, "", 2}));
   // Of records of 2 GiB, the third lies beyond what 32 bits address.
   constexpr size_t kGiB = size_t{1} << 30;
   void *memory = mmap(nullptr, 6 * kGiB, PROT_READ | PROT_WRITE,

@@ -44,10 +44,12 @@ typedef enum ActivityCriteria { kActivityCheckIn } ActivityCriteria;
 enum { kActivityStateRun = 2, kActivityStateDefer = 3 };
 
 /*
- * The text for matching a service by property, the same on every platform: it stands in the
- * exporter table as the `matchKey` of classes that are matched so.
+ * The text for matching a service by property: in the exporter table the `matchKey` of classes that
+ * are matched so. A platform that calls it something else has the build define it.
  */
+#ifndef PLATFORM_PROPERTY_MATCH_KEY
 #define PLATFORM_PROPERTY_MATCH_KEY "PropertyMatch"
+#endif
 
 /*
  * Drivers. Service and connection handles are unsigned numbers, 0 meaning none. Results are 0 for
@@ -87,8 +89,8 @@ MORWICK_EXPORT int32_t ReleaseObject(uint32_t service);
  * reply that is longer is cut. Blocks until the controller has answered.
  *
  * The requests of the daemon and of tools are 24 bytes: two 32-bit numbers in the controller's byte
- * order, little-endian, and 16 zero bytes. The first number is the second one of the SelectorPair
- * (exporter.h) of what is asked for, the second number is 1025 in a task-scheduler request, whose
+ * order, little-endian, and 16 zero bytes. The first number says what is asked for: it is `second`
+ * of the SelectorPair (exporter.h). The second number is 1025 in a task-scheduler request, whose
  * reply is a 32-bit word, and 0 where a buffer is read, which is the reply.
  */
 MORWICK_EXPORT int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
