@@ -21,19 +21,33 @@ TEST(CapacityTest, RoundsToSignificantDigits) {
 
 // Just below a power of two it is advertised, from it on the next; but for one band.
 TEST(CapacityTest, AdvertisesTheNextPowerOfTwo) {
-  const auto inBand = [](uint64_t megabytes) {
-    return megabytes >= 1376256 && megabytes < 1770496;
+  const struct {
+    uint32_t megabytes, gigabytes;
+  } cases[] = {
+      {0, 0},
+      {1, 0},
+      {511, 0},
+      {512, 1},
+      {1023, 1},
+      {1024, 2},
+      {30000, 32},
+      {488000, 512},
+      {976000, 1024},
+      {1048575, 1024},
+      {1048576, 2048},
+      {1376255, 2048},
+      {1376256, 1536},
+      {1770495, 1536},
+      {1770496, 2048},
+      {2097151, 2048},
+      {2097152, 4096},
+      {1U << 30, 2097152},
+      {0x7fffffff, 2097152},
+      {0x80000000, 4194304},
+      {0xffffffff, 4194304},
   };
-  for (uint64_t power = 1; power <= uint64_t{1} << 31; power *= 2) {
-    for (const uint64_t megabytes : {power, 2 * power - 1}) {
-      const uint64_t expected = inBand(megabytes) ? 1536 : 2 * power / 1024;
-      EXPECT_EQ(GetUserCapacityInGB(static_cast<uint32_t>(megabytes)), expected) << megabytes;
-    }
-  }
-  for (const uint32_t megabytes : {0U, 1376255U, 1376256U, 1770495U, 1770496U}) {
-    EXPECT_EQ(GetUserCapacityInGB(megabytes), megabytes == 0      ? 0U
-                                              : inBand(megabytes) ? 1536U
-                                                                  : 2048U);
+  for (const auto &[megabytes, gigabytes] : cases) {
+    EXPECT_EQ(GetUserCapacityInGB(megabytes), gigabytes) << megabytes;
   }
 }
 

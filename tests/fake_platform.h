@@ -21,8 +21,8 @@ using Script = std::map<std::string, std::string>;
 std::string Play(const Script &script, const std::function<void()> &body);
 
 // Plays the cases of a file under tests/cases, each against what is to come of it. A line "== name"
-// begins a case, "key: value" lines are its script, and behind a line "->" stands the outcome. The
-// body has keys of its own.
+// begins a case, "key: value" lines are its script, and behind a line "->" stands the outcome.
+// Keys of its own, `ownKeys`, the body reads from the script.
 void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
                const std::function<void(Script &)> &body);
 

@@ -19,9 +19,12 @@ inline uint64_t ParseInto(Contexts *contexts, Kind kind, const char *data, size_
   KVRStatsCxt *kvr = contexts == nullptr ? nullptr : &contexts->kvr;
   GenericParserCxt *generic = contexts == nullptr ? nullptr : &contexts->generic;
   const auto size32 = static_cast<uint32_t>(size);
-  if (kind == kKVR) return static_cast<uint64_t>(KVRParseBufferToCxt(kvr, data, size32));
-  if (kind == kFTL) return KVRFTLParseBufferToCxt(generic, data, size32);
-  if (kind == kMSP) return KVRMSPParseBufferToCxt(generic, data, size);
+  switch (kind) {
+    case kKVR: return static_cast<uint64_t>(KVRParseBufferToCxt(kvr, data, size32));
+    case kFTL: return KVRFTLParseBufferToCxt(generic, data, size32);
+    case kMSP: return KVRMSPParseBufferToCxt(generic, data, size);
+    case kArray: break;
+  }
   const auto width = static_cast<unsigned char>(data[0]);
   const uint32_t count = width == 0 ? 1 : (size32 - 1) / width;
   return AddMultipleFieldsToGenericContext(generic, "f", data + 1, width, count) == 1 ? 1 : 0;

@@ -2,7 +2,8 @@
 # Plays a session, a file of commands as a person types them ("$ command", "> and more of it") and of
 # what they print, indented by four, with the exit status in brackets when it is not 0; fails with the
 # difference.
-# GRELLON, MORWICK, FAST_SLEEP and SOURCE name the programs, the library to preload and the tree.
+# GRELLON, MORWICK and SOURCE name the programs and the tree; FAST_SLEEP and REFUSE_MEMORY libraries to
+# preload. SANITIZED is set where a sanitizer leaves no room for limits of memory.
 # Usage: session.sh SESSION
 set -uo pipefail
 session=$(realpath "$1")
