@@ -4,7 +4,6 @@
 #include <benchmark/benchmark.h>
 #include <malloc.h>
 
-#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 
@@ -38,13 +37,13 @@ bool PlainAdd(Context *context, const char *prefix, const char *name, uint64_t v
 }
 
 template <typename Element, typename Context>
-void PlainAddAll(Context *context, const char *name, const char *separator, const char *elements,
+void PlainAddAll(Context *context, const char *name, const char *separator, const char *bytes,
                  uint32_t count) {
   char prefix[100];
   std::snprintf(prefix, sizeof prefix, "%s%s", name, separator);
   for (uint32_t i = 0; i < count; ++i) {
     Element element;
-    std::memcpy(&element, elements + i * sizeof element, sizeof element);
+    std::memcpy(&element, bytes + i * sizeof element, sizeof element);
     char index[100] = "";
     if (count > 1) std::snprintf(index, sizeof index, "%d", static_cast<int>(i));
     PlainAdd(context, count > 1 ? prefix : name, index, element);
@@ -59,8 +58,8 @@ void PlainStats(Context *context, const Stream &stream, const char *separator) {
     uint32_t header[2];
     std::memcpy(header, position, sizeof header);
     position += 8;
-    const morwick::KeyRow *key = morwick::FindStatsKey(header[0]);
-    PlainAddAll<uint64_t>(context, key->name.data(), separator, position, key->elementCount);
+    const morwick::KeyRow *row = morwick::FindStatsKey(header[0]);
+    PlainAddAll<uint64_t>(context, row->name.data(), separator, position, row->elementCount);
     position += size_t{header[1]} * 8;
   }
 }
@@ -72,8 +71,8 @@ void PlainMSP(GenericParserCxt *context, const Stream &stream) {
     uint16_t header[2];
     std::memcpy(header, position, sizeof header);
     position += 4;
-    const morwick::KeyRow *key = morwick::FindMSPKey(header[0]);
-    PlainAddAll<uint32_t>(context, key->name.data(), "", position, key->elementCount);
+    const morwick::KeyRow *row = morwick::FindMSPKey(header[0]);
+    PlainAddAll<uint32_t>(context, row->name.data(), "", position, row->elementCount);
     position += header[1];
   }
 }

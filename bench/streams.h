@@ -39,25 +39,27 @@ Stream MakeStream(const morwick::KeyRow *(*find)(uint32_t), uint32_t ids, uint32
   Stream stream;
   for (int copy = 0; copy < copies; ++copy) {
     for (uint32_t id = 0; id < ids; ++id) {
-      const morwick::KeyRow *key = find(id);
-      if (key == nullptr) continue;
-      Append(&stream.buffer, static_cast<HeaderPart>(key->id));
-      Append(&stream.buffer, static_cast<HeaderPart>(key->elementCount * lengthUnit));
-      for (uint32_t i = 0; i < key->elementCount; ++i) {
+      const morwick::KeyRow *row = find(id);
+      if (row == nullptr) continue;
+      Append(&stream.buffer, static_cast<HeaderPart>(row->id));
+      Append(&stream.buffer, static_cast<HeaderPart>(row->elementCount * lengthUnit));
+      for (uint32_t i = 0; i < row->elementCount; ++i) {
         Append(&stream.buffer, static_cast<Element>(MixedMagnitude(random, 8 * sizeof(Element))));
       }
-      stream.entries += key->elementCount;
+      stream.entries += row->elementCount;
     }
   }
   return stream;
 }
 
+constexpr uint32_t kIds = 0x10000;  // more than either table has
+
 inline Stream StatsStream(int copies) {
-  return MakeStream<uint32_t, uint64_t>(morwick::FindStatsKey, 660, 1, copies);
+  return MakeStream<uint32_t, uint64_t>(morwick::FindStatsKey, kIds, 1, copies);
 }
 
 inline Stream MSPStream(int copies) {
-  return MakeStream<uint16_t, uint32_t>(morwick::FindMSPKey, 8215, sizeof(uint32_t), copies);
+  return MakeStream<uint16_t, uint32_t>(morwick::FindMSPKey, kIds, sizeof(uint32_t), copies);
 }
 
 }  // namespace bench

@@ -45,7 +45,7 @@ constexpr NandExporter Row(const Traits &traits) {
       .service = 0,
       .exporterParamA = traits.exporterParamA,
       .methodSelector = traits.methodSelector,
-      .exporterParamB = traits.methodSelector,
+      .exporterParamB = traits.methodSelector,  // equal in every class so far
       .getStatsSelectors = KVRGetStatsSelectors,
       .getMSPStatsSelectors = traits.hasMSPStatistics ? KVRMSPGetStatsSelectors : nullptr,
       .getDefectsListSelectors = KVRGetDefectsListSelectors,

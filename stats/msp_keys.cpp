@@ -1,4 +1,4 @@
-// The keys of the MSP statistics record stream, in key order: key, name, 32-bit elements. Names are
+// The keys of the MSP statistics record stream, in id order: id, name, 32-bit elements. Names are
 // published letter for letter.
 
 #include "stats/msp_keys.h"

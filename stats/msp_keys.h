@@ -6,7 +6,7 @@
 
 namespace morwick {
 
-// The row of the key, or null for an unknown key.
+// The row of the key id, or null for an unknown id.
 const KeyRow *FindMSPKey(uint32_t id);
 
 }  // namespace morwick

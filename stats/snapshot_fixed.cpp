@@ -25,7 +25,7 @@ struct Column {
 
 #define FIELD(name) offsetof(SnapshotRecord, name)
 
-// The line, in print order.
+// The line, in print order. The command has the order too, and a session holds the two together.
 constexpr Column kColumns[] = {
     {"T=", FIELD(timestamp), 4, '0'},
     {" E=", FIELD(erasedBands), 2, '0'},

@@ -1,5 +1,6 @@
 // morwick diff: what changed between two dumps.
 
+#include <algorithm>
 #include <memory>
 
 #include "tools/changes.h"

@@ -218,7 +218,7 @@ std::pair<std::string, std::string> SplitLabel(const std::string &text) {
 std::pair<std::string, std::string> SplitFile(const std::string &text) {
   const size_t split = text.find('=');
   const std::string stream = text.substr(0, split);
-  if (split == std::string::npos || (stream != "kvr" && stream != "ftl" && stream != "msp")) {
+  if (split == std::string::npos || std::ranges::find(kStreams, stream) == std::end(kStreams)) {
     throw CLI::ValidationError("STREAM=FILE", text + " does not begin with kvr=, ftl= or msp=");
   }
   return {stream, text.substr(split + 1)};

@@ -16,7 +16,7 @@ void AddFormat(CLI::App *command, std::string *format, const std::vector<std::st
 
 void AddStream(CLI::App *command, std::string *stream) {
   command->add_option("-s,--stream", *stream, "Which statistics")
-      ->check(CLI::IsMember({"kvr", "ftl", "msp"}))
+      ->check(CLI::IsMember(std::vector<std::string>(std::begin(kStreams), std::end(kStreams))))
       ->required();
 }
 
@@ -46,8 +46,8 @@ CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seco
   return command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
 }
 
-CLI::Option *AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
-                       const std::string &description) {
+void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
+               const std::string &description) {
   const auto take = [=](const std::string &text) {
     const std::optional<uint64_t> value = ParseNumber(text, most);
     if (!value) {
@@ -55,7 +55,7 @@ CLI::Option *AddNumber(CLI::App *command, const std::string &name, uint64_t *num
     }
     *number = *value;
   };
-  return command->add_option_function<std::string>(name, take, description)->type_name("NUMBER");
+  command->add_option_function<std::string>(name, take, description)->type_name("NUMBER");
 }
 
 }  // namespace tools

@@ -25,8 +25,8 @@ CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seco
                         const std::string &description);
 
 // A whole number of digits, at most `most`.
-CLI::Option *AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
-                       const std::string &description);
+void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
+               const std::string &description);
 
 }  // namespace tools
 

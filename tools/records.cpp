@@ -3,19 +3,21 @@
 #include "tools/records.h"
 
 #include <algorithm>
+#include <cassert>
 
 #include "morwick/little_endian.h"
 
 namespace tools {
 namespace {
 
-// What sets the two formats apart, and the parsers of the first.
+// What the parsers go by, which keep it to themselves: a fuzz target holds the two against each
+// other.
 struct Format {
   std::string_view stream;
   uint64_t header;  // in bytes
   uint64_t unit;    // that lengths are counted in, in bytes
-  uint32_t endKey;  // 0: there is none
-  uint32_t highestKey;
+  uint32_t endId;   // 0: there is none
+  uint32_t highestId;
   bool fillers;  // a record of length 0 is one, whatever its key
 };
 
@@ -25,16 +27,18 @@ constexpr Format kFormats[] = {
     {"msp", 4, 1, 0x2FFF, UINT16_MAX, true},
 };
 
-std::string Record(uint32_t key) { return "the record there (key " + std::to_string(key) + ") "; }
+std::string Record(uint32_t id) { return "the record there (key " + std::to_string(id) + ") "; }
 
 }  // namespace
 
 StatisticsEnd FindEnd(std::string_view stream, std::string_view dump) {
-  const Format &format = *std::ranges::find(kFormats, stream, &Format::stream);
+  const auto *found = std::ranges::find(kFormats, stream, &Format::stream);
+  assert(found != std::end(kFormats));
+  const Format &format = *found;
   uint64_t offset = 0;
   while (dump.size() - offset >= format.header) {
     const bool wide = format.header == 8;
-    const uint32_t key =
+    const uint32_t id =
         wide ? LoadLittleEndian32(&dump[offset]) : LoadLittleEndian16(&dump[offset]);
     const uint32_t length =
         wide ? LoadLittleEndian32(&dump[offset + 4]) : LoadLittleEndian16(&dump[offset + 2]);
@@ -42,13 +46,13 @@ StatisticsEnd FindEnd(std::string_view stream, std::string_view dump) {
     const uint64_t needed = uint64_t{length} * format.unit;
     const uint64_t left = dump.size() - payload;
     if (length > 0 || !format.fillers) {
-      if (key == format.endKey && format.endKey != 0) {
+      if (id == format.endId && format.endId != 0) {
         return {offset, "", needed < left ? left - needed : 0};
       }
-      if (key > format.highestKey) return {offset, Record(key) + "has no valid key", 0};
+      if (id > format.highestId) return {offset, Record(id) + "has no valid key", 0};
       if (needed > left) {
         return {offset,
-                Record(key) + "needs " + std::to_string(needed) + " bytes, and " +
+                Record(id) + "needs " + std::to_string(needed) + " bytes, and " +
                     std::to_string(left) + " are left",
                 0};
       }

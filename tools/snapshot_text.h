@@ -3,7 +3,6 @@
 #define TOOLS_SNAPSHOT_TEXT_H
 
 #include <string>
-#include <string_view>
 
 #include "tools/io.h"
 #include "tools/snapshot_records.h"

@@ -9,6 +9,7 @@
 #include <charconv>
 #include <cstddef>
 #include <cstdlib>
+#include <optional>
 #include <utility>
 
 #include "tools/records.h"
@@ -89,7 +90,7 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
 Statistics::~Statistics() {
   if (stream_ == "kvr") {
     row_->releaseContext(&context_.kvr);
-  } else {
+  } else {  // the others share a context
     row_->releaseGenericParserCxt(&context_.generic);
   }
 }

@@ -2,7 +2,6 @@
 #ifndef TOOLS_STATISTICS_H
 #define TOOLS_STATISTICS_H
 
-#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>

@@ -51,6 +51,8 @@ void RunMainQueue() {
   std::exit(EXIT_SUCCESS);
 }
 
+// Waits for whoever reads standard error, which a platform that has runs must not: here there is
+// no run to hold up.
 void SystemLog(const char *format, ...) {
   char message[1024];
   va_list arguments;
