@@ -1,0 +1,178 @@
+// The simulated drivers: handles are checked, and only the right requests are answered.
+
+#include "tests/simulated_platform.h"
+
+#include <algorithm>
+#include <csignal>
+#include <fstream>
+#include <sstream>
+
+#include "morwick/morwick.h"
+
+namespace {
+
+// Each line sends one request; what has gone before it counts. A room of 99 is more than there is.
+TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
+  int fifo[2] = {};
+  ASSERT_EQ(pipe(fifo), 0);
+  ASSERT_EQ(write(fifo[1], "0123456789rest", 14), 14);
+  Play(
+      "[[controller]]\nclass = 'KVRStorage'\nvanish = [2]\npending = 3\nfail_request = [3]\n"
+      "fail_read = [5]\nshort_read = [8, 19]\nmsp = '" +
+      File("msp") + "'\nstatistics = ['" + File("first") + "', '/proc/self/fd/" + File("2nd") +
+      "', '" + File("third") + "']\nsnapshot = '" + File("") +
+      "'\nsnapshot_header = '/'\n"
+      "defects = [\"/no\\n\\u007f\", '" +
+      File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
+  close(STDIN_FILENO);  // a file that is read may well be descriptor 0
+  const uint32_t connection = Connect();
+  const std::string none;
+  const struct {
+    int line;
+    uint32_t method, command, argument, size, room;
+    int32_t result;
+    std::string reply;
+    uint32_t beyond = 0;  // in the bytes that are to be 0, from the front or from behind
+  } cases[] = {
+      {__LINE__, 9, 39, 1025, 24, 99, kBadArgument, none},
+      {__LINE__, 8, 38, 1025, 24, 99, kBadArgument, none},
+      {__LINE__, 8, 39, 1025, 23, 99, kBadArgument, none},
+      {__LINE__, 8, 39, 1025, 25, 99, kBadArgument, none},
+      {__LINE__, 8, 39, 1025, 24, 99, kBadArgument, none, 1},
+      {__LINE__, 8, 39, 1025, 24, 99, kBadArgument, none, 1U << 31},
+      {__LINE__, 8, 39, 1024, 24, 99, kBadArgument, none},
+      {__LINE__, 8, 39, 1025, 24, 3, kBadArgument, none},
+      {__LINE__, 8, 39, 1025, 24, 99, kDeviceError, none},
+      {__LINE__, 8, 39, 1025, 24, 4, 0, {"\2\0\0\0", 4}},
+      {__LINE__, 8, 39, 1025, 24, 99, 0, {"\1\0\0\0", 4}},
+      {__LINE__, 9, 13, 0, 24, 99, kBadArgument, none},
+      {__LINE__, 8, 13, 0, 23, 99, kBadArgument, none},
+      {__LINE__, 8, 13, 0, 24, 99, kBadArgument, none, 1},
+      {__LINE__, 8, 13, 0, 24, 4, 0, "firs"},
+      {__LINE__, 8, 221, 0, 24, 99, 0, "msp"},
+      {__LINE__, 8, 13, 0, 24, 5, 0, "first"},
+      {__LINE__, 8, 13, 0, 24, 0, 0, none},
+      {__LINE__, 8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
+      {__LINE__, 8, 13, 0, 24, 99, kDeviceError, none},
+      {__LINE__, 8, 13, 1, 24, 99, kBadArgument, none},
+      {__LINE__, 8, 13, 0, 24, 6, 0, "first"},
+      {__LINE__, 8, 13, 0, 24, 3, 0, "2"},  // half of what fills the room was cut all the same
+      {__LINE__, 8, 13, 0, 24, 5, 0, "2nd"},
+      {__LINE__, 8, 13, 0, 24, 99, 0, "third"},
+      {__LINE__, 8, 13, 0, 24, 99, 0, "third"},
+      {__LINE__, 8, 221, 0, 24, 99, 0, "msp"},
+      {__LINE__, 8, 22, 0, 24, 99, 0, none},
+      {__LINE__, 8, 145, 0, 24, 99, kDeviceError, none},
+      {__LINE__, 8, 11, 0, 24, 99, kNotOffered, none},
+      {__LINE__, 8, 15, 0, 24, 99, kDeviceError, none},
+      {__LINE__, 8, 15, 0, 24, 99, kDeviceError, none},
+      {__LINE__, 8, 17, 0, 24, 10, 0, "0123456789"},
+      {__LINE__, 8, 13, 0, 24, 99, 0, "th"},
+      {__LINE__, 8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
+  };
+  testing::internal::CaptureStderr();
+  for (const auto &[line, method, command, argument, size, room, result, reply, beyond] : cases) {
+    const uint32_t request[6] = {command, argument, beyond & 1, 0, 0, beyond & ~1U};
+    std::string buffer(room + 1, '#');
+    size_t replySize = room;
+    EXPECT_EQ(CallStructMethod(connection, method, request, size, buffer.data(), &replySize),
+              result)
+        << "line " << line;
+    EXPECT_EQ(buffer.substr(0, replySize), reply) << "line " << line;
+    EXPECT_EQ(buffer.find_first_not_of({"#\0", 2}, replySize), std::string::npos)
+        << "line " << line;
+    EXPECT_EQ(buffer.back(), '#') << "line " << line;
+  }
+  EXPECT_EQ(testing::internal::GetCapturedStderr(),
+            "platform_tests: '/': Is a directory\n"
+            "platform_tests: '/no\\x0a\\x7f': No such file or directory\n"
+            "platform_tests: '/no\\x0a\\x7f': No such file or directory\n");
+  std::string rest(99, '\0');
+  EXPECT_EQ(read(fifo[0], rest.data(), rest.size()), 4) << "what there was no room for";
+  EXPECT_EQ(CloseService(connection), 0);
+  EXPECT_EQ(Find(), 0U) << "the second look-up finds it gone";
+}
+
+// The library's table and the simulated drivers' own list know the same classes and methods.
+TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
+  std::string scenario;
+  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+    scenario += std::string("[[controller]]\nclass = '") + row->className + "'\nband = '" +
+                File(row->className) + "'\n";
+  }
+  Play(scenario);
+  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+    const uint32_t connection = Connect(row->className);
+    EXPECT_EQ(Read(connection, row->methodSelector, row->getBandStatsSelectors()->second),
+              row->className);
+    EXPECT_EQ(CloseService(connection), 0);
+  }
+}
+
+TEST(SimulatedDriversTest, ServesTheExampleDumps) {
+  setenv("GRELLON_SCENARIO", SOURCE "/packaging/scenarios/statistics.toml", 1);
+  const uint32_t connection = Connect("VeltoQRN3NVMeController");
+  const struct {
+    uint32_t command;
+    const char *file;
+  } cases[] = {{13, "kvr.bin"},
+               {13, "ftl.bin"},
+               {221, "msp.bin"},
+               {22, "snapshot.bin"},
+               {145, "snapshot_header.bin"}};
+  for (const auto &[command, file] : cases) {
+    std::ostringstream dump;
+    dump << std::ifstream(std::string(SOURCE "/examples/") + file).rdbuf();
+    EXPECT_EQ(Read(connection, 9, command), dump.str()) << file;
+  }
+  CloseService(connection);
+}
+
+TEST(SimulatedDriversTest, RefusesAndReportsBadHandles) {
+  Play("[[controller]]\nclass = 'KVRStorage'\nrefuse_open = [2]\nfail_close = [2]\n");
+  EXPECT_EQ(ServiceMatching(nullptr), nullptr);
+  EXPECT_EQ(GetMatchingService(nullptr), 0U);
+  const uint32_t service = Find();
+  uint32_t connection = 0;
+  uint32_t second = 1;
+  size_t size = 99;
+  EXPECT_EQ(OpenService(service, 0, &connection), 0);
+  EXPECT_EQ(OpenService(service, 0, &second), kRefused);
+  EXPECT_EQ(second, 0U);
+  EXPECT_EQ(OpenService(service, 0, &second), 0);
+  testing::internal::CaptureStderr();
+  EXPECT_EQ(CloseService(service), kBadHandle);
+  EXPECT_EQ(ReleaseObject(second + 1), kBadHandle);
+  EXPECT_EQ(CloseService(connection), 0);
+  EXPECT_EQ(CloseService(second), kDeviceError);
+  EXPECT_EQ(CloseService(second), kBadHandle);
+  EXPECT_EQ(CallStructMethod(connection, 8, nullptr, 0, nullptr, &size), kBadHandle);
+  EXPECT_EQ(ReleaseObject(service), 0);
+  EXPECT_EQ(OpenService(service, 0, &connection), kBadHandle);
+  EXPECT_EQ(CloseService(0), kBadHandle);
+  EXPECT_EQ(
+      testing::internal::GetCapturedStderr(),
+      "connection 1 is of another kind\nservice 4 is unknown\nconnection 3 is already released\n"
+      "connection 2 is already released\nservice 1 is already released\n");
+}
+
+TEST(SimulatedDriversTest, ReportsHandlesLeftOpenAtExit) {
+  Play("[[controller]]\nclass = 'KVRStorage'\n");
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  EXPECT_EXIT(std::exit(Find() == 1 ? 0 : 1), testing::ExitedWithCode(0),
+              "service 1 of KVRStorage is still open");
+}
+
+TEST(SimulatedDriversTest, LeavesSignalsToATool) {
+  Play("[[controller]]\nclass = 'KVRStorage'\n");
+  CloseService(Connect());
+  sigset_t blocked;
+  pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
+  for (const int signal : {SIGHUP, SIGINT, SIGTERM, SIGUSR1, SIGPIPE, SIGXFSZ}) {
+    struct sigaction action = {};
+    sigaction(signal, nullptr, &action);
+    EXPECT_TRUE(action.sa_handler == SIG_DFL && sigismember(&blocked, signal) == 0) << signal;
+  }
+}
+
+}  // namespace

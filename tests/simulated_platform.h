@@ -1,0 +1,55 @@
+// The simulated platform as tests reach it: a scenario, a controller, a reading. Each test runs in
+// a process of its own, with a scenario of its own.
+#ifndef TESTS_SIMULATED_PLATFORM_H
+#define TESTS_SIMULATED_PLATFORM_H
+
+#include <gtest/gtest.h>
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <string>
+
+#include "morwick/platform.h"
+
+constexpr int32_t kBadHandle = 0x101;
+constexpr int32_t kBadArgument = 0x102;
+constexpr int32_t kRefused = 0x103;
+constexpr int32_t kDeviceError = 0x104;
+constexpr int32_t kNotOffered = 0x105;
+
+// A file in memory, by its name in the one folder where all of them are.
+inline std::string File(const std::string &text) {
+  const int file = memfd_create("file", 0);
+  EXPECT_EQ(write(file, text.data(), text.size()), static_cast<ssize_t>(text.size()));
+  return std::to_string(file);
+}
+
+inline void Play(const std::string &scenario) {
+  setenv("GRELLON_SCENARIO", ("/proc/self/fd/" + File(scenario)).c_str(), 1);
+}
+
+inline uint32_t Find(const char *className = "KVRStorage") {
+  return GetMatchingService(ServiceMatching(className));
+}
+
+inline uint32_t Connect(const char *className = "KVRStorage") {
+  const uint32_t service = Find(className);
+  uint32_t connection = 1;
+  EXPECT_EQ(OpenService(service, 1, &connection), kBadArgument);
+  EXPECT_EQ(connection, 0U);
+  EXPECT_EQ(OpenService(service, 0, &connection), 0);
+  EXPECT_EQ(ReleaseObject(service), 0);
+  return connection;
+}
+
+inline std::string Read(uint32_t connection, uint32_t method, uint32_t command) {
+  const uint32_t request[6] = {command};
+  std::string reply(1 << 20, '\0');
+  size_t size = reply.size();
+  EXPECT_EQ(CallStructMethod(connection, method, request, sizeof request, reply.data(), &size), 0);
+  reply.resize(size);
+  return reply;
+}
+
+#endif

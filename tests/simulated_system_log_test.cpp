@@ -1,0 +1,157 @@
+// The system log of the simulated platform: its lines, and what becomes of them when nobody reads.
+
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/ioctl.h>
+#include <sys/socket.h>
+#include <sys/un.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <cstdio>
+#include <ctime>
+#include <sstream>
+
+#include "tests/simulated_platform.h"
+
+namespace {
+
+std::string systemLog;
+volatile int systemLogError = 0;
+
+}  // namespace
+
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
+// Takes the place of the system's log.
+extern "C" MORWICK_EXPORT ssize_t sendto(int, const void *text, size_t size, int flags,
+                                         const sockaddr *log, socklen_t) {
+  EXPECT_STREQ(reinterpret_cast<const sockaddr_un *>(log)->sun_path, "/dev/log");
+  EXPECT_NE(flags & MSG_DONTWAIT, 0);
+  errno = systemLogError;
+  if (errno != 0) return -1;
+  systemLog.append(static_cast<const char *>(text), size).push_back('\n');
+  return static_cast<ssize_t>(size);
+}
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
+
+namespace {
+
+TEST(SimulatedSystemLogTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
+  Play("");
+  testing::internal::CaptureStderr();
+  for (const char *text : {"100%", "line\n", ""}) SystemLog("%s", text);
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "grellon: 100%\ngrellon: line\ngrellon: \n");
+  std::istringstream lines(systemLog);
+  for (const char *text : {"100%", "line", ""}) {
+    std::string line;
+    std::getline(lines, line);
+    tm time = {};
+    EXPECT_EQ(strptime(line.c_str() + 4, "%b %e %T ", &time), line.c_str() + 20) << line;
+    // Facility daemon, level notice.
+    EXPECT_EQ(line.erase(4, 16), "<29>grellon[" + std::to_string(getpid()) + "]: " + text);
+  }
+  EXPECT_EQ(lines.peek(), EOF);
+}
+
+// In the log 29 characters with the NUL: of the 16 KiB for lines that wait, 564 of them leave one
+// too few for another.
+constexpr char kLine[] = "line %013u";
+constexpr unsigned long kWaiting = 564;
+
+// All lines in their order but for one gap, which is told of, and not before so many lines.
+void CheckOneGap(const std::string &log, unsigned long lines, unsigned long least) {
+  std::istringstream stream(log);
+  std::string line;
+  unsigned long next = 1;
+  int gaps = 0;
+  while (std::getline(stream, line)) {
+    std::string text = line.substr(std::min(line.size(), line.find(": ") + 2));
+    if (text.ends_with('\r')) text.pop_back();
+    if (text.starts_with("line ")) {
+      std::array<char, 32> expected;
+      std::snprintf(expected.data(), expected.size(), kLine, static_cast<unsigned>(next++));
+      EXPECT_EQ(text, expected.data());
+    } else {
+      const unsigned long dropped = std::strtoul(text.c_str(), nullptr, 10);
+      EXPECT_EQ(text, std::to_string(dropped) + " lines of the log were dropped");
+      EXPECT_GT(next, least);
+      next += dropped;
+      ++gaps;
+    }
+  }
+  EXPECT_EQ(next, lines + 1);
+  EXPECT_EQ(gaps, 1);
+}
+
+// Nobody reads standard error or the system's log; then the one is read piece by piece, and the
+// other is started anew.
+void CheckFullLog(int reader, int writer) {
+  Play("");
+  fcntl(reader, F_SETFL, O_NONBLOCK);
+  const int standardError = dup(STDERR_FILENO);
+  dup2(writer, STDERR_FILENO);
+  std::string log;
+  systemLogError = EAGAIN;
+  alarm(20);  // in case it waits
+  unsigned line = 0;
+  while (line < 20'000) SystemLog(kLine, ++line);
+  int unread = 0;
+  ioctl(reader, FIONREAD, &unread);
+  systemLogError = ECONNREFUSED;
+  SystemLog(kLine, ++line);
+  systemLogError = 0;
+  // A terminal hands a line on some time after it was written.
+  pollfd more = {.fd = reader, .events = POLLIN, .revents = 0};
+  while (line < 20'100 || poll(&more, 1, 200) > 0) {
+    if (line < 20'100) SystemLog(kLine, ++line);
+    std::array<char, 5000> some;
+    const ssize_t size = read(reader, some.data(), some.size());
+    if (size > 0) log.append(some.data(), static_cast<size_t>(size));
+    usleep(1000);
+  }
+  alarm(0);
+  EXPECT_EQ(fcntl(STDERR_FILENO, F_GETFL) & O_NONBLOCK, 0) << "others write there too";
+  dup2(standardError, STDERR_FILENO);
+  constexpr unsigned long kLineSize = 30;  // with a terminal's own line end
+  CheckOneGap(log, line, static_cast<unsigned>(unread) / kLineSize + kWaiting);
+  CheckOneGap(systemLog, line, 0);  // what waited went when there was no log
+}
+
+TEST(SimulatedSystemLogTest, NeverWaitsForAPipe) {
+  int ends[2] = {};
+  ASSERT_EQ(pipe(ends), 0);
+  CheckFullLog(ends[0], ends[1]);
+}
+
+TEST(SimulatedSystemLogTest, NeverWaitsForASocket) {
+  int ends[2] = {};
+  ASSERT_EQ(socketpair(AF_UNIX, SOCK_STREAM, 0, ends), 0);
+  CheckFullLog(ends[0], ends[1]);
+}
+
+TEST(SimulatedSystemLogTest, NeverWaitsForATerminal) {
+  const int terminal = posix_openpt(O_RDWR | O_NOCTTY);
+  ASSERT_EQ(grantpt(terminal) | unlockpt(terminal), 0);
+  CheckFullLog(terminal, open(ptsname(terminal), O_RDWR | O_NOCTTY));
+}
+
+// The system's log takes lines again a quarter of a second after the end.
+[[noreturn]] void EndWhileTheLogIsFull() {
+  Play("");
+  std::atexit([] { std::fputs(systemLog.c_str(), stderr); });  // after the log's own end
+  std::signal(SIGALRM, [](int) { systemLogError = 0; });
+  systemLogError = EAGAIN;
+  SystemLog("last line");
+  ualarm(250'000, 0);
+  std::exit(0);
+}
+
+TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsForTheLogSomeTimeAtTheEnd) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  EXPECT_EXIT(EndWhileTheLogIsFull(), testing::ExitedWithCode(0),
+              "^grellon: last line\n<29>.*: last line\n$");
+}
+
+}  // namespace
