@@ -67,12 +67,12 @@ void EndWithoutMemory() {
   std::exit(2);
 }
 
-void ForgetYield() {
-  sigset_t yield;
-  sigemptyset(&yield);
-  sigaddset(&yield, SIGUSR1);
+bool StopCameEarly() {
   const timespec now = {};
-  sigtimedwait(&yield, nullptr, &now);
+  int signal = 0;
+  do signal = sigtimedwait(&WaitedFor(), nullptr, &now);
+  while (signal == SIGUSR1);
+  return signal > 0;
 }
 
 bool WaitToStop() {

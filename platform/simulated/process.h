@@ -16,8 +16,9 @@ const Scenario &TakeProcess();
 // Ends the process for want of memory or of threads: one line, and status 2.
 [[noreturn]] void EndWithoutMemory();
 
-// Forgets a signal to yield that came before there was anything to yield.
-void ForgetYield();
+// Takes the signals that came before there was a run: true when one of them asks to stop. One to
+// yield finds nothing that could.
+bool StopCameEarly();
 
 // Waits for a signal: true when it asks the process to stop, false when it asks the activity to
 // yield.

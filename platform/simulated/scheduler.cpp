@@ -58,7 +58,7 @@ class Scheduler {
 
   // Runs the activity until the schedule ends or a signal asks to stop.
   void Run(const Schedule &schedule) {
-    ForgetYield();
+    stopping_ = StopCameEarly();
     std::thread worker([&] {
       RunSchedule(schedule);
       Stop();  // the schedule's end stops the main queue like a user
