@@ -141,10 +141,13 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
 // Prints in the format that was asked for.
 Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &output, Json *json) {
   if (snapshot.status != kGood) return snapshot.status;
-  const bool text = options.format == "normal" && !options.summary;
-  const size_t recordSize = text && snapshot.header
-                                ? LoadSnapshotHeader(*snapshot.header).recordSize
-                                : sizeof(SnapshotRecord);
+  size_t recordSize = sizeof(SnapshotRecord);
+  uint64_t promised = UINT64_MAX;
+  if (snapshot.header) {
+    const SnapshotHeader numbers = LoadSnapshotHeader(*snapshot.header);
+    recordSize = numbers.recordSize;
+    promised = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is never printed
+  }
   std::optional<Input> input;
   if (!options.live) input.emplace(options.file);
   size_t taken = 0;
@@ -154,7 +157,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     taken += count;
     return count;
   };
-  SnapshotRecords records(read, recordSize);
+  SnapshotRecords records(read, recordSize, promised);
   if (!records.Load()) return kBadUsage;
   if (records.empty()) {
     Complain(snapshot.name, "there is nothing in it");
@@ -175,14 +178,20 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   } else if (options.format == "csv") {
     good = PrintCsv(output, records);
   } else if (snapshot.header) {
-    status =
-        PrintDescribedText(output, records, *snapshot.header, snapshot.name, snapshot.headerName);
+    status = PrintDescribedText(output, records, *snapshot.header, snapshot.name);
   } else {
     good = PrintFixedText(output, records);
   }
   if (!good) return kBadUsage;
   if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
-  if (records.rest() > 0 && !(text && snapshot.header)) {
+  const std::string ofPromised =
+      std::to_string(promised) + " records that " + snapshot.headerName + " promises";
+  if (snapshot.header && records.count() < promised) {
+    Complain(snapshot.name, "ends after " + std::to_string(records.count()) + " of " + ofPromised);
+    status = kBadData;
+  } else if (snapshot.header && records.rest() > 0) {
+    Note(snapshot.name, "goes on behind the " + ofPromised);
+  } else if (records.rest() > 0) {
     Complain(snapshot.name,
              "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
     status = kBadData;

@@ -12,9 +12,10 @@ constexpr size_t kBlockSize = 64 << 10;
 
 }  // namespace
 
-SnapshotRecords::SnapshotRecords(ReadBytes read, size_t recordSize)
+SnapshotRecords::SnapshotRecords(ReadBytes read, size_t recordSize, uint64_t most)
     : read_(std::move(read)),
       recordSize_(recordSize),
+      most_(most),
       buffer_(recordSize + std::max(kBlockSize, recordSize), '\0') {}
 
 bool SnapshotRecords::Load() {
@@ -35,7 +36,9 @@ bool SnapshotRecords::Load() {
 
 std::optional<std::string_view> SnapshotRecords::Next() {
   if (!Load()) return std::nullopt;
-  used_ = filled_ / recordSize_ * recordSize_;
+  const uint64_t count = std::min<uint64_t>(filled_ / recordSize_, most_ - count_);
+  count_ += count;
+  used_ = count * recordSize_;
   return std::string_view(buffer_).substr(recordSize_, used_);
 }
 

@@ -15,7 +15,8 @@ class SnapshotRecords {
   // Reads at most `room` bytes, none at the end. Without a value, reading has failed.
   using ReadBytes = std::function<std::optional<size_t>(char *bytes, size_t room)>;
 
-  SnapshotRecords(ReadBytes read, size_t recordSize);
+  // Hands out no more than `most` records.
+  SnapshotRecords(ReadBytes read, size_t recordSize, uint64_t most);
 
   // Reads until there is a whole record, or the end. False when reading has failed.
   bool Load();
@@ -24,13 +25,19 @@ class SnapshotRecords {
   // which may be read. Without a value, reading has failed.
   std::optional<std::string_view> Next();
 
-  // At the end: bytes that are no whole record, and whether there were no bytes at all.
+  // How many records were handed out.
+  uint64_t count() const { return count_; }
+
+  // At the end: bytes that were read and are in none of them, and whether there were no bytes at
+  // all.
   size_t rest() const { return filled_; }
   bool empty() const { return total_ == 0; }
 
  private:
   ReadBytes read_;
   size_t recordSize_;
+  uint64_t most_;
+  uint64_t count_ = 0;
   std::string buffer_;
   size_t filled_ = 0;  // behind the room of one record
   size_t used_ = 0;    // of what is filled, the block that was handed out

@@ -102,46 +102,21 @@ bool PrintFixedText(Output &output, SnapshotRecords &records) {
 }
 
 Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::string &header,
-                          const std::string &name, const std::string &headerName) {
-  const SnapshotHeader numbers = LoadSnapshotHeader(header);
-  const uint32_t last = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;
+                          const std::string &name) {
   DescribedText text(output, header);
   Status status = kGood;
-  uint32_t dealtWith = 0;
-  bool more = false;  // than the header promises
-  while (dealtWith < last) {
+  for (;;) {
+    const uint64_t first = records.count();
     const auto block = records.Next();
     if (!block) return kBadUsage;
-    if (block->empty()) break;
-    const auto count = static_cast<uint32_t>(
-        std::min<size_t>(block->size() / numbers.recordSize, last - dealtWith));
-    more = block->size() / numbers.recordSize > count;
+    if (block->empty()) return status;
     const auto passOver = [&](uint32_t index) {
-      Complain(name, "record " + std::to_string(dealtWith + index) + " does not fit a text of " +
+      Complain(name, "record " + std::to_string(first + index) + " does not fit a text of " +
                          std::to_string(kMostRoom) + " bytes");
       status = kBadData;
     };
-    if (!text.Print(block->substr(0, size_t{count} * numbers.recordSize), passOver) ||
-        !output.Flush()) {
-      return status;
-    }
-    dealtWith += count;
+    if (!text.Print(*block, passOver) || !output.Flush()) return status;
   }
-  if (dealtWith < last) {
-    Complain(name, "ends after " + std::to_string(dealtWith) + " of " + std::to_string(last) +
-                       " records that " + headerName + " promises");
-    return kBadData;
-  }
-  if (!more) {
-    const auto block = records.Next();
-    if (!block) return kBadUsage;
-    more = !block->empty();
-  }
-  if (more) {
-    Note(name, "goes on behind the " + std::to_string(last) + " records that " + headerName +
-                   " promises");
-  }
-  return status;
 }
 
 }  // namespace tools

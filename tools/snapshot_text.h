@@ -12,10 +12,10 @@ namespace tools {
 // In the fixed layout: legend, lines, an empty line. False when reading or writing has failed.
 bool PrintFixedText(Output &output, SnapshotRecords &records);
 
-// In the layout of a header that has passed its check. Complains about records that are missing or
-// too long, with the names of snapshot and header.
+// In the layout of a header that has passed its check. Complains, with the snapshot's name, about
+// records that are too long.
 Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::string &header,
-                          const std::string &name, const std::string &headerName);
+                          const std::string &name);
 
 }  // namespace tools
 
