@@ -3,13 +3,14 @@
 # what they print, indented by four, with the exit status in brackets when it is not 0; fails with the
 # difference.
 # GRELLON, MORWICK and SOURCE name the programs and the tree; FAST_SLEEP and REFUSE_MEMORY libraries to
-# preload. SANITIZED is set where a sanitizer leaves no room for limits of memory.
-# Usage: session.sh SESSION
+# preload; ctest sets them. SANITIZED is set where a sanitizer leaves no room for limits of memory.
+# Usage: session.sh SESSION; with SESSION_UPDATE=yes what is printed now is written into the session.
 set -uo pipefail
 session=$(realpath "$1")
 work=$(mktemp -d)
 trap 'kill "${pid:-}" 2>/dev/null; rm -rf "$work"' EXIT
 cd "$work" || exit 1
+: "${SANITIZED:=}"
 cp "$SOURCE"/examples/*.bin .
 export LD_PRELOAD=
 

@@ -10,7 +10,7 @@
  * builds it without exceptions and without run-time type information; in any case no exception may
  * leave a function. Tests hold for any platform but where tests/CMakeLists.txt asks for
  * `simulated`: the unit tests (they bring a platform of their own), the header and export checks,
- * the package tests, and tests/sessions/FOLDER.session if there is one. platform/none/ is the
+ * the package tests, and what stands in tests/FOLDER/ if there is one. platform/none/ is the
  * smallest one, without controllers; platform/simulated/ has some that are made up.
  *
  * THREADS. Driver calls and SystemLog may come from any thread, several at once. The functions of

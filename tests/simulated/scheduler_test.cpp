@@ -4,7 +4,7 @@
 #include <cmath>
 #include <cstdio>
 
-#include "tests/simulated_platform.h"
+#include "tests/simulated/platform.h"
 
 namespace {
 

@@ -1,6 +1,6 @@
 // The simulated drivers: handles are checked, and only the right requests are answered.
 
-#include "tests/simulated_platform.h"
+#include "tests/simulated/platform.h"
 
 #include <algorithm>
 #include <csignal>

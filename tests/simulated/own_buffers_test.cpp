@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "morwick/morwick.h"
-#include "tests/simulated_platform.h"
+#include "tests/simulated/platform.h"
 
 namespace {
 

@@ -14,7 +14,7 @@
 #include <ctime>
 #include <sstream>
 
-#include "tests/simulated_platform.h"
+#include "tests/simulated/platform.h"
 
 namespace {
 
