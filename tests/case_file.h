@@ -4,8 +4,17 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <fstream>
 #include <string>
+
+// The number that a case writes, in C's notation. The test fails when it is none.
+inline uint64_t Number(const std::string &text) {
+  char *end = nullptr;
+  const uint64_t number = std::strtoull(text.c_str(), &end, 0);
+  EXPECT_TRUE(end != text.c_str() && *end == '\0') << "no number: '" << text << "'";
+  return number;
+}
 
 class CaseFile {
  public:

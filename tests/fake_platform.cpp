@@ -57,6 +57,9 @@ std::string Take(const std::string &key, const std::string &otherwise) {
   return word;
 }
 
+const std::set<std::string> kCalls = {"match", "lookup",  "open",   "close",
+                                      "call",  "release", "handle0"};
+
 bool Fails(const std::string &name) {
   ++platform.calls;
   return Lists("failing", name + "#" + std::to_string(++platform.callsByName[name])) ||
@@ -67,7 +70,7 @@ bool Fails(const std::string &name) {
 int32_t Result(bool fails) {
   const std::string &code = platform.script["failure"];
   if (!fails) return 0;
-  return code.empty() ? INT32_MIN : static_cast<int32_t>(std::stol(code));
+  return code.empty() ? INT32_MIN : static_cast<int32_t>(Number(code));
 }
 
 uint32_t Issue(const std::string &what) {
@@ -113,6 +116,10 @@ void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
       const std::string key = line.substr(0, colon);
       EXPECT_TRUE(kKeys.contains(key) || ownKeys.contains(key)) << "no such key: " << line;
       script[key] = line.substr(colon + 2);
+      std::istringstream words(key == "failing" ? script[key] : "");
+      for (std::string word; words >> word;) {
+        EXPECT_TRUE(kCalls.contains(word.substr(0, word.find('#')))) << "no such call: " << word;
+      }
     }
     std::string expected;
     while (cases.Peek() != '=' && cases.NextRaw(&line)) expected += line + "\n";
@@ -186,12 +193,12 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
         words[1], " and ", std::count(bytes + 8, bytes + inputSize, 0), " zeros");
   const uint32_t cleared = 0;
   EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
-  const auto pending = static_cast<uint32_t>(std::stoul(Take("replies", "0")));
+  const auto pending = static_cast<uint32_t>(Number(Take("replies", "0")));
   std::memcpy(reply, &pending, sizeof pending);
   *replySize = 1;  // not looked at, and not what the next call may begin with
   // The pair is a writable global: a request takes what stands in it then.
   const std::string second = std::to_string(taskSchedulerSelectors.second);
-  taskSchedulerSelectors.second = static_cast<uint32_t>(std::stoul(Take("commands", second)));
+  taskSchedulerSelectors.second = static_cast<uint32_t>(Number(Take("commands", second)));
   return Result(Fails("call"));
 }
 
@@ -200,7 +207,7 @@ void RegisterActivity(const char *identifier, ActivityCriteria criteria, Activit
 }
 
 int GetActivityState(Activity *) {
-  return std::stoi(Take("state", std::to_string(kActivityStateRun)));
+  return static_cast<int>(Number(Take("state", std::to_string(kActivityStateRun))));
 }
 
 bool ActivityShouldDefer(Activity *) {

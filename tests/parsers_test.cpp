@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <sstream>
 
 #include "tests/case_file.h"
@@ -27,12 +28,11 @@ std::string Stream(Kind kind, const std::string &notation) {
     if (token[0] == '\'') {
       bytes += token.substr(1);
     } else if (colon != std::string::npos) {
-      put(std::stoull(token, nullptr, 0), width / 2);
-      put(std::stoull(token.substr(colon + 1), nullptr, 0), width / 2);
+      put(Number(token.substr(0, colon)), width / 2);
+      put(Number(token.substr(colon + 1)), width / 2);
     } else {
-      uint64_t value = std::stoull(token, nullptr, 0);
-      const uint64_t last =
-          dots == std::string::npos ? value : std::stoull(token.substr(dots + 2), nullptr, 0);
+      uint64_t value = Number(token.substr(0, dots));
+      const uint64_t last = dots == std::string::npos ? value : Number(token.substr(dots + 2));
       do put(value, width);
       while (value++ != last);
     }
@@ -44,7 +44,13 @@ std::string Stream(Kind kind, const std::string &notation) {
 // number `refused` fails. `how` is the kind, with "-context" or "-data" behind it where a null
 // pointer takes their place. What can be seen afterwards, as text; nothing is left behind.
 std::string Parse(const std::string &how, const std::string &stream, size_t refused) {
-  const auto kind = static_cast<Kind>(std::string("KFMA").find(how[0]));
+  constexpr std::string_view kKinds[] = {"KVR", "FTL", "MSP", "Array"};
+  const auto *name = std::ranges::find(kKinds, how.substr(0, how.find('-')));
+  const std::string null = how.substr(std::min(how.size(), how.find('-')));
+  if (name == std::end(kKinds) || !(null.empty() || null == "-context" || null == "-data")) {
+    return "no such kind: " + how;
+  }
+  const auto kind = static_cast<Kind>(name - kKinds);
   const std::string bytes = Stream(kind, stream);
   const std::vector<char> buffer = Unaligned(bytes);
   Contexts contexts = {};
@@ -53,9 +59,9 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   contexts.kvr.exportVersion = 99;
   contexts.kvr.parseMarker = 5;
   RefuseAllocation(refused);
-  const uint64_t result =
-      ParseInto(how.ends_with("-context") ? nullptr : &contexts, kind,
-                how.ends_with("-data") ? nullptr : buffer.data() + 1, bytes.size());
+  const uint64_t result = ParseInto(null == "-context" ? nullptr : &contexts, kind,
+                                    null == "-data" ? nullptr : buffer.data() + 1, bytes.size());
+  EXPECT_GE(AllocationCount(), refused) << "so many there were not";
   RefuseAllocation(0);
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
@@ -63,7 +69,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   const uint32_t version = contexts.kvr.exportVersion;
   if (version != 99) seen += ", version " + std::to_string(version);
   if (const std::string message = TakeMessage(); message != "NA") seen += ", " + message;
-  EXPECT_EQ(contexts.kvr.parseMarker, kind == kKVR && !how.ends_with("-context") ? -1 : 5);
+  EXPECT_EQ(contexts.kvr.parseMarker, kind == kKVR && null != "-context" ? -1 : 5);
   for (int time = 0; time < 2; ++time) {
     KVRReleaseContext(&contexts.kvr);
     ReleaseGenericParserCxt(&contexts.generic);
@@ -95,7 +101,7 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
       continue;
     }
     // An entry takes two allocations, for its value and for its name; each is refused once.
-    const size_t entry = std::stoul(how.substr(mark + 1));
+    const size_t entry = Number(how.substr(mark + 1));
     ASSERT_GT(entry, 0U) << "entries are counted from 1";
     how.resize(mark);
     for (const size_t refused : {2 * entry - 1, 2 * entry}) {
