@@ -40,7 +40,7 @@ void AddRead(CLI::App &app, Action *action) {
   std::vector<std::string> kinds;
   for (const BufferKind &kind : BufferKinds()) kinds.emplace_back(kind.name);
   kinds.insert(kinds.end(), {"kvr", "ftl"});
-  command->add_option("STREAM", options->kind, "Which buffer")
+  command->add_option("BUFFER", options->kind, "Which buffer")
       ->check(CLI::IsMember(kinds))
       ->required();
   AddWrite(command, &options->file, "Write to a file, whole or not at all");
