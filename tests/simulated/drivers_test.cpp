@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <csignal>
+#include <filesystem>
 #include <fstream>
 #include <sstream>
 
@@ -70,6 +71,10 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
       {__LINE__, 8, 13, 0, 24, 99, 0, "th"},
       {__LINE__, 8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
   };
+  const auto descriptors = [] {
+    return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
+  };
+  const auto before = descriptors();
   testing::internal::CaptureStderr();
   for (const auto &[line, method, command, argument, size, room, result, reply, beyond] : cases) {
     const uint32_t request[6] = {command, argument, beyond & 1, 0, 0, beyond & ~1U};
@@ -87,6 +92,7 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
             "platform_tests: '/': Is a directory\n"
             "platform_tests: '/no\\x0a\\x7f': No such file or directory\n"
             "platform_tests: '/no\\x0a\\x7f': No such file or directory\n");
+  EXPECT_EQ(descriptors(), before);
   std::string rest(99, '\0');
   EXPECT_EQ(read(fifo[0], rest.data(), rest.size()), 4) << "what there was no room for";
   EXPECT_EQ(CloseService(connection), 0);
@@ -105,6 +111,9 @@ TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
     const uint32_t connection = Connect(row->className);
     EXPECT_EQ(Read(connection, row->methodSelector, row->getBandStatsSelectors()->second),
               row->className);
+    EXPECT_EQ(Read(connection, row->methodSelector, row->getTaskSchedulerSelectors()->second, 1025),
+              std::string("\1\0\0\0", 4))
+        << "two units of work, unless the scenario has others";
     EXPECT_EQ(CloseService(connection), 0);
   }
 }
