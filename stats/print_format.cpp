@@ -22,7 +22,8 @@ FormatText TakeText(std::string_view *rest) {
   return text;
 }
 
-// A format has no room for a number that 64 bits do not hold.
+// At most 14 digits, or there would be no room in the format for the rest of the conversion.
+static_assert(kFormatRoom <= 20);
 uint64_t TakeNumber(std::string_view *rest) {
   uint64_t number = 0;
   for (; !rest->empty() && rest->front() >= '0' && rest->front() <= '9'; rest->remove_prefix(1)) {

@@ -4,6 +4,9 @@
 
 #include <gtest/gtest.h>
 
+#include <cctype>
+#include <cerrno>
+#include <cstdint>
 #include <cstdlib>
 #include <fstream>
 #include <string>
@@ -11,8 +14,10 @@
 // The number that a case writes, in C's notation. The test fails when it is none.
 inline uint64_t Number(const std::string &text) {
   char *end = nullptr;
+  errno = 0;
   const uint64_t number = std::strtoull(text.c_str(), &end, 0);
-  EXPECT_TRUE(end != text.c_str() && *end == '\0') << "no number: '" << text << "'";
+  EXPECT_TRUE(std::isdigit(text[0]) != 0 && *end == '\0' && errno == 0)
+      << "no number: '" << text << "'";
   return number;
 }
 

@@ -146,7 +146,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   if (snapshot.header) {
     const SnapshotHeader numbers = LoadSnapshotHeader(*snapshot.header);
     recordSize = numbers.recordSize;
-    promised = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is never printed
+    promised = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
   }
   std::optional<Input> input;
   if (!options.live) input.emplace(options.file);
@@ -182,19 +182,19 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   } else {
     good = PrintFixedText(output, records);
   }
-  if (!good) return kBadUsage;
+  if (!good || status == kBadUsage) return kBadUsage;  // reading has failed
   if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
   const std::string ofPromised =
       std::to_string(promised) + " records that " + snapshot.headerName + " promises";
   if (snapshot.header && records.count() < promised) {
     Complain(snapshot.name, "ends after " + std::to_string(records.count()) + " of " + ofPromised);
     status = kBadData;
-  } else if (snapshot.header && records.rest() > 0) {
-    Note(snapshot.name, "goes on behind the " + ofPromised);
-  } else if (records.rest() > 0) {
+  } else if (!snapshot.header && records.rest() > 0) {
     Complain(snapshot.name,
              "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
     status = kBadData;
+  } else if (records.rest() > recordSize) {  // more than the record that is not printed
+    Note(snapshot.name, "goes on behind the " + ofPromised);
   }
   return status;
 }

@@ -16,15 +16,17 @@ SnapshotRecords::SnapshotRecords(ReadBytes read, size_t recordSize, uint64_t mos
     : read_(std::move(read)),
       recordSize_(recordSize),
       most_(most),
-      buffer_(recordSize + std::max(kBlockSize, recordSize), '\0') {}
+      buffer_(recordSize + std::max(kBlockSize, recordSize + 1), '\0') {}
 
-bool SnapshotRecords::Load() {
+bool SnapshotRecords::Load() { return Load(recordSize_); }
+
+bool SnapshotRecords::Load(size_t size) {
   // What is no whole record yet goes to the front.
   char *front = buffer_.data() + recordSize_;
   filled_ -= used_;
   std::memmove(front, front + used_, filled_);
   used_ = 0;
-  while (filled_ < recordSize_) {
+  while (filled_ < size) {
     const auto count = read_(front + filled_, buffer_.size() - recordSize_ - filled_);
     if (!count) return false;
     if (*count == 0) break;
@@ -35,7 +37,7 @@ bool SnapshotRecords::Load() {
 }
 
 std::optional<std::string_view> SnapshotRecords::Next() {
-  if (!Load()) return std::nullopt;
+  if (!Load(recordSize_ + (count_ == most_ ? 1 : 0))) return std::nullopt;
   const uint64_t count = std::min<uint64_t>(filled_ / recordSize_, most_ - count_);
   count_ += count;
   used_ = count * recordSize_;

@@ -28,12 +28,15 @@ class SnapshotRecords {
   // How many records were handed out.
   uint64_t count() const { return count_; }
 
-  // At the end: bytes that were read and are in none of them, and whether there were no bytes at
-  // all.
+  // At the end: bytes that no record has that was handed out, up to more than one record of them,
+  // and whether there were no bytes at all.
   size_t rest() const { return filled_; }
   bool empty() const { return total_ == 0; }
 
  private:
+  // Reads until so much is there, or the end.
+  bool Load(size_t size);
+
   ReadBytes read_;
   size_t recordSize_;
   uint64_t most_;

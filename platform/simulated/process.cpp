@@ -69,10 +69,11 @@ void EndWithoutMemory() {
 
 bool StopCameEarly() {
   const timespec now = {};
-  int signal = 0;
-  do signal = sigtimedwait(&WaitedFor(), nullptr, &now);
-  while (signal == SIGUSR1);
-  return signal > 0;
+  bool stop = false;
+  for (int signal; (signal = sigtimedwait(&WaitedFor(), nullptr, &now)) > 0;) {
+    stop = stop || signal != SIGUSR1;
+  }
+  return stop;
 }
 
 bool WaitToStop() {

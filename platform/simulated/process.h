@@ -17,7 +17,7 @@ const Scenario &TakeProcess();
 [[noreturn]] void EndWithoutMemory();
 
 // Takes the signals that came before there was a run: true when one of them asks to stop. One to
-// yield finds nothing that could.
+// yield means nothing then.
 bool StopCameEarly();
 
 // Waits for a signal: true when it asks the process to stop, false when it asks the activity to

@@ -76,7 +76,7 @@ class Scheduler {
   void Yield(bool stop) {
     const std::lock_guard lock(mutex_);
     yieldWanted_ = true;
-    stopping_ = stop;
+    stopping_ = stopping_ || stop;
     wakeUp_.notify_all();
   }
 
