@@ -219,14 +219,18 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   const DescriptorTable table(header + numbers.descriptorTableOffset, numbers.recordSize);
   // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
   if (!table.TellsEmptyRecords()) *state = last;
-  std::optional<ReadyFields> ready;  // once there is a record to print
+  const auto recordAt = [&](uint32_t index) {
+    return snapshot + uint64_t{numbers.recordSize} * index;
+  };
+  while (*state < last && table.IsEmpty(recordAt(*state))) ++*state;
+  if (*state >= last) return {0, true};
+
+  const ReadyFields ready(table);
   uint64_t completed = 0;
   while (*state < last) {
-    const uint8_t *record = snapshot + uint64_t{numbers.recordSize} * *state;
-    ++*state;
+    const uint8_t *record = recordAt((*state)++);
     if (table.IsEmpty(record)) continue;
-    if (!ready) ready.emplace(table);
-    if (!AppendLine(writer, ready->fields(), table, record)) return {completed, false};
+    if (!AppendLine(writer, ready.fields(), table, record)) return {completed, false};
     completed = writer.length();
   }
   return {completed, true};
