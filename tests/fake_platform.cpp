@@ -152,8 +152,12 @@ MatchingRequest *ServiceMatching(const char *className) {
   } else if (platform.row->className != nullptr) {
     ++platform.row;
   }
-  EXPECT_STREQ(className, platform.row->className) << "a search goes row by row";
-  if (platform.row->className == nullptr) return nullptr;
+  const char *due = platform.row->className;
+  if (due == nullptr) {
+    ADD_FAILURE() << "a search goes on behind the last row";
+    return nullptr;
+  }
+  EXPECT_STREQ(className, due) << "a search goes row by row";
   if (!Fails("match")) return new MatchingRequest{className};
   Miss();
   return nullptr;
