@@ -29,7 +29,7 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
   const uint32_t connection = Connect();
   const std::string none;
   const struct {
-    int line;
+    long line;
     uint32_t method, command, argument, size, room;
     int32_t result;
     std::string reply;
