@@ -1,8 +1,10 @@
 // morwick snapshot: prints a snapshot as the library's text, as CSV or JSON, or what it says as a
 // whole.
 
+#include <algorithm>
 #include <charconv>
 #include <memory>
+#include <new>
 
 #include "tools/commands.h"
 #include "tools/controller.h"
@@ -138,6 +140,34 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
   return good;
 }
 
+// Says where the records end, when that is not as promised. What was printed is whole also when
+// there is no memory for it.
+Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, size_t recordSize,
+                uint64_t promised) {
+  const auto ofPromised = [&] {
+    return std::to_string(promised) + " records that " + snapshot.headerName + " promises";
+  };
+  try {
+    if (snapshot.header && records.count() < promised) {
+      Complain(snapshot.name,
+               "ends after " + std::to_string(records.count()) + " of " + ofPromised());
+      return kBadData;
+    }
+    if (!snapshot.header && records.rest() > 0) {
+      Complain(snapshot.name,
+               "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
+      return kBadData;
+    }
+    if (records.rest() > recordSize) {  // more than the record that is not printed
+      Note(snapshot.name, "goes on behind the " + ofPromised());
+    }
+  } catch (const std::bad_alloc &) {
+    Complain(snapshot.name, "out of memory");
+    return kBadData;
+  }
+  return kGood;
+}
+
 // Prints in the format that was asked for.
 Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &output, Json *json) {
   if (snapshot.status != kGood) return snapshot.status;
@@ -184,19 +214,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   }
   if (!good || status == kBadUsage) return kBadUsage;  // reading has failed
   if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
-  const std::string ofPromised =
-      std::to_string(promised) + " records that " + snapshot.headerName + " promises";
-  if (snapshot.header && records.count() < promised) {
-    Complain(snapshot.name, "ends after " + std::to_string(records.count()) + " of " + ofPromised);
-    status = kBadData;
-  } else if (!snapshot.header && records.rest() > 0) {
-    Complain(snapshot.name,
-             "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
-    status = kBadData;
-  } else if (records.rest() > recordSize) {  // more than the record that is not printed
-    Note(snapshot.name, "goes on behind the " + ofPromised);
-  }
-  return status;
+  return std::max(status, JudgeEnd(snapshot, records, recordSize, promised));
 }
 
 Status Print(const Options &options) {
