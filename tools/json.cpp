@@ -31,7 +31,10 @@ Json::Json(Output &output, std::string_view command, const std::vector<Source> &
   EndObject();
 }
 
-void Json::Text(std::string_view text) { PlainText(ValidText(text)); }
+// No copy of what is good as it is: an object is ended also where memory is refused.
+void Json::Text(std::string_view text) {
+  IsValidText(text) ? PlainText(text) : PlainText(ValidText(text));
+}
 
 void Json::Finish(Status status) {
   Key("messages");

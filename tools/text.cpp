@@ -48,6 +48,16 @@ std::string Clean(std::string_view text, bool controls, std::string_view replace
 
 std::string Printable(std::string_view text) { return Clean(text, false, "?"); }
 
+bool IsValidText(std::string_view text) {
+  while (!text.empty()) {
+    uint32_t code = 0;
+    const size_t length = TakeCharacter(text, &code);
+    if (length == 0) return false;
+    text.remove_prefix(length);
+  }
+  return true;
+}
+
 std::string ValidText(std::string_view text) { return Clean(text, true, "\xef\xbf\xbd"); }
 
 std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most) {

@@ -13,7 +13,8 @@ namespace tools {
 // question mark.
 std::string Printable(std::string_view text);
 
-// For JSON: what is not UTF-8 becomes the replacement character.
+// For JSON: whether all of it is UTF-8; what is not becomes the replacement character.
+bool IsValidText(std::string_view text);
 std::string ValidText(std::string_view text);
 
 // A whole number of decimal digits and nothing else, at most `most`.
