@@ -8,8 +8,6 @@
 #include <cstring>
 #include <string_view>
 
-#include "stats/decimal.h"
-
 namespace morwick {
 
 class BoundedWriter {
@@ -42,13 +40,15 @@ class BoundedWriter {
     return Advance(length);
   }
 
-  // Appends the number as WritePadded does.
-  bool AppendPadded(uint32_t value, uint32_t width, char pad) {
-    if (Fits(kPaddedRoom)) {  // nearly always: no second copy
-      return Advance(static_cast<size_t>(WritePadded(position_, value, width, pad) - position_));
+  // Appends what `write`, which is given room for kRoom characters, writes there and returns the
+  // end of.
+  template <size_t kRoom, typename Write>
+  bool AppendWritten(Write write) {
+    if (Fits(kRoom)) {  // nearly always: no second copy
+      return Advance(static_cast<size_t>(write(position_) - position_));
     }
-    char text[kPaddedRoom];
-    return Append(std::string_view(text, WritePadded(text, value, width, pad)));
+    char text[kRoom];
+    return Append(std::string_view(text, write(text)));
   }
 
   // Appends what `print`, which is given room and its size, prints there as snprintf does.

@@ -9,6 +9,7 @@
 #include <string_view>
 
 #include "stats/bounded_writer.h"
+#include "stats/decimal.h"
 
 namespace morwick {
 
@@ -46,6 +47,12 @@ enum class Arguments { kOneNumber, kTwoNumbers, kOneText };
 // Takes apart a format shorter than kFormatRoom. Nothing when it asks for anything else than (fewer
 // of) these arguments.
 std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments);
+
+// Appends the number right-aligned in at least `width` (1 to 8) characters.
+inline bool PrintNumber(BoundedWriter &writer, uint32_t number, uint32_t width, char pad) {
+  return writer.AppendWritten<kPaddedRoom>(
+      [=](char *room) { return WritePadded(room, number, width, pad); });
+}
 
 // Print what printf would. False when it does not fit, at a cost of no more than what fits.
 bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,

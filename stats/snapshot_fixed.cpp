@@ -7,6 +7,7 @@
 #include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
 #include "stats/bounded_writer.h"
+#include "stats/decimal.h"
 #include "stats/snapshot_legend.h"
 
 namespace morwick {
