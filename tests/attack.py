@@ -28,34 +28,16 @@ for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_heade
     with open("examples/" + example, "rb") as file:
         GOOD[example] = file.read() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
 
-COMMANDS = """normal json: find
-normal json csv: stats -s kvr
-normal json csv: stats -s ftl ftl.bin
-normal json csv: stats -s msp
-normal: stats -s kvr --summary
-normal: stats -s kvr --long kvr.bin
-normal json csv: diff -s kvr --seconds 2 kvr.bin ftl.bin
-normal json csv: watch -s kvr --every 0 --count 1
-normal json csv: snapshot
-normal json csv: snapshot snapshot.bin
-normal: snapshot --header snapshot_header.bin snapshot.bin
-normal json: snapshot --summary snapshot.bin
-normal json: capacity 512 30000
-normal json: stats -s kvr missing.bin""".splitlines()
-PROGRAMS = [[MORWICK, *words.split(), "-o", form]
-            for forms, words in (line.split(": ") for line in COMMANDS) for form in forms.split()]
-PROGRAMS += [[MORWICK, *words.split()] for words in (
-    "read kvr", "read band", "read telemetry -w out", "metrics", "metrics -w out --label host=a",
-    "metrics kvr=kvr.bin msp=msp.bin", "help", "help stats", "--help", "--version", "sats")]
-PROGRAMS = [(program, "live") for program in PROGRAMS]
-PROGRAMS += [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
-
-OUTPUTS = {  # what a shell does with those of "$@"
-    "closed": '"$@" >&-', "both closed": '"$@" >&- 2>&-', "errors closed": '"$@" 2>&-',
-    "full": '"$@" > /dev/full', "both full": '"$@" > /dev/full 2>&1',
-    "gone": '{ sleep 0.05; "$@"; } | true', "both gone": '{ sleep 0.05; "$@" 2>&1; } | true',
-    "slow": '"$@" | { sleep 0.05; cat; }',
-    "unread": 'mkfifo full; exec 9<>full; rm full; timeout 0.1 cat /dev/zero >&9; "$@" 2>&9'}
+PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
+OUTPUTS = {}  # what a shell does with those of "$@"
+with open("tests/cases/attack.txt") as file:
+    for kind, words in (line.strip().split(": ", 1) for line in file if line[0] != "#"):
+        if "$@" in words:
+            OUTPUTS[kind] = words
+        elif kind == "plain":
+            PROGRAMS.append(([MORWICK, *words.split()], "live"))
+        else:
+            PROGRAMS += [([MORWICK, *words.split(), "-o", form], "live") for form in kind.split()]
 
 most_memory = 1 << 20  # KiB that no process has exceeded: 1 GiB at first
 thread = threading.local()

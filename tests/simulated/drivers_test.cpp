@@ -1,7 +1,5 @@
 // The simulated drivers: handles are checked, and only the right requests are answered.
 
-#include "tests/simulated/platform.h"
-
 #include <algorithm>
 #include <csignal>
 #include <filesystem>
@@ -9,11 +7,34 @@
 #include <sstream>
 
 #include "morwick/morwick.h"
+#include "tests/case_file.h"
+#include "tests/simulated/platform.h"
 
 namespace {
 
-// Each line sends one request; what has gone before it counts. A room of 99 is more than there is.
+// A line of requests.txt.
+struct Exchange {
+  uint32_t method = 0, requestSize = 0, room = 0, request[6] = {};
+  int32_t result = -1;
+  std::string reply;
+
+  explicit Exchange(const std::string &line) {
+    std::istringstream columns(line);
+    columns.unsetf(std::ios::dec);  // hexadecimal numbers too
+    columns >> method >> requestSize >> room;
+    for (uint32_t &word : request) {
+      if ((columns >> std::ws).peek() != '-') columns >> word;
+    }
+    std::string arrow;
+    columns >> arrow >> result;
+    EXPECT_TRUE(columns && arrow == "->");
+    columns >> reply;
+    if (reply.starts_with('=')) reply = {static_cast<char>(Number(reply.substr(1))), 0, 0, 0};
+  }
+};
+
 TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
+  CaseFile cases("requests.txt");
   int fifo[2] = {};
   ASSERT_EQ(pipe(fifo), 0);
   ASSERT_EQ(write(fifo[1], "0123456789rest", 14), 14);
@@ -27,66 +48,22 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
       File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
   close(STDIN_FILENO);  // a file that is read may well be descriptor 0
   const uint32_t connection = Connect();
-  const std::string none;
-  const struct {
-    long line;
-    uint32_t method, command, argument, size, room;
-    int32_t result;
-    std::string reply;
-    uint32_t beyond = 0;  // in the bytes that are to be 0, from the front or from behind
-  } cases[] = {
-      {__LINE__, 9, 39, 1025, 24, 99, kBadArgument, none},
-      {__LINE__, 8, 38, 1025, 24, 99, kBadArgument, none},
-      {__LINE__, 8, 39, 1025, 23, 99, kBadArgument, none},
-      {__LINE__, 8, 39, 1025, 25, 99, kBadArgument, none},
-      {__LINE__, 8, 39, 1025, 24, 99, kBadArgument, none, 1},
-      {__LINE__, 8, 39, 1025, 24, 99, kBadArgument, none, 1U << 31},
-      {__LINE__, 8, 39, 1024, 24, 99, kBadArgument, none},
-      {__LINE__, 8, 39, 1025, 24, 3, kBadArgument, none},
-      {__LINE__, 8, 39, 1025, 24, 99, kDeviceError, none},
-      {__LINE__, 8, 39, 1025, 24, 4, 0, {"\2\0\0\0", 4}},
-      {__LINE__, 8, 39, 1025, 24, 99, 0, {"\1\0\0\0", 4}},
-      {__LINE__, 9, 13, 0, 24, 99, kBadArgument, none},
-      {__LINE__, 8, 13, 0, 23, 99, kBadArgument, none},
-      {__LINE__, 8, 13, 0, 24, 99, kBadArgument, none, 1},
-      {__LINE__, 8, 13, 0, 24, 4, 0, "firs"},
-      {__LINE__, 8, 221, 0, 24, 99, 0, "msp"},
-      {__LINE__, 8, 13, 0, 24, 5, 0, "first"},
-      {__LINE__, 8, 13, 0, 24, 0, 0, none},
-      {__LINE__, 8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
-      {__LINE__, 8, 13, 0, 24, 99, kDeviceError, none},
-      {__LINE__, 8, 13, 1, 24, 99, kBadArgument, none},
-      {__LINE__, 8, 13, 0, 24, 6, 0, "first"},
-      {__LINE__, 8, 13, 0, 24, 3, 0, "2"},  // half of what fills the room was cut all the same
-      {__LINE__, 8, 13, 0, 24, 5, 0, "2nd"},
-      {__LINE__, 8, 13, 0, 24, 99, 0, "third"},
-      {__LINE__, 8, 13, 0, 24, 99, 0, "third"},
-      {__LINE__, 8, 221, 0, 24, 99, 0, "msp"},
-      {__LINE__, 8, 22, 0, 24, 99, 0, none},
-      {__LINE__, 8, 145, 0, 24, 99, kDeviceError, none},
-      {__LINE__, 8, 11, 0, 24, 99, kNotOffered, none},
-      {__LINE__, 8, 15, 0, 24, 99, kDeviceError, none},
-      {__LINE__, 8, 15, 0, 24, 99, kDeviceError, none},
-      {__LINE__, 8, 17, 0, 24, 10, 0, "0123456789"},
-      {__LINE__, 8, 13, 0, 24, 99, 0, "th"},
-      {__LINE__, 8, 39, 1025, 24, 4, 0, {"\0\0\0\0", 4}},
-  };
   const auto descriptors = [] {
     return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
   };
   const auto before = descriptors();
   testing::internal::CaptureStderr();
-  for (const auto &[line, method, command, argument, size, room, result, reply, beyond] : cases) {
-    const uint32_t request[6] = {command, argument, beyond & 1, 0, 0, beyond & ~1U};
-    std::string buffer(room + 1, '#');
-    size_t replySize = room;
-    EXPECT_EQ(CallStructMethod(connection, method, request, size, buffer.data(), &replySize),
-              result)
-        << "line " << line;
-    EXPECT_EQ(buffer.substr(0, replySize), reply) << "line " << line;
-    EXPECT_EQ(buffer.find_first_not_of({"#\0", 2}, replySize), std::string::npos)
-        << "line " << line;
-    EXPECT_EQ(buffer.back(), '#') << "line " << line;
+  for (std::string line; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where());
+    const Exchange expected(line);
+    std::string buffer(expected.room + 1, '#');
+    size_t size = expected.room;
+    EXPECT_EQ(CallStructMethod(connection, expected.method, expected.request, expected.requestSize,
+                               buffer.data(), &size),
+              expected.result);
+    EXPECT_EQ(buffer.substr(0, size), expected.reply);
+    EXPECT_EQ(buffer.find_first_not_of({"#\0", 2}, size), std::string::npos);
+    EXPECT_EQ(buffer.back(), '#');
   }
   EXPECT_EQ(testing::internal::GetCapturedStderr(),
             "platform_tests: '/': Is a directory\n"
