@@ -31,7 +31,7 @@ bool SnapshotRecords::Load(size_t size) {
     if (!count) return false;
     if (*count == 0) break;
     filled_ += *count;
-    total_ += *count;
+    empty_ = false;
   }
   return true;
 }

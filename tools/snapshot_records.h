@@ -31,7 +31,7 @@ class SnapshotRecords {
   // At the end: bytes that no record has that was handed out, up to more than one record of them,
   // and whether there were no bytes at all.
   size_t rest() const { return filled_; }
-  bool empty() const { return total_ == 0; }
+  bool empty() const { return empty_; }
 
  private:
   // Reads until so much is there, or the end.
@@ -44,7 +44,7 @@ class SnapshotRecords {
   std::string buffer_;
   size_t filled_ = 0;  // behind the room of one record
   size_t used_ = 0;    // of what is filled, the block that was handed out
-  uint64_t total_ = 0;
+  bool empty_ = true;
 };
 
 }  // namespace tools
