@@ -62,7 +62,10 @@ void AddHelp(CLI::App &app, Action *action) {
   help->callback([=, &app] {
     const CLI::App *subject = name->empty() ? help->get_parent() : FindCommand(app, *name);
     if (subject == nullptr) throw CLI::ValidationError(*name, "not one of " + KnownCommands(app));
-    *action = [=] { return Print(subject->help(name->empty() ? "" : "morwick")); };
+    // Not subject->help(), which says of the program what the sub-command says that was called.
+    const std::string path = name->empty() ? "morwick" : "morwick " + *name;
+    const auto mode = CLI::AppFormatMode::Normal;
+    *action = [=] { return Print(subject->get_formatter()->make_help(subject, path, mode)); };
   });
 }
 
