@@ -40,8 +40,8 @@ class BoundedWriter {
     return Advance(length);
   }
 
-  // Appends what `write`, which is given room for kRoom characters, writes there and returns the
-  // end of.
+  // Appends what `write` writes: it is given room for kRoom characters, and returns the end of what
+  // it wrote there.
   template <size_t kRoom, typename Write>
   bool AppendWritten(Write write) {
     if (Fits(kRoom)) {  // nearly always: no second copy

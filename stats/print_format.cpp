@@ -97,7 +97,7 @@ bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,
   for (size_t i = 0; i < format.conversionCount; ++i) {
     const Conversion &conversion = format.conversions[i];
     const bool appended = conversion.plain
-                              ? PrintNumber(writer, numbers[i], conversion.width, conversion.pad)
+                              ? PrintPadded(writer, numbers[i], conversion.width, conversion.pad)
                               : AppendFormatted(writer, conversion, numbers[i]);
     if (!appended || !AppendText(writer, format.texts[i + 1])) return false;
   }

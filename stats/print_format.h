@@ -48,8 +48,8 @@ enum class Arguments { kOneNumber, kTwoNumbers, kOneText };
 // of) these arguments.
 std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments);
 
-// Appends the number right-aligned in at least `width` (1 to 8) characters.
-inline bool PrintNumber(BoundedWriter &writer, uint32_t number, uint32_t width, char pad) {
+// As WritePadded does, where it fits.
+inline bool PrintPadded(BoundedWriter &writer, uint32_t number, uint32_t width, char pad) {
   return writer.AppendWritten<kPaddedRoom>(
       [=](char *room) { return WritePadded(room, number, width, pad); });
 }

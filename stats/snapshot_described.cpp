@@ -160,7 +160,7 @@ bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *lab
   if (!PrintText(writer, field.format, label)) return false;
   for (uint32_t k = 0; k < field.priorities; ++k, values += kTripleSize) {
     if (k > 0 && !writer.Append("/")) return false;
-    if (!PrintNumber(writer, LoadLittleEndian32(values), width, ' ')) return false;
+    if (!PrintPadded(writer, LoadLittleEndian32(values), width, ' ')) return false;
   }
   return true;
 }

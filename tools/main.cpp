@@ -60,12 +60,13 @@ void AddHelp(CLI::App &app, Action *action) {
   const auto name = std::make_shared<std::string>();
   help->add_option("COMMAND", *name, "The sub-command");
   help->callback([=, &app] {
-    const CLI::App *subject = name->empty() ? help->get_parent() : FindCommand(app, *name);
+    const CLI::App *subject = name->empty() ? &app : FindCommand(app, *name);
     if (subject == nullptr) throw CLI::ValidationError(*name, "not one of " + KnownCommands(app));
-    // Not subject->help(), which says of the program what the sub-command says that was called.
     const std::string path = name->empty() ? "morwick" : "morwick " + *name;
-    const auto mode = CLI::AppFormatMode::Normal;
-    *action = [=] { return Print(subject->get_formatter()->make_help(subject, path, mode)); };
+    *action = [=, &app] {
+      // app.help() would be that of the sub-command in use, which is this one.
+      return Print(app.get_formatter()->make_help(subject, path, CLI::AppFormatMode::Normal));
+    };
   });
 }
 

@@ -189,7 +189,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   };
   SnapshotRecords records(read, recordSize, promised);
   if (!records.Load()) return kBadUsage;
-  if (records.empty()) {
+  if (records.rest() == 0) {
     Complain(snapshot.name, "there is nothing in it");
     return kBadData;
   }

@@ -31,7 +31,6 @@ bool SnapshotRecords::Load(size_t size) {
     if (!count) return false;
     if (*count == 0) break;
     filled_ += *count;
-    empty_ = false;
   }
   return true;
 }

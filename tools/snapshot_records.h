@@ -28,10 +28,8 @@ class SnapshotRecords {
   // How many records were handed out.
   uint64_t count() const { return count_; }
 
-  // At the end: bytes that no record has that was handed out, up to more than one record of them,
-  // and whether there were no bytes at all.
+  // At the end: bytes that no record has that was handed out, up to more than one record of them.
   size_t rest() const { return filled_; }
-  bool empty() const { return empty_; }
 
  private:
   // Reads until so much is there, or the end.
@@ -44,7 +42,6 @@ class SnapshotRecords {
   std::string buffer_;
   size_t filled_ = 0;  // behind the room of one record
   size_t used_ = 0;    // of what is filled, the block that was handed out
-  bool empty_ = true;
 };
 
 }  // namespace tools

@@ -29,7 +29,7 @@ constexpr double kSwing = 5'000;
 // array is a histogram: each element has half of what the one before it has.
 enum Pace { kByLoad, kByClock };
 struct Counter {
-  uint32_t key;
+  uint32_t id;
   uint32_t elementCount;
   uint64_t start;
   uint64_t growth;
@@ -167,7 +167,7 @@ uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
 
 void AppendStatistics(uint64_t time, Reply *reply) {
   for (const Counter &counter : kStatistics) {
-    reply->Append(counter.key);
+    reply->Append(counter.id);
     reply->Append(counter.elementCount);
     for (uint32_t i = 0; i < counter.elementCount; ++i) reply->Append(ElementAt(counter, i, time));
   }
@@ -176,7 +176,7 @@ void AppendStatistics(uint64_t time, Reply *reply) {
 // Counters of 32 bits stay where they end.
 void AppendMspStatistics(uint64_t time, Reply *reply) {
   for (const Counter &counter : kMspStatistics) {
-    reply->Append(static_cast<uint16_t>(counter.key));
+    reply->Append(static_cast<uint16_t>(counter.id));
     reply->Append(static_cast<uint16_t>(counter.elementCount * sizeof(uint32_t)));
     for (uint32_t i = 0; i < counter.elementCount; ++i) {
       const uint64_t largest = std::numeric_limits<uint32_t>::max();

@@ -28,7 +28,7 @@ struct Exchange {
     std::string arrow;
     columns >> arrow >> result;
     EXPECT_TRUE(columns && arrow == "->");
-    columns >> reply;
+    std::getline(columns >> std::ws, reply);
     if (reply.starts_with('=')) reply = {static_cast<char>(Number(reply.substr(1))), 0, 0, 0};
   }
 };
