@@ -16,7 +16,7 @@ _morwick() {
   else
     help=$("$program" help "$command" 2>/dev/null) || return
     # The line of the option that wants a value, or else of what comes without one.
-    line=$(grep -E "^  (-.,)?$previous [A-Z]{2}|^  $previous,--[a-z-]+ [A-Z]{2}" <<<"$help") ||
+    line=$([[ $previous == -* ]] && grep -E "^  (-.,)?$previous [A-Z]{2}|^  $previous,--[a-z-]+ [A-Z]{2}" <<<"$help") ||
       line=$(grep -E '^  (FILE|OLD|BUFFER|STREAM)' <<<"$help")
     # Of a pair, words up to the sign, and a file behind it.
     case $line in

@@ -77,7 +77,9 @@ std::optional<int> OwnDescriptor(const std::filesystem::path &link) {
   if (!equivalent(link.parent_path(), "/proc/self/fd", failure)) return std::nullopt;
   const std::optional<uint64_t> number = ParseNumber(link.filename().native(), INT_MAX);
   if (!number) return std::nullopt;
-  return *number == STDOUT_FILENO ? outputDescriptor : static_cast<int>(*number);
+  if (*number == STDOUT_FILENO) return outputDescriptor;
+  const auto own = static_cast<int>(*number);
+  return own == outputDescriptor ? -1 : own;  // nobody else knows that one: it was not open
 }
 
 int64_t MillisecondsNow() {
@@ -132,11 +134,11 @@ std::string DisplayName(const std::string &file) {
   return file == "-" ? "standard input" : file;
 }
 
-Input::Input(const std::string &file)
+Input::Input(const std::string &file, bool showProgress)
     : name_(DisplayName(file)),
       descriptor_(file == "-" ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC)) {
   if (descriptor_ < 0) error_ = errno;
-  if (isatty(STDERR_FILENO) != 0) nextProgress_ = MillisecondsNow() + 1000;
+  if (showProgress && isatty(STDERR_FILENO) != 0) nextProgress_ = MillisecondsNow() + 1000;
   struct stat status = {};
   if (fstat(descriptor_, &status) == 0 && S_ISREG(status.st_mode)) {
     size_ = static_cast<uint64_t>(status.st_size);

@@ -45,10 +45,11 @@ void ForgetMessages();
 std::string DisplayName(const std::string &file);
 
 // The bytes of a file, or of standard input for "-", in blocks as they arrive. Shows progress on a
-// terminal when it takes longer than a second.
+// terminal when it takes longer than a second, unless what is made of the first blocks may be there
+// already.
 class Input {
  public:
-  explicit Input(const std::string &file);
+  explicit Input(const std::string &file, bool showProgress = true);
   ~Input();
   Input(const Input &) = delete;
   Input &operator=(const Input &) = delete;

@@ -179,7 +179,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     promised = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
   }
   std::optional<Input> input;
-  if (!options.live) input.emplace(options.file);
+  if (!options.live) input.emplace(options.file, !OutputIsTerminal());
   size_t taken = 0;
   const auto read = [&](char *bytes, size_t room) -> std::optional<size_t> {
     if (input) return input->Read(bytes, room);
