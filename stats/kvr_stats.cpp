@@ -13,10 +13,10 @@ namespace morwick {
 namespace {
 
 // Keeps the value of a key that has a summary field.
-void SetSummaryField(KVRStatsCxt *ctx, uint32_t id, const uint8_t *values) {
+void SetSummaryField(KVRStatsCxt *ctx, int32_t key, const uint8_t *values) {
   const auto value = LoadLittleEndian64(values);
   const auto low = static_cast<uint32_t>(value);
-  switch (id) {
+  switch (key) {
     case 4: ctx->hostWrites = value; break;
     case 7: ctx->hostReads = value; break;
     case 12: ctx->IND_pool_free = value; break;
@@ -52,9 +52,9 @@ bool KVRAddValueToContext(KVRStatsCxt *ctx, std::string_view prefix, std::string
 
 // Takes over what a known key carries: its summary field and a pair for each of its values. False
 // when memory was refused for a pair; the others are appended all the same.
-bool KVRAddFieldsToContext(KVRStatsCxt *ctx, uint32_t id, std::string_view name,
+bool KVRAddFieldsToContext(KVRStatsCxt *ctx, int32_t key, std::string_view name,
                            const uint8_t *values, uint32_t count) {
-  SetSummaryField(ctx, id, values);
+  SetSummaryField(ctx, key, values);
   if (count == 1) return KVRAddValueToContext(ctx, "", name, LoadLittleEndian64(values));
   return AppendElements(ctx, EntryName(name), values, kWordSize, count);
 }
@@ -71,7 +71,8 @@ bool ParseKVR(KVRStatsCxt *ctx, RecordStream stream) {
     // records behind it, though never past the buffer.
     const KeyRow *row = FindStatsKey(record.id);
     if (row != nullptr && row->elementCount <= stream.wordsLeft() &&
-        !KVRAddFieldsToContext(ctx, row->id, row->name, record.payload, row->elementCount)) {
+        !KVRAddFieldsToContext(ctx, static_cast<int32_t>(row->id), row->name, record.payload,
+                               row->elementCount)) {
       return false;
     }
     stream.Skip(record.length);
