@@ -213,6 +213,8 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   const auto *text = reinterpret_cast<const char *>(header) + sizeof(SnapshotHeader);
   if (*state == 0 && !AppendBanner(writer, numbers, text, capacity)) return {0, false};
   const uint32_t last = numbers.LastRecord(snapshotSize);
+  // Records too short for any number are empty, whatever the table says.
+  if (numbers.recordSize < kNumberSize) *state = std::max(*state, last);
   if (*state >= last) return {0, true};
 
   // Only now: a header without a record to print needs no descriptor table.

@@ -200,7 +200,7 @@ TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
         for (uint64_t capacity = first; capacity < first + 150; ++capacity) {
           for (uint32_t call = 0, state = 0; call < 10; ++call) {
             const Rendered expected = Expected(recordSize, recordCount, banner, capacity, state);
-            const bool printsNone = expected.state == state;
+            const bool printsNone = expected.state == state || recordSize < 4;
             ASSERT_EQ(Render(records, capacity, printsNone ? bare(header) : header, state),
                       expected)
                 << capacity;
