@@ -30,6 +30,10 @@ class KeyTable {
     return &kRows[kPlaceOfId[index] - 1U];
   }
 
+  static constexpr auto ArrayCount() {
+    return std::ranges::count_if(kRows, [](const KeyRow &row) { return row.elementCount > 1; });
+  }
+
   // Over ids, names and element counts of all rows.
   static constexpr uint32_t RowsChecksum() {
     uint32_t sum = Checksum("");

@@ -108,6 +108,7 @@ constexpr auto kRows = std::to_array<KeyRow>({
 
 using Table = KeyTable<kRows>;
 
+static_assert(kRows.size() == 95 && Table::ArrayCount() == 17);
 static_assert(ChecksumIs<Table::RowsChecksum(), 4196365885>());
 
 }  // namespace

@@ -581,6 +581,7 @@ constexpr auto kRows = std::to_array<KeyRow>({
 
 using Table = KeyTable<kRows>;
 
+static_assert(kRows.size() == 568 && Table::ArrayCount() == 100);
 static_assert(ChecksumIs<Table::RowsChecksum(), 1567143984>());
 
 }  // namespace
