@@ -98,18 +98,12 @@ TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
 TEST(SimulatedDriversTest, ServesTheExampleDumps) {
   setenv("GRELLON_SCENARIO", SOURCE "/packaging/scenarios/statistics.toml", 1);
   const uint32_t connection = Connect("VeltoQRN3NVMeController");
-  const struct {
-    uint32_t command;
-    const char *file;
-  } cases[] = {{13, "kvr.bin"},
-               {13, "ftl.bin"},
-               {221, "msp.bin"},
-               {22, "snapshot.bin"},
-               {145, "snapshot_header.bin"}};
-  for (const auto &[command, file] : cases) {
+  const std::pair<uint32_t, std::string> dumps[] = {
+      {13, "kvr"}, {13, "ftl"}, {221, "msp"}, {22, "snapshot"}, {145, "snapshot_header"}};
+  for (const auto &[command, name] : dumps) {
     std::ostringstream dump;
-    dump << std::ifstream(std::string(SOURCE "/examples/") + file).rdbuf();
-    EXPECT_EQ(Read(connection, 9, command), dump.str()) << file;
+    dump << std::ifstream(SOURCE "/examples/" + name + ".bin").rdbuf();
+    EXPECT_EQ(Read(connection, 9, command), dump.str()) << name;
   }
   CloseService(connection);
 }

@@ -113,10 +113,6 @@ TEST(SimulatedOwnBuffersTest, MakesWhatEveryParserUnderstands) {
   setenv("GRELLON_SCENARIO", "", 1);  // as if it were unset
   const uint32_t connection = Connect("VeltoQRN3NVMeController");
   const uint64_t powerOn = 1704067200000;
-  const auto notLess = [](const std::vector<uint64_t> &values,
-                          const std::vector<uint64_t> &before) {
-    return std::equal(values.begin(), values.end(), before.begin(), std::greater_equal());
-  };
   Statistics before;
   uint64_t ageBefore = 0;
   for (const uint64_t time :
@@ -134,7 +130,8 @@ TEST(SimulatedOwnBuffersTest, MakesWhatEveryParserUnderstands) {
     if (ageBefore != 0) {
       EXPECT_EQ(now.ftl != before.ftl, age > ageBefore);
       EXPECT_EQ(now.msp != before.msp, age > ageBefore);
-      EXPECT_TRUE(notLess(now.ftl, before.ftl) && notLess(now.msp, before.msp));
+      EXPECT_TRUE(std::ranges::equal(now.ftl, before.ftl, std::greater_equal()));
+      EXPECT_TRUE(std::ranges::equal(now.msp, before.msp, std::greater_equal()));
     }
     before = std::move(now);
     ageBefore = age;
