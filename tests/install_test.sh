@@ -88,13 +88,25 @@ fi
   morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/examples/latency.gp) >/dev/null
 build_and_consume "$prefix" given
 
-# The program that the README shows, built as it says.
+# The program that the README shows, built as it says, and the loop that the header of snapshots shows.
 (
   cd "$work"
+  build=$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md")
   # shellcheck disable=SC2016  # no commands
   sed -n '/^```c$/,/^```$/{/^```/d;p}' "$source/README.md" >example.c
-  eval "$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md") $flags"
+  eval "$build $flags"
   expect "$(./a.out "$prefix/share/morwick/examples/kvr.bin")" "123456789 sectors written"
+  {
+    printf '#include <%s>\n' morwick/morwick.h stdio.h stdlib.h
+    echo 'static char header[228], snapshot[1 << 20]; int main(void) { fread(header, 1, 228, stdin);'
+    echo 'const uint64_t snapshotSize = fread(snapshot, 1, sizeof snapshot, stdin);'
+    sed -n '/^ \*     uint64_t room/,/^ \*     free/s/^ \*//p' "$prefix/include/morwick/snapshot.h"
+    echo '}'
+  } >example.c
+  eval "$build $flags"
+  cd "$prefix/share/morwick/examples"
+  expect "$(cat snapshot_header.bin snapshot.bin | "$work/a.out")" \
+    "$("$prefix/bin/morwick" snapshot --header snapshot_header.bin snapshot.bin)"
 )
 
 cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \
