@@ -3,6 +3,7 @@
 #include "stats/print_format.h"
 
 #include <algorithm>
+#include <climits>
 #include <cstdio>
 
 namespace morwick {
@@ -52,6 +53,11 @@ std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_vie
 
   Conversion conversion;
   start.copy(conversion.text, start.size() - rest->size());
+  // The C library refuses a larger precision, which would cut nothing off a text.
+  if (type == 's' && precision > INT_MAX) {
+    conversion.text[start.find('.')] = 's';
+    conversion.text[start.find('.') + 1] = '\0';
+  }
   // A precision is a least number of digits, but a largest number of characters of a text.
   conversion.least = std::max(width, type == 's' ? 0 : precision);
   conversion.plain = !hasPrecision && (type == 's' ? width == 0

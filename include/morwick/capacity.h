@@ -17,8 +17,8 @@ extern "C" {
 /*
  * The value rounded to `sig` significant decimal digits, halves up. When more than 18 digits would
  * have to go the result is 0; when the rounded value does not fit 64 bits it is the largest that
- * does. The digits are counted in double precision: just below a power of ten of 15 digits and
- * more, one too many is counted.
+ * does. The digits are counted in double precision: in values just below a power of ten, from 15
+ * digits on, one too many is counted.
  */
 MORWICK_EXPORT uint64_t roundSig(uint64_t value, uint64_t sig);
 

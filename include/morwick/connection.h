@@ -44,6 +44,7 @@ MORWICK_EXPORT uint32_t findNandExporter(NandExporter **row);
  * Finds the first row whose driver is registered and can be opened; a driver that refuses is passed
  * over for the next row. Returns 1 with `*row` set and both handles stored in the row, to be given
  * back with ReleaseIOInterfaces; returns 0 in silence with `*row` at the terminating row otherwise.
+ * A driver that says success without giving a handle is taken: the row's connection is then 0.
  */
 MORWICK_EXPORT int findNandExporterNew(NandExporter **row);
 

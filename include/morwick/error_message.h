@@ -22,8 +22,8 @@ extern "C" {
 MORWICK_EXPORT extern char *GlobalAPIErrorMessage;
 
 /*
- * Formats as printf does and stores at most 1023 characters. Without memory, or with a null format,
- * nothing is stored.
+ * Formats as printf does and stores at most 1023 characters. Without memory for them, or with a
+ * null format, nothing is stored; where printf itself would fail, what it had written before is.
  */
 MORWICK_EXPORT void SetAPIErrorMessage(const char *format, ...)
     __attribute__((format(printf, 1, 2)));

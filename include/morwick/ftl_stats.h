@@ -26,7 +26,8 @@ extern "C" {
  * at the end of the buffer, at a record of the end key 0xFFFF, at a bad header (a key above
  * 0x30000000 or a length past the end), and when an array could not be added; what was parsed
  * before is kept, and so are those elements of that last array that could be added, though they
- * are not counted. Unknown keys and records of length 0 are passed over.
+ * are not counted. Unknown keys are passed over, and so are records of length 0, whatever their
+ * key.
  *
  * Messages (error_message.h) are recorded for a scalar that could not be added (it is counted all
  * the same), for an array whose length differs from its configured one (the smaller number is

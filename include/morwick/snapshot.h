@@ -91,13 +91,16 @@ typedef struct SnapshotDescriptorTable {
 /*
  * One field of a record and how to print it. Kinds: 0 and 1 a 32-bit number; 2 a 32-bit number in
  * thousandths, printed as two numbers, whole and hundredths; 3 triples of 32-bit numbers, one
- * triple for each priority. Other kinds print nothing.
+ * triple for each priority. Other kinds print nothing. Of kind 3 the format is printed with the
+ * text "O", before the first number of each triple, again with "L", before the second ones, and
+ * with "M", before the third ones; the numbers take at least 4, 7 and 5 characters, and a "/"
+ * stands between two.
  */
 typedef struct SnapshotFieldDescriptor {
   uint16_t kind;
   uint16_t unused;
   uint32_t fieldOffset; /* within the record, in bytes */
-  uint32_t fieldSize;   /* in bytes; kind 3 only, 12 for each priority */
+  uint32_t fieldSize;   /* in bytes; kind 3 only, 12 for each priority, a rest is left out */
   char format[16];      /* print format, label included, ended by a NUL */
 } SnapshotFieldDescriptor;
 
@@ -124,7 +127,7 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * and call again. The record that did not fit is passed over and not printed later. A call in which
  * no line was completed yields the empty text, also where it had written the banner. While the
  * banner does not fit, every call returns 0 with the empty text and `*state` at 0. A record whose
- * first described field is 0 prints no line.
+ * first described field begins with 32 bits of 0 is empty and prints no line.
  *
  * To lose no record, come again for the one that did not fit. After a call that completed lines set
  * `*state` back by one: the record then has the buffer to itself. After a call that completed none,
@@ -160,10 +163,11 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * The header is not trusted, but it must be whole: its text, descriptor table and descriptors are
  * read where it says they are, the table only when there is a record to print. Nothing outside
  * `snapshotSize` bytes is read; a record that does not lie in them whole ends the rendering. A
- * descriptor prints nothing when its field lies outside the record or its format has no NUL, or
- * asks for anything that its kind does not supply: one number, for kind 2 two, by d, i, u, o, x or
- * X with any flags, width and precision; for kind 3 one text by s. When the first described field
- * lies outside the record, or there is none, every record counts as empty.
+ * descriptor prints nothing when its number, or one of its triples, lies outside the record or its
+ * format has no NUL, or asks for anything that its kind does not supply: one number, for kind 2
+ * two, by d, i, u, o, x or X; for kind 3 one text by s. Flags, width and precision may be any, but
+ * what is wider than 2^31 - 1 characters fits no buffer. When the 32 bits that tell an empty record
+ * lie outside the record, or no field is described, every record counts as empty.
  */
 MORWICK_EXPORT uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot,
                                                                 uint64_t snapshotSize, char *output,
