@@ -55,8 +55,9 @@ std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_vie
   start.copy(conversion.text, start.size() - rest->size());
   // The C library refuses a larger precision, which would cut nothing off a text.
   if (type == 's' && precision > INT_MAX) {
-    conversion.text[start.find('.')] = 's';
-    conversion.text[start.find('.') + 1] = '\0';
+    char *point = &conversion.text[start.find('.')];
+    point[0] = 's';
+    point[1] = '\0';
   }
   // A precision is a least number of digits, but a largest number of characters of a text.
   conversion.least = std::max(width, type == 's' ? 0 : precision);

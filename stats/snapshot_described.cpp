@@ -217,7 +217,7 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   if (numbers.recordSize < kNumberSize) *state = std::max(*state, last);
   if (*state >= last) return {0, true};
 
-  // Only now: a header without a record to print needs no descriptor table.
+  // Only now: where no record is left the header needs no descriptor table.
   const DescriptorTable table(header + numbers.descriptorTableOffset, numbers.recordSize);
   // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
   if (!table.TellsEmptyRecords()) *state = last;

@@ -88,7 +88,8 @@ fi
   morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/examples/latency.gp) >/dev/null
 build_and_consume "$prefix" given
 
-# The program that the README shows, built as it says, and the loop that the header of snapshots shows.
+# The program that the README shows, built as it says, and the loop that the header of snapshots shows,
+# with so little room that each of its ways is taken.
 (
   cd "$work"
   build=$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md")
@@ -100,7 +101,7 @@ build_and_consume "$prefix" given
     printf '#include <%s>\n' morwick/morwick.h stdio.h stdlib.h
     echo 'static char header[228], snapshot[1 << 20]; int main(void) { fread(header, 1, 228, stdin);'
     echo 'const uint64_t snapshotSize = fread(snapshot, 1, sizeof snapshot, stdin);'
-    sed -n '/^ \*     uint64_t room/,/^ \*     free/s/^ \*//p' "$prefix/include/morwick/snapshot.h"
+    sed -n '/^ \*     uint64_t room/,/^ \*     free/{s/^ \*//; s/4096/16/; p}' "$prefix/include/morwick/snapshot.h"
     echo '}'
   } >example.c
   eval "$build $flags"
