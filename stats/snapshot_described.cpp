@@ -54,6 +54,8 @@ Field ReadField(const uint8_t *descriptor, uint32_t recordSize) {
   field.offset = LoadLittleEndian32(descriptor + offsetof(SnapshotFieldDescriptor, fieldOffset));
   field.priorities =
       LoadLittleEndian32(descriptor + offsetof(SnapshotFieldDescriptor, fieldSize)) / kTripleSize;
+  // Labels alone: nothing is read, wherever the offset points.
+  if (field.kind == Field::kPriorities && field.priorities == 0) field.offset = 0;
 
   const uint64_t size =
       field.kind == Field::kPriorities ? uint64_t{field.priorities} * kTripleSize : kNumberSize;

@@ -13,7 +13,7 @@ void Handle() { TaskSchedulerActivityHandler(nullptr); }
 
 TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
   const NandExporter whole = nand_exporters[0];
-  PlayCases("activity_handler.txt", {"without task scheduler", "other numbers"},
+  PlayCases("activity_handler.txt", {"without task scheduler", "other numbers", "again"},
             [&](Script &script) {
               if (script.contains("without task scheduler")) {
                 nand_exporters[0].getTaskSchedulerSelectors = nullptr;
@@ -23,6 +23,7 @@ TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
                 taskSchedulerSelectors = {50, 51};
               }
               Handle();
+              if (script.contains("again")) Handle();
               nand_exporters[0] = whole;
               taskSchedulerSelectors = {39, 39};
             });

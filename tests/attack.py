@@ -1,7 +1,7 @@
 """Attacks the programs of the release build, as scripts/attack says, and ends with a table. A
 finding is printed with the command that repeats it; the status is 1 then."""
-import itertools, json, os, random, re, resource, select, shlex, shutil, signal, subprocess, sys
-import tempfile, threading, time
+import itertools, json, os, random, re, resource, select, shlex, shutil, signal, struct, subprocess
+import sys, tempfile, threading, time
 from concurrent.futures import ThreadPoolExecutor
 from functools import partial
 from types import SimpleNamespace
@@ -14,24 +14,32 @@ PRELOAD = f"{BUILD}/tests/librefuse_memory.so {BUILD}/tests/libfast_sleep.so"
 STOP = (signal.SIGTERM, signal.SIGINT, signal.SIGHUP)
 MEANINGLESS = (signal.SIGUSR1, signal.SIGPIPE, signal.SIGXFSZ)
 HANDLES = re.compile(rb"still open|already released| is unknown$|of another kind|did not end", re.M)
-CONTROL = re.compile("[\0-\x09\x0b-\x1f\x7f-\x9f\ufffd]")
+STARTED = re.compile(rb"start grellon|Controller found")
+CONTROL = re.compile("[\0-\x09\x0b-\x1f\x7f-\x9f\udc80-\udcff]")
 MOST_OUTPUT = 16 << 20
 
 QUICK = b"schedule = { first_run_after = 0, interval = 0.001, resume_after = 0, runs = %d }\n"
 NVME = b"[[controller]]\nclass = 'VeltoQRN3NVMeController'\npending = 3\n"
 FAULTS = b"refuse_open = [1]\nfail_request = [3]\nfail_close = true\nvanish = [4]\n"
 FILES = (b"statistics = ['kvr.bin', 'ftl.bin']\nmsp = 'msp.bin'\nsnapshot = 'snapshot.bin'\n"
-         b"snapshot_header = 'snapshot_header.bin'\ntelemetry = 'kvr.bin'\n")
+         b"snapshot_header = 'snapshot_header.bin'\ntelemetry = 'kvr.bin'\n"
+         b"[[controller]]\nclass = 'KVRStorage'\nstatistics = ['many.bin', 'more.bin']\n")
 GOOD = {"live.toml": NVME + FILES, "works.toml": QUICK % 1 + NVME, "bad.toml": b"a = \n"}
 GOOD |= {f"faults-{runs}.toml": QUICK % runs + NVME + FAULTS for runs in (5, 50, 100000)}
 for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_header.bin"):
     with open("examples/" + example, "rb") as file:
         GOOD[example] = file.read() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
+# Two thousand entries, too large for a double, whose JSON is larger than the command's buffer; the one
+# with the odd name is cut. Five hundred records and a part of one.
+many = [b"".join(struct.pack("<IIQ", 4, 1, start << 54 | n) for n in range(2000)) for start in (1, 2)]
+GOOD |= {"many.bin": many[0], "more.bin": many[1], "odd\udcff.bin": many[0][:-4]}
+GOOD["long.bin"] = (GOOD["snapshot.bin"] * 2)[:252 * 500 + 9]
 
 PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
 OUTPUTS = {}  # what a shell does with those of "$@"
 with open("tests/cases/attack.txt") as file:
     for kind, words in (line.strip().split(": ", 1) for line in file if line[0] != "#"):
+        words = words.replace("\\xff", "\udcff")  # a byte that is not UTF-8
         if "$@" in words:
             OUTPUTS[kind] = words
         elif kind == "plain":
@@ -67,8 +75,8 @@ def take(name):
 
 
 def run(program, scenario, draw=None, sent=(), ends=(), **environment):
-    """Runs a program to its end, sending signals at random moments: any before there is a line on
-    standard error may end it, and each of `ends`. `fault` is what no program may do."""
+    """Runs a program to its end, sending signals at random moments: any before it has said that it is at
+    work may end it, and each of `ends`. `fault` is what no program may do."""
     global most_memory
     environment |= {"GRELLON_SCENARIO": scenario + ".toml", "LD_PRELOAD": PRELOAD}
     result = SimpleNamespace(fault=None, deaths=[-each for each in ends])
@@ -80,7 +88,7 @@ def run(program, scenario, draw=None, sent=(), ends=(), **environment):
                                    stdin=subprocess.DEVNULL, stdout=output, stderr=errors)
         for each in sent:
             time.sleep(draw.random() * draw.choice((0.003, 0.01, 0.04)))
-            result.deaths += [] if os.fstat(errors.fileno()).st_size > 0 else [-each]
+            result.deaths += [] if STARTED.search(os.pread(errors.fileno(), 4096, 0)) else [-each]
             os.kill(process.pid, each)
         begin, ended = time.monotonic(), os.pidfd_open(process.pid)
         if not select.select([ended], [], [], 15)[0]:
@@ -111,9 +119,14 @@ def same(program, one, other):
     return len({re.sub(rb" +|\d+([-:.]\d+)+", b"", text) for text in (one, other)}) == 1
 
 
-def whole_json(program, output):
+def whole_json(program, output, status=None):
+    """Each line is an object, and the status, where it is given, that of the last one. Of a watch it is
+    that of the worst one."""
+    if "json" not in program:
+        return True
     try:
-        return "json" not in program or all(json.loads(line) for line in output.splitlines())
+        objects = [json.loads(line) for line in output.splitlines()]
+        return not objects or status is None or "watch" in program or objects[-1]["status"] == status
     except ValueError:
         return len(output) == MOST_OUTPUT
 
@@ -132,13 +145,13 @@ def refused_memory():
 
 def refuse(program, scenario, number, good):
     result = run(program, scenario, REFUSE=str(number))
-    named = re.search(rb": out of memory(\n$| after \d+ entries)", result.errors)
+    named = re.search(rb": out of memory(\n| after \d+ entries)", result.errors)
     if program == [GRELLON]:
         return result, ended_well(result.errors) if result.status == 0 else (
             result.status == 2 and (named or result.errors == good.errors))
     if result.status == good.status and same(program, result.output, good.output):
         return result, same(program, result.file, good.file)
-    return result, result.status == 1 and named and whole_json(program, result.output) and (
+    return result, result.status == 1 and named and whole_json(program, result.output, 1) and (
         result.file is None or b"read_success" in result.file)
 
 
@@ -159,6 +172,34 @@ def interrupt(number):
     result = run(program, "live", draw, [last], STOP)
     whole = same(program, result.file, run(program, "live").file)
     return result, whole or result.status in result.deaths and result.file is None
+
+
+def exchange(number):
+    """While a file is written somebody exchanges the link to it for one to a device, or its folder."""
+    here, name, done = folder() + "/there", ("link", "old")[number % 2], threading.Event()
+    os.mkdir(here)
+    fill({"there/old": b"old"})
+    os.symlink("old", here + "/link")
+
+    def exchange_link():
+        while not done.is_set():
+            for target in ("/dev/null", "old"):
+                os.symlink(target, here + "/next")
+                os.rename(here + "/next", here + "/link")
+
+    def exchange_folder():
+        while not done.is_set():
+            os.rename(here, here + ".moved")
+            os.rename(here + ".moved", here)
+
+    somebody = threading.Thread(target=(exchange_link, exchange_folder)[number % 2])
+    somebody.start()
+    result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
+    done.set()
+    somebody.join()
+    good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (b"old", GOOD["kvr.bin"])
+    shutil.rmtree(here)
+    return result, good
 
 
 def outputs():
@@ -197,7 +238,7 @@ def feed(number):
             result.status == 2 and result.errors.count(b"\n") == 1)
     if number % 8 == 0:  # at a terminal
         result = run(["script", "-qec", shlex.join(program), "/dev/null"], scenario)
-        text = result.output.replace(b"\r\n", b"\n").decode(errors="replace")
+        text = result.output.replace(b"\r\n", b"\n").decode(errors="surrogateescape")
         return result, not CONTROL.search(text)
     result = run(program, scenario)
     return result, whole_json(program, result.output) and (
@@ -224,7 +265,7 @@ def carry_out(attack, jobs, pool):
     jobs, end, numbers = list(jobs), float("inf"), itertools.count()
     if SECONDS > 0:  # the first one always
         jobs[1:] = random.Random(SEED).sample(jobs[1:], len(jobs) - 1)
-        end = time.monotonic() + SECONDS / 4
+        end = time.monotonic() + SECONDS / 5
 
     def one(job):
         if time.monotonic() > end:
@@ -233,7 +274,7 @@ def carry_out(attack, jobs, pool):
         if fine and not result.fault:
             return result.took, 0
         kept = f"{ROOT}/{attack}-{next(numbers)}"
-        shutil.copytree(folder(), kept)
+        shutil.copytree(folder(), kept, symlinks=True)
         print(f"{attack}: {result.fault or 'goes wrong'}, status {result.status}:",
               result.command.replace(folder(), kept), flush=True)
         return result.took, 1
@@ -250,7 +291,7 @@ print("seed", SEED, flush=True)
 with ThreadPoolExecutor(os.cpu_count()) as workers:
     table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
         "memory": refused_memory(), "signals": (partial(interrupt, n) for n in range(1000)),
-        "outputs": outputs(),
+        "outputs": outputs(), "links": (partial(exchange, n) for n in range(1000)),
         "bytes": [many_entries, *(partial(feed, n) for n in range(10000))]}.items()]
 print("attack      runs  findings  worst time")
 for row in table:

@@ -65,6 +65,11 @@ TEST(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {
   }
 }
 
+TEST(ConnectionTest, DisconnectsWhateverItIsGiven) {
+  EXPECT_EQ(Play({}, [] { TolkDisconnect(0); }),
+            "closing connection to service failed\n\nclose 0\n");
+}
+
 TEST(ConnectionTest, PassesOverNullPointers) {
   const std::string outcome = Play({}, [] {
     EXPECT_EQ(findNandExporter(nullptr) + TolkConnect(nullptr), 0U);

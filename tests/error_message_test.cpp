@@ -32,6 +32,9 @@ TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
   SetAPIErrorMessage("%s %d", "100%d", 7);
   SetAPIErrorMessage("second");
   EXPECT_EQ(TakeMessage(), "100%d 7");
+  SetAPIErrorMessage("%s", "");
+  SetAPIErrorMessage("an empty message is one, too");
+  EXPECT_EQ(TakeMessage(), "");
   for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
     SetAPIErrorMessage("%s", std::string(length, 'x').c_str());
     EXPECT_EQ(TakeMessage().size(), length < 1023 ? length : 1023U);

@@ -72,9 +72,18 @@ int32_t Result(bool fails) {
   return code.empty() ? INT32_MIN : static_cast<int32_t>(Number(code));
 }
 
+// Handles need all their 32 bits; in the journal the n-th is n.
+constexpr uint32_t kHandleStep = 0x10001;
+
 uint32_t Issue(const std::string &what) {
-  platform.openHandles[++platform.lastHandle] = what;
+  platform.lastHandle += kHandleStep;
+  platform.openHandles[platform.lastHandle] = what;
   return platform.lastHandle;
+}
+
+std::string NameOf(uint32_t handle) {
+  return handle % kHandleStep == 0 ? std::to_string(handle / kHandleStep)
+                                   : "no handle, " + std::to_string(handle);
 }
 
 // Searches are journalled by what they find, however many rows there are.
@@ -84,7 +93,7 @@ void Miss() {
 }
 
 void Return(uint32_t handle, const std::string &what) {
-  EXPECT_EQ(platform.openHandles[handle], what) << handle << " is not open";
+  EXPECT_EQ(platform.openHandles[handle], what) << NameOf(handle) << " is not open";
   platform.openHandles.erase(handle);
 }
 
@@ -99,7 +108,7 @@ std::string Play(const Script &script, const std::function<void()> &body) {
   std::string printed = testing::internal::GetCapturedStdout();
   printed += testing::internal::GetCapturedStderr();
   for (const auto &[handle, what] : platform.openHandles) {
-    ADD_FAILURE() << what << " " << handle << " was left open";
+    ADD_FAILURE() << what << " " << NameOf(handle) << " was left open";
   }
   return printed.empty() ? platform.journal : printed + "\n" + platform.journal;
 }
@@ -171,7 +180,7 @@ uint32_t GetMatchingService(MatchingRequest *request) {
   }
   platform.missed = false;
   const uint32_t service = Issue("service");
-  Write("find ", request->className, " = ", service);
+  Write("find ", request->className, " = ", NameOf(service));
   return service;
 }
 
@@ -179,19 +188,19 @@ int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   EXPECT_EQ(platform.openHandles[service], "service");
   const bool fails = Fails("open");
   *connection = fails || Lists("failing", "handle0") ? 0 : Issue("connection");
-  Write("open ", service, " type ", type, " = ", *connection);
+  Write("open ", NameOf(service), " type ", type, " = ", NameOf(*connection));
   return Result(fails);
 }
 
 int32_t CloseService(uint32_t connection) {
-  Write("close ", connection);
+  Write("close ", NameOf(connection));
   if (connection == 0) return 1;
   Return(connection, "connection");
   return Result(Fails("close"));
 }
 
 int32_t ReleaseObject(uint32_t service) {
-  Write("release ", service);
+  Write("release ", NameOf(service));
   Return(service, "service");
   return Result(Fails("release"));
 }
@@ -202,8 +211,8 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
   const auto *bytes = static_cast<const unsigned char *>(input);
   uint32_t words[2];
   std::memcpy(words, bytes, sizeof words);
-  Write("call ", connection, " method ", selector, ": ", inputSize, " bytes, ", words[0], " ",
-        words[1], " and ", std::count(bytes + 8, bytes + inputSize, 0), " zeros");
+  Write("call ", NameOf(connection), " method ", selector, ": ", inputSize, " bytes, ", words[0],
+        " ", words[1], " and ", std::count(bytes + 8, bytes + inputSize, 0), " zeros");
   const uint32_t cleared = 0;
   EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
   const auto pending = static_cast<uint32_t>(Number(Take("replies", "0")));

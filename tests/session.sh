@@ -36,6 +36,12 @@ le32() {
   done
 }
 
+# Waits, for 20 seconds at most, until a command succeeds.
+await() {
+  for _ in {1..1000}; do "$@" && return; sleep 0.02; done
+  echo "in vain: $*"
+}
+
 # The daemon in the background: start it (with a library preloaded), wait until its log says something,
 # signal and await it.
 start() {
@@ -43,10 +49,8 @@ start() {
   LD_PRELOAD=${1:-} ASAN_OPTIONS=verify_asan_link_order=0 "$GRELLON" >log 2>&1 &
   pid=$!
 }
-wait_for() {
-  for _ in {1..1000}; do [ "$(grep -c -- "$1" log)" -ge "${2:-1}" ] && return; sleep 0.02; done
-  echo "no '$1' in the log"; cat log
-}
+said() { [ "$(grep -c -- "$1" log)" -ge "${2:-1}" ]; }
+wait_for() { await said "$@"; }
 stop() { SECONDS=0; kill "-$1" "$pid"; wait "$pid"; echo "status $?, $([ $SECONDS -le 6 ] && echo "in time" || echo "after $SECONDS s")"; }
 
 perform() {
@@ -71,7 +75,7 @@ command=
   perform
 } >played
 [ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
-diff "$session" played || exit 1
+diff -U6 -F '^\$ ' --label expected --label played "$session" played || exit 1
 ! grep -s -e "still open" -e "already released" complaints || exit 1
 [ ! -s objects ] || python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
 import json, jsonschema, sys

@@ -156,7 +156,7 @@ TEST(DescribedSnapshotTest, PrintsNumbersAsPrintfDoes) {
 // the third record is empty, and the fourth is cut.
 const Fields kCounting = {
     {0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}, {3, 9, 0, 0, "%4s="}, {3, 9, 12, 12, ""}};
-constexpr uint32_t kWords[] = {1, 0, 7, 2, 100000, 7, 0, 5000, 7, 4, 9000000, 7};
+constexpr uint32_t kWords[] = {65536, 0, 7, 2, 100000, 7, 0, 5000, 7, 4, 9000000, 7};
 constexpr size_t kSize = sizeof kWords - 1;
 
 // What a call must do, written down plainly.

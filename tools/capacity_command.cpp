@@ -16,7 +16,7 @@ struct Options {
   std::string format;
 };
 
-void PrintJson(Output &output, const Options &options) {
+Status PrintJson(Output &output, const Options &options) {
   Json json(output, "capacity");
   json.Key("capacities");
   json.BeginArray();
@@ -27,19 +27,20 @@ void PrintJson(Output &output, const Options &options) {
     json.EndObject();
   }
   json.EndArray();
-  json.Finish(kGood);
+  return json.Finish(kGood);
 }
 
 Status PrintCapacities(const Options &options) {
   Output output;
+  Status status = kGood;
   if (options.format == "json") {
-    PrintJson(output, options);
+    status = PrintJson(output, options);
   } else {
     for (const uint32_t megabytes : options.megabytes) {
       output.Write(std::to_string(GetUserCapacityInGB(megabytes)) + "\n");
     }
   }
-  return output.Finish(kGood);
+  return output.Finish(status);
 }
 
 }  // namespace

@@ -47,14 +47,18 @@ Status Diff(const Options &options) {
     status = before->Judge(old);
     status = std::max(status, after->Judge(now));
     changes = FindChanges(*before, *after, options.all, now.subject);
-    if (!changes) status = kBadData;
+    if (!changes) {  // their memory is needed to say so
+      before.reset();
+      after.reset();
+      status = kBadData;
+    }
   }
   Output output;
   if (options.format == "json") {
     Json json(output, "diff", {{"old", options.oldFile}, {"new", options.newFile}});
     json.Member("stream", options.stream);
     PrintChanges(json, changes.value_or(std::vector<Change>()), options.seconds);
-    json.Finish(status);
+    status = json.Finish(status);
   } else if (changes && options.format == "csv") {
     PrintCsv(output, *changes, options.seconds);
   } else if (changes) {

@@ -41,7 +41,7 @@ void PrintNormal(Output &output, const std::vector<Finding> &findings) {
   }
 }
 
-void PrintJson(Output &output, const std::vector<Finding> &findings, Status status) {
+Status PrintJson(Output &output, const std::vector<Finding> &findings, Status status) {
   Json json(output, "find");
   json.Key("controllers");
   json.BeginArray();
@@ -61,7 +61,7 @@ void PrintJson(Output &output, const std::vector<Finding> &findings, Status stat
     json.EndObject();
   }
   json.EndArray();
-  json.Finish(status);
+  return json.Finish(status);
 }
 
 Status Find(const std::string &format) {
@@ -73,7 +73,7 @@ Status Find(const std::string &format) {
   }
   Output output;
   if (format == "json") {
-    PrintJson(output, findings, status);
+    status = PrintJson(output, findings, status);
   } else {
     PrintNormal(output, findings);
   }

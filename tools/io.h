@@ -1,8 +1,6 @@
-// Input, output and complaints of the morwick command.
+// Input and output of the morwick command.
 #ifndef TOOLS_IO_H
 #define TOOLS_IO_H
-
-#include <sys/types.h>
 
 #include <csignal>
 #include <cstdint>
@@ -10,36 +8,23 @@
 #include <optional>
 #include <string>
 #include <string_view>
-#include <vector>
+
+#include "tools/descriptor.h"
+#include "tools/messages.h"
 
 namespace tools {
 
-enum Status {
-  kGood = 0,
-  kBadData = 1,   // no controller; data that is bad or incomplete; output that cannot be written
-  kBadUsage = 2,  // wrong usage; input that cannot be read
-};
-
 // Once, before anything else. Data goes to what was standard output from then on, and everything
 // that the library prints to standard error; streams that were closed are taken by something that
-// cannot be written; memory is limited, so that a hostile dump ends with a message.
+// cannot be written.
 void PrepareStreams();
-void LimitMemory();
 
-// One line on standard error, as it stands; to a terminal without control characters.
-void PrintLine(const std::string &text);
+// Writes everything, waiting where it must. 0, or the number of the error.
+int WriteAll(int descriptor, std::string_view bytes);
 
-// A complaint is one line on standard error, and makes the status of the command bad; a note is a
-// line that does not. Both are kept for the JSON output.
-void Complain(const std::string &subject, const std::string &reason);
-void Note(const std::string &subject, const std::string &reason);
-
-struct Message {
-  std::string severity;
-  std::string text;
-};
-const std::vector<Message> &Messages();
-void ForgetMessages();
+// The descriptor that now stands for what this number meant when the command was started; -1 for
+// one of the command's own.
+int OriginalDescriptor(int number);
 
 // What a file is called in messages; "-" is standard input.
 std::string DisplayName(const std::string &file);
@@ -50,7 +35,7 @@ std::string DisplayName(const std::string &file);
 class Input {
  public:
   explicit Input(const std::string &file, bool showProgress = true);
-  ~Input();
+  ~Input() { ClearProgress(); }
   Input(const Input &) = delete;
   Input &operator=(const Input &) = delete;
 
@@ -69,8 +54,9 @@ class Input {
   void ClearProgress();
 
   std::string name_;
-  int descriptor_;
-  int error_ = 0;  // of opening it
+  Descriptor file_;
+  int descriptor_;  // of the file, or standard input
+  int error_ = 0;   // of opening it
   uint64_t size_ = 0;
   uint64_t read_ = 0;
   bool progressShown_ = false;
@@ -81,12 +67,6 @@ class Input {
 // than `limit` bytes.
 std::optional<std::string> ReadInput(const std::string &file, uint64_t limit);
 
-// Writes a file whole or not at all: beside it first, then renamed, with that mode or as the umask
-// gives it. What is no regular file (a device, a pipe) is written directly, and so is an open
-// descriptor (/dev/stdout, /dev/fd/3). False after a complaint.
-bool WriteFile(const std::string &file, std::string_view bytes,
-               std::optional<mode_t> mode = std::nullopt);
-
 // Standard output, checked: nothing is cut silently. It has a buffer and takes no memory else. To a
 // terminal no control characters are written.
 class Output {
@@ -95,9 +75,13 @@ class Output {
 
   // False when writing has failed; there is no point in going on then.
   bool Write(std::string_view text) {
-    if (text.size() > kRoom - length_) return WriteRoundTheBuffer(text);
-    text.copy(buffer_ + length_, text.size());
-    length_ += text.size();
+    while (text.size() > kRoom - length_) {
+      const size_t part = text.copy(buffer_ + length_, kRoom - length_);
+      length_ += part;
+      text.remove_prefix(part);
+      if (!Flush()) return false;
+    }
+    length_ += text.copy(buffer_ + length_, text.size());
     return error_ == 0;
   }
 
@@ -106,7 +90,8 @@ class Output {
     buffer_[length_++] = c;
   }
 
-  // Writes out what is buffered, for whoever waits for it at the other end of a pipe.
+  // Writes out what is buffered, for whoever waits for it at the other end of a pipe. At a terminal
+  // a character that has come in part waits for the rest of it.
   bool Flush();
 
   // Waits, under that signal mask, for the time to pass or a signal. False when the reader at the
@@ -120,7 +105,6 @@ class Output {
  private:
   static constexpr size_t kRoom = 64 << 10;
 
-  bool WriteRoundTheBuffer(std::string_view text);
   bool WriteOut(std::string_view bytes);
 
   bool terminal_;

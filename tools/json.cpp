@@ -8,6 +8,7 @@ namespace tools {
 
 Json::Json(Output &output, std::string_view command, const std::vector<Source> &sources)
     : stream_{output} {
+  if (!reserve_.IsHeld()) RefuseMemory();
   BeginObject();
   Key("format_version");
   BeginArray();
@@ -36,20 +37,30 @@ void Json::Text(std::string_view text) {
   IsValidText(text) ? PlainText(text) : PlainText(ValidText(text));
 }
 
-void Json::Finish(Status status) {
+void Json::PrintMessage(std::string_view severity, std::string_view text) {
+  BeginObject();
+  Member("severity", severity);
+  Member("text", text);
+  EndObject();
+}
+
+Status Json::Finish(Status status) {
+  if (TakeMemoryRefusal()) {
+    ComplainOfMemory();
+    status = kBadData;
+  }
   Key("messages");
   BeginArray();
-  for (const Message &message : Messages()) {
-    BeginObject();
-    Member("severity", message.severity);
-    Member("text", message.text);
-    EndObject();
+  for (const Message &message : KeptMessages()) PrintMessage(message.severity, message.text);
+  if (LeftOutMessages() > 0) {
+    PrintMessage("note", std::to_string(LeftOutMessages()) + " more messages are left out here");
   }
   EndArray();
   ForgetMessages();
   Member("status", static_cast<uint32_t>(status));
   EndObject();
   stream_.output.Put('\n');
+  return status;
 }
 
 }  // namespace tools

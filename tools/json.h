@@ -11,6 +11,7 @@
 #include <string_view>
 
 #include "tools/io.h"
+#include "tools/memory.h"
 
 namespace tools {
 
@@ -24,9 +25,12 @@ struct Source {
 // stands beside them.
 constexpr uint64_t kLargestExact = uint64_t{1} << 53;
 
+// What is made of memory once the object has begun is little beside the reserve that is held for
+// it: a command reads and compares before.
 class Json {
  public:
-  // Begins the object: what made it, and where the data comes from.
+  // Begins the object: what made it, and where the data comes from. Throws std::bad_alloc, and
+  // writes nothing, where there is no memory to end it.
   Json(Output &output, std::string_view command, const std::vector<Source> &sources = {});
 
   void Key(std::string_view key) { writer_.Key(key.data(), Length(key)); }
@@ -75,8 +79,9 @@ class Json {
     print([&](uint64_t, std::string_view digits) { PlainText(digits); });
   }
 
-  // Ends the object with the messages so far, which are forgotten then, and the status.
-  void Finish(Status status);
+  // Ends the object with the messages so far, which are forgotten then, and the status, which it
+  // returns: it is bad where memory was refused.
+  Status Finish(Status status);
 
  private:
   // What the writer puts its characters into.
@@ -92,6 +97,9 @@ class Json {
     return static_cast<rapidjson::SizeType>(text.size());
   }
 
+  void PrintMessage(std::string_view severity, std::string_view text);
+
+  MemoryReserve reserve_{2 << 20};
   Stream stream_;
   char room_[4096] = {};  // for the writer's stack, which so takes no memory from the heap
   Memory memory_{room_, sizeof room_};

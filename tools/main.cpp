@@ -1,6 +1,7 @@
 // morwick: the command for people and scripts that work with controller statistics.
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
@@ -8,17 +9,10 @@
 #include <new>
 
 #include "tools/commands.h"
+#include "tools/memory.h"
 
 namespace tools {
 namespace {
-
-bool memoryRefused = false;
-
-// Streams swallow the exception, and what they print is cut: at the end it is known all the same.
-void RefuseMemory() {
-  memoryRefused = true;
-  throw std::bad_alloc();
-}
 
 // Before main the argument parser sets itself up, where nobody would catch the exception.
 [[gnu::constructor(101)]] void EndBeforeMainWithoutMemory() {
@@ -70,6 +64,29 @@ void AddHelp(CLI::App &app, Action *action) {
   });
 }
 
+// The parser takes the next word for the value of an option that ends in "=". Returns such an
+// option, or nothing.
+std::string_view OptionWithEmptyValue(int argc, char **argv) {
+  for (int i = 1; i < argc; ++i) {
+    const std::string_view word = argv[i];
+    if (word == "--") break;
+    if (word.starts_with("--") && word.find('=') == word.size() - 1) {
+      return word.substr(0, word.size() - 1);
+    }
+  }
+  return {};
+}
+
+// The same for a value that is a word of its own.
+std::string OptionWithEmptyWord(const CLI::App &command) {
+  for (const CLI::Option *option : command.get_options()) {
+    if (option->nonpositional() && std::ranges::count(option->results(), "") > 0) {
+      return option->get_name();
+    }
+  }
+  return {};
+}
+
 Status Run(int argc, char **argv) {
   CLI::App app("Finds storage controllers and turns what they report into text.", "morwick");
   app.set_version_flag("--version",
@@ -89,6 +106,9 @@ Status Run(int argc, char **argv) {
                                       : "'" + first + "' is no sub-command, those are ") +
                        KnownCommands(app));
   }
+  if (const std::string option(OptionWithEmptyValue(argc, argv)); !option.empty()) {
+    return RefuseUsage(option + ": a value is missing", "help " + first);
+  }
   try {
     app.parse(argc, argv);
   } catch (const CLI::CallForHelp &) {
@@ -97,6 +117,10 @@ Status Run(int argc, char **argv) {
     return Print(version.what() + std::string("\n"));
   } catch (const CLI::Error &error) {
     return RefuseUsage(error.what(), "help " + first);
+  }
+  if (const std::string option = OptionWithEmptyWord(*app.get_subcommands().front());
+      !option.empty()) {
+    return RefuseUsage(option + ": a value is missing", "help " + first);
   }
   return action();
 }
@@ -107,16 +131,14 @@ Status Run(int argc, char **argv) {
 int main(int argc, char **argv) {
   tools::PrepareStreams();
   tools::LimitMemory();
-  std::set_new_handler(tools::RefuseMemory);
   tools::Status status = tools::kBadData;
   try {
     status = tools::Run(argc, argv);
-  } catch (const std::bad_alloc &) {
-    tools::memoryRefused = true;
+  } catch (const std::bad_alloc &) {  // remembered
   } catch (const std::exception &error) {
     std::fprintf(stderr, "morwick: %s\n", error.what());
   }
-  if (!tools::memoryRefused) return status;
-  std::fputs("morwick: out of memory\n", stderr);
+  if (!tools::MemoryWasRefused()) return status;
+  tools::ComplainOfMemory();
   return tools::kBadData;
 }

@@ -12,6 +12,7 @@
 #include "tools/options.h"
 #include "tools/statistics.h"
 #include "tools/text.h"
+#include "tools/write_file.h"
 
 namespace tools {
 namespace {

@@ -3,6 +3,7 @@
 #include "tools/options.h"
 
 #include "tools/controller.h"
+#include "tools/messages.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -11,7 +12,10 @@ void AddFormat(CLI::App *command, std::string *format, const std::vector<std::st
   *format = choices.front();
   command->add_option("-o,--output-format", *format, "How to print")
       ->check(CLI::IsMember(choices))
-      ->capture_default_str();
+      ->capture_default_str()
+      ->each([](const std::string &choice) {
+        if (choice == "json") KeepMessages();
+      });
 }
 
 void AddStream(CLI::App *command, std::string *stream) {
@@ -28,7 +32,6 @@ void AddController(CLI::App *command, std::string *className, const std::string 
 
 void AddWrite(CLI::App *command, std::string *file, const std::string &description) {
   const auto take = [=](const std::string &name) {
-    if (name.empty()) throw CLI::ValidationError("--write", "a file needs a name");
     if (name == "-") throw CLI::ValidationError("--write", "standard output goes without it");
     *file = name;
   };

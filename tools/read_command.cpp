@@ -5,6 +5,7 @@
 #include "tools/commands.h"
 #include "tools/controller.h"
 #include "tools/options.h"
+#include "tools/write_file.h"
 
 namespace tools {
 namespace {

@@ -89,18 +89,25 @@ Snapshot Prepare(const Options &options) {
   return snapshot;
 }
 
-// Calls `print` with each record until it returns false; false when reading has failed.
-template <typename PrintRecord>
-bool ForEachRecord(Output &output, SnapshotRecords &records, PrintRecord print) {
-  for (;;) {
+// Calls `take` with each record, and `goesOn` after each block that came, until that returns false.
+// False when reading has failed.
+template <typename TakeRecord, typename GoesOn>
+bool ForEachRecord(SnapshotRecords &records, TakeRecord take, GoesOn goesOn) {
+  do {
     const auto block = records.Next();
     if (!block) return false;
     if (block->empty()) return true;
     for (size_t at = 0; at < block->size(); at += sizeof(SnapshotRecord)) {
-      print(block->substr(at, sizeof(SnapshotRecord)));
+      take(block->substr(at, sizeof(SnapshotRecord)));
     }
-    if (!output.Flush()) return true;
-  }
+  } while (goesOn());
+  return true;
+}
+
+// Prints each record when it has come.
+template <typename PrintRecord>
+bool PrintEachRecord(Output &output, SnapshotRecords &records, PrintRecord print) {
+  return ForEachRecord(records, print, [&] { return output.Flush(); });
 }
 
 bool PrintCsv(Output &output, SnapshotRecords &records) {
@@ -111,7 +118,7 @@ bool PrintCsv(Output &output, SnapshotRecords &records) {
     output.Write(column.name);
     output.Put(separator(column));
   }
-  return ForEachRecord(output, records, [&](std::string_view record) {
+  return PrintEachRecord(output, records, [&](std::string_view record) {
     for (const SnapshotColumn &column : kSnapshotColumns) {
       char digits[16];
       const char *end =
@@ -129,7 +136,7 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
   json.EndArray();
   json.Key("rows");
   json.BeginArray();
-  const bool good = ForEachRecord(output, records, [&](std::string_view record) {
+  const bool good = PrintEachRecord(output, records, [&](std::string_view record) {
     json.BeginArray();
     for (const SnapshotColumn &column : kSnapshotColumns) {
       json.Number(LoadLittleEndian32(&record[column.offset]));
@@ -140,30 +147,24 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
   return good;
 }
 
-// Says where the records end, when that is not as promised. What was printed is whole also when
-// there is no memory for it.
+// Says where the records end, when that is not as promised.
 Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, size_t recordSize,
                 uint64_t promised) {
   const auto ofPromised = [&] {
     return std::to_string(promised) + " records that " + snapshot.headerName + " promises";
   };
-  try {
-    if (snapshot.header && records.count() < promised) {
-      Complain(snapshot.name,
-               "ends after " + std::to_string(records.count()) + " of " + ofPromised());
-      return kBadData;
-    }
-    if (!snapshot.header && records.rest() > 0) {
-      Complain(snapshot.name,
-               "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
-      return kBadData;
-    }
-    if (records.rest() > recordSize) {  // more than the record that is not printed
-      Note(snapshot.name, "goes on behind the " + ofPromised());
-    }
-  } catch (const std::bad_alloc &) {
-    Complain(snapshot.name, "out of memory");
+  if (snapshot.header && records.count() < promised) {
+    Complain(snapshot.name,
+             "ends after " + std::to_string(records.count()) + " of " + ofPromised());
     return kBadData;
+  }
+  if (!snapshot.header && records.rest() > 0) {
+    Complain(snapshot.name,
+             "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
+    return kBadData;
+  }
+  if (records.rest() > recordSize) {  // more than the record that is not printed
+    Note(snapshot.name, "goes on behind the " + ofPromised());
   }
   return kGood;
 }
@@ -197,7 +198,9 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   bool good = true;
   if (options.summary) {
     SnapshotSummary summary;
-    good = ForEachRecord(output, records, [&](std::string_view record) { summary.Add(record); });
+    // Nothing is written before all records have come: an object that was begun must be ended.
+    good = ForEachRecord(
+        records, [&](std::string_view record) { summary.Add(record); }, [] { return true; });
     if (json == nullptr) {
       summary.Print(output);
     } else {
@@ -225,8 +228,7 @@ Status Print(const Options &options) {
   }
   Json json(output, "snapshot", {snapshot.source});
   const Status status = PrintRecords(options, snapshot, output, &json);
-  json.Finish(status);
-  return output.Finish(status);
+  return output.Finish(json.Finish(status));
 }
 
 }  // namespace

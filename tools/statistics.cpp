@@ -2,8 +2,6 @@
 
 #include "tools/statistics.h"
 
-#include <sys/mman.h>
-
 #include <algorithm>
 #include <cerrno>
 #include <charconv>
@@ -12,12 +10,11 @@
 #include <optional>
 #include <utility>
 
+#include "tools/memory.h"
 #include "tools/records.h"
 
 namespace tools {
 namespace {
-
-constexpr size_t kReserve = 8 << 20;
 
 static_assert(offsetof(KVRStatsCxt, namesHead) == offsetof(GenericParserCxt, namesHead));
 static_assert(offsetof(KVRStatsCxt, valuesHead) == offsetof(GenericParserCxt, valuesHead));
@@ -71,7 +68,7 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
     : row_(dump.row), stream_(stream) {
   const auto size = static_cast<uint32_t>(dump.bytes.size());
   // After a parse that took all the memory that there is, what it gave is to be printed.
-  void *reserve = mmap(nullptr, kReserve, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  MemoryReserve reserve(8 << 20);
   errno = 0;
   if (stream == "kvr") {
     result_ = static_cast<uint64_t>(row_->parseBufferToCxt(&context_.kvr, dump.bytes.data(), size));
@@ -81,7 +78,7 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
     result_ = row_->mspParseBufferToCxt(&context_.generic, dump.bytes.data(), size);
   }
   outOfMemory_ = errno == ENOMEM;  // the heap's own word: not every parser reports each refusal
-  if (reserve != MAP_FAILED) munmap(reserve, kReserve);
+  reserve.GiveUp();
   if (GlobalAPIErrorMessage != nullptr) message_ = GetAPIErrorMessage();
   // The library keeps its first message only; here each dump has its own.
   std::free(std::exchange(GlobalAPIErrorMessage, nullptr));

@@ -140,8 +140,7 @@ Status PrintJson(Output &output, const Options &options, const Dump &dump,
     PrintJsonEntries(json, *statistics);
     status = statistics->Judge(dump);
   }
-  json.Finish(status);
-  return status;
+  return json.Finish(status);
 }
 
 Status PrintText(Output &output, const Options &options, const Dump &dump,

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <charconv>
+#include <cmath>
 #include <cstdio>
 
 namespace tools {
@@ -27,17 +28,19 @@ size_t TakeCharacter(std::string_view text, uint32_t *code) {
   return *code < kLeast[length] || *code > 0x10ffff || surrogate ? 0 : length;
 }
 
-bool IsControl(uint32_t code) {
-  return (code < 0x20 && code != '\n') || (code >= 0x7f && code < 0xa0);
-}
+bool IsControl(uint32_t code) { return code < 0x20 || (code >= 0x7f && code < 0xa0); }
+bool IsAnything(uint32_t) { return true; }
+bool IsPrinted(uint32_t code) { return !IsControl(code); }
+bool IsPrintedOrLineEnd(uint32_t code) { return !IsControl(code) || code == '\n'; }
 
-// Copies characters; what is none, and controls where they are not wanted, is replaced.
-std::string Clean(std::string_view text, bool controls, std::string_view replacement) {
+// Copies the characters that are wanted; the others, and what is no character, are replaced.
+std::string Clean(std::string_view text, bool (*isWanted)(uint32_t code),
+                  std::string_view replacement) {
   std::string clean;
   while (!text.empty()) {
     uint32_t code = 0;
     const size_t length = TakeCharacter(text, &code);
-    const bool good = length > 0 && (controls || !IsControl(code));
+    const bool good = length > 0 && isWanted(code);
     clean += good ? text.substr(0, length) : replacement;
     text.remove_prefix(std::max<size_t>(length, 1));
   }
@@ -46,7 +49,19 @@ std::string Clean(std::string_view text, bool controls, std::string_view replace
 
 }  // namespace
 
-std::string Printable(std::string_view text) { return Clean(text, false, "?"); }
+std::string PrintableLine(std::string_view line) { return Clean(line, IsPrinted, "?"); }
+
+std::string PrintableText(std::string_view text) { return Clean(text, IsPrintedOrLineEnd, "?"); }
+
+size_t IncompleteEnd(std::string_view text) {
+  for (size_t length = 1; length <= std::min<size_t>(text.size(), 3); ++length) {
+    const auto byte = static_cast<unsigned char>(text[text.size() - length]);
+    if (byte >= 0x80 && byte < 0xc0) continue;  // not the first of its character
+    const size_t needed = byte < 0xc0 ? 1 : byte < 0xe0 ? 2 : byte < 0xf0 ? 3 : 4;
+    return needed > length ? length : 0;
+  }
+  return 0;
+}
 
 bool IsValidText(std::string_view text) {
   while (!text.empty()) {
@@ -58,7 +73,7 @@ bool IsValidText(std::string_view text) {
   return true;
 }
 
-std::string ValidText(std::string_view text) { return Clean(text, true, "\xef\xbf\xbd"); }
+std::string ValidText(std::string_view text) { return Clean(text, IsAnything, "\xef\xbf\xbd"); }
 
 std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most) {
   uint64_t number = 0;
@@ -75,7 +90,7 @@ std::optional<double> ParseSeconds(std::string_view text) {
   const auto [end, error] =
       std::from_chars(text.data(), text.data() + text.size(), seconds, std::chars_format::fixed);
   const bool whole = error == std::errc() && end == text.data() + text.size();
-  if (!whole || !(seconds >= 0 && seconds <= kMost)) return std::nullopt;
+  if (!whole || !(seconds >= 0 && seconds <= kMost) || std::signbit(seconds)) return std::nullopt;
   return seconds;
 }
 

@@ -9,9 +9,13 @@
 
 namespace tools {
 
-// For a terminal: each control character but the line end, and what is not UTF-8, becomes a
-// question mark.
-std::string Printable(std::string_view text);
+// For a terminal: each control character, and what is not UTF-8, becomes a question mark. In a line
+// that goes for line ends too, which would forge a second line; a text keeps its line ends.
+std::string PrintableLine(std::string_view line);
+std::string PrintableText(std::string_view text);
+
+// How many bytes at the end begin a character of UTF-8 whose rest is not there yet: 0 to 3.
+size_t IncompleteEnd(std::string_view text);
 
 // For JSON: whether all of it is UTF-8; what is not becomes the replacement character.
 bool IsValidText(std::string_view text);

@@ -139,7 +139,7 @@ Status PrintBlock(Output &output, const Options &options, const Reading *old, co
     json.Key("time");
     json.Digits(Seconds(now.time));
     PrintChanges(json, changes, seconds);
-    json.Finish(status);
+    status = json.Finish(status);
   } else if (seconds && options.format == "csv") {
     PrintCsv(output, now, changes, *seconds);
   } else if (seconds) {

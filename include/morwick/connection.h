@@ -66,10 +66,13 @@ MORWICK_EXPORT uint32_t TolkConnect(NandExporter **row);
 MORWICK_EXPORT void TolkDisconnect(uint32_t connection);
 
 /*
- * Fills the record with the first controller's service and connection. Returns 1, or 0 after a
- * message on standard error; the record's handles are then 0 and everything obtained was given
- * back. Close a record before it is opened again: its handles are overwritten, but for a connection
- * that it still holds when no driver is found, which is closed.
+ * Fills the record with the first controller's service and connection, by two searches: one as
+ * findNandExporter does, for the service, and one as TolkConnect does, for the connection. Each
+ * prints its line on standard output, and where a driver comes or goes in between they find two
+ * different controllers; `exporter` is then the row of the second, which the connection is to.
+ * Returns 1, or 0 after a message on standard error; the record's handles are then 0 and everything
+ * obtained was given back. Close a record before it is opened again: its handles are overwritten,
+ * but for a connection that it still holds when no driver is found, which is closed.
  */
 MORWICK_EXPORT int openKVRConnection(KVRConnection *record);
 

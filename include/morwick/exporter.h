@@ -41,8 +41,8 @@ typedef void (*GenericParserRelease)(GenericParserCxt *ctx);
  * row every field is zero or null.
  */
 typedef struct NandExporter {
-  const char *className;   /* driver class name; null only in the terminating row */
-  const char *matchKey;    /* the text that the class is matched by, for tools; not read here */
+  const char *className;   /* searches go by this driver class name; null only in the last row */
+  const char *matchKey;    /* for tools; no search in the library reads it */
   uint32_t connection;     /* written by findNandExporterNew only */
   uint32_t service;        /* written by findNandExporterNew only */
   int32_t exporterParamA;  /* for tools, as is exporterParamB; not read here */

@@ -76,7 +76,9 @@ typedef struct KVRStatsCxt {
  * Returns 1 when the records were read to the end of the buffer. Returns 0, with everything that
  * was parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above
  * 0x30000000 or a length past the end; `exportVersion` is then set to 0) and when memory is
- * refused. A null context or buffer gets 0. No message is recorded.
+ * refused. The entry that was refused memory is missing; the later elements of its array are still
+ * appended, and the records after it are not read. Its summary field is set all the same. A null
+ * context or buffer gets 0. No message is recorded.
  */
 MORWICK_EXPORT int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size);
 

@@ -38,10 +38,11 @@ extern "C" {
  * elements are named by the key's name followed directly by the index (by the name alone when the
  * record holds just one element).
  *
- * Returns the number of elements added. Parsing ends at the end of the buffer, at a record of the
- * end key 0x2FFF, at a record that runs past the end, and when a record could not be added; what
- * was parsed before is kept, and so are those elements of that last record that could be added,
- * though they are not counted. Unknown keys and records of length 0 are passed over.
+ * Returns the number of elements added. Parsing ends at the end of the buffer, where only 1 to 3
+ * bytes are left for the next header (they are not looked at, and there is no message), at a record
+ * of the end key 0x2FFF, at a record that runs past the end, and when a record could not be added;
+ * what was parsed before is kept, and so are those elements of that last record that could be
+ * added, though they are not counted. Unknown keys and records of length 0 are passed over.
  *
  * Messages (error_message.h) are recorded for a null buffer or a size of 0 (result 0), for a record
  * whose length differs from its configured one (as many whole elements as both allow are added),

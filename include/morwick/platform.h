@@ -44,8 +44,9 @@ typedef enum ActivityCriteria { kActivityCheckIn } ActivityCriteria;
 enum { kActivityStateRun = 2, kActivityStateDefer = 3 };
 
 /*
- * The text for matching a service by property: in the exporter table the `matchKey` of classes that
- * are matched so. A platform that calls it something else has the build define it.
+ * The platform's own text for matching a service by property. It stands in the exporter table as
+ * the `matchKey` of some classes, for tools to read: the library itself searches by class name
+ * only. A platform that calls it something else has the build define it.
  */
 #ifndef PLATFORM_PROPERTY_MATCH_KEY
 #define PLATFORM_PROPERTY_MATCH_KEY "PropertyMatch"
@@ -86,7 +87,9 @@ MORWICK_EXPORT int32_t ReleaseObject(uint32_t service);
 /*
  * Calls the driver method `selector` with `inputSize` bytes at `input`. The driver writes at most
  * `*replySize` bytes to `reply`, which is the caller's, and sets `*replySize` to what it wrote; a
- * reply that is longer is cut. Blocks until the controller has answered.
+ * reply that is longer is cut. A call that fails writes nothing to `reply` and sets `*replySize` to
+ * 0, whatever the reason: a handle that is not open is no exception. Blocks until the controller
+ * has answered.
  *
  * The requests of the daemon and of tools are 24 bytes: two 32-bit numbers in the controller's byte
  * order, little-endian, and 16 zero bytes. The first number says what is asked for: it is `second`

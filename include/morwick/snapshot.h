@@ -74,7 +74,7 @@ typedef struct SnapshotHeader {
   uint32_t unused1;
   uint32_t formatVersion; /* decides what the banner is */
   uint32_t recordSize;    /* bytes from one record to the next */
-  uint32_t recordCount;   /* the last one is never printed */
+  uint32_t recordCount;   /* the last one is never printed; 0 is as 1, no record is printed */
   uint32_t unused2[2];
   uint32_t descriptorTableOffset;
   uint32_t unused3[2];
@@ -165,8 +165,10 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * Nothing outside `snapshotSize` bytes is read; a record that does not lie in them whole ends the
  * rendering. A descriptor prints nothing when its field (of kind 3 without the rest) lies outside
  * the record or its format has no NUL, or asks for anything that its kind does not supply: one
- * number, for kind 2 two, by d, i, u, o, x or X; for kind 3 one text by s. The flags -, 0, +, blank
- * and #, width and precision may be any, but what is wider than 2^31 - 1 characters fits no buffer.
+ * number, for kind 2 two, by d, i, u, o, x or X; for kind 3 one text by s. A field of kind 3
+ * without priorities is the exception: nothing is read for it, so it prints its three labels
+ * wherever its offset points. The flags -, 0, +, blank and #, width and precision may be any, but
+ * what is wider than 2^31 - 1 characters fits no buffer.
  * When the 32 bits that tell an empty record lie outside the record, or no field is described,
  * every record counts as empty.
  */

@@ -56,7 +56,7 @@ function(debian_service component service files)
   set(CPACK_DEBIAN_${name}_PACKAGE_CONTROL_EXTRA ${scripts} PARENT_SCOPE)
 endfunction()
 debian_service(morwick morwick-metrics
-  "/var/lib/prometheus/node-exporter/morwick.prom /var/lib/prometheus/node-exporter/morwick.prom.??????")
+  "/var/lib/prometheus/node-exporter/morwick.prom /var/lib/prometheus/node-exporter/morwick.prom.tmp-??????")
 debian_service(grellon grellon "")
 list(APPEND CPACK_DEBIAN_GRELLON_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/grellon/conffiles)
 

@@ -143,7 +143,6 @@ class Drivers {
     Device *device = DeviceOf(HandleKind::kConnection, connection);
     if (device == nullptr) return kBadHandle;
     const size_t room = *replySize;
-    *replySize = 0;
     if (method != RequestMethod(device->controller->className) || inputSize != kRequestSize) {
       return kBadArgument;
     }
@@ -188,9 +187,14 @@ class Drivers {
       const std::optional<size_t> made = MakeOwnBuffer(command, reply, room);
       if (!made) return kNotOffered;
       size = *made;
-    } else if (const int error = ReadFile(files[next].c_str(), reply, room, &size); error != 0) {
-      Complain(Quoted(files[next]) + ": " + std::strerror(error));
-      return kDeviceError;
+    } else {
+      // Not straight into the reply: where reading fails half-way nothing is to be written there.
+      const auto bytes = std::make_unique_for_overwrite<char[]>(room);
+      if (const int error = ReadFile(files[next].c_str(), bytes.get(), room, &size); error != 0) {
+        Complain(Quoted(files[next]) + ": " + std::strerror(error));
+        return kDeviceError;
+      }
+      std::copy_n(bytes.get(), size, static_cast<char *>(reply));
     }
     // A reply that fills the room may have been cut, and the same is asked for again with more.
     const bool cut = size == room;
@@ -284,7 +288,9 @@ int32_t ReleaseObject(uint32_t service) {
 
 int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
                          size_t inputSize, void *reply, size_t *replySize) {
-  return OrFailure<int32_t>(simulated::kNoMemory, [=] {
+  const int32_t result = OrFailure<int32_t>(simulated::kNoMemory, [=] {
     return Drivers::Instance().Call(connection, selector, input, inputSize, reply, replySize);
   });
+  if (result != simulated::kSuccess) *replySize = 0;
+  return result;
 }

@@ -13,6 +13,7 @@
 #include <cmath>
 #include <limits>
 #include <numbers>
+#include <numeric>
 #include <string_view>
 
 #include "platform/simulated/scenario.h"
@@ -185,10 +186,14 @@ void AppendMspStatistics(uint64_t time, Reply *reply) {
   }
 }
 
+constexpr uint32_t kNotShown = 4'200'000'000;
+
 // The interval that ended in the given second, with slow writes for eight seconds out of two
 // minutes.
 void AppendInterval(uint32_t second, Reply *reply) {
-  std::array<uint32_t, kIntervalSize / sizeof(uint32_t)> interval = {};
+  // What no column shows is far from what they show, so that a wrong offset is seen.
+  std::array<uint32_t, kIntervalSize / sizeof(uint32_t)> interval;
+  std::iota(interval.begin(), interval.end(), kNotShown);
   const auto set = [&](uint32_t offset, uint32_t value) { interval[offset / 4] = value; };
   const uint32_t noise = second * 2654435761U >> 28;  // 0 to 15
   const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{second} * 1000)) + noise;

@@ -16,11 +16,12 @@ namespace simulated {
 namespace {
 
 // What is written to a stream that was closed at the start is to fail, and not to land in whatever
-// is opened next.
+// is opened next. Where there is no /dev/null the root folder does: it cannot be written either.
 void TakeStandardStreams() {
   int descriptor;
   do {
     descriptor = open("/dev/null", O_RDONLY);
+    if (descriptor < 0) descriptor = open("/", O_RDONLY);
   } while (descriptor >= 0 && descriptor <= STDERR_FILENO);
   if (descriptor >= 0) close(descriptor);
 }
@@ -42,24 +43,37 @@ const sigset_t &WaitedFor() {
   return signals;
 }
 
-// Blocked in the main thread before there is another, they never interrupt a pause of the activity.
-void TakeSignals() {
-  pthread_sigmask(SIG_BLOCK, &WaitedFor(), nullptr);
+// Signals that mean nothing to a daemon: what cannot be written fails where it is written.
+void IgnoreSignals() {
   signal(SIGPIPE, SIG_IGN);
   signal(SIGXFSZ, SIG_IGN);
+}
+
+const Scenario *LoadOrEnd() {
+  try {
+    if (const Scenario *scenario = TheScenario()) return scenario;
+  } catch (const std::bad_alloc &) {
+    EndWithoutMemory();
+  }
+  std::exit(2);
+}
+
+const Scenario &Take() {
+  TakeStandardStreams();
+  IgnoreSignals();
+  // Any signal still ends the process here: the scenario may come from a pipe that stays open.
+  const Scenario *scenario = LoadOrEnd();
+  // Blocked in the main thread before there is another, they never interrupt a pause of the
+  // activity.
+  pthread_sigmask(SIG_BLOCK, &WaitedFor(), nullptr);
+  return *scenario;
 }
 
 }  // namespace
 
 const Scenario &TakeProcess() {
-  static const bool taken = (TakeStandardStreams(), TakeSignals(), true);
-  static_cast<void>(taken);
-  try {
-    if (const Scenario *scenario = TheScenario()) return *scenario;
-  } catch (const std::bad_alloc &) {
-    EndWithoutMemory();
-  }
-  std::exit(2);
+  static const Scenario &scenario = Take();
+  return scenario;
 }
 
 void EndWithoutMemory() {

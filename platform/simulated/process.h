@@ -8,9 +8,10 @@
 namespace simulated {
 
 // What every function begins with that only a daemon calls, on its main thread at first. The first
-// call takes the process over: nothing else becomes descriptor 0, 1 or 2, SIGPIPE and SIGXFSZ mean
-// nothing, and SIGTERM, SIGINT, SIGHUP and SIGUSR1 wait for WaitToStop. Then it loads the scenario,
-// without which the process ends with status 2.
+// call takes the process over: nothing else becomes descriptor 0, 1 or 2, and SIGPIPE and SIGXFSZ
+// mean nothing. Then it loads the scenario, without which the process ends with status 2; until
+// that is done any other signal ends it too. From then on SIGTERM, SIGINT, SIGHUP and SIGUSR1 wait
+// for WaitToStop.
 const Scenario &TakeProcess();
 
 // Ends the process for want of memory or of threads: one line, and status 2.

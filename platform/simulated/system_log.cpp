@@ -43,17 +43,22 @@ class Output {
       const size_t length = std::strlen(waiting_.data());
       const ssize_t written = Write(waiting_.data(), length);
       if (written == 0) return false;
-      if (written < 0) ++dropped_;
+      // A line is lost, or with a count of lost lines all those that it counts.
+      if (written < 0) dropped_ += std::max(countWaits_, 1ULL);
       // What is left of a line that was written in part goes on waiting.
       const bool done = written < 0 || static_cast<size_t>(written) == length;
       const size_t gone = done ? length + 1 : static_cast<size_t>(written);
       waitingSize_ -= gone;
       std::memmove(waiting_.data(), waiting_.data() + gone, waitingSize_);
+      if (done) countWaits_ = 0;
     }
     if (dropped_ > 0) {
       std::array<char, 64> message;
       std::snprintf(message.data(), message.size(), "%llu lines of the log were dropped", dropped_);
-      if (Put(message.data())) dropped_ = 0;
+      if (Put(message.data())) {
+        if (waitingSize_ > 0) countWaits_ = dropped_;
+        dropped_ = 0;
+      }
     }
     return waitingSize_ == 0;
   }
@@ -85,6 +90,7 @@ class Output {
   std::array<char, 16 << 10> waiting_ = {};  // lines, each with its NUL
   size_t waitingSize_ = 0;
   unsigned long long dropped_ = 0;
+  unsigned long long countWaits_ = 0;  // in the first line that waits, if that is such a count
 };
 
 class SystemSocket : public Output {

@@ -84,6 +84,8 @@ void CheckSnapshot(uint32_t connection, uint32_t lastSecond) {
   const std::string banner = "- KVR Snapshot - \nSimulated controller\n";
   EXPECT_EQ(described.substr(0, banner.size()), banner);
   EXPECT_EQ(fixed.substr(1337), described.substr(banner.size()) + "\n");
+  // Words that no column is for begin so, each with an end of its own.
+  EXPECT_EQ(fixed.find("42000000"), std::string::npos);
 
   std::vector<SnapshotRecord> records(120);
   ASSERT_EQ(snapshot.size(), records.size() * sizeof records[0]);
@@ -93,7 +95,10 @@ void CheckSnapshot(uint32_t connection, uint32_t lastSecond) {
   for (const SnapshotRecord &record : records) {
     EXPECT_EQ(record.timestamp, ++second);
     const auto *words = reinterpret_cast<const uint32_t *>(&record);
-    EXPECT_LT(*std::max_element(words + 1, words + sizeof record / 4), 1'000'000U);
+    EXPECT_EQ(std::count_if(words + 1, words + sizeof record / 4,
+                            [](uint32_t word) { return word < 1'000'000; }),
+              63 - 1 - 14)
+        << "words that a column is for, but for the timestamp";
     EXPECT_GE(record.nandReads, record.hostReads);
     EXPECT_GE(record.nandWrites, record.hostWrites);
     for (const auto &priorities : {record.reads, record.writes}) {

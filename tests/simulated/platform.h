@@ -7,6 +7,7 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <string>
 
@@ -24,6 +25,21 @@ inline std::string File(const std::string &text) {
   EXPECT_EQ(write(file, text.data(), text.size()), static_cast<ssize_t>(text.size()));
   return std::to_string(file);
 }
+
+// The platform has one scenario a process, so that tests one after the other would disturb each
+// other: ctest runs each in a process of its own.
+class OneTestAProcess : public testing::EmptyTestEventListener {
+  void OnTestProgramStart(const testing::UnitTest &all) override {
+    if (all.test_to_run_count() <= 1) return;
+    std::fputs("These tests need a process each: run ctest, or one of them with --gtest_filter.\n",
+               stderr);
+    std::exit(1);
+  }
+};
+inline const bool kOneTestAProcess = [] {
+  testing::UnitTest::GetInstance()->listeners().Append(new OneTestAProcess);
+  return true;
+}();
 
 inline void Play(const std::string &scenario) {
   setenv("GRELLON_SCENARIO", ("/proc/self/fd/" + File(scenario)).c_str(), 1);

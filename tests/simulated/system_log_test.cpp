@@ -55,6 +55,23 @@ TEST(SimulatedSystemLogTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
   EXPECT_EQ(lines.peek(), EOF);
 }
 
+// The system's log goes away again while the line waits that says how many were dropped before.
+TEST(SimulatedSystemLogTest, CountsAgainWhatALostCountSaid) {
+  Play("");
+  for (const int error : {ECONNREFUSED, ECONNREFUSED, EAGAIN, ECONNREFUSED, EAGAIN, 0}) {
+    systemLogError = error;
+    SystemLog("error %d", error);
+  }
+  // Lost are the first two, with their count the third, the fourth, and none of those that wait.
+  std::istringstream lines(systemLog);
+  for (const std::string text : {"4 lines of the log were dropped", "error 11", "error 0"}) {
+    std::string line;
+    std::getline(lines, line);
+    EXPECT_TRUE(line.ends_with("]: " + text)) << line;
+  }
+  EXPECT_EQ(lines.peek(), EOF);
+}
+
 // In the log 29 characters with the NUL: of the 16 KiB for lines that wait, 564 of them leave one
 // too few for another.
 constexpr char kLine[] = "line %013u";

@@ -1,0 +1,67 @@
+// Memory of the morwick command.
+
+#include "tools/memory.h"
+
+#include <sys/mman.h>
+#include <sys/resource.h>
+
+#include <new>
+#include <utility>
+
+namespace tools {
+namespace {
+
+constexpr rlim_t kMemoryLimit = 1 << 30;
+
+bool refused = false;
+bool refusalTaken = false;
+MemoryReserve *held = nullptr;
+
+void NoteRefusal() {
+  refused = true;
+  refusalTaken = false;
+}
+
+void OnRefusal() {
+  if (held == nullptr) RefuseMemory();
+  NoteRefusal();
+  held->GiveUp();
+}
+
+}  // namespace
+
+void LimitMemory() {
+  std::set_new_handler(OnRefusal);
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)  // these need all there is
+  rlimit limit = {};
+  if (getrlimit(RLIMIT_AS, &limit) != 0 || limit.rlim_cur <= kMemoryLimit) return;
+  limit.rlim_cur = kMemoryLimit;
+  setrlimit(RLIMIT_AS, &limit);
+#endif
+}
+
+void RefuseMemory() {
+  NoteRefusal();
+  throw std::bad_alloc();
+}
+
+bool MemoryWasRefused() { return refused; }
+
+bool TakeMemoryRefusal() { return refused && !std::exchange(refusalTaken, true); }
+
+// Address space is what the limit counts: pages that nobody may touch cost nothing else. It comes
+// from the system, since the heap need not have a room of that size again when it has been full.
+MemoryReserve::MemoryReserve(size_t size)
+    : room_(mmap(nullptr, size, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0)), size_(size) {
+  if (IsHeld()) held = this;
+}
+
+bool MemoryReserve::IsHeld() const { return room_ != MAP_FAILED; }
+
+void MemoryReserve::GiveUp() {
+  if (!IsHeld()) return;
+  held = nullptr;
+  munmap(std::exchange(room_, MAP_FAILED), size_);
+}
+
+}  // namespace tools

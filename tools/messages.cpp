@@ -1,0 +1,70 @@
+// What the morwick command says about its work.
+
+#include "tools/messages.h"
+
+#include <unistd.h>
+
+#include <cstdio>
+#include <new>
+#include <utility>
+
+#include "tools/text.h"
+
+namespace tools {
+namespace {
+
+constexpr size_t kMostKept = 1000;
+
+bool keeping = false;
+std::vector<Message> kept;
+uint64_t leftOut = 0;
+
+void Keep(std::string_view severity, std::string_view text) {
+  if (!keeping) return;
+  try {
+    if (kept.size() < kMostKept) {
+      kept.push_back({severity, std::string(text)});
+      return;
+    }
+  } catch (const std::bad_alloc &) {  // counted below
+  }
+  ++leftOut;
+}
+
+void Say(std::string_view severity, const std::string &subject, const std::string &reason) {
+  const std::string text = subject + ": " + reason;
+  PrintLine(text);
+  Keep(severity, text);
+}
+
+}  // namespace
+
+void PrintLine(const std::string &text) {
+  const bool terminal = isatty(STDERR_FILENO) != 0;
+  std::fprintf(stderr, "morwick: %s\n", terminal ? PrintableLine(text).c_str() : text.c_str());
+}
+
+void Complain(const std::string &subject, const std::string &reason) {
+  Say("error", subject, reason);
+}
+
+void Note(const std::string &subject, const std::string &reason) { Say("note", subject, reason); }
+
+void ComplainOfMemory() {
+  static bool said = false;
+  if (!std::exchange(said, true)) std::fputs("morwick: out of memory\n", stderr);
+  Keep("error", "out of memory");
+}
+
+void KeepMessages() { keeping = true; }
+
+const std::vector<Message> &KeptMessages() { return kept; }
+
+uint64_t LeftOutMessages() { return leftOut; }
+
+void ForgetMessages() {
+  kept.clear();
+  leftOut = 0;
+}
+
+}  // namespace tools

@@ -1,0 +1,178 @@
+// Writes files whole or not at all.
+
+#include "tools/write_file.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <cerrno>
+#include <climits>
+#include <csignal>
+#include <cstdio>
+#include <cstring>
+#include <filesystem>
+#include <random>
+
+#include "tools/descriptor.h"
+#include "tools/io.h"
+#include "tools/text.h"
+
+namespace tools {
+namespace {
+
+using std::filesystem::path;
+
+constexpr int kMostLinks = 40;  // the kernel's own limit
+constexpr std::string_view kTemporary = ".tmp-";
+constexpr size_t kRandomLetters = 6;
+
+// A name in a folder. The folder is held open: what is done there stays there, also when somebody
+// renames it meanwhile.
+struct Place {
+  Descriptor folder;
+  std::string name;
+};
+
+// The place that a path means, seen from a folder. Errors are numbers as in errno, 0 for none.
+int FindPlace(int from, const path &file, Place *place) {
+  // With a dot behind it, so that the kernel takes a link to a folder as one within a path.
+  const path parent = file.parent_path() / ".";
+  Descriptor folder(openat(from, parent.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
+  if (!folder.open()) return errno;
+  place->folder = std::move(folder);
+  place->name = file.filename().empty() ? "." : file.filename().native();
+  return 0;
+}
+
+// The rule that the kernel keeps for opening (fs.protected_symlinks): in a folder where everybody
+// makes files and nobody removes those of others, a link is followed for its owner only, or where
+// it belongs to the owner of the folder.
+bool MayFollow(const struct stat &folder, const struct stat &link) {
+  const bool shared = (folder.st_mode & S_ISVTX) != 0 && (folder.st_mode & S_IWOTH) != 0;
+  return !shared || link.st_uid == geteuid() || link.st_uid == folder.st_uid;
+}
+
+// The descriptor of this process that a link such as /proc/self/fd/1 stands for: what it leads to
+// is to be written through it, and not replaced.
+std::optional<int> OwnDescriptor(const struct stat &folder, const std::string &name) {
+  for (const char *own : {"/proc/self/fd", "/proc/thread-self/fd"}) {
+    struct stat descriptors = {};
+    if (stat(own, &descriptors) != 0 || descriptors.st_dev != folder.st_dev ||
+        descriptors.st_ino != folder.st_ino) {
+      continue;
+    }
+    const std::optional<uint64_t> number = ParseNumber(name, INT_MAX);
+    if (!number) return std::nullopt;
+    return OriginalDescriptor(static_cast<int>(*number));
+  }
+  return std::nullopt;
+}
+
+// What stands at a place: nothing, something to be replaced, or something to be written directly.
+struct Target {
+  Place place;
+  bool isFile = true;             // a regular file, or nothing yet
+  std::optional<int> descriptor;  // of this process, which stands for it
+};
+
+// Follows one link, from the place where it stands.
+int FollowLink(int link, Target *target) {
+  std::array<char, PATH_MAX> text;
+  const ssize_t length = readlinkat(link, "", text.data(), text.size());
+  if (length < 0) return errno;
+  const path leadsTo = std::string_view(text.data(), static_cast<size_t>(length));
+  Place next;
+  if (const int error = FindPlace(target->place.folder.number(), leadsTo, &next)) return error;
+  target->place = std::move(next);
+  return 0;
+}
+
+// Follows links to what is to be written.
+int FindTarget(const std::string &file, Target *target) {
+  if (const int error = FindPlace(AT_FDCWD, file, &target->place)) return error;
+  for (int links = 0;; ++links) {
+    const Place &place = target->place;
+    const Descriptor entry(
+        openat(place.folder.number(), place.name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+    if (!entry.open()) return errno == ENOENT ? 0 : errno;
+    struct stat folder = {}, status = {};
+    if (fstat(place.folder.number(), &folder) != 0) return errno;
+    if (fstat(entry.number(), &status) != 0) return errno;
+    if (!S_ISLNK(status.st_mode)) {
+      target->isFile = S_ISREG(status.st_mode);
+      return 0;
+    }
+    target->descriptor = OwnDescriptor(folder, place.name);
+    if (target->descriptor) return 0;
+    if (links == kMostLinks) return ELOOP;
+    if (!MayFollow(folder, status)) return EACCES;
+    if (const int error = FollowLink(entry.number(), target)) return error;
+  }
+}
+
+// A name beside that one, which nobody can know before.
+std::string TemporaryName(const std::string &name) {
+  constexpr std::string_view kLetters = "abcdefghijklmnopqrstuvwxyz234567";
+  std::random_device random;
+  std::string temporary = name.substr(0, NAME_MAX - kTemporary.size() - kRandomLetters);
+  temporary += kTemporary;
+  for (size_t i = 0; i < kRandomLetters; ++i) temporary += kLetters[random() % kLetters.size()];
+  return temporary;
+}
+
+// Writes beside a file, under another name, what then takes its place.
+int Replace(const Place &place, const std::string &beside, std::string_view bytes,
+            std::optional<mode_t> mode) {
+  const int folder = place.folder.number();
+  Descriptor file(openat(folder, beside.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+  if (!file.open()) return errno;
+  const mode_t mask = umask(0);
+  umask(mask);
+  int error = WriteAll(file.number(), bytes);
+  if (error == 0 && fchmod(file.number(), mode.value_or(0666 & ~mask)) != 0) error = errno;
+  if (error == 0 && fsync(file.number()) != 0) error = errno;
+  if (file.Close() != 0 && error == 0) error = errno;
+  if (error == 0 && renameat(folder, beside.c_str(), folder, place.name.c_str()) != 0) {
+    error = errno;
+  }
+  if (error != 0) unlinkat(folder, beside.c_str(), 0);
+  return error;
+}
+
+// Writes to a device or a pipe.
+int WriteThrough(const Place &place, std::string_view bytes) {
+  const Descriptor device(openat(place.folder.number(), place.name.c_str(),
+                                 O_WRONLY | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC));
+  if (!device.open()) return errno;
+  struct stat status = {};
+  if (fstat(device.number(), &status) != 0) return errno;
+  // Somebody has put a file there since: half of it would stay as it was.
+  if (S_ISREG(status.st_mode)) return EBUSY;
+  return WriteAll(device.number(), bytes);
+}
+
+int WriteTarget(const std::string &file, std::string_view bytes, std::optional<mode_t> mode) {
+  Target target;
+  if (const int error = FindTarget(file, &target)) return error;
+  if (target.descriptor) return WriteAll(*target.descriptor, bytes);
+  if (!target.isFile) return WriteThrough(target.place, bytes);
+  const std::string beside = TemporaryName(target.place.name);
+  // A signal waits meanwhile: if it ends the command, nothing is left beside the file.
+  sigset_t all, before;
+  sigfillset(&all);
+  sigprocmask(SIG_BLOCK, &all, &before);
+  const int error = Replace(target.place, beside, bytes, mode);
+  sigprocmask(SIG_SETMASK, &before, nullptr);
+  return error;
+}
+
+}  // namespace
+
+bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mode_t> mode) {
+  const int error = WriteTarget(file, bytes, mode);
+  if (error != 0) Complain(file, std::strerror(error));
+  return error == 0;
+}
+
+}  // namespace tools
