@@ -3,9 +3,9 @@
 # nothing else.
 # Usage: exports_test.sh INCLUDE_FOLDER LIBRARY...
 set -euo pipefail
+source "$(dirname "$0")/documented.sh"
 
-documented=$(cat "$1"/morwick/*.h | tr '\n' ' ' | grep -oE 'MORWICK_EXPORT [^][;({]*[][(;]' |
-  grep -v '__attribute__' | sed -E 's/.*[ *]([A-Za-z0-9_]+)[^A-Za-z0-9_]$/\1/' | sort)
+documented=$(documented_symbols "$1")
 # Names with two underscores, those of the C++ standard library's templates, and gcov's mangle_path are
 # the toolchain's own.
 exported=$(nm -D --defined-only "${@:2}" | awk 'NF == 3 {print $3}' | sed 's/@.*//' |

@@ -1,0 +1,45 @@
+#!/usr/bin/env bash
+# The binary interface is that of the baseline, tests/morwick.abi: every public record with its offsets,
+# every enumerator, and the signature of every exported function and global. Then each line of
+# tests/cases/abi_breaks.txt breaks a copy of the headers, and must be noticed.
+# ABI_UPDATE=yes in the environment writes the baseline anew, for what was added: what a tool was built with
+# must stay.
+# Usage: abi_test.sh INCLUDE_FOLDER
+set -euo pipefail
+tests=$(realpath "$(dirname "$0")")
+source "$tests/documented.sh"
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+
+# What the headers in a folder come to. A variable holds each fact by its type: a function's signature, a
+# record, and the number of an enumerator as the length of an array. Usage: describe INCLUDE_FOLDER FILE
+describe() {
+  {
+    echo '#include "morwick/morwick.h"'
+    for name in $(documented_symbols "$1"); do echo "__typeof__($name) *symbol_$name;"; done
+    for name in $(documented_records "$1"); do echo "$name *record_$name;"; done
+    for name in $(documented_enumerators "$1"); do echo "char enumerator_$name[1000 + $name];"; done
+  } >"$work/interface.c"
+  cc -std=c11 -g -shared -fPIC -I "$1" "$work/interface.c" -o "$work/interface.so"
+  abidw --no-corpus-path --no-comp-dir-path --no-show-locs --out-file "$2" "$work/interface.so"
+}
+
+[ "${ABI_UPDATE:-}" != yes ] || describe "$1" "$tests/morwick.abi"
+describe "$1" "$work/now.abi"
+abidiff "$tests/morwick.abi" "$work/now.abi" || {
+  echo "Tools that were built with the headers as they were may read other fields and call other functions."
+  exit 1
+}
+
+breaks=0
+while IFS='|' read -r header edit; do
+  [[ $header == [a-z]* ]] || continue
+  rm -rf "$work/include"
+  cp -r "$1" "$work/include"
+  sed -i -E "$edit" "$work/include/morwick/${header% }"
+  ! cmp -s "$1/morwick/${header% }" "$work/include/morwick/${header% }" || { echo "breaks nothing: $edit"; exit 1; }
+  describe "$work/include" "$work/broken.abi"
+  ! abidiff "$tests/morwick.abi" "$work/broken.abi" >/dev/null || { echo "not noticed: $edit"; exit 1; }
+  breaks=$((breaks + 1))
+done <"$tests/cases/abi_breaks.txt"
+echo "the interface is as it was, and $breaks breaks of it were noticed"
