@@ -10,6 +10,8 @@
 #include "bench/streams.h"
 #include "morwick/morwick.h"
 #include "stats/entry_list.h"
+#include "stats/msp_keys.h"
+#include "stats/stats_keys.h"
 
 namespace {
 
@@ -58,8 +60,8 @@ void PlainStats(Context *context, const Stream &stream, const char *separator) {
     uint32_t header[2];
     std::memcpy(header, position, sizeof header);
     position += 8;
-    const morwick::KeyRow *row = morwick::FindStatsKey(header[0]);
-    PlainAddAll<uint64_t>(context, row->name.data(), separator, position, row->elementCount);
+    const MorwickKey *key = morwick::kStatsKeys.Find(header[0]);
+    PlainAddAll<uint64_t>(context, key->name, separator, position, key->valueCount);
     position += size_t{header[1]} * 8;
   }
 }
@@ -71,8 +73,8 @@ void PlainMSP(GenericParserCxt *context, const Stream &stream) {
     uint16_t header[2];
     std::memcpy(header, position, sizeof header);
     position += 4;
-    const morwick::KeyRow *row = morwick::FindMSPKey(header[0]);
-    PlainAddAll<uint32_t>(context, row->name.data(), "", position, row->elementCount);
+    const MorwickKey *key = morwick::kMSPKeys.Find(header[0]);
+    PlainAddAll<uint32_t>(context, key->name, "", position, key->valueCount);
     position += header[1];
   }
 }
@@ -144,6 +146,51 @@ void PlainMSPAndRelease(const Stream &stream) {
 
 void Heap(const Stream &stream) { BareHeap(stream.entries); }
 
+// What a tool does that wants values without lists: every value goes to its column. The columns,
+// one for each value of each key, are looked up once, by their names.
+template <MorwickStream kKind, typename Value>
+class Columns {
+ public:
+  Columns() {
+    for (uint32_t i = 0; i < MorwickKeyCount(kKind); ++i) {
+      const MorwickKey *key = MorwickFindKey(kKind, MorwickKeyAt(kKind, i)->name);
+      if (key->id >= firstOfId_.size()) firstOfId_.resize(key->id + 1);
+      firstOfId_[key->id] = static_cast<uint32_t>(values_.size());
+      values_.resize(values_.size() + key->valueCount);
+    }
+  }
+
+  void Fill(const Stream &stream) {
+    static_assert(std::endian::native == std::endian::little);
+    uint64_t *values = values_.data();
+    const uint32_t *first = firstOfId_.data();
+    MorwickRecordReader reader;
+    MorwickRecord record;
+    MorwickStartRecords(&reader, kKind, stream.buffer.data(), stream.buffer.size());
+    while (MorwickNextRecord(&reader, &record) != 0) {
+      const auto *bytes = static_cast<const char *>(record.values);
+      uint64_t *column = values + first[record.id];
+      for (uint32_t i = 0; i < record.valueCount; ++i) {
+        Value value;
+        std::memcpy(&value, bytes + i * sizeof value, sizeof value);
+        column[i] = value;
+      }
+    }
+    benchmark::DoNotOptimize(values_.data());
+    benchmark::ClobberMemory();
+  }
+
+ private:
+  std::vector<uint32_t> firstOfId_;
+  std::vector<uint64_t> values_;
+};
+
+template <MorwickStream kKind, typename Value>
+void Walk(const Stream &stream) {
+  static Columns<kKind, Value> columns;
+  columns.Fill(stream);
+}
+
 const bool kRegistered = [] {
   static std::vector<Stream> streams;
   streams.reserve(6);
@@ -157,12 +204,15 @@ const bool kRegistered = [] {
     const Stream &stats = streams.emplace_back(bench::StatsStream(copies));
     const Stream &msp = streams.emplace_back(bench::MSPStream(copies * 10));
     add("KVR/parser", stats, KVR);
+    add("KVR/walk", stats, Walk<kMorwickKVR, uint64_t>);
     add("KVR/plain", stats, PlainKVR);
     add("KVR/heap", stats, Heap);
     add("FTL/parser", stats, FTL);
+    add("FTL/walk", stats, Walk<kMorwickFTL, uint64_t>);
     add("FTL/plain", stats, PlainFTL);
     add("FTL/heap", stats, Heap);
     add("MSP/parser", msp, MSP);
+    add("MSP/walk", msp, Walk<kMorwickMSP, uint32_t>);
     add("MSP/plain", msp, PlainMSPAndRelease);
     add("MSP/heap", msp, Heap);
   }

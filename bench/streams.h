@@ -9,8 +9,7 @@
 #include <string>
 #include <vector>
 
-#include "stats/msp_keys.h"
-#include "stats/stats_keys.h"
+#include "morwick/records.h"
 
 namespace bench {
 
@@ -30,36 +29,32 @@ struct Stream {
   size_t entries = 0;
 };
 
-// Every key that `find` knows below `ids`, so many times over. A header is two of `HeaderPart`: the
-// key, and the number of its elements times `lengthUnit`.
-template <typename HeaderPart, typename Element>
-Stream MakeStream(const morwick::KeyRow *(*find)(uint32_t), uint32_t ids, uint32_t lengthUnit,
-                  int copies) {
+// Every key of a stream, so many times over. A header is two of `HeaderPart`: the key, and the
+// number of its values times `lengthUnit`.
+template <typename HeaderPart, typename Value>
+Stream MakeStream(MorwickStream kind, uint32_t lengthUnit, int copies) {
   std::mt19937_64 random(1);
   Stream stream;
   for (int copy = 0; copy < copies; ++copy) {
-    for (uint32_t id = 0; id < ids; ++id) {
-      const morwick::KeyRow *row = find(id);
-      if (row == nullptr) continue;
-      Append(&stream.buffer, static_cast<HeaderPart>(row->id));
-      Append(&stream.buffer, static_cast<HeaderPart>(row->elementCount * lengthUnit));
-      for (uint32_t i = 0; i < row->elementCount; ++i) {
-        Append(&stream.buffer, static_cast<Element>(MixedMagnitude(random, 8 * sizeof(Element))));
+    for (uint32_t index = 0; index < MorwickKeyCount(kind); ++index) {
+      const MorwickKey &key = *MorwickKeyAt(kind, index);
+      Append(&stream.buffer, static_cast<HeaderPart>(key.id));
+      Append(&stream.buffer, static_cast<HeaderPart>(key.valueCount * lengthUnit));
+      for (uint32_t i = 0; i < key.valueCount; ++i) {
+        Append(&stream.buffer, static_cast<Value>(MixedMagnitude(random, 8 * sizeof(Value))));
       }
-      stream.entries += row->elementCount;
+      stream.entries += key.valueCount;
     }
   }
   return stream;
 }
 
-constexpr uint32_t kIds = 0x10000;  // more than either table has
-
 inline Stream StatsStream(int copies) {
-  return MakeStream<uint32_t, uint64_t>(morwick::FindStatsKey, kIds, 1, copies);
+  return MakeStream<uint32_t, uint64_t>(kMorwickKVR, 1, copies);
 }
 
 inline Stream MSPStream(int copies) {
-  return MakeStream<uint16_t, uint32_t>(morwick::FindMSPKey, kIds, sizeof(uint32_t), copies);
+  return MakeStream<uint16_t, uint32_t>(kMorwickMSP, sizeof(uint32_t), copies);
 }
 
 }  // namespace bench

@@ -4,22 +4,13 @@
 
 #include <cstdio>
 
+#include "morwick/controller.h"
 #include "morwick/platform.h"
-
-namespace {
-
-// The service handle of the row's driver, or 0 when none is registered.
-uint32_t FindService(const NandExporter &row) {
-  MatchingRequest *request = ServiceMatching(row.className);
-  return request == nullptr ? 0 : GetMatchingService(request);
-}
-
-}  // namespace
 
 uint32_t findNandExporter(NandExporter **row) {
   if (row == nullptr) return 0;
   for (*row = nand_exporters; (*row)->className != nullptr; ++*row) {
-    if (const uint32_t service = FindService(**row); service != 0) {
+    if (const uint32_t service = MorwickFindService(*row); service != 0) {
       std::printf("Morwick: findNandExporter: Controller found: %s\n", (*row)->className);
       return service;
     }
@@ -30,7 +21,7 @@ uint32_t findNandExporter(NandExporter **row) {
 int findNandExporterNew(NandExporter **row) {
   if (row == nullptr) return 0;
   for (*row = nand_exporters; (*row)->className != nullptr; ++*row) {
-    const uint32_t service = FindService(**row);
+    const uint32_t service = MorwickFindService(*row);
     if (service == 0) continue;
     uint32_t connection = 0;
     if (OpenService(service, kNandConnectionType, &connection) == 0) {

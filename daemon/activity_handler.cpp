@@ -5,10 +5,10 @@
 
 #include <unistd.h>
 
-#include <cstddef>
 #include <cstdint>
 
 #include "morwick/connection.h"
+#include "morwick/controller.h"
 #include "morwick/exporter.h"
 #include "morwick/little_endian.h"
 
@@ -19,22 +19,10 @@ constexpr uint32_t kRequestArgument = 1025;
 constexpr uint32_t kDeferChecks = 6;  // between two requests, one before each pause
 constexpr uint32_t kPauseSeconds = 5;
 
-struct TaskSchedulerRequest {
-  uint32_t command;
-  uint32_t argument;
-  uint8_t reserved[16];
-};
-static_assert(offsetof(TaskSchedulerRequest, command) == 0);
-static_assert(offsetof(TaskSchedulerRequest, argument) == 4);
-static_assert(offsetof(TaskSchedulerRequest, reserved) == 8);
-static_assert(sizeof(TaskSchedulerRequest) == 24);
-
 // What the controller answers one request with: the work still pending, 0 after a failed request.
 uint32_t RequestWork(uint32_t connection, const NandExporter &row, const SelectorPair &selectors,
                      uint32_t iteration) {
-  const TaskSchedulerRequest request = {.command = LittleEndian32(selectors.second),
-                                        .argument = LittleEndian32(kRequestArgument),
-                                        .reserved = {}};
+  const MorwickRequest request = MorwickMakeRequest(&selectors, kRequestArgument);
   uint32_t reply = 0;
   size_t replySize = sizeof reply;
   const int32_t status = CallStructMethod(connection, row.methodSelector, &request, sizeof request,

@@ -1,11 +1,10 @@
-// The parsers, the array add, and the walk that says where a dump's statistics end. The first byte
-// chooses.
+// The parsers, the array add, and the walk over records, entry by entry beside each parser. The
+// first byte chooses.
 
 #include <cassert>
 #include <cstring>
 
 #include "tests/parsing.h"
-#include "tools/records.h"
 
 namespace {
 
@@ -30,15 +29,18 @@ std::string Parse(Kind kind, const char *data, size_t size) {
   return entries.text + std::to_string(result);
 }
 
-// The walk ends where the parser does: a KVR parse fails at a record that ends it, and the others
-// find nothing from there on.
-void CheckEnd(Kind kind, std::string_view dump) {
-  const char *const kStreams[] = {"kvr", "ftl", "msp"};
-  const tools::StatisticsEnd end = tools::FindEnd(kStreams[kind], dump);
-  assert(end.offset + end.surplus <= dump.size());
+// The walk takes what the parser takes, and ends where it ends: a KVR parse fails at a record that
+// ends it, and the others find nothing from there on.
+void CheckWalk(Kind kind, std::string_view dump) {
+  MorwickRecord end;
+  const std::string walked = WalkedEntries(kind, dump.data(), dump.size(), &end);
   const std::string whole = Parse(kind, dump.data(), dump.size());
+  assert(whole.substr(0, walked.size()) == walked);
+  assert(whole.find('=', walked.size()) == std::string::npos);
+  assert(end.offset <= dump.size() && end.following <= dump.size() - end.offset);
   if (kind == kKVR) {
-    assert(dump.size() < 8 || whole.ends_with('1') == (dump.size() - end.offset < 8));
+    assert(dump.size() < 8 || whole.ends_with('1') == (end.step == kMorwickEndOfBuffer ||
+                                                       end.step == kMorwickPartOfHeader));
   } else {
     assert(whole == Parse(kind, dump.data(), end.offset));
   }
@@ -51,7 +53,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   const auto kind = static_cast<Kind>(data[0] % 4);
   const auto *bytes = reinterpret_cast<const char *>(data) + 1;
   assert(Parse(kind, bytes, size - 1) == Parse(kind, bytes, size - 1));
-  if (kind != kArray) CheckEnd(kind, {bytes, size - 1});
+  if (kind != kArray) CheckWalk(kind, {bytes, size - 1});
   assert(std::strlen(GetAPIErrorMessage()) < 1024);
   return 0;
 }

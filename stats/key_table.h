@@ -8,56 +8,66 @@
 #include <functional>
 #include <string_view>
 
+#include "morwick/records.h"
 #include "stats/checksum.h"
 
 namespace morwick {
 
+// What is written down of a key.
 struct KeyRow {
   uint32_t id;
-  std::string_view name;  // a literal: its data() ends in a NUL
-  uint32_t elementCount;  // 1 for a scalar key
+  const char *name;
+  uint32_t valueCount;
 };
 
-// The table of the given rows, which must stand in id order; in which place each id has its row is
-// worked out at compile time.
-template <const auto &kRows>
-class KeyTable {
- public:
+// Rows in id order, each id once, and for each id from the first to the last the number of its row,
+// counted from 1; 0 without one. Where it is defined nobody sees it, but the lookup is in sight of
+// every caller: called, it takes longer than the rest of a record's walk.
+template <uint32_t kFirstId, size_t kIdCount, size_t kRowCount>
+struct KeyTable {
+  std::array<MorwickKey, kRowCount> rows;
+  std::array<uint16_t, kIdCount> placeOfId;
+
   // In constant time; null for an id without a row.
-  static const KeyRow *Find(uint32_t id) {
-    const uint32_t index = id - kFirst;  // wraps to a large number below the first
-    if (index >= kPlaceOfId.size() || kPlaceOfId[index] == 0) return nullptr;
-    return &kRows[kPlaceOfId[index] - 1U];
+  const MorwickKey *Find(uint32_t id) const {
+    const uint32_t index = id - kFirstId;  // wraps to a large number below the first
+    if (index >= kIdCount || placeOfId[index] == 0) return nullptr;
+    return &rows[placeOfId[index] - 1U];
   }
 
-  static constexpr auto ArrayCount() {
-    return std::ranges::count_if(kRows, [](const KeyRow &row) { return row.elementCount > 1; });
+  constexpr auto ArrayCount() const {
+    return std::ranges::count_if(rows, [](const MorwickKey &row) { return row.valueCount > 1; });
   }
 
-  // Over ids, names and element counts of all rows.
-  static constexpr uint32_t RowsChecksum() {
+  // Over ids, names and value counts of all rows.
+  constexpr uint32_t RowsChecksum() const {
     uint32_t sum = Checksum("");
-    for (const KeyRow &row : kRows) {
-      sum = Checksum(row.name, Checksum(row.elementCount, Checksum(row.id, sum)));
+    for (const MorwickKey &row : rows) {
+      sum = Checksum(row.name, Checksum(row.valueCount, Checksum(row.id, sum)));
     }
     return sum;
   }
 
- private:
-  static_assert(std::ranges::adjacent_find(kRows, std::ranges::greater_equal(), &KeyRow::id) ==
-                    kRows.end(),
-                "the rows of a key table stand in id order, each id once");
-
-  static constexpr uint32_t kFirst = kRows.front().id;
-
-  // For each id from the first to the last the number of its row, counted from 1; 0 without one.
-  static constexpr auto kPlaceOfId = [] {
-    std::array<uint16_t, kRows.back().id - kFirst + 1> places = {};
-    uint16_t place = 0;
-    for (const KeyRow &row : kRows) places[row.id - kFirst] = ++place;
-    return places;
-  }();
+  constexpr bool IsInOrder() const {
+    return rows.front().id == kFirstId && rows.back().id == kFirstId + kIdCount - 1 &&
+           std::ranges::adjacent_find(rows, std::ranges::greater_equal(), &MorwickKey::id) ==
+               rows.end();
+  }
 };
+
+// The table of these rows, as many as it has room for.
+template <typename Table, size_t kRowCount>
+consteval Table MakeKeyTable(const std::array<KeyRow, kRowCount> &rows) {
+  static_assert(std::tuple_size_v<decltype(Table::rows)> == kRowCount);
+  Table table = {};
+  for (uint16_t place = 0; place < kRowCount; ++place) {
+    const auto &[id, name, valueCount] = rows[place];
+    const auto nameLength = static_cast<uint32_t>(std::string_view(name).size());
+    table.rows[place] = {id, name, valueCount, nameLength};
+    table.placeOfId[id - rows.front().id] = static_cast<uint16_t>(place + 1);
+  }
+  return table;
+}
 
 }  // namespace morwick
 

@@ -106,13 +106,13 @@ constexpr auto kRows = std::to_array<KeyRow>({
 });
 // clang-format on
 
-using Table = KeyTable<kRows>;
+constexpr auto kTable = MakeKeyTable<MSPKeyTable>(kRows);
 
-static_assert(kRows.size() == 95 && Table::ArrayCount() == 17);
-static_assert(ChecksumIs<Table::RowsChecksum(), 4196365885>());
+static_assert(kTable.IsInOrder() && kTable.ArrayCount() == 17);
+static_assert(ChecksumIs<kTable.RowsChecksum(), 4196365885>());
 
 }  // namespace
 
-const KeyRow *FindMSPKey(uint32_t id) { return Table::Find(id); }
+constinit const MSPKeyTable kMSPKeys = kTable;
 
 }  // namespace morwick

@@ -6,8 +6,8 @@
 
 namespace morwick {
 
-// The row of the key id, or null for an unknown id.
-const KeyRow *FindMSPKey(uint32_t id);
+using MSPKeyTable = KeyTable<4096, 4119, 95>;
+extern const MSPKeyTable kMSPKeys;
 
 }  // namespace morwick
 

@@ -579,13 +579,13 @@ constexpr auto kRows = std::to_array<KeyRow>({
 });
 // clang-format on
 
-using Table = KeyTable<kRows>;
+constexpr auto kTable = MakeKeyTable<StatsKeyTable>(kRows);
 
-static_assert(kRows.size() == 568 && Table::ArrayCount() == 100);
-static_assert(ChecksumIs<Table::RowsChecksum(), 1567143984>());
+static_assert(kTable.IsInOrder() && kTable.ArrayCount() == 100);
+static_assert(ChecksumIs<kTable.RowsChecksum(), 1567143984>());
 
 }  // namespace
 
-const KeyRow *FindStatsKey(uint32_t id) { return Table::Find(id); }
+constinit const StatsKeyTable kStatsKeys = kTable;
 
 }  // namespace morwick

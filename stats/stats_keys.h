@@ -6,8 +6,8 @@
 
 namespace morwick {
 
-// The row of the key id, or null for an unknown id.
-const KeyRow *FindStatsKey(uint32_t id);
+using StatsKeyTable = KeyTable<1, 659, 568>;
+extern const StatsKeyTable kStatsKeys;
 
 }  // namespace morwick
 

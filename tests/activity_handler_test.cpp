@@ -42,6 +42,13 @@ TEST(ActivityHandlerTest, EndsEveryRunWhateverFails) {
   }
 }
 
+TEST(ActivityHandlerTest, CountsIterationsWithoutEnd) {
+  std::string replies;
+  for (int i = 0; i < 70000; ++i) replies += "1 ";
+  const std::string outcome = Play({{"present", "KVRStorage"}, {"replies", replies + "0"}}, Handle);
+  EXPECT_NE(outcome.find("log iter# 70001 - DONE - no more BDR\n"), std::string::npos);
+}
+
 TEST(ActivityHandlerTest, RegistersAtCheckIn) {
   EXPECT_EQ(Play({}, RegisterTaskSchedulerActivity), "register org.morwick.grellon at check-in\n");
 }

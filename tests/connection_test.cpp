@@ -59,6 +59,36 @@ TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {
   });
 }
 
+// What findNandExporterNew keeps in the row is nobody else's.
+TEST(ConnectionTest, SearchesAnewEachTime) {
+  const std::string outcome = Play({{"present", "KVRStorage"}}, [] {
+    NandExporter *kept = nullptr;
+    NandExporter *found = nullptr;
+    findNandExporterNew(&kept);
+    ReleaseObject(findNandExporter(&found));
+    EXPECT_EQ(found, kept);
+    ReleaseIOInterfaces(kept);
+    kept->connection = kept->service = 0;
+  });
+  EXPECT_TRUE(outcome.ends_with("find KVRStorage = 3\nrelease 3\nclose 2\nrelease 1\n")) << outcome;
+}
+
+TEST(ExporterTest, TheTableBeginsWithoutHandlesAndGettersReturnTheGlobals) {
+  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+    EXPECT_TRUE(row->connection == 0 && row->service == 0) << row->className;
+  }
+  const std::pair<SelectorGetter, SelectorPair *> globals[] = {
+      {KVRGetStatsSelectors, &statsSelector},
+      {KVRMSPGetStatsSelectors, &mspStatsSelector},
+      {KVRGetBandStatsSelectors, &bandStatsSelector},
+      {KVRGetDefectsListSelectors, &defectsListSelector},
+      {KVRGetTelemetryListSelectors, &telemetryListSelectors},
+      {KVRGetTaskSchedulerSelectors, &taskSchedulerSelectors},
+      {KVRGetSnapshotSelectors, &snapshotSelectors},
+      {KVRGetSnapshotHeaderSelectors, &snapshotHeaderSelectors}};
+  for (const auto &[getter, global] : globals) EXPECT_EQ(getter(), global);
+}
+
 TEST(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {
   for (const char *way : {"find", "find new", "connect", "open"}) {
     PlayEveryFailure({{"present", "VeltoQRN3NVMeController KVRStorage"}}, [&] { Use(way); });

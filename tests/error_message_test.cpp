@@ -32,6 +32,12 @@ TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
   SetAPIErrorMessage("%s %d", "100%d", 7);
   SetAPIErrorMessage("second");
   EXPECT_EQ(TakeMessage(), "100%d 7");
+  SetAPIErrorMessage("kept");
+  SetAPIErrorMessage(none, 7);
+  EXPECT_EQ(TakeMessage(), "kept");
+  const wchar_t noCharacter[] = {0xd800, 0};
+  SetAPIErrorMessage("what came before %ls is there", noCharacter);
+  EXPECT_EQ(TakeMessage(), "what came before ");
   SetAPIErrorMessage("%s", "");
   SetAPIErrorMessage("an empty message is one, too");
   EXPECT_EQ(TakeMessage(), "");

@@ -21,7 +21,7 @@ struct MatchingRequest {
 namespace {
 
 const std::set<std::string> kKeys = {"present", "failing",  "failure", "replies",
-                                     "defers",  "commands", "state"};
+                                     "defers",  "commands", "state",   "keeps state"};
 
 struct FakePlatform {
   Script script;
@@ -72,18 +72,23 @@ int32_t Result(bool fails) {
   return code.empty() ? INT32_MIN : static_cast<int32_t>(Number(code));
 }
 
-// Handles need all their 32 bits; in the journal the n-th is n.
+// Handles need all their 32 bits, the highest one too; in the journal the n-th is n.
 constexpr uint32_t kHandleStep = 0x10001;
+constexpr uint32_t kHandleBit = 0x80000000;
+constexpr uint32_t kLeftover = 0xdeadbeef;  // what a failed open may leave; it is no handle
 
 uint32_t Issue(const std::string &what) {
   platform.lastHandle += kHandleStep;
-  platform.openHandles[platform.lastHandle] = what;
-  return platform.lastHandle;
+  platform.openHandles[kHandleBit | platform.lastHandle] = what;
+  return kHandleBit | platform.lastHandle;
 }
 
 std::string NameOf(uint32_t handle) {
-  return handle % kHandleStep == 0 ? std::to_string(handle / kHandleStep)
-                                   : "no handle, " + std::to_string(handle);
+  const uint32_t number = handle & ~kHandleBit;
+  if (handle == kLeftover) return "leftover";
+  if (handle == 0) return "0";
+  return handle != number && number % kHandleStep == 0 ? std::to_string(number / kHandleStep)
+                                                       : "no handle, " + std::to_string(handle);
 }
 
 // Searches are journalled by what they find, however many rows there are.
@@ -127,7 +132,7 @@ void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
       script[key] = line.substr(colon + 2);
       std::istringstream words(key == "failing" ? script[key] : "");
       for (std::string word; words >> word;) {
-        if (word == "handle0") continue;
+        if (word == "handle0" || word == "leftover") continue;
         const size_t mark = std::min(word.find('#'), word.size());
         EXPECT_TRUE(kCalls.contains(word.substr(0, mark))) << "no such call: " << word;
         Number(word.substr(std::min(mark + 1, word.size())));
@@ -187,14 +192,16 @@ uint32_t GetMatchingService(MatchingRequest *request) {
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   EXPECT_EQ(platform.openHandles[service], "service");
   const bool fails = Fails("open");
-  *connection = fails || Lists("failing", "handle0") ? 0 : Issue("connection");
+  *connection = fails                         ? (Lists("failing", "leftover") ? kLeftover : 0)
+                : Lists("failing", "handle0") ? 0
+                                              : Issue("connection");
   Write("open ", NameOf(service), " type ", type, " = ", NameOf(*connection));
   return Result(fails);
 }
 
 int32_t CloseService(uint32_t connection) {
   Write("close ", NameOf(connection));
-  if (connection == 0) return 1;
+  if (connection == 0 || connection == kLeftover) return 1;
   Return(connection, "connection");
   return Result(Fails("close"));
 }
@@ -240,7 +247,7 @@ bool ActivityShouldDefer(Activity *) {
 
 bool SetActivityState(Activity *, int state) {
   Write("set state ", state);
-  return true;
+  return !platform.script.contains("keeps state");
 }
 
 void ExitTransactionClean() { Write("exit clean"); }

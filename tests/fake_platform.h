@@ -9,11 +9,12 @@
 #include <vector>
 
 // Words by key. "present": the driver classes that are registered; "failing": the calls that fail,
-// as "name#n" or, counting all calls, "#n", and "handle0" for an open without a handle (the names
-// are match, lookup, open, close, release and call); "failure": their code, unless it is negative;
-// "replies" and "defers": what controller and scheduler answer in turn, 0 and no when the words
-// have run out; "commands": what each call leaves in the task-scheduler pair; "state": the
-// activity's, unless it is to run.
+// as "name#n" or, counting all calls, "#n" (the names are match, lookup, open, close, release and
+// call), and "handle0" for an open that succeeds without a handle, "leftover" for opens that leave
+// something where they fail; "failure": their code, unless it is negative; "replies" and "defers":
+// what controller and scheduler answer in turn, 0 and no when the words have run out; "commands":
+// what each call leaves in the task-scheduler pair; "state": the activity's, unless it is to run;
+// "keeps state": it cannot be set.
 using Script = std::map<std::string, std::string>;
 
 // What the body did to a fresh platform with this script: what it printed, if anything, and behind

@@ -92,6 +92,18 @@ build_and_consume "$prefix" given
 # with so little room that each of its ways is taken.
 (
   cd "$work"
+  # shellcheck disable=SC2046,SC2086  # lists of flags
+  cc -std=c11 -Wall -Wextra -Werror $flags "$prefix/share/morwick/examples/inspect.c" -o inspect \
+    $(pkg-config --cflags --libs morwick)
+  export LD_LIBRARY_PATH=$prefix/lib
+  if [ "$platform" = simulated ]; then
+    GRELLON_SCENARIO=$scenarios/statistics.toml
+    export GRELLON_SCENARIO
+    expect "$(./inspect 2>/dev/null | grep -v -e ^Morwick -e '^the ')" "$(
+      "$prefix/bin/morwick" stats -s kvr --long "$prefix/share/morwick/examples/kvr.bin" | sed 's/ *: / /'
+      echo "240 bytes of statistics, which end right behind a record")"
+    ./inspect | grep -q "the snapshot header is whole"
+  fi
   build=$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md")
   # shellcheck disable=SC2016  # no commands
   sed -n '/^```c$/,/^```$/{/^```/d;p}' "$source/README.md" >example.c

@@ -9,48 +9,20 @@
 #include "tests/heap.h"
 #include "tests/message.h"
 #include "tests/parsing.h"
+#include "tests/stream_notation.h"
 
 namespace {
-
-// A stream from its notation: "4:1" is a header with key and length, "7" a value, "3..5" the values
-// 3, 4 and 5, "'ab" the bytes a and b. Headers and values are as wide as the kind's; an array is
-// written in bytes.
-std::string Stream(Kind kind, const std::string &notation) {
-  std::string bytes;
-  const size_t width = kind == kArray ? 1 : kind == kMSP ? 4 : 8;
-  const auto put = [&](uint64_t number, size_t size) {
-    for (size_t i = 0; i < size; ++i) bytes += static_cast<char>(number >> (8 * i));
-  };
-  std::istringstream tokens(notation);
-  for (std::string token; tokens >> token;) {
-    const size_t colon = token.find(':');
-    const size_t dots = token.find("..");
-    if (token[0] == '\'') {
-      bytes += token.substr(1);
-    } else if (colon != std::string::npos) {
-      put(Number(token.substr(0, colon)), width / 2);
-      put(Number(token.substr(colon + 1)), width / 2);
-    } else {
-      uint64_t value = Number(token.substr(0, dots));
-      const uint64_t last = dots == std::string::npos ? value : Number(token.substr(dots + 2));
-      do put(value, width);
-      while (value++ != last);
-    }
-  }
-  return bytes;
-}
 
 // Parses once, unaligned, into contexts that hold an entry already, while the allocation with the
 // number `refused` fails. `how` is the kind, with "-context" or "-data" behind it where a null
 // pointer takes their place. What can be seen afterwards, as text; nothing is left behind.
 std::string Parse(const std::string &how, const std::string &stream, size_t refused) {
-  constexpr std::string_view kKinds[] = {"KVR", "FTL", "MSP", "Array"};
-  const auto *name = std::ranges::find(kKinds, how.substr(0, how.find('-')));
+  const std::optional<Kind> named = KindOf(how.substr(0, how.find('-')));
   const std::string null = how.substr(std::min(how.size(), how.find('-')));
-  if (name == std::end(kKinds) || !(null.empty() || null == "-context" || null == "-data")) {
+  if (!named || !(null.empty() || null == "-context" || null == "-data")) {
     return "no such kind: " + how;
   }
-  const auto kind = static_cast<Kind>(name - kKinds);
+  const Kind kind = *named;
   const std::string bytes = Stream(kind, stream);
   const std::vector<char> buffer = Unaligned(bytes);
   Contexts contexts = {};
@@ -65,6 +37,12 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   RefuseAllocation(0);
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
+  if (refused == 0 && null.empty() && kind != kArray) {
+    MorwickRecord end;
+    EXPECT_EQ("validLbas=1 " + WalkedEntries(kind, buffer.data() + 1, bytes.size(), &end),
+              entries.text)
+        << "the walk takes what the parser takes";
+  }
   std::string seen = entries.text + "-> " + std::to_string(result);
   const uint32_t version = contexts.kvr.exportVersion;
   if (version != 99) seen += ", version " + std::to_string(version);
@@ -77,14 +55,6 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   const std::string_view record(reinterpret_cast<const char *>(&contexts), sizeof contexts);
   EXPECT_EQ(record.find_first_not_of('\0'), record.npos) << "released means zero-filled";
   return seen;
-}
-
-// What stands before the next bar, without the blanks around it.
-std::string TakeColumn(std::istringstream &columns) {
-  std::string column;
-  std::getline(columns, column, '|');
-  const size_t first = std::min(column.find_first_not_of(' '), column.size());
-  return column.substr(first, column.find_last_not_of(' ') + 1 - first);
 }
 
 TEST(ParsersTest, ReadGoodAndBadStreams) {

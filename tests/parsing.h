@@ -2,10 +2,12 @@
 #ifndef TESTS_PARSING_H
 #define TESTS_PARSING_H
 
+#include <cstring>
 #include <string>
 
 #include "morwick/morwick.h"
 
+// The first three are those of MorwickStream.
 enum Kind { kKVR, kFTL, kMSP, kArray };
 
 struct Contexts {
@@ -53,6 +55,23 @@ struct Entries {
             context.valuesTail == lastValue;
   }
 };
+
+// The walk over the same records, and its entries as text.
+inline std::string WalkedEntries(Kind kind, const void *data, size_t size, MorwickRecord *end) {
+  std::string text;
+  MorwickRecordReader reader;
+  MorwickStartRecords(&reader, static_cast<MorwickStream>(kind), data, size);
+  while (MorwickNextRecord(&reader, end) != 0) {
+    for (uint32_t i = 0; i < end->valueCount; ++i) {
+      char name[kMorwickNameRoom];
+      std::memset(name, 'x', sizeof name);
+      const uint32_t length = MorwickValueName(reader.stream, end->key, end->valueCount, i, name);
+      text.append(std::strlen(name) == length ? name : "a name of another length").append("=");
+      text.append(std::to_string(MorwickValue(end, i))).append(" ");
+    }
+  }
+  return text;
+}
 
 inline Entries EntriesOf(const Contexts &contexts, Kind kind) {
   return kind == kKVR ? Entries(contexts.kvr) : Entries(contexts.generic);

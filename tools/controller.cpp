@@ -6,23 +6,14 @@
 #include <array>
 #include <cerrno>
 #include <cstdio>
+#include <memory>
 #include <new>
 
-#include "tools/io.h"
+#include "tools/memory.h"
+#include "tools/messages.h"
 
 namespace tools {
 namespace {
-
-constexpr size_t kFirstRoom = 64 << 10;
-constexpr size_t kMostRoom = 16 << 20;
-
-// The shape of every request; a buffer is read with an argument of 0.
-struct Request {
-  uint32_t command;
-  uint32_t argument;
-  uint8_t reserved[16];
-};
-static_assert(sizeof(Request) == 24);
 
 constexpr BufferKind kBufferKinds[] = {
     {"statistics", &NandExporter::getStatsSelectors},
@@ -33,10 +24,6 @@ constexpr BufferKind kBufferKinds[] = {
     {"defects", &NandExporter::getDefectsListSelectors},
     {"telemetry", &NandExporter::getTelemetryListSelectors},
 };
-
-uint32_t FindService(const NandExporter &row) {
-  return GetMatchingService(ServiceMatching(row.className));
-}
 
 // Connects and gives the service back; the connection stays open without it.
 int32_t Open(uint32_t service, uint32_t *connection) {
@@ -77,8 +64,8 @@ NandExporter *FindRow(std::string_view className) {
 
 Presence Probe(const NandExporter &row) {
   errno = 0;
-  const uint32_t service = FindService(row);
-  if (service == 0 && errno == ENOMEM) throw std::bad_alloc();
+  const uint32_t service = MorwickFindService(&row);
+  if (service == 0 && errno == ENOMEM) RefuseMemory();
   if (service == 0) return {};
   uint32_t connection = 0;
   const int32_t result = Open(service, &connection);
@@ -91,14 +78,14 @@ Controller::Controller(const std::string &className, const std::string &what)
     : className_(className), what_(what) {
   NandExporter *row = FindRow(className);
   errno = 0;
-  const uint32_t service = row == nullptr ? findNandExporter(&row) : FindService(*row);
+  const uint32_t service = row == nullptr ? findNandExporter(&row) : MorwickFindService(row);
   if (service != 0) {
     row_ = row;
     const int32_t result = Open(service, &connection_);
     if (connection_ != 0) return;
     Complain(name() + ": " + what, "the connection was refused, result " + Hexadecimal(result));
   } else if (errno == ENOMEM) {
-    throw std::bad_alloc();
+    RefuseMemory();
   } else if (className.empty()) {
     Complain(what, "no controller is present");
   } else {
@@ -122,25 +109,22 @@ std::optional<std::string> Controller::Read(const BufferKind &kind) {
     Complain(subject, "this controller does not offer it");
     return std::nullopt;
   }
-  const Request request = {
-      .command = LittleEndian32((row_->*kind.selectors)()->second), .argument = 0, .reserved = {}};
-  std::string reply;
-  // A reply that fills the room may have been cut: it is asked for again with twice the room.
-  for (size_t room = kFirstRoom; room <= kMostRoom; room *= 2) {
-    reply.resize(room);
-    size_t size = room;
-    const int32_t result = CallStructMethod(connection_, row_->methodSelector, &request,
-                                            sizeof request, reply.data(), &size);
-    if (result != 0) {
-      Complain(subject, "reading failed, result " + Hexadecimal(result));
-      return std::nullopt;
-    }
-    if (size < room) {
-      reply.resize(size);
-      return reply;
-    }
+  MorwickBuffer buffer;
+  const MorwickReadResult result =
+      MorwickReadBuffer(connection_, row_, (row_->*kind.selectors)(), &buffer);
+  const std::unique_ptr<MorwickBuffer, decltype(&MorwickFreeBuffer)> owned(&buffer,
+                                                                           MorwickFreeBuffer);
+  switch (result) {
+    case kMorwickRead: return std::string(static_cast<const char *>(buffer.bytes), buffer.size);
+    case kMorwickReadNoMemory: RefuseMemory();
+    case kMorwickReadFailed:
+      Complain(subject, "reading failed, result " + Hexadecimal(buffer.result));
+      break;
+    case kMorwickReadTooLarge:
+      Complain(subject, "reading failed, the reply fills " + std::to_string(kMorwickLargestReply) +
+                            " bytes");
+      break;
   }
-  Complain(subject, "reading failed, the reply fills " + std::to_string(kMostRoom) + " bytes");
   return std::nullopt;
 }
 

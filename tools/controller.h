@@ -1,4 +1,4 @@
-// Reads buffers from a controller through its driver: an example for other tools, too.
+// Finds controllers, connects to them and reads their buffers.
 #ifndef TOOLS_CONTROLLER_H
 #define TOOLS_CONTROLLER_H
 

@@ -134,7 +134,8 @@ int main(int argc, char **argv) {
   tools::Status status = tools::kBadData;
   try {
     status = tools::Run(argc, argv);
-  } catch (const std::bad_alloc &) {  // remembered
+  } catch (const std::bad_alloc &) {
+    tools::NoteMemoryRefusal();
   } catch (const std::exception &error) {
     std::fprintf(stderr, "morwick: %s\n", error.what());
   }

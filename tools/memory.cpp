@@ -17,14 +17,9 @@ bool refused = false;
 bool refusalTaken = false;
 MemoryReserve *held = nullptr;
 
-void NoteRefusal() {
-  refused = true;
-  refusalTaken = false;
-}
-
 void OnRefusal() {
   if (held == nullptr) RefuseMemory();
-  NoteRefusal();
+  NoteMemoryRefusal();
   held->GiveUp();
 }
 
@@ -40,8 +35,13 @@ void LimitMemory() {
 #endif
 }
 
+void NoteMemoryRefusal() {
+  refused = true;
+  refusalTaken = false;
+}
+
 void RefuseMemory() {
-  NoteRefusal();
+  NoteMemoryRefusal();
   throw std::bad_alloc();
 }
 

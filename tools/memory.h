@@ -11,7 +11,9 @@ namespace tools {
 // C++ is remembered and ends as std::bad_alloc, unless a reserve can be given up for it.
 void LimitMemory();
 
-// For memory that is not C++'s own: what happens when it is refused.
+// For memory that is refused elsewhere than in C++'s own allocation: remembers it, and throws as
+// that does.
+void NoteMemoryRefusal();
 [[noreturn]] void RefuseMemory();
 
 // Whether memory was refused so far. Streams swallow the exception, and what they print is cut: at

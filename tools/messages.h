@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace tools {
@@ -22,6 +23,33 @@ void PrintLine(const std::string &text);
 // line that does not.
 void Complain(const std::string &subject, const std::string &reason);
 void Note(const std::string &subject, const std::string &reason);
+
+// Complaints of one kind, of which a hostile file makes millions: the first few are said, the
+// others counted.
+class RepeatedComplaint {
+ public:
+  explicit RepeatedComplaint(std::string subject) : subject_(std::move(subject)) {}
+
+  // `makeReason` is called for those that are said.
+  template <typename MakeReason>
+  void Add(MakeReason makeReason) {
+    if (++count_ <= kMostSaid) Complain(subject_, makeReason());
+  }
+
+  // Says how many more there were, if any: "7 more" and what they do. True when there was any at
+  // all.
+  bool Finish(const std::string &whatTheyDo) const {
+    if (count_ > kMostSaid)
+      Complain(subject_, std::to_string(count_ - kMostSaid) + " more " + whatTheyDo);
+    return count_ > 0;
+  }
+
+ private:
+  static constexpr uint64_t kMostSaid = 3;
+
+  std::string subject_;
+  uint64_t count_ = 0;
+};
 
 // The complaint that memory was refused. Its line is printed once, and takes no memory.
 void ComplainOfMemory();

@@ -9,8 +9,7 @@
 
 namespace tools {
 
-// Empty when text, descriptor table and descriptors lie inside the file; otherwise which field is
-// wrong, and its value.
+// Empty for a header that is whole, with records of a bearable size; otherwise what is wrong.
 std::string CheckSnapshotHeader(std::string_view file);
 
 // The numbers that a file of at least the header's size begins with.

@@ -18,7 +18,6 @@ constexpr size_t kLegendRoom = 2048;
 constexpr size_t kLineRoom = 1024;  // of the fixed layout: more than the longest line
 constexpr size_t kLeastRoom = 64 << 10;
 constexpr size_t kMostRoom = 8 << 20;
-constexpr uint64_t kMostNamed = 3;  // records that do not fit
 
 // Prints the blocks of a snapshot in the layout of its header. The library is given each block as a
 // snapshot of its own, whose header has the block's record count.
@@ -106,25 +105,21 @@ Status PrintDescribedText(Output &output, SnapshotRecords &records, const std::s
                           const std::string &name) {
   DescribedText text(output, header);
   const std::string tooLong = " a text of " + std::to_string(kMostRoom) + " bytes";
-  uint64_t passedOver = 0;
+  RepeatedComplaint passedOver(name);
   bool good = true;  // reading
   for (bool goesOn = true; goesOn;) {
     const uint64_t first = records.count();
     const auto block = records.Next();
     good = block.has_value();
     if (!good || block->empty()) break;
-    // The first few are named, the others counted: a hostile header makes millions of them.
     const auto passOver = [&](uint32_t index) {
-      if (passedOver++ >= kMostNamed) return;
-      Complain(name, "record " + std::to_string(first + index) + " does not fit" + tooLong);
+      passedOver.Add(
+          [&] { return "record " + std::to_string(first + index) + " does not fit" + tooLong; });
     };
     goesOn = text.Print(*block, passOver) && output.Flush();
   }
-  if (passedOver > kMostNamed) {
-    Complain(name, std::to_string(passedOver - kMostNamed) + " more records do not fit" + tooLong);
-  }
-  if (!good) return kBadUsage;
-  return passedOver > 0 ? kBadData : kGood;
+  const bool all = !passedOver.Finish("records do not fit" + tooLong);
+  return !good ? kBadUsage : all ? kGood : kBadData;
 }
 
 }  // namespace tools

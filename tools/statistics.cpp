@@ -6,18 +6,75 @@
 #include <cerrno>
 #include <charconv>
 #include <cstddef>
-#include <cstdlib>
 #include <optional>
 #include <utility>
 
 #include "tools/memory.h"
-#include "tools/records.h"
 
 namespace tools {
 namespace {
 
 static_assert(offsetof(KVRStatsCxt, namesHead) == offsetof(GenericParserCxt, namesHead));
 static_assert(offsetof(KVRStatsCxt, valuesHead) == offsetof(GenericParserCxt, valuesHead));
+
+MorwickStream StreamOf(std::string_view name) {
+  return name == "msp" ? kMorwickMSP : name == "ftl" ? kMorwickFTL : kMorwickKVR;
+}
+
+// The record that a complaint is about; `where` it is.
+std::string Name(const MorwickRecord &record, const std::string &where) {
+  const std::string name = record.key == nullptr ? "" : std::string(", ") + record.key->name;
+  return "the record " + where + " (key " + std::to_string(record.id) + name + ") ";
+}
+
+std::string AtOffset(const MorwickRecord &record) {
+  return "at offset " + std::to_string(record.offset);
+}
+
+std::string Bytes(uint64_t count) {
+  return std::to_string(count) + (count == 1 ? " byte" : " bytes");
+}
+
+// Why the records end there, when that is no good end.
+std::string FaultOf(const MorwickRecord &end) {
+  switch (end.step) {
+    case kMorwickRecord:
+    case kMorwickEndOfBuffer:
+    case kMorwickEndRecord: break;
+    case kMorwickBadKey: return Name(end, "there") + "has no valid key";
+    case kMorwickTooLong:
+      return Name(end, "there") + "needs " + Bytes(end.length) + ", and " +
+             std::to_string(end.left) + " are left";
+    case kMorwickPartOfHeader: return "the rest, " + Bytes(end.left) + ", is not a whole header";
+  }
+  return "";
+}
+
+// Says which records of a dump are not as configured, and where its statistics end and why.
+Status JudgeRecords(const std::string &subject, MorwickStream stream, std::string_view dump) {
+  MorwickRecordReader reader;
+  MorwickRecord record;
+  RepeatedComplaint otherLengths(subject);
+  MorwickStartRecords(&reader, stream, dump.data(), dump.size());
+  while (MorwickNextRecord(&reader, &record) != 0) {
+    if (record.lengthDiffers == 0) continue;
+    otherLengths.Add([&] {
+      return Name(record, AtOffset(record)) + "has " + Bytes(record.length) + ", and " +
+             std::to_string(uint64_t{record.key->valueCount} * record.valueWidth) +
+             " are configured";
+    });
+  }
+  Status status =
+      otherLengths.Finish("records have another length than is configured") ? kBadData : kGood;
+  if (const std::string fault = FaultOf(record); !fault.empty()) {
+    Complain(subject, "the statistics end " + AtOffset(record) + ": " + fault);
+    status = kBadData;
+  } else if (record.following > 0) {
+    Note(subject, Bytes(record.following) + (record.following == 1 ? " follows" : " follow") +
+                      " the end record at offset " + std::to_string(record.offset));
+  }
+  return status;
+}
 
 // Whether the name is `base` and the number.
 bool IsElement(std::string_view name, std::string_view base, size_t number) {
@@ -79,9 +136,6 @@ Statistics::Statistics(const Dump &dump, std::string_view stream)
   }
   outOfMemory_ = errno == ENOMEM;  // the heap's own word: not every parser reports each refusal
   reserve.GiveUp();
-  if (GlobalAPIErrorMessage != nullptr) message_ = GetAPIErrorMessage();
-  // The library keeps its first message only; here each dump has its own.
-  std::free(std::exchange(GlobalAPIErrorMessage, nullptr));
 }
 
 Statistics::~Statistics() {
@@ -93,31 +147,18 @@ Statistics::~Statistics() {
 }
 
 Status Statistics::Judge(const Dump &dump) const {
-  Status status = kGood;
   const auto complain = [&](const std::string &reason) {
     Complain(dump.subject, reason);
-    status = kBadData;
+    return kBadData;
   };
-  if (dump.bytes.empty()) {
-    complain("there is nothing in it");
-    return status;
-  }
+  if (dump.bytes.empty()) return complain("there is nothing in it");
   if (outOfMemory_) {
     size_t count = 0;
     for (const ContextNode *name = names(); name != nullptr; name = name->next) ++count;
-    complain("out of memory after " + std::to_string(count) + " entries");
-    return status;
+    return complain("out of memory after " + std::to_string(count) + " entries");
   }
-  if (!message_.empty()) complain(message_);
-  const StatisticsEnd end = FindEnd(stream_, dump.bytes);
-  const std::string where = "offset " + std::to_string(end.offset);
-  if (!end.fault.empty()) {
-    complain("the statistics end at " + where + ": " + end.fault);
-  } else if (end.surplus > 0) {
-    Note(dump.subject,
-         "behind the end record at " + where + " follow " + std::to_string(end.surplus) + " bytes");
-  }
-  if (names() == nullptr && status == kGood) complain("no statistics found");
+  const Status status = JudgeRecords(dump.subject, StreamOf(stream_), dump.bytes);
+  if (names() == nullptr && status == kGood) return complain("no statistics found");
   return status;
 }
 
@@ -137,27 +178,14 @@ EntryGroup EntryReader::TakeGroup() {
 }
 
 std::vector<SummaryField> SummaryOf(const Statistics &statistics) {
-  const KVRStatsCxt &summary = statistics.summary();
-  std::vector<SummaryField> fields = {
-      {"exportVersion", {summary.exportVersion}},
-      {"numVirtualBlocks", {summary.numVirtualBlocks}},
-      {"blocksPerVirtualBlock", {summary.blocksPerVirtualBlock}},
-      {"pagesPerVirtualBlock", {summary.pagesPerVirtualBlock}},
-      {"bytesPerPage", {summary.bytesPerPage}},
-      {"hostReads", {summary.hostReads}},
-      {"hostWrites", {summary.hostWrites}},
-      {"numFreeVirtualBlocks", {summary.numFreeVirtualBlocks}},
-      {"wearLevMoves", {summary.wearLevMoves}},
-      {"nandReads", {summary.nandReads}},
-      {"nandWrites", {summary.nandWrites}},
-      {"bandErases", {summary.bandErases}},
-      {"IND_pool_free", {summary.IND_pool_free}},
-      {"IND_pool_count", {summary.IND_pool_count}},
-      {"utilFormatTime", {summary.utilFormatTime}},
-      {"numSleepOps", {summary.numSleepOps}},
-      {"maxHighEnduranceBlockErases", {summary.maxHighEnduranceBlockErases}},
-      {"readCountHisto", {std::begin(summary.readCountHisto), std::end(summary.readCountHisto)}},
-  };
+  std::vector<SummaryField> fields;
+  for (uint32_t i = 0; i < MorwickSummaryFieldCount(); ++i) {
+    const MorwickSummaryField &field = *MorwickSummaryFieldAt(i);
+    fields.push_back({field.name, {}});
+    for (uint32_t k = 0; k < field.valueCount; ++k) {
+      fields.back().values.push_back(MorwickSummaryValue(&statistics.summary(), &field, k));
+    }
+  }
   // A field is 0 too when the dump lacked it: its entries tell.
   std::vector<bool> present(fields.size());
   for (EntryReader reader(statistics); !reader.AtEnd();) {

@@ -63,7 +63,6 @@ class Statistics {
   std::string_view stream_;
   uint64_t result_ = 0;
   bool outOfMemory_ = false;
-  std::string message_;  // of the parser
   // Both begin with the same four fields, so that the lists are read from either.
   union {
     KVRStatsCxt kvr;

@@ -15,9 +15,9 @@ extern "C" {
 #endif
 
 /*
- * The stored message, or null before there is one. Read it through GetAPIErrorMessage. A tool that
- * wants a message of each call may set it to null while no other thread is in the library: the next
- * one is stored again, and the text before is the tool's own, to be given to free().
+ * The stored message, or null before there is one. Read it through GetAPIErrorMessage, and never
+ * change it: the message is set once, nobody frees it, and there is no way back. A tool that wants
+ * to know what is wrong with each of many buffers asks the walk over their records (records.h).
  */
 MORWICK_EXPORT extern char *GlobalAPIErrorMessage;
 

@@ -1,5 +1,6 @@
 /*
  * The numbers that controllers write and read: little-endian, on any alignment, whatever the host.
+ * Comments that begin with an at sign are rules, which scripts/prove holds the code to.
  *
  * Threads: pure functions, callable from any thread. The bytes must be there.
  */
@@ -7,7 +8,6 @@
 #define MORWICK_LITTLE_ENDIAN_H
 
 #include <stdint.h>
-#include <string.h>
 
 /* The value in the order of a controller; also back again. */
 static inline uint16_t LittleEndian16(uint16_t value) {
@@ -34,23 +34,43 @@ static inline uint64_t LittleEndian64(uint64_t value) {
 #endif
 }
 
-/* The number that the bytes hold. */
-static inline uint16_t LoadLittleEndian16(const void *bytes) {
-  uint16_t value;
-  memcpy(&value, bytes, sizeof value);
-  return LittleEndian16(value);
+/* Bytes at any address. The prover does not follow a cast. */
+#ifdef __FRAMAC__
+typedef uint8_t MorwickBytes;
+#else
+typedef void MorwickBytes;
+#endif
+
+/*@ logic integer Number16(uint8_t *b, integer o) = b[o] + 0x100 * b[o + 1];
+    logic integer Number32(uint8_t *b, integer o) = Number16(b, o) + 0x10000 * Number16(b, o + 2);
+*/
+
+/* The number that the bytes hold. Compilers make one load of it. */
+/*@ requires \valid_read(bytes + (0 .. 1));
+    assigns \nothing;
+    ensures \result == Number16(bytes, 0); */
+static inline uint16_t LoadLittleEndian16(const MorwickBytes *bytes) {
+  const uint8_t *b = (const uint8_t *)bytes;
+  return (uint16_t)(b[0] + ((uint32_t)b[1] << 8));
 }
 
-static inline uint32_t LoadLittleEndian32(const void *bytes) {
-  uint32_t value;
-  memcpy(&value, bytes, sizeof value);
-  return LittleEndian32(value);
+/*@ requires \valid_read(bytes + (0 .. 3));
+    assigns \nothing;
+    ensures \result == Number32(bytes, 0); */
+static inline uint32_t LoadLittleEndian32(const MorwickBytes *bytes) {
+  const uint8_t *b = (const uint8_t *)bytes;
+  return b[0] + ((uint32_t)b[1] << 8) + ((uint32_t)b[2] << 16) + ((uint32_t)b[3] << 24);
 }
 
-static inline uint64_t LoadLittleEndian64(const void *bytes) {
-  uint64_t value;
-  memcpy(&value, bytes, sizeof value);
-  return LittleEndian64(value);
+/*@ requires \valid_read(bytes + (0 .. 7));
+    assigns \nothing;
+    ensures \result == Number32(bytes, 0) +
+      0x100000000 * Number32(bytes, 4); */
+static inline uint64_t LoadLittleEndian64(const MorwickBytes *bytes) {
+  const uint8_t *b = (const uint8_t *)bytes;
+  return b[0] + ((uint64_t)b[1] << 8) + ((uint64_t)b[2] << 16) + ((uint64_t)b[3] << 24) +
+         ((uint64_t)b[4] << 32) + ((uint64_t)b[5] << 40) + ((uint64_t)b[6] << 48) +
+         ((uint64_t)b[7] << 56);
 }
 
 #endif

@@ -4,6 +4,7 @@
 
 #include "morwick/capacity.h"
 #include "morwick/connection.h"
+#include "morwick/controller.h"
 #include "morwick/error_message.h"
 #include "morwick/exporter.h"
 #include "morwick/ftl_stats.h"
@@ -12,7 +13,10 @@
 #include "morwick/msp_stats.h"
 #include "morwick/parser_context.h"
 #include "morwick/platform.h"
+#include "morwick/records.h"
 #include "morwick/snapshot.h"
+#include "morwick/snapshot_header.h"
+#include "morwick/summary.h"
 
 /*
  * The version of the library that these headers belong to. One of the same major number runs what

@@ -160,17 +160,17 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * A null header, output, output size or state and a capacity of 0 get 0, and nothing is touched. A
  * null snapshot is one without records: 1 and the empty text, unless the banner does not fit.
  *
- * The header is not trusted, but it must be whole: its text, descriptor table and descriptors are
- * read where it says they are, the table only when a whole record of 4 bytes or more is left.
- * Nothing outside `snapshotSize` bytes is read; a record that does not lie in them whole ends the
- * rendering. A descriptor prints nothing when its field (of kind 3 without the rest) lies outside
- * the record or its format has no NUL, or asks for anything that its kind does not supply: one
- * number, for kind 2 two, by d, i, u, o, x or X; for kind 3 one text by s. A field of kind 3
- * without priorities is the exception: nothing is read for it, so it prints its three labels
- * wherever its offset points. The flags -, 0, +, blank and #, width and precision may be any, but
- * what is wider than 2^31 - 1 characters fits no buffer.
- * When the 32 bits that tell an empty record lie outside the record, or no field is described,
- * every record counts as empty.
+ * The header is not trusted, but it must be whole (ask snapshot_header.h first): its text,
+ * descriptor table and descriptors are read where it says they are, the table only when a whole
+ * record of 4 bytes or more is left. Nothing outside `snapshotSize` bytes is read; a record that
+ * does not lie in them whole ends the rendering. A descriptor prints nothing when its field (of
+ * kind 3 without the rest) lies outside the record or its format has no NUL, or asks for anything
+ * that its kind does not supply: one number, for kind 2 two, by d, i, u, o, x or X; for kind 3 one
+ * text by s. A field of kind 3 without priorities is the exception: nothing is read for it, so it
+ * prints its three labels wherever its offset points. The flags -, 0, +, blank and #, width and
+ * precision may be any, but what is wider than 2^31 - 1 characters fits no buffer. When the 32 bits
+ * that tell an empty record lie outside the record, or no field is described, every record counts
+ * as empty.
  */
 MORWICK_EXPORT uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot,
                                                                 uint64_t snapshotSize, char *output,

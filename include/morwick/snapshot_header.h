@@ -1,0 +1,47 @@
+/*
+ * Whether a snapshot header is whole, to be asked before the renderings of snapshot.h and whatever
+ * else follows its offsets are trusted with it: a header comes from a controller or a file, and may
+ * be damaged or hostile.
+ *
+ * Threads: may be called from any thread.
+ */
+#ifndef MORWICK_SNAPSHOT_HEADER_H
+#define MORWICK_SNAPSHOT_HEADER_H
+
+#include <stdint.h>
+
+#include "morwick/export.h"
+#include "morwick/snapshot.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/* What is wrong with a header; the first of these, in this order. */
+typedef enum MorwickHeaderFault {
+  kMorwickHeaderIsWhole,
+  kMorwickHeaderTooShort,     /* fewer bytes than SnapshotHeader has, or a null pointer */
+  kMorwickHeaderNoRecordSize, /* the record size is 0 */
+  kMorwickHeaderNoTextEnd,    /* the header text is due, and has no NUL */
+  kMorwickHeaderNoTable,      /* the descriptor table lies outside */
+  kMorwickHeaderNoDescriptors /* descriptors lie outside */
+} MorwickHeaderFault;
+
+/* Room for every text of MorwickCheckSnapshotHeader, with its NUL. */
+enum { kMorwickHeaderTextRoom = 120 };
+
+/*
+ * Checks a header of `size` bytes, of any alignment: its text (where the format version asks for
+ * it), its descriptor table and its descriptors must lie inside, and its records must have a size.
+ * Formats and fields need no check: the renderings look at each themselves. Unless `text` is null
+ * it gets what is wrong, in a few words with the value that is, at most kMorwickHeaderTextRoom
+ * bytes with the NUL; the empty text for a whole header.
+ */
+MORWICK_EXPORT MorwickHeaderFault MorwickCheckSnapshotHeader(const void *header, uint64_t size,
+                                                             char *text);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

@@ -1,0 +1,41 @@
+/*
+ * The summary fields of KVRStatsCxt as a table, for tools that list all of them: which key each one
+ * is set from, its name, and its values.
+ *
+ * Threads: all functions may be called from any thread.
+ */
+#ifndef MORWICK_SUMMARY_H
+#define MORWICK_SUMMARY_H
+
+#include <stdint.h>
+
+#include "morwick/export.h"
+#include "morwick/kvr_stats.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+typedef struct MorwickSummaryField {
+  uint32_t id;         /* of the key that it is set from, which has the same name */
+  const char *name;    /* as in KVRStatsCxt */
+  uint32_t offset;     /* in KVRStatsCxt, in bytes */
+  uint32_t valueWidth; /* bytes of a value: 4, the low half of what the key carries, or 8 */
+  uint32_t valueCount; /* 1, or more for an array */
+} MorwickSummaryField;
+
+MORWICK_EXPORT uint32_t MorwickSummaryFieldCount(void);
+
+/* The field with that index, in the order of KVRStatsCxt, counted from 0; null behind the last. */
+MORWICK_EXPORT const MorwickSummaryField *MorwickSummaryFieldAt(uint32_t index);
+
+/* A value of a context's field, by its index from 0; 0 for an index that there is none at, and for
+ * null pointers. A field is 0 too when no buffer had its key. */
+MORWICK_EXPORT uint64_t MorwickSummaryValue(const KVRStatsCxt *ctx,
+                                            const MorwickSummaryField *field, uint32_t index);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

@@ -1,0 +1,158 @@
+/*
+ * The walk over the records of a statistics dump: where the next record lies, or where the records
+ * end and why. The three parsers and morwick/records.h are built on it. C11 and C++20 alike.
+ * Comments that begin with an at sign are rules in ACSL: scripts/prove proves that the code keeps
+ * them for any bytes of any length.
+ */
+#ifndef STATS_RECORD_WALK_H
+#define STATS_RECORD_WALK_H
+
+#include <stdint.h>
+
+#include "morwick/little_endian.h"
+#include "morwick/records.h"
+
+enum {
+  kWideHeader = 8,  /* of KVR and FTL: key, and length in words of eight bytes */
+  kShortHeader = 4, /* of MSP: key, and length in bytes */
+  kFTLEndId = 0xFFFF,
+  kMSPEndId = 0x2FFF,
+  kHighestId = 0x30000000 /* of KVR and FTL: a key above it is bad */
+};
+
+/* A record, or what ends the records. Behind the buffer's last whole header id and length are 0. */
+struct WalkedRecord {
+  uint32_t id;
+  uint64_t offset;  /* of the header */
+  uint64_t payload; /* its offset */
+  uint64_t length;  /* of the payload, in bytes */
+};
+
+/*@ logic integer HeaderSize(MorwickStream s) = s == kMorwickMSP ? 4 : 8;
+
+    logic integer Id(MorwickStream s, uint8_t *b, integer o) =
+      s == kMorwickMSP ? Number16(b, o) : Number32(b, o);
+
+    logic integer Length(MorwickStream s, uint8_t *b, integer o) =
+      s == kMorwickMSP ? Number16(b, o + 2) : 8 * Number32(b, o + 4);
+
+    // What stands at `o`, where there is no filler.
+    logic integer Step(MorwickStream s, uint8_t *b, integer size, integer o) =
+      o == size ? kMorwickEndOfBuffer
+      : o + HeaderSize(s) > size ? kMorwickPartOfHeader
+      : s == kMorwickFTL && Id(s, b, o) == 0xFFFF ? kMorwickEndRecord
+      : s == kMorwickMSP && Id(s, b, o) == 0x2FFF ? kMorwickEndRecord
+      : s != kMorwickMSP && Id(s, b, o) > 0x30000000 ? kMorwickBadKey
+      : o + HeaderSize(s) + Length(s, b, o) > size ? kMorwickTooLong
+      : kMorwickRecord;
+
+    // Where the first that is no filler stands, from `o` on. A filler is a header alone, whatever
+    // its key.
+    logic integer Start(MorwickStream s, uint8_t *b, integer size, integer o) =
+      s != kMorwickKVR && o + HeaderSize(s) <= size && Length(s, b, o) == 0
+        ? Start(s, b, size, o + HeaderSize(s)) : o;
+
+    predicate Describes(struct WalkedRecord r, MorwickStream s, uint8_t *b, integer size) =
+      r.offset <= r.payload <= size &&
+      (r.offset + HeaderSize(s) <= size ==>
+        r.payload == r.offset + HeaderSize(s) &&
+        r.id == Id(s, b, r.offset) && r.length == Length(s, b, r.offset)) &&
+      (r.offset + HeaderSize(s) > size ==>
+        r.payload == r.offset && r.id == 0 && r.length == 0);
+*/
+
+/* What the header at the offset says. */
+/*@ requires \valid_read(bytes + (offset .. offset + HeaderSize(stream) - 1));
+    requires offset + HeaderSize(stream) <= UINT64_MAX;
+    assigns \nothing;
+    ensures \result == Id(stream, bytes, offset); */
+static inline uint32_t HeaderId(MorwickStream stream, const uint8_t *bytes, uint64_t offset) {
+  if (stream == kMorwickMSP) return LoadLittleEndian16(bytes + offset);
+  return LoadLittleEndian32(bytes + offset);
+}
+
+/*@ requires \valid_read(bytes + (offset .. offset + HeaderSize(stream) - 1));
+    requires offset + HeaderSize(stream) <= UINT64_MAX;
+    assigns \nothing;
+    ensures \result == Length(stream, bytes, offset); */
+static inline uint64_t HeaderLength(MorwickStream stream, const uint8_t *bytes, uint64_t offset) {
+  if (stream == kMorwickMSP) return LoadLittleEndian16(bytes + offset + 2);
+  return (uint64_t)LoadLittleEndian32(bytes + offset + 4) * 8;
+}
+
+/* Which of the steps a header is, when `left` bytes follow it. */
+/*@ assigns \nothing;
+    ensures \result ==
+      (stream == kMorwickFTL && id == 0xFFFF ? kMorwickEndRecord
+       : stream == kMorwickMSP && id == 0x2FFF ? kMorwickEndRecord
+       : stream != kMorwickMSP && id > 0x30000000 ? kMorwickBadKey
+       : length > left ? kMorwickTooLong
+       : kMorwickRecord); */
+static inline MorwickStep StepOfHeader(MorwickStream stream, uint32_t id, uint64_t length,
+                                       uint64_t left) {
+  if (stream == kMorwickFTL && id == kFTLEndId) return kMorwickEndRecord;
+  if (stream == kMorwickMSP && id == kMSPEndId) return kMorwickEndRecord;
+  if (stream != kMorwickMSP && id > kHighestId) return kMorwickBadKey;
+  return length > left ? kMorwickTooLong : kMorwickRecord;
+}
+
+/*
+ * The record at the offset, or what ends the records there. Fillers, which FTL and MSP records may
+ * have in front of them, are passed over.
+ */
+/*@ requires \valid_read(bytes + (0 .. size - 1)) && offset <= size;
+    requires \valid(record) && \separated(record, bytes + (0 .. size - 1));
+    requires stream == kMorwickKVR || stream == kMorwickFTL || stream == kMorwickMSP;
+    assigns *record;
+    ensures Describes(*record, stream, bytes, size);
+    ensures record->offset == Start(stream, bytes, size, offset) && record->offset >= offset;
+    ensures \result == Step(stream, bytes, size, record->offset);
+    ensures \result == kMorwickRecord ==> record->payload + record->length <= size; */
+static inline MorwickStep WalkToRecord(MorwickStream stream, const uint8_t *bytes, uint64_t size,
+                                       uint64_t offset, struct WalkedRecord *record) {
+  const uint64_t header = stream == kMorwickMSP ? kShortHeader : kWideHeader;
+  /*@ loop invariant \at(offset, Pre) <= offset <= size;
+      loop invariant Start(stream, bytes, size, offset) ==
+        Start(stream, bytes, size, \at(offset, Pre));
+      loop assigns offset, *record;
+      loop variant size - offset; */
+  while (size - offset >= header) {
+    const uint32_t id = HeaderId(stream, bytes, offset);
+    const uint64_t length = HeaderLength(stream, bytes, offset);
+    if (stream == kMorwickKVR || length > 0) {
+      record->id = id;
+      record->offset = offset;
+      record->payload = offset + header;
+      record->length = length;
+      return StepOfHeader(stream, id, length, size - offset - header);
+    }
+    offset += header;
+  }
+  record->id = 0;
+  record->offset = offset;
+  record->payload = offset;
+  record->length = 0;
+  return offset == size ? kMorwickEndOfBuffer : kMorwickPartOfHeader;
+}
+
+/*
+ * How many of a key's configured values the parser takes from a record. Those of KVR may run on
+ * into the records behind it, but are taken all or not at all; others must lie in the record.
+ */
+/*@ requires payload + length <= size;
+    requires stream == kMorwickKVR || stream == kMorwickFTL || stream == kMorwickMSP;
+    assigns \nothing;
+    ensures payload + \result * (stream == kMorwickMSP ? 4 : 8) <= size;
+    ensures stream == kMorwickKVR ==>
+      \result == (payload + configured * 8 <= size ? configured : 0);
+    ensures stream != kMorwickKVR ==>
+      \result == \min(configured, length / (stream == kMorwickMSP ? 4 : 8)); */
+static inline uint32_t ValuesTaken(MorwickStream stream, uint64_t payload, uint64_t length,
+                                   uint64_t size, uint32_t configured) {
+  const uint64_t width = stream == kMorwickMSP ? 4 : 8;
+  const uint64_t room = (stream == kMorwickKVR ? size - payload : length) / width;
+  if (configured <= room) return configured;
+  return stream == kMorwickKVR ? 0 : (uint32_t)room;
+}
+
+#endif

@@ -1,0 +1,70 @@
+// What the parser of each stream makes of a record, beyond where it lies: its key, whether its
+// length is the configured one, and how its values are named. The parsers and morwick/records.h
+// share it.
+#ifndef STATS_STREAM_RULES_H
+#define STATS_STREAM_RULES_H
+
+#include <cstdint>
+#include <string_view>
+
+#include "stats/msp_keys.h"
+#include "stats/record_walk.h"
+#include "stats/stats_keys.h"
+
+namespace morwick {
+
+template <MorwickStream kStream>
+struct StreamRules {
+  static constexpr uint32_t kValueWidth = kStream == kMorwickMSP ? 4 : 8;
+
+  static const MorwickKey *FindKey(uint32_t id) {
+    if constexpr (kStream == kMorwickMSP) return kMSPKeys.Find(id);
+    return kStatsKeys.Find(id);
+  }
+
+  // Whether the parser reports it. KVR values are counted by the key alone, and FTL scalars may
+  // have more than the one value that is taken.
+  static bool LengthDiffers(const MorwickKey &key, uint64_t length) {
+    if constexpr (kStream == kMorwickKVR) return false;
+    if (kStream == kMorwickFTL && key.valueCount == 1) return false;
+    return length != uint64_t{key.valueCount} * kValueWidth;
+  }
+
+  // What stands between the name of an array and the index of a value.
+  static std::string_view Separator(const MorwickKey &key) {
+    return kStream == kMorwickFTL && key.valueCount > 1 ? "_" : "";
+  }
+};
+
+// A record of a known key.
+struct KnownRecord {
+  const MorwickKey &key;
+  const uint8_t *values;
+  uint64_t length;      // of the payload, in bytes
+  uint32_t valueCount;  // of values that the parser takes
+};
+
+inline std::string_view NameOf(const MorwickKey &key) { return {key.name, key.nameLength}; }
+
+// Hands the records of known keys to `take` until it returns false, which comes to kMorwickRecord.
+// Returns what ended the walk.
+template <MorwickStream kStream, typename Take>
+MorwickStep ForEachKnownRecord(const void *buffer, uint32_t size, Take take) {
+  const auto *bytes = static_cast<const uint8_t *>(buffer);
+  uint64_t offset = 0;
+  for (;;) {
+    WalkedRecord walked;
+    const MorwickStep step = WalkToRecord(kStream, bytes, size, offset, &walked);
+    if (step != kMorwickRecord) return step;
+    if (const MorwickKey *key = StreamRules<kStream>::FindKey(walked.id)) {
+      const uint32_t count =
+          ValuesTaken(kStream, walked.payload, walked.length, size, key->valueCount);
+      if (!take(KnownRecord{*key, bytes + walked.payload, walked.length, count})) return step;
+    }
+    offset = walked.payload + walked.length;
+  }
+}
+
+}  // namespace morwick
+
+#endif

@@ -1,0 +1,171 @@
+// The walk over records, the key tables, the summary fields and the check of snapshot headers: what
+// tools ask the library beside its parsers.
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <tuple>
+
+#include "tests/heap.h"
+#include "tests/stream_notation.h"
+
+namespace {
+
+constexpr const char *kSteps[] = {"record",  "end of buffer", "end record",
+                                  "bad key", "too long",      "part of a header"};
+
+// What the walk says of each record and of the end, as the cases write it down.
+std::string Walk(Kind kind, const std::string &bytes) {
+  const std::vector<char> buffer = Unaligned(bytes);
+  const char *start = buffer.data() + 1;
+  MorwickRecordReader reader;
+  MorwickRecord record;
+  std::ostringstream seen;
+  MorwickStartRecords(&reader, static_cast<MorwickStream>(kind), start, bytes.size());
+  const auto next = [&] {
+    RefuseAllocation(0);
+    const bool isRecord = MorwickNextRecord(&reader, &record) != 0;
+    EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+    EXPECT_EQ(isRecord, record.step == kMorwickRecord);
+    return isRecord;
+  };
+  while (next()) {
+    EXPECT_EQ(static_cast<const char *>(record.values) + record.length + record.following,
+              start + bytes.size());
+    EXPECT_EQ(record.left, record.length + record.following);
+    EXPECT_EQ(record.valueWidth, kind == kMSP ? 4U : 8U);
+    seen << record.id << "@" << record.offset << (record.key == nullptr ? "?" : "") << " "
+         << record.valueCount << "/" << record.recordedValues
+         << (record.lengthDiffers != 0 ? "!" : "") << ", ";
+  }
+  const MorwickRecord end = record;
+  EXPECT_FALSE(next()) << "the end stays the end";
+  EXPECT_TRUE(record.step == end.step && record.offset == end.offset);
+  EXPECT_TRUE(end.key == nullptr && end.valueCount == 0 && end.lengthDiffers == 0);
+  seen << kSteps[end.step] << "@" << end.offset;
+  if (end.step > kMorwickEndOfBuffer && end.step < kMorwickPartOfHeader) {
+    seen << ", key " << end.id << " with " << end.length << " of " << end.left << ", "
+         << end.following << " follow";
+  } else {
+    EXPECT_TRUE(end.id == 0 && end.length == 0 && end.left == bytes.size() - end.offset);
+  }
+  return seen.str();
+}
+
+TEST(RecordsTest, WalksToEveryKindOfEnd) {
+  CaseFile cases("records.txt");
+  for (std::string line; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where());
+    std::istringstream columns(line);
+    const std::optional<Kind> kind = KindOf(TakeColumn(columns));
+    ASSERT_TRUE(kind);
+    const std::string stream = TakeColumn(columns);
+    EXPECT_EQ(Walk(*kind, Stream(*kind, stream)), TakeColumn(columns));
+  }
+}
+
+TEST(RecordsTest, TakesNullPointersAndUnknownStreams) {
+  const std::string bytes = Stream(kKVR, "4:1 9");
+  const auto unknown = static_cast<MorwickStream>(3);
+  MorwickRecordReader reader = {};
+  MorwickRecord record = {};
+  MorwickStartRecords(nullptr, kMorwickKVR, bytes.data(), bytes.size());
+  EXPECT_EQ(MorwickNextRecord(nullptr, &record) + MorwickNextRecord(&reader, nullptr), 0);
+  MorwickStartRecords(&reader, kMorwickMSP, nullptr, 16);
+  EXPECT_EQ(MorwickNextRecord(&reader, &record), 0);
+  EXPECT_TRUE(record.step == kMorwickEndOfBuffer && record.offset == 0);
+  MorwickStartRecords(&reader, unknown, bytes.data(), bytes.size());
+  EXPECT_EQ(MorwickNextRecord(&reader, &record), 0);
+  EXPECT_TRUE(record.step == kMorwickEndOfBuffer && record.offset == 0);
+  MorwickStartRecords(&reader, kMorwickKVR, bytes.data(), bytes.size());
+  EXPECT_EQ(MorwickNextRecord(&reader, &record), 1);
+  EXPECT_EQ(MorwickValue(&record, 0), 9U);
+  EXPECT_EQ(MorwickValue(&record, 1) + MorwickValue(nullptr, 0), 0U);
+  char name[kMorwickNameRoom] = "kept";
+  EXPECT_EQ(MorwickValueName(kMorwickKVR, nullptr, 1, 0, name), 0U);
+  EXPECT_STREQ(name, "");
+  EXPECT_EQ(MorwickValueName(kMorwickKVR, record.key, 1, 0, nullptr), 0U);
+  EXPECT_EQ(MorwickKeyCount(unknown), 0U);
+  EXPECT_EQ(MorwickKeyAt(unknown, 0), nullptr);
+  EXPECT_EQ(MorwickFindKey(unknown, "version"), nullptr);
+  EXPECT_EQ(MorwickFindKey(kMorwickKVR, nullptr), nullptr);
+}
+
+TEST(RecordsTest, ListsAndFindsEveryKey) {
+  for (const auto &[stream, count, first, last] :
+       {std::tuple(kMorwickKVR, 568U, "version", "raidVerificationReads"),
+        {kMorwickFTL, 568U, "version", "raidVerificationReads"},
+        {kMorwickMSP, 95U, "passWithTmodeHard", "active_time_hist"}}) {
+    ASSERT_EQ(MorwickKeyCount(stream), count);
+    EXPECT_STREQ(MorwickKeyAt(stream, 0)->name, first);
+    EXPECT_STREQ(MorwickKeyAt(stream, count - 1)->name, last);
+    EXPECT_EQ(MorwickKeyAt(stream, count), nullptr);
+    for (uint32_t i = 0; i < count; ++i) {
+      const MorwickKey *key = MorwickKeyAt(stream, i);
+      EXPECT_EQ(MorwickFindKey(stream, key->name), key);
+      EXPECT_EQ(key->nameLength, std::strlen(key->name));
+    }
+    EXPECT_EQ(MorwickFindKey(stream, "versio"), nullptr);
+    EXPECT_EQ(MorwickFindKey(stream, ""), nullptr);
+  }
+}
+
+TEST(SummaryTest, ListsTheFieldsOfTheContext) {
+  KVRStatsCxt context = {};
+  context.exportVersion = 0xfedcba98;
+  context.readCountHisto[4] = 0xfedcba9876543210;
+  const uint32_t count = MorwickSummaryFieldCount();
+  EXPECT_EQ(MorwickSummaryFieldAt(count), nullptr);
+  for (uint32_t i = 0; i < count; ++i) {
+    const MorwickSummaryField *field = MorwickSummaryFieldAt(i);
+    const MorwickKey *key = MorwickFindKey(kMorwickKVR, field->name);
+    ASSERT_NE(key, nullptr) << field->name;
+    EXPECT_TRUE(key->id == field->id && key->valueCount == field->valueCount) << field->name;
+    EXPECT_EQ(MorwickSummaryValue(&context, field, field->valueCount), 0U);
+    EXPECT_EQ(MorwickSummaryValue(nullptr, field, 0), 0U);
+    EXPECT_EQ(MorwickSummaryValue(&context, field, field->valueCount - 1), i == 0 ? 0xfedcba98
+                                                                           : i == count - 1
+                                                                               ? 0xfedcba9876543210
+                                                                               : 0);
+  }
+  EXPECT_EQ(MorwickSummaryValue(&context, nullptr, 0), 0U);
+}
+
+// Every size and each field around its bounds; buffers end where the header ends.
+TEST(SnapshotHeaderTest, SaysWhatIsWrong) {
+  constexpr uint32_t kTable = 42;
+  const auto check = [](uint32_t version, uint32_t recordSize, uint32_t table, uint32_t count,
+                        size_t size) {
+    std::vector<uint32_t> words(40, 0x01010101);
+    words[1] = version;
+    words[2] = recordSize;
+    words[6] = table;
+    std::string header(reinterpret_cast<const char *>(words.data()), words.size() * 4);
+    header[41] = '\0';  // the text's end
+    header.replace(kTable, 4, reinterpret_cast<const char *>(&count), 4);
+    const std::vector<char> unaligned = Unaligned(header.substr(0, size));
+    char text[kMorwickHeaderTextRoom] = "kept";
+    const auto fault = MorwickCheckSnapshotHeader(unaligned.data() + 1, size, text);
+    EXPECT_EQ(MorwickCheckSnapshotHeader(unaligned.data() + 1, size, nullptr), fault);
+    EXPECT_EQ(fault == kMorwickHeaderIsWhole, text[0] == '\0');
+    return std::to_string(fault) + " " + text;
+  };
+  EXPECT_EQ(check(6, 65536, kTable, 2, 106), "0 ");
+  EXPECT_EQ(check(6, 1, kTable, 2, 105),
+            "5 descriptor count 2 points outside the header of 105 bytes");
+  EXPECT_EQ(check(6, 1, kTable, 0xffffffff, 106),
+            "5 descriptor count 4294967295 points outside the header of 106 bytes");
+  EXPECT_EQ(check(6, 1, kTable, 0, 50), "0 ");
+  EXPECT_EQ(check(6, 1, kTable, 0, 49),
+            "4 descriptor table offset 42 points outside the header of 49 bytes");
+  EXPECT_EQ(check(6, 1, 0xffffffff, 0, 160),
+            "4 descriptor table offset 4294967295 points outside the header of 160 bytes");
+  EXPECT_EQ(check(6, 1, kTable, 0, 41), "3 the text at offset 36 has no end");
+  EXPECT_EQ(check(5, 1, kTable, 0, 41),
+            "4 descriptor table offset 42 points outside the header of 41 bytes");
+  EXPECT_EQ(check(6, 0, kTable, 0, 41), "2 the record size is 0");
+  EXPECT_EQ(check(6, 0, kTable, 0, 35), "1 a header of 35 bytes is shorter than 36");
+  EXPECT_EQ(MorwickCheckSnapshotHeader(nullptr, 36, nullptr), kMorwickHeaderTooShort);
+}
+
+}  // namespace

@@ -1,0 +1,56 @@
+// Streams of statistics as cases write them down.
+#ifndef TESTS_STREAM_NOTATION_H
+#define TESTS_STREAM_NOTATION_H
+
+#include <algorithm>
+#include <optional>
+#include <sstream>
+#include <string>
+
+#include "tests/case_file.h"
+#include "tests/parsing.h"
+
+inline std::optional<Kind> KindOf(const std::string &name) {
+  constexpr std::string_view kKinds[] = {"KVR", "FTL", "MSP", "Array"};
+  const auto *found = std::ranges::find(kKinds, name);
+  if (found == std::end(kKinds)) return std::nullopt;
+  return static_cast<Kind>(found - kKinds);
+}
+
+// A stream from its notation: "4:1" is a header with key and length, "7" a value, "3..5" the values
+// 3, 4 and 5, "'ab" the bytes a and b. Headers and values are as wide as the kind's; an array is
+// written in bytes.
+inline std::string Stream(Kind kind, const std::string &notation) {
+  std::string bytes;
+  const size_t width = kind == kArray ? 1 : kind == kMSP ? 4 : 8;
+  const auto put = [&](uint64_t number, size_t size) {
+    for (size_t i = 0; i < size; ++i) bytes += static_cast<char>(number >> (8 * i));
+  };
+  std::istringstream tokens(notation);
+  for (std::string token; tokens >> token;) {
+    const size_t colon = token.find(':');
+    const size_t dots = token.find("..");
+    if (token[0] == '\'') {
+      bytes += token.substr(1);
+    } else if (colon != std::string::npos) {
+      put(Number(token.substr(0, colon)), width / 2);
+      put(Number(token.substr(colon + 1)), width / 2);
+    } else {
+      uint64_t value = Number(token.substr(0, dots));
+      const uint64_t last = dots == std::string::npos ? value : Number(token.substr(dots + 2));
+      do put(value, width);
+      while (value++ != last);
+    }
+  }
+  return bytes;
+}
+
+// What stands before the next bar, without the blanks around it.
+inline std::string TakeColumn(std::istringstream &columns) {
+  std::string column;
+  std::getline(columns, column, '|');
+  const size_t first = std::min(column.find_first_not_of(' '), column.size());
+  return column.substr(first, column.find_last_not_of(' ') + 1 - first);
+}
+
+#endif
