@@ -82,6 +82,15 @@ TEST(FixedSnapshotTest, CutsTheTextAtAnyCapacity) {
   }
 }
 
+TEST(FixedSnapshotTest, PrintsAnyNumberOfRecords) {
+  constexpr size_t kCount = 65536 + 3;
+  const std::string snapshot = Bytes(std::vector<uint32_t>(kCount * 63, 7));
+  std::string text(kCount * 400, '\0');
+  uint64_t size = text.size();
+  EXPECT_EQ(kFixed(snapshot.data(), snapshot.size(), text.data(), &size), 1U);
+  EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 27 + static_cast<ptrdiff_t>(kCount) + 1);
+}
+
 using Fields = std::vector<SnapshotFieldDescriptor>;
 
 std::string Header(uint32_t version, uint32_t recordSize, uint32_t recordCount,
@@ -249,6 +258,11 @@ TEST(DescribedSnapshotTest, ReadsNoDescriptorThatIsNotNeeded) {
   bare[52] = 0;
   EXPECT_EQ(Render("no field, no line", 500, bare), (Rendered{1, 1, "", 2}));
   EXPECT_EQ(Render("no field, no line", 500, bare, 7), (Rendered{1, 1, "", 7}));
+  // The 32 bits that tell an empty record must lie in it whole.
+  for (const uint32_t offset : {4U, 5U, 7U, 8U}) {
+    const std::string header = Header(6, 8, 3, {{4, 9, offset, 0, ""}});
+    EXPECT_EQ(Render("sixteen bytes...", 500, header).text, offset == 4 ? kBanner + "\n\n" : "");
+  }
   // Where there is no record to print none is read but the first.
   bare[52] = 9;
   EXPECT_EQ(Render(std::string(8, '\0'), 500, bare, 1), (Rendered{1, 1, "", 2}));
