@@ -1,11 +1,13 @@
 // What the library does for the morwick command, in one process and nothing around it: what the
 // command is timed against.
 //   library_work make FOLDER    the inputs: kvr.bin of 15 MB, snapshot.bin of 100 MB
+//   library_work fleet FOLDER COUNT  so many full KVR dumps of 22 KB, in folders of 100
 //   library_work stats FILE     parses and prints a line an entry
 //   library_work snapshot FILE  renders in one call and prints the text
 
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <string>
@@ -39,6 +41,25 @@ void Make(const std::string &folder) {
   std::ofstream(folder + "/snapshot.bin", std::ios::binary) << snapshot;
 }
 
+// Every dump has all keys, with values of its own: counters of up to 31 bits, as most are.
+void MakeFleet(const std::string &folder, int count) {
+  std::mt19937_64 random(1);
+  for (int i = 0; i < count; ++i) {
+    std::string dump;
+    for (uint32_t index = 0; index < MorwickKeyCount(kMorwickKVR); ++index) {
+      const MorwickKey &key = *MorwickKeyAt(kMorwickKVR, index);
+      bench::Append(&dump, key.id);
+      bench::Append(&dump, key.valueCount);
+      for (uint32_t value = 0; value < key.valueCount; ++value) {
+        bench::Append(&dump, bench::MixedMagnitude(random, 31));
+      }
+    }
+    const std::string machine = folder + "/" + std::to_string(i / 100);
+    std::filesystem::create_directories(machine);
+    std::ofstream(machine + "/" + std::to_string(i % 100) + ".bin", std::ios::binary) << dump;
+  }
+}
+
 void Stats(const std::string &file) {
   const std::string bytes = ReadAll(file);
   KVRStatsCxt context = {};
@@ -68,15 +89,17 @@ void Snapshot(const std::string &file) {
 }  // namespace
 
 int main(int argc, char **argv) {
-  const std::string work = argc == 3 ? argv[1] : "";
-  if (work == "make") {
+  const std::string work = argc >= 3 ? argv[1] : "";
+  if (work == "fleet" && argc == 4) {
+    MakeFleet(argv[2], std::stoi(argv[3]));
+  } else if (work == "make") {
     Make(argv[2]);
   } else if (work == "stats") {
     Stats(argv[2]);
   } else if (work == "snapshot") {
     Snapshot(argv[2]);
   } else {
-    std::fputs("usage: library_work make|stats|snapshot PLACE\n", stderr);
+    std::fputs("usage: library_work make|stats|snapshot PLACE, or fleet PLACE COUNT\n", stderr);
     return 2;
   }
 }

@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
 """Makes the example dumps in this folder; the same ones every time."""
 
+import gzip
 import math
 import pathlib
 import random
@@ -70,3 +71,18 @@ table = 36 + len(text)
     struct.pack("<II", len(descriptors), 0) +
     b"".join(struct.pack("<HHII16s", kind, 0, offset, size, layout)
              for kind, offset, size, layout in descriptors))
+
+# A dump of each machine on two days; one machine wears out, one dump was cut, one is compressed.
+for machine, writes, amplification, bad in (
+        ("b7", 80, 1.5, (2, 2)), ("b8", 95, 3.9, (11, 19)), ("c2", 31, 1.6, (0, 0))):
+    for day in (0, 1):
+        host = (writes + day) * 10 ** 9 + 123456
+        dump = words([(57, [1795503600 + 86400 * day]), (4, [host]), (7, [2 * host]),
+                      (18, [int(host * amplification)]), (47, [bad[day]]), (10, [3])])
+        file = folder / "fleet" / machine / f"2026-11-{24 + day}.bin"
+        file.parent.mkdir(parents=True, exist_ok=True)
+        if machine == "c2" and day == 1:
+            dump = dump[:60]
+        if machine == "b7" and day == 0:
+            file, dump = file.with_suffix(".bin.gz"), gzip.compress(dump, mtime=0)
+        file.write_bytes(dump)

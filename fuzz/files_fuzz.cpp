@@ -1,10 +1,19 @@
-// Files from outside: the first byte chooses between a scenario and a snapshot header. A header
-// that passes its check is used, at the end of its own allocation.
+// Files from outside: the first byte chooses between a scenario, a snapshot header, names of
+// statistics, a list of files, and what may be compressed by gzip. A header that passes its check
+// is used, at the end of its own allocation.
+
+#include <unistd.h>
 
 #include <cassert>
+#include <cstdlib>
 #include <optional>
+#include <set>
+#include <sstream>
 #include <vector>
 
+#include "fleet/columns.h"
+#include "fleet/file_list.h"
+#include "fleet/gzip.h"
 #include "morwick/morwick.h"
 #include "platform/simulated/scenario.h"
 #include "tools/snapshot_header.h"
@@ -43,15 +52,92 @@ void CheckHeader(std::string_view file) {
   assert(size >= 1 && size <= output.size() && output[size - 1] == '\0');
 }
 
+// A selection has each column once, and asks for all of its names.
+void CheckNames(MorwickStream stream, std::string_view text) {
+  std::vector<std::string> names;
+  std::istringstream words{std::string(text)};
+  for (std::string name; std::getline(words, name, ',');) names.push_back(name);
+  if (names.size() > 4) return;  // each takes its time
+  try {
+    const fleet::Selection selection({&stream, 1}, names);
+    std::set<std::string> columns;
+    for (const auto &[key, index, name] : selection.columns()) {
+      assert(index < key->valueCount && selection.Has(name));
+      assert(columns.insert(name).second);
+    }
+    std::vector<uint64_t> values(columns.size());
+    std::vector<uint8_t> present(columns.size());
+    const fleet::ColumnFiller filler(stream, selection);
+    const fleet::Verdict verdict = filler.Fill(text, values, present);
+    assert(verdict.faults == fleet::JudgeDump(stream, text).faults);
+  } catch (const fleet::UnknownName &unknown) {
+    assert(std::string_view(unknown.what()).starts_with("no statistic"));
+  }
+}
+
+// Each name that is not empty is handed out once, in an empty folder, where no name is a folder.
+void CheckList(char end, std::string_view text) {
+  if (text.empty() || text.find_first_of("/.") != std::string_view::npos) return;
+  std::vector<std::string> expected;
+  std::istringstream names{std::string(text)};
+  for (std::string name; std::getline(names, name, end);) {
+    if (!name.empty()) expected.push_back(name);
+  }
+  std::string copy(text);
+  fleet::FileList list({}, fmemopen(copy.data(), copy.size(), "r"), end);
+  fleet::ListedFile file;
+  for (const std::string &name : expected) {
+    const bool isThere = list.Next(&file);
+    assert(isThere && file.name == name && file.fault.empty());
+  }
+  const bool isThere = list.Next(&file);
+  assert(!isThere);
+}
+
+// What is unpacked does not depend on the sizes of the pieces that go in and come out.
+std::string Unpack(std::string_view data, size_t in, size_t out) {
+  size_t taken = 0;
+  fleet::GzipReader reader([&](char *bytes, size_t room) -> fleet::ReadResult {
+    const size_t count = data.copy(bytes, std::min(room, in), taken);
+    taken += count;
+    return {count, ""};
+  });
+  std::string whole;
+  for (;;) {
+    std::vector<char> room(out);
+    const fleet::ReadResult result = reader.Read(room.data(), room.size());
+    assert(result.count <= room.size() && (result.fault.empty() || result.count == 0));
+    whole.append(room.data(), result.count);
+    if (result.count == 0) return whole + "|" + result.fault;
+    if (whole.size() > 1 << 20) return "too large";
+  }
+}
+
+void CheckGzip(std::string_view data) {
+  const std::string whole = Unpack(data, data.size() + 1, 1 << 16);
+  assert(Unpack(data, 1, 1 << 16) == whole && Unpack(data, 3, 7) == whole);
+  if (!data.starts_with("\x1f\x8b")) assert(whole == std::string(data) + "|");
+}
+
 }  // namespace
+
+extern "C" int LLVMFuzzerInitialize(int *, char ***) {
+  char folder[] = "/tmp/files_fuzz.XXXXXX";
+  return mkdtemp(folder) == nullptr || chdir(folder) != 0 || rmdir(folder) != 0 ? 1 : 0;
+}
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   if (size == 0) return 0;
   const std::string_view rest(reinterpret_cast<const char *>(data) + 1, size - 1);
-  if (data[0] % 2 == 0) {
-    CheckScenario(rest);
-  } else {
-    CheckHeader(rest);
+  switch (data[0] % 8) {
+    case 0: CheckScenario(rest); break;
+    case 1: CheckHeader(rest); break;
+    case 2: CheckNames(kMorwickKVR, rest); break;
+    case 3: CheckNames(kMorwickFTL, rest); break;
+    case 4: CheckNames(kMorwickMSP, rest); break;
+    case 5: CheckList('\n', rest); break;
+    case 6: CheckList('\0', rest); break;
+    case 7: CheckGzip(rest); break;
   }
   return 0;
 }

@@ -60,7 +60,7 @@ template <typename Table, size_t kRowCount>
 consteval Table MakeKeyTable(const std::array<KeyRow, kRowCount> &rows) {
   static_assert(std::tuple_size_v<decltype(Table::rows)> == kRowCount);
   Table table = {};
-  for (uint16_t place = 0; place < kRowCount; ++place) {
+  for (size_t place = 0; place < kRowCount; ++place) {
     const auto &[id, name, valueCount] = rows[place];
     const auto nameLength = static_cast<uint32_t>(std::string_view(name).size());
     table.rows[place] = {id, name, valueCount, nameLength};

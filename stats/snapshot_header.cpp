@@ -41,22 +41,21 @@ Finding Check(const char *header, uint64_t size) {
 MorwickHeaderFault MorwickCheckSnapshotHeader(const void *header, uint64_t size, char *text) {
   const Finding finding = Check(static_cast<const char *>(header), size);
   if (text == nullptr) return finding.fault;
-  const auto print = [=](const char *format, auto... values) {
-    std::snprintf(text, kMorwickHeaderTextRoom, format, values...);
-  };
+  constexpr size_t kRoom = kMorwickHeaderTextRoom;
   switch (finding.fault) {
     case kMorwickHeaderIsWhole: text[0] = '\0'; break;
     case kMorwickHeaderTooShort:
-      print("a header of %" PRIu64 " bytes is shorter than %zu", size, sizeof(SnapshotHeader));
+      std::snprintf(text, kRoom, "a header of %" PRIu64 " bytes is shorter than %zu", size,
+                    sizeof(SnapshotHeader));
       break;
-    case kMorwickHeaderNoRecordSize: print("the record size is 0"); break;
+    case kMorwickHeaderNoRecordSize: std::snprintf(text, kRoom, "the record size is 0"); break;
     case kMorwickHeaderNoTextEnd:
-      print("the text at offset %zu has no end", sizeof(SnapshotHeader));
+      std::snprintf(text, kRoom, "the text at offset %zu has no end", sizeof(SnapshotHeader));
       break;
     case kMorwickHeaderNoTable:
     case kMorwickHeaderNoDescriptors:
-      print("%s %" PRIu64 " points outside the header of %" PRIu64 " bytes", finding.field,
-            finding.value, size);
+      std::snprintf(text, kRoom, "%s %" PRIu64 " points outside the header of %" PRIu64 " bytes",
+                    finding.field, finding.value, size);
       break;
   }
   return finding.fault;

@@ -17,10 +17,10 @@ namespace {
 template <typename Field>
 constexpr uint32_t kWidth = sizeof(std::remove_all_extents_t<Field>);
 
-#define FIELD(id, member)                                                              \
-  {                                                                                    \
-    id, #member, offsetof(KVRStatsCxt, member), kWidth<decltype(KVRStatsCxt::member)>, \
-        sizeof(KVRStatsCxt::member) / kWidth<decltype(KVRStatsCxt::member)>            \
+#define FIELD(id, member)                                                                \
+  {                                                                                      \
+#member, id, offsetof(KVRStatsCxt, member), kWidth < decltype(KVRStatsCxt::member)>, \
+        sizeof(KVRStatsCxt::member) / kWidth < decltype(KVRStatsCxt::member)>            \
   }
 
 // In the order of KVRStatsCxt.
@@ -63,7 +63,8 @@ constexpr size_t kOthers = offsetof(KVRStatsCxt, exportVersion) + sizeof(KVRStat
                            sizeof(KVRStatsCxt::reserved3) + kPadding;
 static_assert(sizeof(void *) != 8 || [] {
   size_t size = kOthers;
-  for (const MorwickSummaryField &field : kFields) size += field.valueWidth * field.valueCount;
+  for (const MorwickSummaryField &field : kFields)
+    size += size_t{field.valueWidth} * field.valueCount;
   return size == sizeof(KVRStatsCxt);
 }());
 static_assert(std::ranges::is_sorted(kFields, {}, &MorwickSummaryField::offset));

@@ -17,7 +17,7 @@ describe() {
     echo '#include "morwick/morwick.h"'
     for name in $(documented_symbols "$1"); do echo "__typeof__($name) *symbol_$name;"; done
     for name in $(documented_records "$1"); do echo "$name *record_$name;"; done
-    for name in $(documented_enumerators "$1"); do echo "char enumerator_$name[1000 + $name];"; done
+    for name in $(documented_enumerators "$1"); do echo "char enumerator_${name}[1000 + $name];"; done
   } >"$work/interface.c"
   cc -std=c11 -g -shared -fPIC -I "$1" "$work/interface.c" -o "$work/interface.so"
   abidw --no-corpus-path --no-comp-dir-path --no-show-locs --out-file "$2" "$work/interface.so"

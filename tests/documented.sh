@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # What the public headers in the folder $1 declare, for scripts that hold something against it.
 
 headers() { cat "$1"/morwick/*.h | tr '\n' ' '; }

@@ -1,9 +1,10 @@
 #!/usr/bin/env bash
 # Plays a session, a file of commands as a person types them ("$ command", "> and more of it") and of
 # what they print, indented by four, with the exit status in brackets when it is not 0; fails with the
-# difference.
-# GRELLON, MORWICK and SOURCE name the programs and the tree; FAST_SLEEP and REFUSE_MEMORY libraries to
-# preload; ctest sets them. SANITIZED is set where a sanitizer leaves no room for limits of memory.
+# difference. In a document, a file of Markdown, the commands are indented too, and what is indented
+# without one before it is not played.
+# GRELLON, MORWICK and SOURCE name the programs and the tree; FAST_SLEEP, FAST_WATCH and REFUSE_MEMORY libraries
+# to preload; ctest sets them. SANITIZED is set where a sanitizer leaves no room for limits of memory.
 # Usage: session.sh SESSION; with SESSION_UPDATE=yes what is printed now is written into the session.
 set -uo pipefail
 session=$(realpath "$1")
@@ -11,11 +12,14 @@ work=$(mktemp -d)
 trap 'kill "${pid:-}" 2>/dev/null; rm -rf "$work"' EXIT
 cd "$work" || exit 1
 : "${SANITIZED:=}"
-cp "$SOURCE"/examples/*.bin .
+cp -r "$SOURCE"/examples/{*.bin,fleet} .
+[[ $session != *.md ]] || { sed -E 's/^    ([$>] )/\1/' "$session" >document && session=$PWD/document; }
 export LD_PRELOAD=
 
 # With pauses a thousand times shorter; the sanitizer would rather be preloaded before them.
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
+# A watch, with pauses and seconds a thousand times shorter.
+fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" watch "$@"; }
 # What it prints as JSON is kept, and checked at the end, as is what it says about open handles.
 morwick() {
   case " $* " in *" json "*) ;; *) "$MORWICK" "$@"; return ;; esac
@@ -67,7 +71,7 @@ command=
     case $line in
       '$ '*) perform; command=${line#\$ } ;;
       '> '*) command+=$'\n'${line#> } ;;
-      '    '*) continue ;;
+      '    '*) [ -n "$command" ] || printf '%s\n' "$line"; continue ;;
       *) perform ;;
     esac
     printf '%s\n' "$line"
@@ -77,7 +81,7 @@ command=
 [ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
 diff -U6 -F '^\$ ' --label expected --label played "$session" played || exit 1
 ! grep -s -e "still open" -e "already released" complaints || exit 1
-[ ! -s objects ] || python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
+[ ! -s objects ] || /usr/bin/python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
 import json, jsonschema, sys
 validator = jsonschema.Draft202012Validator(json.load(open(sys.argv[1])))
 for line in open(sys.argv[2]):

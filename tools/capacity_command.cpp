@@ -13,7 +13,7 @@ namespace {
 
 struct Options {
   std::vector<uint32_t> megabytes;
-  std::string format;
+  Format format = Format::kNormal;
 };
 
 Status PrintJson(Output &output, const Options &options) {
@@ -33,7 +33,7 @@ Status PrintJson(Output &output, const Options &options) {
 Status PrintCapacities(const Options &options) {
   Output output;
   Status status = kGood;
-  if (options.format == "json") {
+  if (options.format == Format::kJson) {
     status = PrintJson(output, options);
   } else {
     for (const uint32_t megabytes : options.megabytes) {
@@ -52,13 +52,14 @@ void AddCapacity(CLI::App &app, Action *action) {
   const auto take = [=](const std::vector<std::string> &texts) {
     for (const std::string &text : texts) {
       const std::optional<uint64_t> number = ParseNumber(text, UINT32_MAX);
-      if (!number) throw CLI::ValidationError("MB", text + " is no whole number up to 4294967295");
+      if (!number)
+        throw CLI::ValidationError("MB", text + " is not a whole number up to 4294967295");
       options->megabytes.push_back(static_cast<uint32_t>(*number));
     }
   };
   command->add_option_function<std::vector<std::string>>("MB", take, "Capacities in megabytes")
       ->required();
-  AddFormat(command, &options->format, {"normal", "json"});
+  AddFormat(command, &options->format, {Format::kNormal, Format::kJson});
   command->callback([=] { *action = [=] { return PrintCapacities(*options); }; });
 }
 

@@ -3,11 +3,11 @@
 #include "tools/changes.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
 #include <new>
 #include <unordered_map>
 
+#include "tools/aligned_table.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -15,61 +15,39 @@ namespace {
 
 // Of one name: its entries in the old reading, and how many of them have been met again.
 struct Occurrences {
-  std::vector<const ContextNode *> values;
+  std::vector<Entry> entries;
   size_t met = 0;
 };
-
-// Columns of text, right-aligned but for the first and the last.
-using Row = std::array<std::string, 6>;
-
-void PrintRows(Output &output, const std::vector<Row> &rows) {
-  std::array<size_t, std::tuple_size_v<Row>> widths = {};
-  for (const Row &row : rows) {
-    for (size_t i = 0; i < row.size(); ++i) widths[i] = std::max(widths[i], row[i].size());
-  }
-  for (const Row &row : rows) {
-    std::string line = row.front();
-    line.resize(widths.front(), ' ');
-    for (size_t i = 1; i + 1 < row.size(); ++i) {
-      if (widths[i] == 0) continue;  // nothing to say in this column
-      line += "  " + std::string(widths[i] - row[i].size(), ' ') + row[i];
-    }
-    if (!row.back().empty()) line += "  " + row.back();
-    output.Write(line + "\n");
-  }
-}
 
 void PrintNumber(Json &json, const char *key, uint64_t magnitude, std::string_view digits) {
   json.Numbers(key, false, [&](auto print) { print(magnitude, digits); });
 }
 
+void PrintEntry(Json &json, const char *key, const std::optional<Entry> &entry) {
+  if (entry) PrintNumber(json, key, entry->value(), entry->digits());
+}
+
+uint64_t Magnitude(const Change &change) {
+  const uint64_t old = change.old->value();
+  const uint64_t now = change.now->value();
+  return now < old ? old - now : now - old;
+}
+
 std::vector<Change> Compare(const Statistics &old, const Statistics &now, bool all) {
   std::unordered_map<std::string_view, Occurrences> before;
-  const ContextNode *value = old.values();
-  for (const ContextNode *name = old.names(); name != nullptr; name = name->next) {
-    before[name->text].values.push_back(value);
-    value = value->next;
-  }
+  for (const Entry &entry : old) before[entry.name()].entries.push_back(entry);
   std::vector<Change> changes;
-  value = now.values();
-  for (const ContextNode *name = now.names(); name != nullptr; name = name->next) {
-    const ContextNode *same = nullptr;
-    const auto found = before.find(name->text);
-    if (found != before.end() && found->second.met < found->second.values.size()) {
-      same = found->second.values[found->second.met++];
+  for (const Entry &entry : now) {
+    Change change = {std::nullopt, entry};
+    const auto found = before.find(entry.name());
+    if (found != before.end() && found->second.met < found->second.entries.size()) {
+      change.old = found->second.entries[found->second.met++];
     }
-    if (all || same == nullptr || same->value != value->value) {
-      changes.push_back({name->text, same, value});
-    }
-    value = value->next;
+    if (all || !change.old || change.old->value() != entry.value()) changes.push_back(change);
   }
   std::unordered_map<std::string_view, size_t> passed;
-  value = old.values();
-  for (const ContextNode *name = old.names(); name != nullptr; name = name->next) {
-    if (passed[name->text]++ >= before[name->text].met) {
-      changes.push_back({name->text, value, nullptr});
-    }
-    value = value->next;
+  for (const Entry &entry : old) {
+    if (passed[entry.name()]++ >= before[entry.name()].met) changes.push_back({entry, {}});
   }
   return changes;
 }
@@ -77,23 +55,20 @@ std::vector<Change> Compare(const Statistics &old, const Statistics &now, bool a
 }  // namespace
 
 std::string_view Change::Remark() const {
-  if (old == nullptr) return "appeared";
-  if (now == nullptr) return "vanished";
-  return now->value < old->value ? "backwards" : "";
+  if (!old) return "appeared";
+  if (!now) return "vanished";
+  return now->value() < old->value() ? "backwards" : "";
 }
 
 std::string Change::Difference() const {
-  if (old == nullptr || now == nullptr) return "";
-  if (now->value < old->value) return "-" + std::to_string(old->value - now->value);
-  return std::to_string(now->value - old->value);
+  if (!old || !now) return "";
+  return (now->value() < old->value() ? "-" : "") + std::to_string(Magnitude(*this));
 }
 
-std::optional<double> Change::Rate(double seconds) const {
-  if (old == nullptr || now == nullptr) return std::nullopt;
-  const bool backwards = now->value < old->value;
-  const auto difference =
-      static_cast<double>(backwards ? old->value - now->value : now->value - old->value);
-  const double rate = (backwards ? -difference : difference) / seconds;
+std::optional<double> Change::Rate(std::optional<double> seconds) const {
+  if (!old || !now || !seconds) return std::nullopt;
+  const auto difference = static_cast<double>(Magnitude(*this));
+  const double rate = (now->value() < old->value() ? -difference : difference) / *seconds;
   return std::isfinite(rate) ? std::optional(rate) : std::nullopt;
 }
 
@@ -107,17 +82,18 @@ std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Stat
   }
 }
 
-void PrintChanges(Output &output, const std::vector<Change> &changes,
-                  std::optional<double> seconds) {
-  if (changes.empty()) return;
-  std::vector<Row> rows = {{"name", "old", "new", "difference", seconds ? "per second" : "", ""}};
+std::vector<std::string> TableOf(const std::vector<Change> &changes,
+                                 std::optional<double> seconds) {
+  if (changes.empty()) return {};
+  AlignedTable table(5);
+  table.Add({"name", "old", "new", "difference", seconds ? "per second" : ""});
   for (const Change &change : changes) {
-    const std::optional<double> rate = seconds ? change.Rate(*seconds) : std::nullopt;
-    rows.push_back({std::string(change.name), change.old == nullptr ? "" : change.old->text,
-                    change.now == nullptr ? "" : change.now->text, change.Difference(),
-                    rate ? ThreeDecimals(*rate) : "", std::string(change.Remark())});
+    const std::optional<double> rate = change.Rate(seconds);
+    table.Add({std::string(change.name()), std::string(change.old ? change.old->digits() : ""),
+               std::string(change.now ? change.now->digits() : ""), change.Difference(),
+               rate ? ThreeDecimals(*rate) : "", std::string(change.Remark())});
   }
-  PrintRows(output, rows);
+  return table.Lines();
 }
 
 void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<double> seconds) {
@@ -128,15 +104,13 @@ void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<
   for (const Change &change : changes) {
     json.BeginObject();
     json.Key("name");
-    json.PlainText(change.name);
-    if (change.old != nullptr) PrintNumber(json, "old", change.old->value, change.old->text);
-    if (change.now != nullptr) PrintNumber(json, "new", change.now->value, change.now->text);
+    json.PlainText(change.name());
+    PrintEntry(json, "old", change.old);
+    PrintEntry(json, "new", change.now);
     if (const std::string difference = change.Difference(); !difference.empty()) {
-      const uint64_t old = change.old->value;
-      const uint64_t now = change.now->value;
-      PrintNumber(json, "difference", now < old ? old - now : now - old, difference);
+      PrintNumber(json, "difference", Magnitude(change), difference);
     }
-    if (const std::optional<double> rate = seconds ? change.Rate(*seconds) : std::nullopt) {
+    if (const std::optional<double> rate = change.Rate(seconds)) {
       json.Key("rate");
       json.Fraction(*rate);
     }

@@ -19,6 +19,7 @@ using Action = std::function<Status()>;
   COMMAND(Stats)                  \
   COMMAND(Diff)                   \
   COMMAND(Watch)                  \
+  COMMAND(Table)                  \
   COMMAND(Snapshot)               \
   COMMAND(Read)                   \
   COMMAND(Metrics)                \

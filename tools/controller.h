@@ -17,9 +17,6 @@ struct BufferKind {
   SelectorGetter NandExporter::*selectors;
 };
 
-// The streams of statistics that buffers hold.
-inline constexpr std::string_view kStreams[] = {"kvr", "ftl", "msp"};
-
 // All kinds, in the order in which they are listed.
 std::span<const BufferKind> BufferKinds();
 

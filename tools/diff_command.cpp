@@ -1,5 +1,7 @@
 // morwick diff: what changed between two dumps.
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <memory>
 
@@ -12,11 +14,13 @@ namespace tools {
 namespace {
 
 struct Options {
-  std::string stream;
+  MorwickStream stream = kMorwickKVR;
+  std::vector<std::string> names;
+  Filter filter;
   std::string oldFile;
   std::string newFile;
   std::string className;
-  std::string format;
+  Format format = Format::kNormal;
   std::optional<double> seconds;
   bool all = false;
 };
@@ -24,15 +28,22 @@ struct Options {
 void PrintCsv(Output &output, const std::vector<Change> &changes, std::optional<double> seconds) {
   output.Write("name,old,new,difference,rate,remark\n");
   for (const Change &change : changes) {
-    const std::optional<double> rate = seconds ? change.Rate(*seconds) : std::nullopt;
-    output.Write(change.name);
-    output.Put(',');
-    if (change.old != nullptr) output.Write(change.old->text);
-    output.Put(',');
-    if (change.now != nullptr) output.Write(change.now->text);
-    output.Write("," + change.Difference() + "," + (rate ? ThreeDecimals(*rate) : "") + "," +
-                 std::string(change.Remark()) + "\n");
+    const std::optional<double> rate = change.Rate(seconds);
+    output.Write(fmt::format("{},{},{},{},{},{}\n", change.name(),
+                             change.old ? change.old->digits() : "",
+                             change.now ? change.now->digits() : "", change.Difference(),
+                             rate ? ThreeDecimals(*rate) : "", change.Remark()));
   }
+}
+
+// The time between two dumps by the controller's own clock, in seconds, if it went on.
+std::optional<double> TimeBetween(const Statistics &old, const Statistics &now) {
+  const std::optional<uint64_t> before = old.Find("calendarTime");
+  const std::optional<uint64_t> after = now.Find("calendarTime");
+  if (!before || !after || *after <= *before) return std::nullopt;
+  Note("diff",
+       fmt::format("rates are for {} s, by the calendarTime of both dumps", *after - *before));
+  return static_cast<double>(*after - *before);
 }
 
 Status Diff(const Options &options) {
@@ -41,11 +52,13 @@ Status Diff(const Options &options) {
   Status status = std::max(old.status, now.status);
   std::optional<Statistics> before, after;
   std::optional<std::vector<Change>> changes;
-  if (status == kGood) {
-    before.emplace(old, options.stream);
-    after.emplace(now, options.stream);
-    status = before->Judge(old);
-    status = std::max(status, after->Judge(now));
+  std::optional<double> seconds = options.seconds;
+  if (old.bytes && now.bytes) {
+    before.emplace(old, options.stream, options.filter);
+    after.emplace(now, options.stream, options.filter);
+    status = before->Check(old);
+    status = std::max(status, after->Check(now));
+    if (!seconds) seconds = TimeBetween(*before, *after);
     changes = FindChanges(*before, *after, options.all, now.subject);
     if (!changes) {  // their memory is needed to say so
       before.reset();
@@ -54,15 +67,15 @@ Status Diff(const Options &options) {
     }
   }
   Output output;
-  if (options.format == "json") {
+  if (options.format == Format::kJson) {
     Json json(output, "diff", {{"old", options.oldFile}, {"new", options.newFile}});
-    json.Member("stream", options.stream);
-    PrintChanges(json, changes.value_or(std::vector<Change>()), options.seconds);
+    json.Member("stream", NameOf(options.stream));
+    PrintChanges(json, changes.value_or(std::vector<Change>()), seconds);
     status = json.Finish(status);
-  } else if (changes && options.format == "csv") {
-    PrintCsv(output, *changes, options.seconds);
+  } else if (changes && options.format == Format::kCsv) {
+    PrintCsv(output, *changes, seconds);
   } else if (changes) {
-    PrintChanges(output, *changes, options.seconds);
+    for (const std::string &line : TableOf(*changes, seconds)) output.Write(line + "\n");
   }
   return output.Finish(status);
 }
@@ -74,16 +87,18 @@ void AddDiff(CLI::App &app, Action *action) {
   const auto options = std::make_shared<Options>();
   const auto seconds = std::make_shared<double>(0);
   AddStream(command, &options->stream);
+  AddNames(command, &options->names);
   command->add_option("OLD", options->oldFile, "The earlier dump")->required()->type_name("");
   command->add_option("NEW", options->newFile, "The later dump; one may be - for standard input")
       ->required()
       ->type_name("");
-  CLI::Option *time =
-      AddSeconds(command, "--seconds", seconds.get(), "The time between them, for rates");
+  CLI::Option *time = AddSeconds(command, "--seconds", seconds.get(), 0,
+                                 "The time between them, for rates; else by their calendarTime");
   command->add_flag("--all", options->all, "List also what did not change");
   AddController(command, &options->className, "Where the dumps are from");
-  AddFormat(command, &options->format, {"normal", "json", "csv"});
+  AddFormat(command, &options->format, {Format::kNormal, Format::kJson, Format::kCsv});
   command->callback([=] {
+    options->filter = MakeFilter({&options->stream, 1}, options->names);
     if (options->oldFile == "-" && options->newFile == "-") {
       throw CLI::ValidationError("OLD, NEW", "standard input can be read only once");
     }

@@ -1,8 +1,10 @@
 // morwick find: which controllers there are and what they offer.
 
-#include <algorithm>
+#include <fmt/format.h>
+
 #include <memory>
 
+#include "tools/aligned_table.h"
 #include "tools/commands.h"
 #include "tools/controller.h"
 #include "tools/json.h"
@@ -20,25 +22,21 @@ struct Finding {
   }
 };
 
-// One line a class, the states below each other.
+// One line a class, the states in a column.
 void PrintNormal(Output &output, const std::vector<Finding> &findings) {
-  size_t width = 0;
+  AlignedTable table(1, 1);
   for (const Finding &finding : findings) {
-    width = std::max(width, std::string_view(finding.row->className).size());
-  }
-  for (const Finding &finding : findings) {
-    std::string line = finding.row->className;
-    line.resize(width, ' ');
-    line += " : " + std::string(finding.State());
+    std::string line = fmt::format(": {}", finding.State());
     if (finding.presence.present && !finding.presence.opened) {
       line += ", result " + Hexadecimal(finding.presence.result);
     }
     line += ", offers";
     for (const BufferKind &kind : BufferKinds()) {
-      if (finding.row->*kind.selectors != nullptr) line += " " + std::string(kind.name);
+      if (finding.row->*kind.selectors != nullptr) line += fmt::format(" {}", kind.name);
     }
-    output.Write(line + "\n");
+    table.Add({finding.row->className, line});
   }
+  table.Print(output);
 }
 
 Status PrintJson(Output &output, const std::vector<Finding> &findings, Status status) {
@@ -64,7 +62,7 @@ Status PrintJson(Output &output, const std::vector<Finding> &findings, Status st
   return json.Finish(status);
 }
 
-Status Find(const std::string &format) {
+Status Find(Format format) {
   std::vector<Finding> findings;
   Status status = kBadData;
   for (const NandExporter &row : KnownControllers()) {
@@ -72,7 +70,7 @@ Status Find(const std::string &format) {
     if (findings.back().presence.opened) status = kGood;
   }
   Output output;
-  if (format == "json") {
+  if (format == Format::kJson) {
     status = PrintJson(output, findings, status);
   } else {
     PrintNormal(output, findings);
@@ -85,8 +83,8 @@ Status Find(const std::string &format) {
 void AddFind(CLI::App &app, Action *action) {
   CLI::App *command =
       app.add_subcommand("find", "Say which controllers there are and what they offer");
-  const auto format = std::make_shared<std::string>();
-  AddFormat(command, format.get(), {"normal", "json"});
+  const auto format = std::make_shared<Format>();
+  AddFormat(command, format.get(), {Format::kNormal, Format::kJson});
   command->callback([=] { *action = [=] { return Find(*format); }; });
 }
 

@@ -4,9 +4,11 @@
 
 #include <fcntl.h>
 #include <poll.h>
+#include <sys/ioctl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <csignal>
@@ -14,6 +16,7 @@
 #include <cstring>
 #include <utility>
 
+#include "fleet/dump.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -91,17 +94,23 @@ Input::Input(const std::string &file, bool showProgress)
 }
 
 std::optional<size_t> Input::Read(char *bytes, size_t room) {
+  fleet::ReadResult result = reader_.Read(bytes, room);
+  if (result.fault.empty()) return result.count;
+  Refuse(result.fault);
+  return std::nullopt;
+}
+
+fleet::ReadResult Input::ReadRaw(char *bytes, size_t room) {
   while (error_ == 0) {
     const ssize_t count = read(descriptor_, bytes, room);
     if (count >= 0) {
       read_ += static_cast<size_t>(count);
       ShowProgress();
-      return static_cast<size_t>(count);
+      return {static_cast<size_t>(count), ""};
     }
     if (!CanTryAgain(descriptor_, POLLIN)) error_ = errno;
   }
-  Refuse(std::strerror(error_));
-  return std::nullopt;
+  return {0, std::strerror(error_)};
 }
 
 void Input::Refuse(const std::string &reason) {
@@ -124,19 +133,35 @@ void Input::ClearProgress() {
   progressShown_ = false;
 }
 
-std::optional<std::string> ReadInput(const std::string &file, uint64_t limit) {
+void NoteUnreadInput() {
+  struct stat status = {};
+  if (fstat(STDIN_FILENO, &status) != 0) return;
+  bool isReady = false;
+  if (S_ISREG(status.st_mode)) {
+    isReady = lseek(STDIN_FILENO, 0, SEEK_CUR) < status.st_size;
+  } else if (S_ISFIFO(status.st_mode) || S_ISSOCK(status.st_mode)) {
+    int count = 0;
+    isReady = ioctl(STDIN_FILENO, FIONREAD, &count) == 0 && count > 0;
+  }
+  if (isReady) Note("standard input", "was not read; name it, as -, to read it");
+}
+
+WholeInput ReadInput(const std::string &file, uint64_t limit) {
   Input input(file);
-  std::string bytes;
-  for (uint64_t length = input.size(); length <= limit; length = bytes.size()) {
+  WholeInput whole;
+  std::string &bytes = whole.bytes;
+  while (bytes.size() <= limit) {
     const size_t size = bytes.size();
     bytes.resize(size + kBlockSize);
     const std::optional<size_t> count = input.Read(bytes.data() + size, kBlockSize);
-    if (!count) return std::nullopt;
-    bytes.resize(size + *count);
-    if (*count == 0) return bytes;
+    bytes.resize(size + count.value_or(0));
+    if (!count) whole.status = kBadUsage;
+    if (count.value_or(0) == 0) return whole;
   }
-  input.Refuse("larger than " + std::to_string(limit) + " bytes");
-  return std::nullopt;
+  bytes.resize(limit);
+  input.Refuse(fleet::TooLarge(limit));
+  whole.status = kBadUsage;
+  return whole;
 }
 
 Output::Output() : terminal_(OutputIsTerminal()) {}
@@ -148,6 +173,17 @@ bool Output::Flush() {
   length_ -= whole;
   std::memmove(buffer_, buffer_ + whole, length_);
   return error_ == 0;
+}
+
+void Output::Control(std::string_view sequence) {
+  if (Flush()) error_ = WriteAll(outputDescriptor, sequence);
+}
+
+Output::Size Output::Window() {
+  winsize size = {};
+  if (ioctl(outputDescriptor, TIOCGWINSZ, &size) != 0 || size.ws_row * size.ws_col == 0)
+    size = {24, 80, 0, 0};
+  return {std::max<size_t>(size.ws_row, 2), std::max<size_t>(size.ws_col, 1)};
 }
 
 bool Output::WaitWithReader(const timespec &time, const sigset_t &mask) {

@@ -9,6 +9,7 @@
 #include <string>
 #include <string_view>
 
+#include "fleet/gzip.h"
 #include "tools/descriptor.h"
 #include "tools/messages.h"
 
@@ -29,9 +30,9 @@ int OriginalDescriptor(int number);
 // What a file is called in messages; "-" is standard input.
 std::string DisplayName(const std::string &file);
 
-// The bytes of a file, or of standard input for "-", in blocks as they arrive. Shows progress on a
-// terminal when it takes longer than a second, unless what is made of the first blocks may be there
-// already.
+// The bytes of a file, or of standard input for "-", in blocks as they arrive; unpacked where they
+// are compressed by gzip. Shows progress on a terminal when it takes longer than a second, unless
+// what is made of the first blocks may be there already.
 class Input {
  public:
   explicit Input(const std::string &file, bool showProgress = true);
@@ -50,6 +51,7 @@ class Input {
   void Refuse(const std::string &reason);
 
  private:
+  fleet::ReadResult ReadRaw(char *bytes, size_t room);
   void ShowProgress();
   void ClearProgress();
 
@@ -61,11 +63,20 @@ class Input {
   uint64_t read_ = 0;
   bool progressShown_ = false;
   int64_t nextProgress_ = INT64_MAX;  // on no terminal, never
+  fleet::GzipReader reader_{[this](char *bytes, size_t room) { return ReadRaw(bytes, room); }};
 };
 
-// Reads the whole of an input. Without a value it has complained: it cannot be read or is larger
-// than `limit` bytes.
-std::optional<std::string> ReadInput(const std::string &file, uint64_t limit);
+// A note, when there is something to be read on standard input that nobody asked for: it may be
+// meant for somebody else, or it may be what should have been read. Waits for nothing.
+void NoteUnreadInput();
+
+// Reads the whole of an input, but not more than `limit` bytes. What was read before a fault is
+// there; the status is good when there was none, and otherwise it has complained.
+struct WholeInput {
+  std::string bytes;
+  Status status = kGood;
+};
+WholeInput ReadInput(const std::string &file, uint64_t limit);
 
 // Standard output, checked: nothing is cut silently. It has a buffer and takes no memory else. To a
 // terminal no control characters are written.
@@ -93,6 +104,15 @@ class Output {
   // Writes out what is buffered, for whoever waits for it at the other end of a pipe. At a terminal
   // a character that has come in part waits for the rest of it.
   bool Flush();
+
+  // Writes a control sequence to the terminal, after what is buffered.
+  void Control(std::string_view sequence);
+
+  // How many rows and columns the terminal's window has; at least two rows and a column.
+  struct Size {
+    size_t rows, columns;
+  };
+  static Size Window();
 
   // Waits, under that signal mask, for the time to pass or a signal. False when the reader at the
   // other end has gone away, which then counts as a failed write.

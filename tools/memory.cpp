@@ -5,6 +5,7 @@
 #include <sys/mman.h>
 #include <sys/resource.h>
 
+#include <atomic>
 #include <new>
 #include <utility>
 
@@ -13,8 +14,9 @@ namespace {
 
 constexpr rlim_t kMemoryLimit = 1 << 30;
 
-bool refused = false;
-bool refusalTaken = false;
+// Several threads may be refused memory at once.
+std::atomic<bool> refused = false;
+std::atomic<bool> refusalTaken = false;
 MemoryReserve *held = nullptr;
 
 void OnRefusal() {
@@ -47,7 +49,7 @@ void RefuseMemory() {
 
 bool MemoryWasRefused() { return refused; }
 
-bool TakeMemoryRefusal() { return refused && !std::exchange(refusalTaken, true); }
+bool TakeMemoryRefusal() { return refused && !refusalTaken.exchange(true); }
 
 // Address space is what the limit counts: pages that nobody may touch cost nothing else. It comes
 // from the system, since the heap need not have a room of that size again when it has been full.

@@ -16,6 +16,7 @@ namespace {
 constexpr size_t kMostKept = 1000;
 
 bool keeping = false;
+uint64_t linesSaid = 0;
 std::vector<Message> kept;
 uint64_t leftOut = 0;
 
@@ -40,6 +41,7 @@ void Say(std::string_view severity, const std::string &subject, const std::strin
 }  // namespace
 
 void PrintLine(const std::string &text) {
+  ++linesSaid;
   const bool terminal = isatty(STDERR_FILENO) != 0;
   std::fprintf(stderr, "morwick: %s\n", terminal ? PrintableLine(text).c_str() : text.c_str());
 }
@@ -55,6 +57,8 @@ void ComplainOfMemory() {
   if (!std::exchange(said, true)) std::fputs("morwick: out of memory\n", stderr);
   Keep("error", "out of memory");
 }
+
+uint64_t LinesSaid() { return linesSaid; }
 
 void KeepMessages() { keeping = true; }
 

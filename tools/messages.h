@@ -57,6 +57,9 @@ void ComplainOfMemory();
 // From then on messages are kept, a thousand at most, for an object of JSON that prints them.
 void KeepMessages();
 
+// How many lines were said so far.
+uint64_t LinesSaid();
+
 struct Message {
   std::string_view severity;  // error, note
   std::string text;

@@ -21,9 +21,21 @@ using std::chrono::steady_clock;
 
 constexpr mode_t kCollectorsMode = 0644;  // the collector is another user
 
+struct Label {
+  std::string key;
+  std::string value;
+};
+
+struct File {
+  MorwickStream stream;
+  std::string name;
+};
+
 struct Options {
-  std::vector<std::pair<std::string, std::string>> labels;
-  std::vector<std::pair<std::string, std::string>> files;  // by stream
+  std::vector<Label> labels;
+  std::vector<File> files;
+  std::vector<std::string> names;  // each of one of the streams
+  Filter filter;
   std::string className;
   std::string output;  // standard output when not named
 };
@@ -36,7 +48,7 @@ struct Sample {
 
 // What came of one stream.
 struct Reading {
-  std::string stream;
+  MorwickStream stream = kMorwickKVR;
   bool good = false;
   double seconds = 0;                    // it took
   std::optional<double> timestamp = {};  // of the data, since 1970
@@ -59,37 +71,36 @@ double FileTime(const std::string &file) {
 std::vector<Sample> SamplesOf(const Statistics &statistics) {
   std::vector<Sample> samples = {};
   std::map<std::pair<std::string, std::string>, size_t> places;
-  for (EntryReader reader(statistics); !reader.AtEnd();) {
-    const EntryGroup group = reader.TakeGroup();
-    const ContextNode *value = group.value;
-    for (size_t i = 0; i < group.count; ++i, value = value->next) {
-      const Sample sample = {std::string(group.base), group.IsArray() ? std::to_string(i) : "",
-                             value->value};
+  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+    group->ForEach([&](const Entry &entry, size_t i) {
+      const Sample sample = {std::string(group->base), group->IsArray() ? std::to_string(i) : "",
+                             entry.value()};
       const auto [place, isNew] = places.try_emplace({sample.name, sample.index}, samples.size());
       if (isNew) {
         samples.push_back(sample);
       } else {
         samples[place->second].value = sample.value;
       }
-    }
+    });
   }
   return samples;
 }
 
+// Reads one stream; `readDump` does it.
 template <typename ReadDump>
-Reading Read(const std::string &stream, ReadDump readDump) {
+Reading Read(const Options &options, MorwickStream stream, ReadDump readDump) {
   Reading reading = {.stream = stream};
   const auto start = steady_clock::now();
   try {
     const Dump dump = readDump();
-    if (dump.status == kGood) {
-      const Statistics statistics(dump, stream);
+    if (dump.bytes) {
+      const Statistics statistics(dump, stream, options.filter);
       reading.samples = SamplesOf(statistics);
       reading.timestamp = dump.source.kind == "file" ? FileTime(dump.source.name) : Now();
-      reading.good = statistics.Judge(dump) == kGood;
+      reading.good = statistics.Check(dump) == kGood;
     }
   } catch (const std::bad_alloc &) {
-    Complain(stream, "out of memory");
+    Complain(std::string(NameOf(stream)), "out of memory");
   }
   reading.seconds = std::chrono::duration<double>(steady_clock::now() - start).count();
   return reading;
@@ -97,9 +108,10 @@ Reading Read(const std::string &stream, ReadDump readDump) {
 
 std::vector<Reading> ReadFiles(const Options &options) {
   std::vector<Reading> readings;
-  for (const auto &pair : options.files) {
-    const auto readFile = [&] { return ReadDumpFile(pair.second, pair.first, options.className); };
-    readings.push_back(Read(pair.first, readFile));
+  for (const File &file : options.files) {
+    readings.push_back(Read(options, file.stream, [&] {
+      return ReadDumpFile(file.name, file.stream, options.className);
+    }));
   }
   return readings;
 }
@@ -109,10 +121,11 @@ std::vector<Reading> ReadLive(const Options &options, std::string *className) {
   Controller controller(options.className, "kvr");
   *className = controller.name();
   std::vector<Reading> readings;
-  readings.push_back(Read("kvr", [&] { return ReadDump(controller, "kvr"); }));
-  if (controller.connected() && controller.Offers(*FindBufferKind("msp"))) {
-    readings.push_back(Read("msp", [&] { return ReadDump(controller, "msp"); }));
-  }
+  const auto read = [&](MorwickStream stream) {
+    readings.push_back(Read(options, stream, [&] { return ReadDump(controller, stream); }));
+  };
+  read(kMorwickKVR);
+  if (controller.connected() && controller.Offers(*FindBufferKind("msp"))) read(kMorwickMSP);
   return readings;
 }
 
@@ -127,7 +140,7 @@ class Exposition {
   }
 
   // A label without a value is left out.
-  void Line(std::vector<std::pair<std::string, std::string>> labels, const std::string &value) {
+  void Line(std::vector<Label> labels, const std::string &value) {
     labels.insert(labels.end(), options_.labels.begin(), options_.labels.end());
     std::string list;
     for (const auto &[key, label] : labels) {
@@ -150,6 +163,10 @@ class Exposition {
   std::string text_;
 };
 
+Label StreamLabel(const Reading &reading) {
+  return {"stream", std::string(NameOf(reading.stream))};
+}
+
 std::string Compose(const Options &options, const std::string &className,
                     const std::vector<Reading> &readings) {
   Exposition exposition(options);
@@ -160,22 +177,22 @@ std::string Compose(const Options &options, const std::string &className,
                   "1");
   exposition.Family("morwick_read_success", "Whether the stream was read whole and good.");
   for (const Reading &reading : readings) {
-    exposition.Line({{"stream", reading.stream}}, reading.good ? "1" : "0");
+    exposition.Line({StreamLabel(reading)}, reading.good ? "1" : "0");
   }
   exposition.Family("morwick_read_duration_seconds", "How long reading the stream took.");
   for (const Reading &reading : readings) {
-    exposition.Line({{"stream", reading.stream}}, std::to_string(reading.seconds));
+    exposition.Line({StreamLabel(reading)}, std::to_string(reading.seconds));
   }
   exposition.Family("morwick_read_timestamp_seconds",
                     "When the stream was read, or its file made.");
   for (const Reading &reading : readings) {
     if (!reading.timestamp) continue;
-    exposition.Line({{"stream", reading.stream}}, std::to_string(*reading.timestamp));
+    exposition.Line({StreamLabel(reading)}, std::to_string(*reading.timestamp));
   }
   exposition.Family("morwick_statistic", "A statistic that the storage controller reports.");
   for (const Reading &reading : readings) {
     for (const Sample &sample : reading.samples) {
-      exposition.Line({{"stream", reading.stream}, {"name", sample.name}, {"index", sample.index}},
+      exposition.Line({StreamLabel(reading), {"name", sample.name}, {"index", sample.index}},
                       std::to_string(sample.value));
     }
   }
@@ -186,6 +203,7 @@ Status Print(const Options &options) {
   std::string className = options.className;
   const std::vector<Reading> readings =
       options.files.empty() ? ReadLive(options, &className) : ReadFiles(options);
+  if (options.files.empty()) NoteUnreadInput();
   const std::string text = Compose(options, className, readings);
   const Status status = std::ranges::all_of(readings, &Reading::good) ? kGood : kBadData;
   if (!options.output.empty()) {
@@ -196,8 +214,8 @@ Status Print(const Options &options) {
   return output.Finish(status);
 }
 
-// K=V, with a key that Prometheus takes and that is not one of ours.
-std::pair<std::string, std::string> SplitLabel(const std::string &text) {
+// KEY=VALUE, with a key that Prometheus takes and that is not one of ours.
+Label SplitLabel(const std::string &text) {
   constexpr std::string_view kOurs[] = {"stream",     "name",    "index",
                                         "controller", "version", "platform"};
   const size_t split = text.find('=');
@@ -216,28 +234,23 @@ std::pair<std::string, std::string> SplitLabel(const std::string &text) {
   return {key, text.substr(split + 1)};
 }
 
-std::pair<std::string, std::string> SplitFile(const std::string &text) {
+File SplitFile(const std::string &text) {
   const size_t split = text.find('=');
-  const std::string stream = text.substr(0, split);
-  if (split == std::string::npos || std::ranges::find(kStreams, stream) == std::end(kStreams)) {
+  const std::optional<MorwickStream> stream = StreamNamed(text.substr(0, split));
+  if (split == std::string::npos || !stream) {
     throw CLI::ValidationError("STREAM=FILE", text + " does not begin with kvr=, ftl= or msp=");
   }
-  return {stream, text.substr(split + 1)};
+  return {*stream, text.substr(split + 1)};
 }
 
-// Takes the pairs of an option, each key once.
-template <typename Split>
-auto TakePairs(std::vector<std::pair<std::string, std::string>> *pairs, const std::string &option,
-               Split split) {
-  return [=](const std::vector<std::string> &texts) {
-    for (const std::string &text : texts) {
-      const auto pair = split(text);
-      for (const auto &[key, value] : *pairs) {
-        if (key == pair.first) throw CLI::ValidationError(option, key + " is given twice");
-      }
-      pairs->push_back(pair);
-    }
-  };
+// Takes one, whose `key` may be given once.
+template <typename Pair, typename Key>
+void TakeOnce(std::vector<Pair> *pairs, Pair pair, Key Pair::*key, const std::string &option,
+              const std::string &text) {
+  if (std::ranges::find(*pairs, pair.*key, key) != pairs->end()) {
+    throw CLI::ValidationError(option, text.substr(0, text.find('=')) + " is given twice");
+  }
+  pairs->push_back(std::move(pair));
 }
 
 }  // namespace
@@ -246,24 +259,37 @@ void AddMetrics(CLI::App &app, Action *action) {
   CLI::App *command =
       app.add_subcommand("metrics", "Print the statistics of a controller for Prometheus");
   const auto options = std::make_shared<Options>();
-  using Texts = std::vector<std::string>;
+  const auto takeFiles = [=](const std::vector<std::string> &texts) {
+    for (const std::string &text : texts) {
+      TakeOnce(&options->files, SplitFile(text), &File::stream, "STREAM=FILE", text);
+    }
+  };
+  const auto takeLabels = [=](const std::vector<std::string> &texts) {
+    for (const std::string &text : texts) {
+      TakeOnce(&options->labels, SplitLabel(text), &Label::key, "--label", text);
+    }
+  };
   command
-      ->add_option_function<Texts>("STREAM=FILE",
-                                   TakePairs(&options->files, "STREAM=FILE", SplitFile),
-                                   "Of dumps instead, such as kvr=FILE")
+      ->add_option_function<std::vector<std::string>>("STREAM=FILE", takeFiles,
+                                                      "Of dumps instead, such as kvr=FILE")
       ->type_name("{kvr,ftl,msp}");
+  AddNames(command, &options->names);
   command
-      ->add_option_function<Texts>("--label", TakePairs(&options->labels, "--label", SplitLabel),
-                                   "A label for all lines")
+      ->add_option_function<std::vector<std::string>>("--label", takeLabels,
+                                                      "A label for all lines")
       ->type_name("KEY=VALUE")
-      ->allow_extra_args(false);  // one behind each --label
+      ->allow_extra_args(false);  // one for each --label
   AddWrite(command, &options->output, "Write to a file, whole or not at all, mode 0644");
   AddController(command, &options->className,
                 "Read from this one instead of the first; with files, where they are from");
   command->callback([=] {
-    if (std::ranges::count(options->files, "-", [](const auto &file) { return file.second; }) > 1) {
+    if (std::ranges::count(options->files, "-", &File::name) > 1) {
       throw CLI::ValidationError("STREAM=FILE", "standard input can be read only once");
     }
+    std::vector<MorwickStream> streams;
+    for (const File &file : options->files) streams.push_back(file.stream);
+    if (streams.empty()) streams = {kMorwickKVR, kMorwickMSP};  // of a controller
+    options->filter = MakeFilter(streams, options->names);
     *action = [=] { return Print(*options); };
   });
 }

@@ -2,26 +2,70 @@
 
 #include "tools/options.h"
 
+#include <fmt/format.h>
+
+#include <algorithm>
+
 #include "tools/controller.h"
 #include "tools/messages.h"
 #include "tools/text.h"
 
 namespace tools {
+namespace {
 
-void AddFormat(CLI::App *command, std::string *format, const std::vector<std::string> &choices) {
-  *format = choices.front();
-  command->add_option("-o,--output-format", *format, "How to print")
-      ->check(CLI::IsMember(choices))
-      ->capture_default_str()
-      ->each([](const std::string &choice) {
-        if (choice == "json") KeepMessages();
-      });
+constexpr std::pair<std::string_view, Format> kFormats[] = {
+    {"normal", Format::kNormal}, {"json", Format::kJson}, {"csv", Format::kCsv}};
+
+std::string FormatName(Format format) {
+  for (const auto &[name, known] : kFormats) {
+    if (known == format) return std::string(name);
+  }
+  return "";
 }
 
-void AddStream(CLI::App *command, std::string *stream) {
-  command->add_option("-s,--stream", *stream, "Which statistics")
-      ->check(CLI::IsMember(std::vector<std::string>(std::begin(kStreams), std::end(kStreams))))
+}  // namespace
+
+void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &choices) {
+  std::vector<std::string> names;
+  for (const Format choice : choices) names.push_back(FormatName(choice));
+  *format = choices.front();
+  const auto take = [=](const std::string &name) {
+    for (const auto &[known, choice] : kFormats) {
+      if (name == known) *format = choice;
+    }
+    if (*format == Format::kJson) KeepMessages();
+  };
+  command->add_option_function<std::string>("-o,--output-format", take, "How to print")
+      ->check(CLI::IsMember(names))
+      ->default_str(names.front());
+}
+
+void AddStream(CLI::App *command, MorwickStream *stream) {
+  std::vector<std::string> names;
+  for (const MorwickStream each : kStreams) names.emplace_back(NameOf(each));
+  const auto take = [=](const std::string &name) { *stream = *StreamNamed(name); };
+  command->add_option_function<std::string>("-s,--stream", take, "Which statistics")
+      ->check(CLI::IsMember(names))
       ->required();
+}
+
+void AddNames(CLI::App *command, std::vector<std::string> *names) {
+  command->add_option("-n,--names", *names, "Only these statistics; 'host*' for all that begin so")
+      ->delimiter(',')
+      ->allow_extra_args(false)
+      ->type_name("NAMES");
+}
+
+Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &names) {
+  try {
+    return std::make_shared<const fleet::Selection>(streams, names);
+  } catch (const fleet::UnknownName &unknown) {
+    throw CLI::ValidationError("--names", unknown.what());
+  }
+}
+
+Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &names) {
+  return names.empty() ? nullptr : Select(streams, names);
 }
 
 void AddController(CLI::App *command, std::string *className, const std::string &description) {
@@ -38,23 +82,27 @@ void AddWrite(CLI::App *command, std::string *file, const std::string &descripti
   command->add_option_function<std::string>("-w,--write", take, description)->type_name("FILE");
 }
 
-CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds,
+CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds, double least,
                         const std::string &description) {
   const auto take = [=](const std::string &text) {
     const std::optional<double> value = ParseSeconds(text);
-    if (!value)
-      throw CLI::ValidationError(name, text + " is no number of seconds up to 1000000000");
+    if (!value || *value < least) {
+      throw CLI::ValidationError(
+          name, fmt::format("{} is not a number of seconds from {} to 1000000000", text, least));
+    }
     *seconds = *value;
   };
   return command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
 }
 
-void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
-               const std::string &description) {
+void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,
+               uint64_t most, const std::string &description) {
+  const std::string longName = name.substr(name.find("--"));
   const auto take = [=](const std::string &text) {
     const std::optional<uint64_t> value = ParseNumber(text, most);
-    if (!value) {
-      throw CLI::ValidationError(name, text + " is no whole number up to " + std::to_string(most));
+    if (!value || *value < least) {
+      throw CLI::ValidationError(
+          longName, fmt::format("{} is not a whole number from {} to {}", text, least, most));
     }
     *number = *value;
   };

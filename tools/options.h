@@ -3,16 +3,33 @@
 #define TOOLS_OPTIONS_H
 
 #include <CLI/CLI.hpp>
+#include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
+#include "fleet/columns.h"
+#include "tools/streams.h"
+
 namespace tools {
 
-// -o, --output-format: one of the choices, of which the first is the default.
-void AddFormat(CLI::App *command, std::string *format, const std::vector<std::string> &choices);
+enum class Format { kNormal, kJson, kCsv };
 
-// -s, --stream: kvr, ftl or msp; required.
-void AddStream(CLI::App *command, std::string *stream);
+// -o, --output-format: one of the choices, of which the first is the default.
+void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &choices);
+
+// -s, --stream: required.
+void AddStream(CLI::App *command, MorwickStream *stream);
+
+// -n, --names: names of statistics, separated by commas or in several options.
+void AddNames(CLI::App *command, std::vector<std::string> *names);
+
+// What these names select; all statistics without any. A name that no stream has is wrong usage.
+using Filter = std::shared_ptr<const fleet::Selection>;
+Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
+
+// The same, but null where everything is wanted.
+Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
 
 // -c, --controller: a class that the library knows.
 void AddController(CLI::App *command, std::string *className, const std::string &description);
@@ -20,13 +37,13 @@ void AddController(CLI::App *command, std::string *className, const std::string 
 // -w, --write: a file with a name; standard output is what there is without it.
 void AddWrite(CLI::App *command, std::string *file, const std::string &description);
 
-// Seconds, 0 or more, fractions too.
-CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds,
+// Seconds, `least` or more, fractions too.
+CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds, double least,
                         const std::string &description);
 
-// A whole number of digits, at most `most`.
-void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t most,
-               const std::string &description);
+// A whole number of digits, at least `least` and at most `most`.
+void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,
+               uint64_t most, const std::string &description);
 
 }  // namespace tools
 

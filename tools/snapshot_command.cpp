@@ -27,7 +27,7 @@ struct Options {
   bool described = false;  // by the file `header`
   bool fixed = false;
   std::string className;
-  std::string format;
+  Format format = Format::kNormal;
   bool summary = false;
 };
 
@@ -67,15 +67,19 @@ Snapshot Prepare(const Options &options) {
   Snapshot snapshot;
   snapshot.source = {"file", options.file};
   snapshot.name = DisplayName(options.file);
-  if (options.live) ReadLive(options, &snapshot);
+  if (options.live) {
+    NoteUnreadInput();
+    ReadLive(options, &snapshot);
+  }
   if (snapshot.status == kGood && options.described) {
     snapshot.headerName = DisplayName(options.header);
-    snapshot.header = ReadInput(options.header, kLargestHeader);
-    if (!snapshot.header) snapshot.status = kBadUsage;
+    WholeInput header = ReadInput(options.header, kLargestHeader);
+    snapshot.status = header.status;
+    snapshot.header = std::move(header.bytes);
   }
   if (snapshot.status != kGood || !snapshot.header) return snapshot;
   std::string wrong = CheckSnapshotHeader(*snapshot.header);
-  if (wrong.empty() && (options.format != "normal" || options.summary)) {
+  if (wrong.empty() && (options.format != Format::kNormal || options.summary)) {
     const uint32_t recordSize = LoadSnapshotHeader(*snapshot.header).recordSize;
     if (recordSize != sizeof(SnapshotRecord)) {
       wrong = "record size " + std::to_string(recordSize) + " is not that of the fixed layout, " +
@@ -208,7 +212,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     }
   } else if (json != nullptr) {
     good = PrintRows(output, *json, records);
-  } else if (options.format == "csv") {
+  } else if (options.format == Format::kCsv) {
     good = PrintCsv(output, records);
   } else if (snapshot.header) {
     status = PrintDescribedText(output, records, *snapshot.header, snapshot.name);
@@ -223,7 +227,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
 Status Print(const Options &options) {
   const Snapshot snapshot = Prepare(options);
   Output output;
-  if (options.format != "json") {
+  if (options.format != Format::kJson) {
     return output.Finish(PrintRecords(options, snapshot, output, nullptr));
   }
   Json json(output, "snapshot", {snapshot.source});
@@ -246,14 +250,14 @@ void AddSnapshot(CLI::App &app, Action *action) {
       ->excludes(header);
   command->add_flag("--summary", options->summary, "What it says as a whole");
   AddController(command, &options->className, "Read from this one instead of the first");
-  AddFormat(command, &options->format, {"normal", "json", "csv"});
+  AddFormat(command, &options->format, {Format::kNormal, Format::kJson, Format::kCsv});
   command->callback([=] {
     options->live = file->count() == 0;
     options->described = header->count() > 0;
     if (!options->live && !options->className.empty()) {
       throw CLI::ValidationError("--controller", "is not asked for what is read from a file");
     }
-    if (options->summary && options->format == "csv") {
+    if (options->summary && options->format == Format::kCsv) {
       throw CLI::ValidationError("--summary", "is not printed as csv");
     }
     if (options->file == "-" && options->header == "-") {

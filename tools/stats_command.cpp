@@ -1,5 +1,7 @@
 // morwick stats: prints the statistics of a controller or in a dump.
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <memory>
 
@@ -13,9 +15,11 @@ namespace {
 struct Options {
   std::string file;
   bool live = true;
-  std::string stream;
+  MorwickStream stream = kMorwickKVR;
+  std::vector<std::string> names;
+  Filter filter;
   std::string className;
-  std::string format;
+  Format format = Format::kNormal;
   bool summary = false;
   bool inFull = false;
 };
@@ -27,103 +31,104 @@ size_t LabelLength(const EntryGroup &group) {
          std::to_string(group.count - 1).size();
 }
 
-void PrintLabel(Output &output, std::string_view label, size_t length, size_t width) {
-  static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');
-  output.Write(label);
-  output.Write(std::string_view(blanks).substr(0, width - length));
-  output.Write(" : ");
-}
+// Labels that all take up the same width, with a colon after them.
+class Labels {
+ public:
+  explicit Labels(Output &output) : output_(output) {}
+
+  void Measure(size_t length) { width_ = std::max(width_, length); }
+
+  void Print(std::string_view label) {
+    static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');
+    output_.Write(label);
+    output_.Write(std::string_view(blanks).substr(0, width_ - label.size()));
+    output_.Write(" : ");
+  }
+
+ private:
+  Output &output_;
+  size_t width_ = 0;
+};
 
 // An array in one line.
 void PrintGroups(Output &output, const Statistics &statistics) {
-  size_t width = 0;
-  for (EntryReader reader(statistics); !reader.AtEnd();) {
-    width = std::max(width, LabelLength(reader.TakeGroup()));
+  Labels labels(output);
+  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+    labels.Measure(LabelLength(*group));
   }
-  for (EntryReader reader(statistics); !reader.AtEnd();) {
-    const EntryGroup group = reader.TakeGroup();
-    if (group.IsArray()) {
-      const std::string label =
-          std::string(group.base) + "[0.." + std::to_string(group.count - 1) + "]";
-      PrintLabel(output, label, label.size(), width);
+  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+    if (group->IsArray()) {
+      labels.Print(fmt::format("{}[0..{}]", group->base, group->count - 1));
     } else {
-      PrintLabel(output, group.base, group.base.size(), width);
+      labels.Print(group->base);
     }
-    const ContextNode *value = group.value;
-    for (size_t i = 0; i < group.count; ++i, value = value->next) {
+    group->ForEach([&](const Entry &entry, size_t i) {
       if (i > 0) output.Put(' ');
-      output.Write(value->text);
-    }
+      output.Write(entry.digits());
+    });
     output.Put('\n');
   }
 }
 
 void PrintEntries(Output &output, const Statistics &statistics) {
-  size_t width = 0;
-  for (const ContextNode *name = statistics.names(); name != nullptr; name = name->next) {
-    width = std::max(width, std::string_view(name->text).size());
-  }
-  const ContextNode *value = statistics.values();
-  for (const ContextNode *name = statistics.names(); name != nullptr; name = name->next) {
-    PrintLabel(output, name->text, std::string_view(name->text).size(), width);
-    output.Write(value->text);
+  Labels labels(output);
+  for (const Entry &entry : statistics) labels.Measure(entry.name().size());
+  for (const Entry &entry : statistics) {
+    labels.Print(entry.name());
+    output.Write(entry.digits());
     output.Put('\n');
-    value = value->next;
   }
 }
 
 void PrintSummary(Output &output, const Statistics &statistics) {
-  const std::vector<SummaryField> fields = SummaryOf(statistics);
-  size_t width = 0;
-  for (const SummaryField &field : fields) width = std::max(width, field.name.size());
-  for (const SummaryField &field : fields) {
-    PrintLabel(output, field.name, field.name.size(), width);
-    for (size_t i = 0; i < field.values.size(); ++i) {
-      output.Write((i > 0 ? " " : "") + std::to_string(field.values[i]));
+  const std::vector<Figure> figures = SummaryOf(statistics);
+  Labels labels(output);
+  for (const Figure &figure : figures) labels.Measure(figure.name.size());
+  for (const Figure &figure : figures) {
+    labels.Print(figure.name);
+    for (size_t i = 0; i < figure.values.size(); ++i) {
+      output.Write(fmt::format("{}{}", i > 0 ? " " : "", figure.values[i]));
     }
-    output.Put('\n');
+    output.Write(figure.fraction + "\n");
   }
 }
 
 void PrintCsv(Output &output, const Statistics &statistics) {
   output.Write("name,value\n");
-  const ContextNode *value = statistics.values();
-  for (const ContextNode *name = statistics.names(); name != nullptr; name = name->next) {
-    output.Write(name->text);
+  for (const Entry &entry : statistics) {
+    output.Write(entry.name());
     output.Put(',');
-    output.Write(value->text);
+    output.Write(entry.digits());
     output.Put('\n');
-    value = value->next;
   }
 }
 
 void PrintJsonSummary(Json &json, const Statistics &statistics) {
   json.Key("summary");
   json.BeginObject();
-  for (const SummaryField &field : SummaryOf(statistics)) {
-    json.Numbers(field.name, field.values.size() > 1, [&](auto print) {
-      for (const uint64_t value : field.values) print(value, std::to_string(value));
+  for (const Figure &figure : SummaryOf(statistics)) {
+    if (figure.values.empty()) {
+      json.Key(figure.name);
+      json.Digits(figure.fraction);
+      continue;
+    }
+    json.Numbers(figure.name, figure.values.size() > 1, [&](auto print) {
+      for (const uint64_t value : figure.values) print(value, std::to_string(value));
     });
   }
   json.EndObject();
 }
 
-void PrintJsonValues(Json &json, const EntryGroup &group) {
-  json.Numbers(group.IsArray() ? "values" : "value", group.IsArray(), [&](auto print) {
-    const ContextNode *value = group.value;
-    for (size_t i = 0; i < group.count; ++i, value = value->next) print(value->value, value->text);
-  });
-}
-
 void PrintJsonEntries(Json &json, const Statistics &statistics) {
   json.Key("entries");
   json.BeginArray();
-  for (EntryReader reader(statistics); !reader.AtEnd();) {
-    const EntryGroup group = reader.TakeGroup();
+  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
     json.BeginObject();
     json.Key("name");
-    json.PlainText(group.base);
-    PrintJsonValues(json, group);
+    json.PlainText(group->base);
+    json.Numbers(group->IsArray() ? "values" : "value", group->IsArray(), [&](auto print) {
+      group->ForEach([&](const Entry &entry, size_t) { print(entry.value(), entry.digits()); });
+    });
     json.EndObject();
   }
   json.EndArray();
@@ -132,20 +137,20 @@ void PrintJsonEntries(Json &json, const Statistics &statistics) {
 Status PrintJson(Output &output, const Options &options, const Dump &dump,
                  const Statistics *statistics) {
   Json json(output, "stats", {dump.source});
-  json.Member("stream", options.stream);
+  json.Member("stream", NameOf(options.stream));
   Status status = dump.status;
   if (statistics != nullptr) {
     json.Member("result", statistics->result());
-    if (options.stream == "kvr") PrintJsonSummary(json, *statistics);
+    if (options.stream == kMorwickKVR) PrintJsonSummary(json, *statistics);
     PrintJsonEntries(json, *statistics);
-    status = statistics->Judge(dump);
+    status = statistics->Check(dump);
   }
   return json.Finish(status);
 }
 
 Status PrintText(Output &output, const Options &options, const Dump &dump,
                  const Statistics &statistics) {
-  if (options.format == "csv") {
+  if (options.format == Format::kCsv) {
     PrintCsv(output, statistics);
   } else if (options.summary) {
     PrintSummary(output, statistics);
@@ -155,17 +160,18 @@ Status PrintText(Output &output, const Options &options, const Dump &dump,
     PrintGroups(output, statistics);
   }
   output.Flush();
-  return statistics.Judge(dump);
+  return statistics.Check(dump);
 }
 
 Status Print(const Options &options) {
   const Dump dump = options.live ? ReadDumpLive(options.stream, options.className)
                                  : ReadDumpFile(options.file, options.stream, options.className);
+  if (options.live) NoteUnreadInput();
   std::optional<Statistics> statistics;
-  if (dump.status == kGood) statistics.emplace(dump, options.stream);
+  if (dump.bytes) statistics.emplace(dump, options.stream, options.filter);
   Output output;
   Status status = dump.status;
-  if (options.format == "json") {
+  if (options.format == Format::kJson) {
     status = PrintJson(output, options, dump, statistics ? &*statistics : nullptr);
   } else if (statistics) {
     status = PrintText(output, options, dump, *statistics);
@@ -182,6 +188,7 @@ void AddStats(CLI::App &app, Action *action) {
   CLI::Option *file =
       command->add_option("FILE", options->file, "A dump; - for standard input")->type_name("");
   AddStream(command, &options->stream);
+  AddNames(command, &options->names);
   AddController(command, &options->className,
                 "Read from this one instead of the first; with FILE, where the dump is from");
   CLI::Option *summary = command->add_flag("--summary", options->summary,
@@ -190,13 +197,15 @@ void AddStats(CLI::App &app, Action *action) {
       ->add_flag("--long", options->inFull,
                  "Each element of an array on a line of its own; normal output only")
       ->excludes(summary);
-  AddFormat(command, &options->format, {"normal", "json", "csv"});
+  AddFormat(command, &options->format, {Format::kNormal, Format::kJson, Format::kCsv});
   command->callback([=] {
     options->live = file->count() == 0;
-    if (options->summary && (options->stream != "kvr" || options->format != "normal")) {
+    options->filter = MakeFilter({&options->stream, 1}, options->names);
+    const bool normal = options->format == Format::kNormal;
+    if (options->summary && (options->stream != kMorwickKVR || !normal)) {
       throw CLI::ValidationError("--summary", "is for kvr and normal output");
     }
-    if (options->inFull && options->format != "normal") {
+    if (options->inFull && !normal) {
       throw CLI::ValidationError("--long", "is for normal output");
     }
     *action = [=] { return Print(*options); };

@@ -17,8 +17,8 @@ extern "C" {
 #endif
 
 typedef struct MorwickSummaryField {
-  uint32_t id;         /* of the key that it is set from, which has the same name */
   const char *name;    /* as in KVRStatsCxt */
+  uint32_t id;         /* of the key that it is set from, which has the same name */
   uint32_t offset;     /* in KVRStatsCxt, in bytes */
   uint32_t valueWidth; /* bytes of a value: 4, the low half of what the key carries, or 8 */
   uint32_t valueCount; /* 1, or more for an array */
@@ -26,7 +26,7 @@ typedef struct MorwickSummaryField {
 
 MORWICK_EXPORT uint32_t MorwickSummaryFieldCount(void);
 
-/* The field with that index, in the order of KVRStatsCxt, counted from 0; null behind the last. */
+/* The field with that index, in the order of KVRStatsCxt, counted from 0; null after the last. */
 MORWICK_EXPORT const MorwickSummaryField *MorwickSummaryFieldAt(uint32_t index);
 
 /* A value of a context's field, by its index from 0; 0 for an index that there is none at, and for

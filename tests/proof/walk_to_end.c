@@ -1,6 +1,6 @@
 /*
- * What scripts/prove proves besides the walk itself: the loop that every caller runs. It ends for any
- * bytes, and it ends where the rules say.
+ * What scripts/prove proves besides the walk itself: the loop that every caller runs. It ends for
+ * any bytes, and it ends where the rules say.
  */
 /*@ // What the provers need to know of shifts, proved first.
     lemma shift_8: \forall integer x; x << 8 == x * 0x100;
@@ -14,7 +14,8 @@
 #include "stats/record_walk.h"
 
 /*@ // Where the header stands that comes after the record at `o`.
-    logic integer After(MorwickStream s, uint8_t *b, integer o) = o + HeaderSize(s) + Length(s, b, o);
+    logic integer After(MorwickStream s, uint8_t *b, integer o) = o + HeaderSize(s) + Length(s, b,
+   o);
 
     // Where the records end, from `o` on.
     logic integer End(MorwickStream s, uint8_t *b, integer size, integer o) =

@@ -1,0 +1,157 @@
+// The columns of a table of dumps.
+
+#include "fleet/columns.h"
+
+#include <fnmatch.h>
+
+#include <algorithm>
+#include <array>
+#include <numeric>
+#include <utility>
+
+namespace fleet {
+namespace {
+
+std::vector<const MorwickKey *> KeysOf(MorwickStream stream) {
+  std::vector<const MorwickKey *> keys(MorwickKeyCount(stream));
+  for (uint32_t i = 0; i < keys.size(); ++i) keys[i] = MorwickKeyAt(stream, i);
+  return keys;
+}
+
+std::string ValueName(MorwickStream stream, const MorwickKey &key, uint32_t count, uint32_t index) {
+  std::array<char, kMorwickNameRoom> name;
+  const uint32_t length = MorwickValueName(stream, &key, count, index, name.data());
+  return {name.data(), length};
+}
+
+bool Matches(const std::string &pattern, const std::string &name) {
+  return fnmatch(pattern.c_str(), name.c_str(), 0) == 0;
+}
+
+// How many letters must be put in, taken out or exchanged to make one of the other.
+size_t Distance(std::string_view one, std::string_view other) {
+  std::vector<size_t> row(other.size() + 1);
+  std::iota(row.begin(), row.end(), size_t{0});
+  for (size_t i = 0; i < one.size(); ++i) {
+    size_t diagonal = std::exchange(row[0], i + 1);
+    for (size_t j = 0; j < other.size(); ++j) {
+      const size_t exchanged = diagonal + (one[i] == other[j] ? 0 : 1);
+      diagonal = row[j + 1];
+      row[j + 1] = std::min({exchanged, row[j] + 1, row[j + 1] + 1});
+    }
+  }
+  return row.back();
+}
+
+std::string Lower(std::string text) {
+  for (char &c : text) {
+    if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+  }
+  return text;
+}
+
+std::string ClosestName(MorwickStream stream, const std::string &name) {
+  const std::string text = Lower(name).substr(0, kMorwickNameRoom);
+  const auto keys = KeysOf(stream);
+  // Better one that goes on than one that is as far away.
+  const auto closest = std::ranges::min_element(keys, {}, [&](const MorwickKey *key) {
+    const std::string known = Lower(key->name);
+    return std::pair(!known.starts_with(text), Distance(text, known));
+  });
+  return (*closest)->name;
+}
+
+}  // namespace
+
+Selection::Selection(std::span<const MorwickStream> streams, std::span<const std::string> names) {
+  const std::string everything = "*";
+  for (const std::string &name : names.empty() ? std::span(&everything, 1) : names) {
+    const bool isPattern = name.find_first_of("*?[") != std::string::npos;
+    bool found = false;
+    for (const MorwickStream stream : streams) {
+      found = (isPattern ? AddMatches(stream, name) : AddNamed(stream, name)) || found;
+    }
+    if (found) continue;
+    if (isPattern) throw UnknownName("no statistic has a name like '" + name + "'");
+    throw UnknownName("no statistic has the name '" + name + "'; the closest is " +
+                      ClosestName(streams.front(), name));
+  }
+}
+
+void Selection::Add(MorwickStream stream, const MorwickKey &key, uint32_t index) {
+  std::string name = ValueName(stream, key, key.valueCount, index);
+  if (!names_.insert(name).second) return;
+  columns_.push_back({&key, index, std::move(name)});
+  if (index == 0) names_.insert(ValueName(stream, key, 1, 0));
+}
+
+bool Selection::AddNamed(MorwickStream stream, const std::string &name) {
+  for (const MorwickKey *key : KeysOf(stream)) {
+    const bool all = name == key->name;
+    if (!all && !name.starts_with(key->name)) continue;
+    for (uint32_t i = 0; i < key->valueCount; ++i) {
+      if (!all && name != ValueName(stream, *key, key->valueCount, i)) continue;
+      Add(stream, *key, i);
+      if (!all) return true;
+    }
+    if (all) return true;
+  }
+  return false;
+}
+
+bool Selection::AddMatches(MorwickStream stream, const std::string &pattern) {
+  bool any = false;
+  for (const MorwickKey *key : KeysOf(stream)) {
+    const bool all = Matches(pattern, key->name);
+    for (uint32_t i = 0; i < key->valueCount; ++i) {
+      if (!all && !Matches(pattern, ValueName(stream, *key, key->valueCount, i))) continue;
+      Add(stream, *key, i);
+      any = true;
+    }
+  }
+  return any;
+}
+
+ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
+    : stream_(stream), firstId_(MorwickKeyAt(stream, 0)->id) {
+  const uint32_t lastId = MorwickKeyAt(stream, MorwickKeyCount(stream) - 1)->id;
+  firstOfId_.assign(lastId - firstId_ + 1, kNoColumn);
+  for (uint32_t column = 0; column < selection.columns().size(); ++column) {
+    const auto &[key, index, name] = selection.columns()[column];
+    uint32_t &first = firstOfId_[key->id - firstId_];
+    if (first == kNoColumn) {
+      first = static_cast<uint32_t>(columns_.size());
+      columns_.resize(columns_.size() + key->valueCount, kNoColumn);
+    }
+    columns_[first + index] = column;
+  }
+}
+
+// For the values of the key in turn; null when none has a column.
+const uint32_t *ColumnFiller::ColumnsOf(const MorwickKey &key) const {
+  const uint32_t first = firstOfId_[key.id - firstId_];
+  return first == kNoColumn ? nullptr : &columns_[first];
+}
+
+Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
+                           std::span<uint8_t> present) const {
+  Judge judge(dump);
+  MorwickRecordReader reader;
+  MorwickRecord record;
+  MorwickStartRecords(&reader, stream_, dump.data(), dump.size());
+  while (MorwickNextRecord(&reader, &record) != 0) {
+    judge.Take(record);
+    const uint32_t *columns = record.valueCount == 0 ? nullptr : ColumnsOf(*record.key);
+    if (columns == nullptr) continue;
+    // One value of an array has a name of its own, which no column has.
+    if (record.valueCount == 1 && record.key->valueCount > 1) continue;
+    for (uint32_t i = 0; i < record.valueCount; ++i) {
+      if (columns[i] == kNoColumn) continue;
+      values[columns[i]] = MorwickValue(&record, i);
+      present[columns[i]] = 1;
+    }
+  }
+  return judge.Finish(record);
+}
+
+}  // namespace fleet

@@ -1,0 +1,62 @@
+// The files of a fleet, one after the other.
+#ifndef FLEET_FILE_LIST_H
+#define FLEET_FILE_LIST_H
+
+#include <cstdint>
+#include <cstdio>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace fleet {
+
+// A file that was named, or found in a folder.
+struct ListedFile {
+  std::string name;
+  bool inFolder = false;
+  std::string fault;  // why there is nothing to be read, of a folder
+};
+
+// Hands out the files that names stand for, in the order of the names. A folder stands for all
+// files in it and below, in byte order of their paths. Of a folder no more is kept in memory than
+// the names in it and in those above it.
+class FileList {
+ public:
+  // Names from a list, if there is one, come after the others: one a line, or each ended by `end`.
+  // Empty ones are passed over. The stream is closed at the end.
+  explicit FileList(std::vector<std::string> names, std::FILE *list = nullptr, char end = '\n');
+
+  // False after the last one.
+  bool Next(ListedFile *file);
+
+  // Why the list could not be read to its end, as in errno; 0 when it was.
+  int error() const { return error_; }
+
+ private:
+  // A folder that is being gone through.
+  struct Folder {
+    std::string path;  // with a slash at its end
+    std::vector<std::string> names;
+    size_t next = 0;
+    uint64_t device = 0;
+    uint64_t inode = 0;
+  };
+  struct CloseFile {
+    void operator()(std::FILE *file) const { std::fclose(file); }
+  };
+
+  bool NextName(std::string *name);
+  bool Enter(const std::string &path, ListedFile *file);
+  bool NextInFolder(ListedFile *file);
+
+  std::vector<std::string> names_;
+  size_t next_ = 0;
+  std::unique_ptr<std::FILE, CloseFile> list_;
+  char end_;
+  int error_ = 0;
+  std::vector<Folder> folders_;
+};
+
+}  // namespace fleet
+
+#endif

@@ -1,0 +1,93 @@
+// What is wrong with a dump, in words.
+
+#include "fleet/judge.h"
+
+#include <algorithm>
+
+namespace fleet {
+namespace {
+
+constexpr uint64_t kMostNamed = 3;  // records of another length; a hostile dump has millions
+
+// The record that a fault is about; `where` it is.
+std::string Name(const MorwickRecord &record, const std::string &where) {
+  const std::string name = record.key == nullptr ? "" : std::string(", ") + record.key->name;
+  return "the record " + where + " (key " + std::to_string(record.id) + name + ") ";
+}
+
+std::string AtOffset(const MorwickRecord &record) {
+  return "at offset " + std::to_string(record.offset);
+}
+
+// Why the records end there, when that is no good end.
+std::string FaultOf(const MorwickRecord &end) {
+  switch (end.step) {
+    case kMorwickRecord:
+    case kMorwickEndOfBuffer:
+    case kMorwickEndRecord: break;
+    case kMorwickBadKey: return Name(end, "there") + "has no valid key";
+    case kMorwickTooLong:
+      return Name(end, "there") + "needs " + Bytes(end.length) + ", and " +
+             std::to_string(end.left) + " are left";
+    case kMorwickPartOfHeader: return "the rest, " + Bytes(end.left) + ", is not a whole header";
+  }
+  return "";
+}
+
+// What the first bytes say of data that is no dump; empty when they say nothing.
+std::string_view FormatOf(std::string_view data) {
+  constexpr std::pair<std::string_view, std::string_view> kFormats[] = {
+      {"\x28\xb5\x2f\xfd", "zstd"},
+      {std::string_view("\xfd\x37\x7a\x58\x5a\0", 6), "xz"},
+      {"BZh", "bzip2"},
+      {"PK\x03\x04", "zip"}};
+  for (const auto &[begin, name] : kFormats) {
+    if (data.starts_with(begin)) return name;
+  }
+  return "";
+}
+
+}  // namespace
+
+std::string Bytes(uint64_t count) {
+  return std::to_string(count) + (count == 1 ? " byte" : " bytes");
+}
+
+void Judge::Take(const MorwickRecord &record) {
+  hasValues_ = hasValues_ || record.valueCount > 0;
+  if (record.lengthDiffers == 0 || ++otherLengths_ > kMostNamed) return;
+  const uint64_t configured = uint64_t{record.key->valueCount} * record.valueWidth;
+  verdict_.faults.push_back(Name(record, AtOffset(record)) + "has " + Bytes(record.length) +
+                            ", and " + std::to_string(configured) + " are configured");
+}
+
+Verdict Judge::Finish(const MorwickRecord &end) {
+  if (dump_.empty()) return {{"there is nothing in it"}, ""};
+  const std::string fault = FaultOf(end);
+  if (const auto format = FormatOf(dump_); !format.empty() && !fault.empty()) {
+    return {{"this is " + std::string(format) + " data, and must be unpacked first"}, ""};
+  }
+  if (otherLengths_ > kMostNamed) {
+    verdict_.faults.push_back(std::to_string(otherLengths_ - kMostNamed) +
+                              " more records have another length than is configured");
+  }
+  if (!fault.empty()) {
+    verdict_.faults.push_back("the statistics end " + AtOffset(end) + ": " + fault);
+  } else if (end.following > 0) {
+    verdict_.note = Bytes(end.following) + (end.following == 1 ? " follows" : " follow") +
+                    " the end record " + AtOffset(end);
+  }
+  if (!hasValues_ && verdict_.faults.empty()) verdict_.faults.emplace_back("no statistics found");
+  return std::move(verdict_);
+}
+
+Verdict JudgeDump(MorwickStream stream, std::string_view dump) {
+  Judge judge(dump);
+  MorwickRecordReader reader;
+  MorwickRecord record;
+  MorwickStartRecords(&reader, stream, dump.data(), dump.size());
+  while (MorwickNextRecord(&reader, &record) != 0) judge.Take(record);
+  return judge.Finish(record);
+}
+
+}  // namespace fleet

@@ -1,0 +1,37 @@
+#define _GNU_SOURCE
+
+// Preloaded into a watch under test: its clock runs a thousand times faster, and so do its pauses.
+
+#include <poll.h>
+#include <signal.h>
+#include <stddef.h>
+#include <sys/syscall.h>
+#include <time.h>
+#include <unistd.h>
+
+enum { kFaster = 1000 };
+
+int clock_gettime(clockid_t clock, struct timespec *time) {
+  const int result = (int)syscall(SYS_clock_gettime, clock, time);
+  if (clock != CLOCK_MONOTONIC || result != 0) return result;
+  time->tv_sec = time->tv_sec * kFaster + time->tv_nsec / (1000000000 / kFaster);
+  time->tv_nsec = time->tv_nsec % (1000000000 / kFaster) * kFaster;
+  return 0;
+}
+
+int ppoll(struct pollfd *files, nfds_t count, const struct timespec *time, const sigset_t *mask) {
+  struct timespec shorter = {0, 0};
+  if (time != NULL) {
+    shorter.tv_sec = time->tv_sec / kFaster;
+    shorter.tv_nsec = time->tv_sec % kFaster * (1000000000 / kFaster) + time->tv_nsec / kFaster;
+  }
+  return (int)syscall(SYS_ppoll, files, count, time == NULL ? NULL : &shorter, mask,
+                      (size_t)(_NSIG / 8));
+}
+
+// The name that calls have where the compiler checks the array's size.
+int __ppoll_chk(struct pollfd *files, nfds_t count, const struct timespec *time,
+                const sigset_t *mask, size_t size) {
+  (void)size;
+  return ppoll(files, count, time, mask);
+}

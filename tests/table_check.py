@@ -1,0 +1,26 @@
+"""Holds a table against what `stats` prints for the same dumps: each value, and each fault.
+Usage: table_check.py MORWICK STREAM FILE..."""
+import csv, io, subprocess, sys
+
+morwick, stream, files = sys.argv[1], sys.argv[2], sys.argv[3:]
+run = lambda *words: subprocess.run([morwick, *words], capture_output=True, errors="surrogateescape")
+table = run("table", "-s", stream, "--", *files)
+heading, *rows = csv.reader(io.StringIO(table.stdout, newline=""))
+assert [row[0] for row in rows] == files, "a row for each file, in their order"
+said = []
+for row in rows:
+    stats = run("stats", "-s", stream, "-o", "csv", "--", row[0])
+    values = dict(csv.reader(io.StringIO(stats.stdout)))  # the last one of a name
+    values.pop("name", None)
+    expected = [values.pop(name, "") for name in heading[2:]]
+    assert expected == row[2:], [(n, e, v) for n, e, v in zip(heading[2:], expected, row[2:]) if e != v]
+    # One value of an array is named like the array, and has no column; the fault tells.
+    assert not values or (row[1] and all(name + "0" in heading for name in values)), values
+    faults = [line.removeprefix(f"morwick: {row[0]}: ") for line in stats.stderr.splitlines()]
+    faults = [fault for fault in faults if "the end record" not in fault]
+    assert row[1] == "; ".join(faults), (row[1], faults)
+    assert (stats.returncode == 0) == (row[1] == "")
+    said += [f"morwick: {row[0]}: {row[1]}"] if row[1] else []
+assert table.stderr.splitlines() == said, (table.stderr, said)
+assert table.returncode == (1 if said else 0)
+print(len(rows), "dumps agree,", len(said), "of them with a fault,", len(heading) - 2, "columns")

@@ -1,0 +1,40 @@
+// Lines on a terminal that are drawn again and again in the same place.
+
+#include "tools/redrawn_block.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+
+#include "tools/messages.h"
+
+namespace tools {
+
+void RedrawnBlock::Draw(std::vector<std::string> lines) {
+  lines_ = std::move(lines);
+  DrawAgain();
+}
+
+void RedrawnBlock::DrawAgain() {
+  const auto [rows, columns] = output_.Window();
+  // A line that is longer than the window by now takes up several of its rows.
+  size_t up = 0;
+  for (const size_t length : drawn_) up += length == 0 ? 1 : (length + columns - 1) / columns;
+  if (said_ == LinesSaid() && up > 0) {
+    output_.Control(fmt::format("\r\033[{}A\033[J", std::min(up, rows - 1)));
+  }
+  said_ = LinesSaid();
+  drawn_.clear();
+  const size_t most = rows - 1;  // the cursor has the last one
+  for (size_t i = 0; i < std::min(lines_.size(), most); ++i) {
+    const bool cut = i + 1 == most && lines_.size() > most;
+    const std::string line =
+        cut ? fmt::format("... and {} lines more", lines_.size() - i) : lines_[i];
+    drawn_.push_back(std::min(line.size(), columns));
+    output_.Write(line.substr(0, columns));
+    output_.Write("\n");
+  }
+  output_.Flush();
+}
+
+}  // namespace tools

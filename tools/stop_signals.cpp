@@ -1,0 +1,54 @@
+// Signals that ask a command to stop.
+
+#include "tools/stop_signals.h"
+
+#include <algorithm>
+#include <cstdlib>
+
+namespace tools {
+
+using std::chrono::nanoseconds;
+using std::chrono::steady_clock;
+
+volatile sig_atomic_t StopSignals::stopped_ = 0;
+volatile sig_atomic_t StopSignals::resized_ = 0;
+
+StopSignals::StopSignals() {
+  struct sigaction action = {};
+  sigemptyset(&signals_);
+  action.sa_handler = [](int) { resized_ = 1; };
+  sigaction(SIGWINCH, &action, nullptr);
+  sigaddset(&signals_, SIGWINCH);
+  action.sa_handler = [](int signal) { stopped_ = signal; };
+  action.sa_flags = static_cast<int>(SA_RESETHAND);
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+    struct sigaction before = {};
+    sigaction(signal, nullptr, &before);
+    if (signal == SIGHUP && before.sa_handler == SIG_IGN) continue;
+    sigaction(signal, &action, nullptr);
+    sigaddset(&signals_, signal);
+  }
+}
+
+StopSignals::End StopSignals::WaitUntil(steady_clock::time_point moment, Output &output) {
+  sigset_t before;
+  sigprocmask(SIG_BLOCK, &signals_, &before);  // none is missed between question and sleep
+  bool reader = true;
+  resized_ = 0;
+  int64_t left = 1;  // nanoseconds; without any, signals and reader are asked for all the same
+  while (stopped_ == 0 && resized_ == 0 && reader && left > 0) {
+    left = std::max(nanoseconds(moment - steady_clock::now()).count(), int64_t{0});
+    reader = output.WaitWithReader({left / 1000000000, left % 1000000000}, before);
+  }
+  sigprocmask(SIG_SETMASK, &before, nullptr);
+  if (stopped_ != 0 || !reader) return End::kStopped;
+  return resized_ != 0 ? End::kResized : End::kTime;
+}
+
+void StopSignals::EndProcess() {
+  std::signal(stopped_, SIG_DFL);
+  std::raise(stopped_);
+  std::abort();  // never comes here
+}
+
+}  // namespace tools
