@@ -1,5 +1,5 @@
-// Keeps the contract with nothing behind it: there is no controller to find, no handle is ever
-// open, and the schedule is over before it begins.
+// A platform without controllers. It keeps the contract: it finds no controller, it opens no
+// handle, and its schedule is empty.
 
 #include <cstdarg>
 #include <cstdio>
@@ -16,7 +16,7 @@ constexpr int kActivityStateNone = 0;
 }  // namespace
 
 MatchingRequest *ServiceMatching(const char *className) {
-  static char request;  // no more is known of it than that it is there
+  static char request;  // callers see only that it is not null
   return className == nullptr ? nullptr : reinterpret_cast<MatchingRequest *>(&request);
 }
 
@@ -51,7 +51,7 @@ void RunMainQueue() {
   std::exit(EXIT_SUCCESS);
 }
 
-// Waits for whoever reads standard error, which a platform that has runs must not: here there is
+// May wait until somebody reads standard error. A platform with runs must not wait; here there is
 // no run to hold up.
 void SystemLog(const char *format, ...) {
   char message[1024];

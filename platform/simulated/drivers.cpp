@@ -1,4 +1,4 @@
-// The driver registry, driver connections and the simulated controllers behind them.
+// The driver registry, the driver connections and the simulated controllers.
 
 #include <endian.h>
 
@@ -31,14 +31,14 @@ enum Result : int32_t {
   kNoMemory = 0x106,
 };
 
-// The driver's own numbers, as a controller has them: a wrong one in the library is noticed.
+// The driver has its own copies of these numbers, so that tests notice a wrong one in the library.
 constexpr size_t kRequestSize = 24;  // command, argument, zeros
 constexpr size_t kRequestZeros = 8;
 constexpr uint32_t kTaskSchedulerArgument = 1025;
 constexpr uint32_t kReadArgument = 0;
 
-// A controller at work: what is left to do, which files its next reads hand out, and how often it
-// was called, which faults count by.
+// A controller at work: its pending work, the files of its next reads, and how often it was called.
+// Faults count the calls.
 struct Device {
   const Controller *controller;
   uint32_t pending;
@@ -69,7 +69,7 @@ Handles::node_type MakeRoom() {
   return one.extract(0);
 }
 
-// The library has a load of this kind too; a platform knows of the tree nothing but its contract.
+// The library has such a function too, but a platform may include only the contract.
 uint32_t LoadWord(const void *bytes, size_t offset) {
   uint32_t word;
   std::memcpy(&word, static_cast<const char *>(bytes) + offset, sizeof word);
@@ -188,7 +188,8 @@ class Drivers {
       if (!made) return kNotOffered;
       size = *made;
     } else {
-      // Not straight into the reply: where reading fails half-way nothing is to be written there.
+      // A failed call writes nothing, so the bytes go into the reply only when all of them are
+      // read.
       const auto bytes = std::make_unique_for_overwrite<char[]>(room);
       if (const int error = ReadFile(files[next].c_str(), bytes.get(), room, &size); error != 0) {
         Complain(Quoted(files[next]) + ": " + std::strerror(error));
@@ -196,10 +197,11 @@ class Drivers {
       }
       std::copy_n(bytes.get(), size, static_cast<char *>(reply));
     }
-    // A reply that fills the room may have been cut, and the same is asked for again with more.
+    // A reply that fills the room may be cut. The caller then asks again with more room and must
+    // get the same file.
     const bool cut = size == room;
     if (controller.shortRead.Hits(read)) {
-      // Who looks beyond a short reply is not to find the rest of it there.
+      // A caller that reads beyond a short reply must not find the rest of it there.
       std::fill_n(static_cast<char *>(reply) + size / 2, size - size / 2, '\0');
       size /= 2;
     }
@@ -216,8 +218,8 @@ class Drivers {
     return lastHandle_;
   }
 
-  // Null for a handle that is not open, with a word about it on standard error; 0 means none and
-  // is refused in silence.
+  // Null for a handle that is not open, after a line on standard error. 0 means no handle and is
+  // refused without a line.
   Device *DeviceOf(HandleKind kind, uint32_t number) {
     const auto found = open_.find(number);
     if (found != open_.end() && found->second.kind == kind) return found->second.device;
@@ -236,7 +238,7 @@ class Drivers {
   uint32_t lastHandle_ = 0;
 };
 
-// Answers a contract function; without memory for the answer, with the failure.
+// Returns what `answer` returns, or `failure` when memory is refused.
 template <typename Answer, typename Function>
 Answer OrFailure(Answer failure, Function answer) {
   try {
@@ -252,7 +254,7 @@ Answer OrFailure(Answer failure, Function answer) {
 using simulated::Drivers;
 using simulated::OrFailure;
 
-// Brings the memory for the handle, so that only the making of a request may fail for want of it.
+// It holds the memory for the handle already: only making the request can fail for lack of memory.
 struct MatchingRequest {
   std::string className;
   simulated::Handles::node_type room;

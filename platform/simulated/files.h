@@ -8,18 +8,18 @@
 
 namespace simulated {
 
-// Reads the file's first `room` bytes and not one more, so that a device or a FIFO will do. Returns
-// 0, or the number of the error.
+// Reads at most the first `room` bytes of the file, so that devices and FIFOs work too. Returns 0,
+// or the error number as in errno.
 int ReadFile(const char *path, void *bytes, size_t room, size_t *size);
 
-// Text from outside, without characters that would end a line or steer a terminal.
+// Text from outside. Bytes that could end a line or control a terminal are written as \x0a.
 std::string Printable(std::string_view text);
 
 // The same in quotes.
 std::string Quoted(std::string_view text);
 
-// One line on standard error, after the program's name. Whoever does not read it is given a second:
-// the process may be one that no signal ends by now.
+// Prints one line on standard error, after the program's name. When nobody reads standard error it
+// gives up after a second: signals may already be blocked, so that only SIGKILL would end a wait.
 void Complain(const std::string &reason);
 
 }  // namespace simulated

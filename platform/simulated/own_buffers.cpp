@@ -1,7 +1,7 @@
-// Statistics, snapshot and snapshot header of a controller that is made up: it was first powered on
-// at a fixed time, and everything follows from the time since then. Its load swells and ebbs within
-// a minute. All numbers are little-endian. Keys and columns are its own copies, as a controller has
-// them: a wrong one in the library is noticed.
+// Statistics, snapshot and snapshot header of a made-up controller. It was first powered on at a
+// fixed time, and all values follow from the time since then. Its load rises and falls once a
+// minute. All numbers are little-endian. It has its own copies of keys and columns, so that tests
+// notice a wrong one in the library.
 
 #include "platform/simulated/own_buffers.h"
 
@@ -26,8 +26,8 @@ constexpr uint64_t kHour = 3'600'000;           // in milliseconds
 constexpr uint64_t kMinute = 60'000;
 constexpr double kSwing = 5'000;
 
-// What is known at the first power-on, and what each hour adds: of the clock, or of the load. An
-// array is a histogram: each element has half of what the one before it has.
+// The value at the first power-on, and how much each hour adds: an hour of the clock, or of work.
+// An array is a histogram: each element has half the value of the element before it.
 enum Pace { kByLoad, kByClock };
 struct Counter {
   uint32_t id;
@@ -76,7 +76,7 @@ constexpr Counter kMspStatistics[] = {
     {8214, 5, 0, 3'600},         // active time
 };
 
-// Where the columns of a snapshot's interval lie, and how each is printed.
+// Where the columns of a snapshot's interval are, and how each is printed.
 enum Kind : uint16_t { kPlain = 1, kThousandths = 2, kPriorities = 3 };
 struct Column {
   Kind kind;
@@ -121,7 +121,7 @@ constexpr uint32_t kIntervalCount = 120;
 constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};
 constexpr size_t kFormatSize = 16;
 
-// A reply that is written for as long as there is room.
+// A reply that is cut where its room ends.
 class Reply {
  public:
   Reply(void *bytes, size_t room) : bytes_(static_cast<char *>(bytes)), room_(room) {}
@@ -143,23 +143,23 @@ class Reply {
   size_t size_ = 0;
 };
 
-// Where in the load's minute a time is, in milliseconds, as an angle.
+// The place of a time (in milliseconds) within the load's minute, as an angle.
 double PhaseAt(uint64_t time) {
   return 2 * std::numbers::pi * static_cast<double>(time % kMinute) / kMinute;
 }
 
-// The time that counters go by. It runs up to five seconds ahead of the clock and behind it, and
-// never back: the load is what it gains in a second.
+// The time that drives the counters. It is up to five seconds before or after the clock and never
+// goes back. The load is how much of it passes in a second.
 uint64_t BusyTime(uint64_t time) {
   return time + static_cast<uint64_t>(std::llround(kSwing * std::sin(PhaseAt(time))));
 }
 
-// The load at a time, 1 on average: the slope of the above.
+// The load at a time, 1 on average: the derivative of BusyTime.
 double LoadAt(uint64_t time) {
   return 1 + 2 * std::numbers::pi * kSwing / kMinute * std::cos(PhaseAt(time));
 }
 
-// Hours apart from the rest of one: growth times milliseconds could run past 64 bits.
+// Multiplies whole hours and the rest separately: growth times milliseconds could exceed 64 bits.
 uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
   const uint64_t time = counter.pace == kByClock ? clock : BusyTime(clock);
   const uint64_t grown = time / kHour * counter.growth + time % kHour * counter.growth / kHour;
@@ -174,7 +174,7 @@ void AppendStatistics(uint64_t time, Reply *reply) {
   }
 }
 
-// Counters of 32 bits stay where they end.
+// Counters of 32 bits stop at their largest value.
 void AppendMspStatistics(uint64_t time, Reply *reply) {
   for (const Counter &counter : kMspStatistics) {
     reply->Append(static_cast<uint16_t>(counter.id));
@@ -188,10 +188,10 @@ void AppendMspStatistics(uint64_t time, Reply *reply) {
 
 constexpr uint32_t kNotShown = 4'200'000'000;
 
-// The interval that ended in the given second, with slow writes for eight seconds out of two
+// The interval that ended in the given second. Writes are slow in eight seconds of each two
 // minutes.
 void AppendInterval(uint32_t second, Reply *reply) {
-  // What no column shows is far from what they show, so that a wrong offset is seen.
+  // Words without a column get values that no column has, so that a wrong offset is seen.
   std::array<uint32_t, kIntervalSize / sizeof(uint32_t)> interval;
   std::iota(interval.begin(), interval.end(), kNotShown);
   const auto set = [&](uint32_t offset, uint32_t value) { interval[offset / 4] = value; };
@@ -244,8 +244,8 @@ void AppendSnapshot(uint64_t time, Reply *reply) {
   for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, reply);
 }
 
-// Describes the snapshot. Of the records that a header counts the last is never printed, so it
-// counts one more than there are.
+// Describes the snapshot. The last record that a header counts is never printed, so the header
+// counts one record more than there are.
 void AppendSnapshotHeader(Reply *reply) {
   constexpr uint32_t kVersion = 6;
   constexpr uint32_t kTextOffset = 36;
@@ -266,8 +266,8 @@ void AppendSnapshotHeader(Reply *reply) {
   }
 }
 
-// Milliseconds since the first power-on. A clock that is set before it leaves the controller with
-// as many intervals behind it as a snapshot has.
+// Milliseconds since the first power-on. When the clock is set to an earlier time, the controller
+// still has as many intervals as a snapshot holds.
 uint64_t Now() {
   using std::chrono::milliseconds;
   const int64_t now =

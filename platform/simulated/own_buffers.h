@@ -1,4 +1,4 @@
-// What a simulated controller tells about itself when its scenario names no files for it.
+// The buffers of a simulated controller for which its scenario names no files.
 #ifndef PLATFORM_SIMULATED_OWN_BUFFERS_H
 #define PLATFORM_SIMULATED_OWN_BUFFERS_H
 
@@ -8,8 +8,8 @@
 
 namespace simulated {
 
-// Writes the buffer that the command reads, as it is at this moment by the wall clock, cut to the
-// room. The number of bytes written, or nothing for a buffer that controllers make none of.
+// Writes the buffer that the command reads, as of now by the wall clock, cut to the room. Returns
+// the number of bytes written, or nothing when the made-up controller has no such buffer.
 std::optional<size_t> MakeOwnBuffer(uint32_t command, void *reply, size_t room);
 
 }  // namespace simulated

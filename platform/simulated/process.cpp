@@ -1,4 +1,4 @@
-// Takes a daemon's process over.
+// Takes over the process of a daemon.
 
 #include "platform/simulated/process.h"
 
@@ -15,8 +15,8 @@
 namespace simulated {
 namespace {
 
-// What is written to a stream that was closed at the start is to fail, and not to land in whatever
-// is opened next. Where there is no /dev/null the root folder does: it cannot be written either.
+// A write to a stream that was closed at the start must fail, and must not go to the next file that
+// is opened. Without /dev/null the root folder takes its place: nobody can write to it either.
 void TakeStandardStreams() {
   int descriptor;
   do {
@@ -26,7 +26,7 @@ void TakeStandardStreams() {
   if (descriptor >= 0) close(descriptor);
 }
 
-// Whoever starts a process with SIGHUP ignored, as nohup does, wants it to outlive the terminal.
+// nohup starts a process with SIGHUP ignored, so that it goes on when the terminal is closed.
 bool OutlivesTerminal() {
   struct sigaction hangup = {};
   return sigaction(SIGHUP, nullptr, &hangup) == 0 && hangup.sa_handler == SIG_IGN;
@@ -43,7 +43,7 @@ const sigset_t &WaitedFor() {
   return signals;
 }
 
-// Signals that mean nothing to a daemon: what cannot be written fails where it is written.
+// The failing write reports these two; they must not end the daemon.
 void IgnoreSignals() {
   signal(SIGPIPE, SIG_IGN);
   signal(SIGXFSZ, SIG_IGN);
@@ -61,10 +61,10 @@ const Scenario *LoadOrEnd() {
 const Scenario &Take() {
   TakeStandardStreams();
   IgnoreSignals();
-  // Any signal still ends the process here: the scenario may come from a pipe that stays open.
+  // Until here any signal ends the process: the scenario may come from a pipe that stays open.
   const Scenario *scenario = LoadOrEnd();
-  // Blocked in the main thread before there is another, they never interrupt a pause of the
-  // activity.
+  // The signals are blocked before a second thread starts. So they never interrupt the activity's
+  // sleep.
   pthread_sigmask(SIG_BLOCK, &WaitedFor(), nullptr);
   return *scenario;
 }
@@ -77,7 +77,7 @@ const Scenario &TakeProcess() {
 }
 
 void EndWithoutMemory() {
-  Complain("out of memory");  // short enough to take no memory itself
+  Complain("out of memory");  // so short that the text needs no memory
   std::exit(2);
 }
 

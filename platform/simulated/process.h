@@ -7,25 +7,24 @@
 
 namespace simulated {
 
-// What every function begins with that only a daemon calls, on its main thread at first. The first
-// call takes the process over: nothing else becomes descriptor 0, 1 or 2, and SIGPIPE and SIGXFSZ
-// mean nothing. Then it loads the scenario, without which the process ends with status 2; until
-// that is done any other signal ends it too. From then on SIGTERM, SIGINT, SIGHUP and SIGUSR1 wait
-// for WaitToStop.
+// Each function that only a daemon calls begins with it. The first call must come from the main
+// thread and takes over the process: no file that is opened later becomes descriptor 0, 1 or 2, and
+// SIGPIPE and SIGXFSZ are ignored. Then it loads the scenario; without one the process ends with
+// status 2. From then on SIGTERM, SIGINT, SIGHUP and SIGUSR1 wait for WaitToStop.
 const Scenario &TakeProcess();
 
-// Ends the process for want of memory or of threads: one line, and status 2.
+// Ends the process with one line and status 2, because memory or a thread was refused.
 [[noreturn]] void EndWithoutMemory();
 
-// Takes the signals that came before there was a run: true when one of them asks to stop. One to
-// yield means nothing then.
+// Takes the signals that came before the first run. True when one of them asks to stop; SIGUSR1 has
+// nothing to interrupt yet and is dropped.
 bool StopCameEarly();
 
-// Waits for a signal: true when it asks the process to stop, false when it asks the activity to
+// Waits for a signal. True when it asks the process to stop, false when it asks the activity to
 // yield.
 bool WaitToStop();
 
-// What SIGTERM does.
+// Sends SIGTERM to this process.
 void Stop();
 
 }  // namespace simulated

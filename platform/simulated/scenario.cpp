@@ -2,13 +2,16 @@
 
 #include "platform/simulated/scenario.h"
 
-// The TOML library asserts, or has the compiler assume, what bad input does not keep, in front of
-// the code that refuses such input. Only that code is to be left.
+// The TOML library asserts conditions that bad input breaks, or tells the compiler to assume them,
+// just before the code that refuses such input. Here only that code stays.
 #include <toml++/impl/preprocessor.h>
 #undef TOML_ASSERT
 #undef TOML_ASSERT_ASSUME
 #define TOML_ASSERT(condition) static_assert(true)
 #define TOML_ASSERT_ASSUME(condition) static_assert(true)
+// Each nested value takes some of the stack.
+#undef TOML_MAX_NESTED_VALUES
+#define TOML_MAX_NESTED_VALUES 16
 #include <toml++/toml.h>
 
 #include <algorithm>
@@ -24,7 +27,7 @@
 namespace simulated {
 namespace {
 
-// Discovery, two requests, a deferral between them and the resumed run, in some ten seconds.
+// It takes about ten seconds: discovery, two requests, a deferral between them and the resumed run.
 constexpr std::string_view kBuiltInScenario = R"(
 [schedule]
 defer_at_check = [2]
@@ -36,9 +39,9 @@ pending = 2
 
 constexpr double kLongestSeconds = 1e6;
 constexpr size_t kLargestFile = 64 << 10;
-constexpr size_t kDeepest = 64;
+constexpr size_t kMostDots = 256;
 
-// What a scenario is refused for: the first error, and the line that it is in.
+// The first error of a scenario, and its line.
 struct BadScenario {
   size_t line;
   std::string reason;
@@ -48,66 +51,26 @@ struct BadScenario {
   throw BadScenario{.line = where.begin.line, .reason = reason};
 }
 
-// Refuses what the TOML library cannot be given: for some characters beyond ASCII its tables run
-// into undefined behaviour.
-void CheckCharacters(std::string_view text) {
+// Some texts must not reach the TOML library. For some characters beyond ASCII its tables run into
+// undefined behaviour. Each dot of a key takes some of its stack.
+void CheckText(std::string_view text) {
   size_t line = 1;
+  size_t dots = 0;
   for (const char c : text) {
     const bool ascii = static_cast<unsigned char>(c) <= 127;
     if (!ascii) throw BadScenario{line, "a character that is not ASCII"};
-    if (c == '\n') ++line;
-  }
-}
-
-// Where the comment or the string ends that begins at `at`.
-size_t EndOfText(std::string_view text, size_t at) {
-  const char begin = text[at];
-  if (begin == '#') return std::min(text.find('\n', at), text.size());
-  const bool lines = text.substr(at, 3) == std::string(3, begin);
-  const std::string_view end = text.substr(at, lines ? 3 : 1);
-  for (at += end.size(); at < text.size(); ++at) {
-    if (text[at] == '\n' && !lines) return at;
-    if (text.substr(at, end.size()) == end) {
-      at += end.size();
-      // Up to two more belong to the string.
-      return lines ? std::min(text.find_first_not_of(begin, at), text.size()) : at;
+    if (c == '.' && ++dots > kMostDots) {
+      throw BadScenario{line, "more than " + std::to_string(kMostDots) + " dots in one line"};
     }
-    if (text[at] == '\\' && begin == '"') ++at;
-  }
-  return text.size();
-}
-
-// The same for nesting, by brackets or by the dots of a key: each level takes some of its stack.
-void CheckDepth(std::string_view text) {
-  size_t depth = 0;
-  std::vector<size_t> outside;  // of each bracket that is open
-  for (size_t at = 0; at < text.size(); ++at) {
-    switch (text[at]) {
-      case '#':
-      case '"':
-      case '\'': at = EndOfText(text, at) - 1; break;
-      case '[':
-      case '{': outside.push_back(depth); [[fallthrough]];
-      case '.': ++depth; break;
-      case ']':
-      case '}':
-        if (!outside.empty()) outside.pop_back();
-        break;
-      case ',':
-      case '\n': depth = outside.empty() ? 0 : outside.back() + 1; break;
-      default: break;
-    }
-    if (depth > kDeepest) {
-      const auto line =
-          1 + std::count(text.begin(), text.begin() + static_cast<ptrdiff_t>(at), '\n');
-      throw BadScenario{static_cast<size_t>(line),
-                        "deeper than " + std::to_string(kDeepest) + " levels"};
+    if (c == '\n') {
+      ++line;
+      dots = 0;
     }
   }
 }
 
-// One table of the file. Each Read takes one key and leaves the target alone when the key is
-// absent; whatever none has asked for is unknown.
+// One table of the file. Each Read takes one key, and leaves the target alone when the key is
+// absent. A key that no Read has asked for is unknown.
 class TableReader {
  public:
   explicit TableReader(const toml::table &table) : table_(table) {}
@@ -166,7 +129,7 @@ class TableReader {
     *target = std::chrono::milliseconds(std::llround(seconds * 1000));
   }
 
-  // A file or some, whose names are put behind `folder`.
+  // A file or a list of files. Names that are not absolute are relative to `folder`.
   void Read(std::string_view key, std::vector<std::string> *target, std::string_view folder) {
     const toml::node *node = Find(key);
     if (node == nullptr) return;
@@ -313,8 +276,7 @@ std::optional<Scenario> ParseScenario(std::string_view text, const std::string &
     return std::nullopt;
   };
   try {
-    CheckCharacters(text);
-    CheckDepth(text);
+    CheckText(text);
     const toml::parse_result result = toml::parse(text);
     if (!result) {
       return refuse(result.error().source().begin.line, result.error().description());

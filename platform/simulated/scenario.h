@@ -1,4 +1,4 @@
-// What the simulated platform plays: its controllers, its schedule, its log.
+// A scenario tells the simulated platform which controllers, which schedule and which log to play.
 #ifndef PLATFORM_SIMULATED_SCENARIO_H
 #define PLATFORM_SIMULATED_SCENARIO_H
 
@@ -13,8 +13,8 @@
 
 namespace simulated {
 
-// What a request asks for: its first number. The simulated drivers have their own copy of all such
-// numbers, and of the classes and their methods, so that a wrong one in the library is noticed.
+// The first number of a request. The simulated drivers have their own copies of these numbers, and
+// of the classes and methods, so that tests notice a wrong one in the library.
 enum Command : uint32_t {
   kReadBand = 11,
   kReadStatistics = 13,
@@ -26,7 +26,7 @@ enum Command : uint32_t {
   kReadMsp = 221,
 };
 
-// The buffers that are read from a controller, and the scenario's keys for them.
+// The buffers of a controller, and their keys in a scenario.
 struct Buffer {
   std::string_view key;
   Command command;
@@ -41,7 +41,7 @@ inline constexpr std::array<Buffer, 7> kBuffers = {{
     {"telemetry", kReadTelemetry},
 }};
 
-// Which calls of one kind go wrong: all of them, or those with the listed numbers, counted from 1.
+// Which calls of one kind fail: all of them, or those with the listed numbers, counted from 1.
 struct Fault {
   bool always = false;
   std::vector<uint32_t> calls;
@@ -58,16 +58,16 @@ struct Controller {
   Fault failRead;
   Fault shortRead;
   Fault failClose;
-  std::map<uint32_t, std::vector<std::string>>
-      files;  // by command: what its reads hand out in turn
+  // By command: the files that its reads return, one after the other.
+  std::map<uint32_t, std::vector<std::string>> files;
 };
 
 struct Schedule {
-  uint32_t runs = 1;  // a run that resumes a deferred one is not counted
+  uint32_t runs = 1;  // without the runs that resume a deferred one
   std::chrono::milliseconds firstRunAfter{1000};
   std::chrono::milliseconds interval{1000};
   std::chrono::milliseconds resumeAfter{2000};
-  // For each run, resumed ones included: the question from which on it is asked to yield; 0 never.
+  // For each run, resumed runs too: from which check on it is asked to yield; 0 for never.
   std::vector<uint32_t> deferAtCheck;
 };
 
@@ -80,13 +80,13 @@ struct Scenario {
 // The driver method that takes the requests for a controller of the class; 0 for an unknown class.
 uint32_t RequestMethod(std::string_view className);
 
-// Parses the text of a scenario file; the files it names are relative to that file. Nothing for a
-// bad one, with "FILE:LINE: reason" in `error`. Opens nothing.
+// Parses the text of a scenario file. Names of files in it are relative to that file. For a bad
+// text returns nothing, with "FILE:LINE: reason" in `error`. Opens no file.
 std::optional<Scenario> ParseScenario(std::string_view text, const std::string &file,
                                       std::string *error);
 
-// The scenario of this process, loaded at the first call: the file that GRELLON_SCENARIO names, or
-// the built-in one. Null for a bad file, about which there is one line on standard error.
+// The scenario of this process: the file that GRELLON_SCENARIO names, or the built-in one. The
+// first call loads it. Null for a bad file, after one line on standard error.
 const Scenario *TheScenario();
 
 }  // namespace simulated

@@ -43,7 +43,7 @@ class Scheduler {
     return true;
   }
 
-  // Once the scheduler wants the run to yield it does not change its mind within the run.
+  // Once true, the answer stays true until the run ends.
   bool ShouldDefer() {
     const std::lock_guard lock(mutex_);
     ++questions_;
@@ -61,7 +61,7 @@ class Scheduler {
     stopping_ = StopCameEarly();
     std::thread worker([&] {
       RunSchedule(schedule);
-      Stop();  // the schedule's end stops the main queue like a user
+      Stop();  // at the end of the schedule the main queue ends as by SIGTERM
     });
     bool stop;
     do {
@@ -72,7 +72,7 @@ class Scheduler {
   }
 
  private:
-  // A wish to yield between two runs finds no activity to yield and means nothing.
+  // Between two runs there is no activity to yield, and Enter forgets the wish.
   void Yield(bool stop) {
     const std::lock_guard lock(mutex_);
     yieldWanted_ = true;
@@ -97,7 +97,7 @@ class Scheduler {
     }
   }
 
-  // True when the activity was handed back, to be resumed.
+  // True when the activity was deferred and is to be resumed.
   bool RunActivity(uint32_t deferAtCheck) {
     Enter(kActivityStateRun, deferAtCheck);
     activity_.handler(&activity_);
@@ -155,12 +155,13 @@ void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
 
 void RunMainQueue() {
   const simulated::Schedule &schedule = simulated::TakeProcess().schedule;
-  // Lines that the library prints belong between the lines of the log, not behind them all.
+  // The lines that the library prints then appear among the lines of the log, not after all of
+  // them.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
   try {
     Scheduler::Instance().Run(schedule);
   } catch (...) {
-    simulated::EndWithoutMemory();  // no thread was to be had
+    simulated::EndWithoutMemory();  // the worker thread was refused
   }
   std::exit(EXIT_SUCCESS);
 }

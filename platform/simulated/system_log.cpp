@@ -1,5 +1,5 @@
-// The system log: the system's socket for it, and standard error too for a person who runs the
-// process in the foreground. Nothing here ever waits for whoever reads them.
+// The system log. Lines go to the system's log socket, and to standard error for a person who runs
+// the process in the foreground. No function here waits for a reader.
 
 #include <fcntl.h>
 #include <poll.h>
@@ -28,8 +28,8 @@ namespace {
 constexpr size_t kLongestMessage = 1024;
 using Line = std::array<char, kLongestMessage + 64>;
 
-// Where lines go. What there is no room for now waits, in a bounded space; lines beyond that, and
-// those that cannot be written at all, are dropped and counted.
+// Where lines go. A line that cannot be written at once waits in a bounded space. Lines that do not
+// fit there, and lines whose write fails, are dropped and counted.
 class Output {
  public:
   void Add(const char *message) {
@@ -37,15 +37,15 @@ class Output {
     if (dropped_ > 0 || !Put(message)) ++dropped_;
   }
 
-  // True when nothing waits any more.
+  // Writes the lines that wait. True when none is left.
   bool Flush() {
     while (waitingSize_ > 0) {
       const size_t length = std::strlen(waiting_.data());
       const ssize_t written = Write(waiting_.data(), length);
       if (written == 0) return false;
-      // A line is lost, or with a count of lost lines all those that it counts.
+      // One line is lost, or all lines that a lost count stands for.
       if (written < 0) dropped_ += std::max(countWaits_, 1ULL);
-      // What is left of a line that was written in part goes on waiting.
+      // The rest of a line that was written in part keeps waiting.
       const bool done = written < 0 || static_cast<size_t>(written) == length;
       const size_t gone = done ? length + 1 : static_cast<size_t>(written);
       waitingSize_ -= gone;
@@ -90,7 +90,7 @@ class Output {
   std::array<char, 16 << 10> waiting_ = {};  // lines, each with its NUL
   size_t waitingSize_ = 0;
   unsigned long long dropped_ = 0;
-  unsigned long long countWaits_ = 0;  // in the first line that waits, if that is such a count
+  unsigned long long countWaits_ = 0;  // dropped lines that the first waiting line counts
 };
 
 class SystemSocket : public Output {
@@ -104,7 +104,7 @@ class SystemSocket : public Output {
                          LOG_DAEMON | LOG_NOTICE, stamp.data(), getpid(), message);
   }
 
-  // Not connected, so that a log that is started anew finds its next reader.
+  // The socket is not connected, so that it reaches a log that was restarted.
   ssize_t Write(const char *text, size_t length) override {
     static constexpr sockaddr_un kReader = {.sun_family = AF_UNIX, .sun_path = "/dev/log"};
     const ssize_t written = sendto(socket_, text, length, MSG_DONTWAIT | MSG_NOSIGNAL,
@@ -130,9 +130,9 @@ class StandardError : public Output {
     return written < 0 && errno == EAGAIN ? 0 : written;
   }
 
-  // A pipe or a terminal that others write to as well can be full again between poll and write. It
-  // is opened once more to be written without waiting: the others may want to wait, and what is set
-  // on the descriptor that they share would be theirs too.
+  // A pipe or a terminal that others write to can be full again between poll and write. So it is
+  // opened a second time, with O_NONBLOCK. The flag may not be set on the shared descriptor,
+  // because the others may want to wait.
   static int Open() {
     struct stat stream = {};
     if (fstat(STDERR_FILENO, &stream) == 0 &&
@@ -146,7 +146,8 @@ class StandardError : public Output {
   const int descriptor_ = Open();
 };
 
-// The journal names the stream it reads from a service; what goes there would be logged twice.
+// The journal names the stream that it reads from a service. A line written there would be logged
+// twice.
 bool StandardErrorIsTheJournal() {
   const char *journal = std::getenv("JOURNAL_STREAM");
   struct stat stream = {};
@@ -164,7 +165,7 @@ class Log {
   Log(const Log &) = delete;
   Log &operator=(const Log &) = delete;
 
-  // A second for what waits.
+  // Lines that still wait have a second.
   ~Log() {
     for (int tries = 100; tries > 0 && !Flush(); --tries) usleep(10'000);
   }
