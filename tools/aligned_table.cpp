@@ -1,4 +1,4 @@
-// Texts in columns, for people.
+// A table with aligned columns, for people.
 
 #include "tools/aligned_table.h"
 

@@ -1,27 +1,27 @@
-// Texts in columns, for people.
+// A table with aligned columns, for people.
 #ifndef TOOLS_ALIGNED_TABLE_H
 #define TOOLS_ALIGNED_TABLE_H
 
 #include <string>
 #include <vector>
 
-#include "tools/io.h"
+#include "tools/output.h"
 
 namespace tools {
 
-// Rows of cells. The first column is left-aligned, the others are right-aligned; a cell behind the
-// last of them, such as a remark, may follow.
+// Rows of cells. The first column is left-aligned, the others are right-aligned. One more cell,
+// such as a remark, may follow the last column.
 class AlignedTable {
  public:
-  // `columns` counts those that are aligned. At least `gap` blanks stand between two.
+  // `columns` is the number of aligned columns; at least `gap` blanks stand between two of them.
   explicit AlignedTable(size_t columns, size_t gap = 2) : widths_(columns), gap_(gap) {}
 
-  // A column is at least so wide.
+  // Makes a column at least that wide.
   void Widen(size_t column, size_t width) { widths_[column] = std::max(widths_[column], width); }
 
   void Add(std::vector<std::string> row);
 
-  // The lines; a column without any text is left out.
+  // The lines, without columns that are empty in all rows.
   std::vector<std::string> Lines() const;
   void Print(Output &output) const;
 

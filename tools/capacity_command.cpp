@@ -1,4 +1,4 @@
-// morwick capacity: advertised capacities.
+// morwick capacity: prints advertised capacities.
 
 #include <memory>
 

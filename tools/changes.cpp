@@ -13,7 +13,7 @@
 namespace tools {
 namespace {
 
-// Of one name: its entries in the old reading, and how many of them have been met again.
+// The old reading's entries of one name, and how many of them the later reading has so far.
 struct Occurrences {
   std::vector<Entry> entries;
   size_t met = 0;

@@ -1,19 +1,19 @@
-// The sub-commands of morwick, each in a file of its own and one line here.
+// The sub-commands of morwick. Each has one line here and a file of its own.
 #ifndef TOOLS_COMMANDS_H
 #define TOOLS_COMMANDS_H
 
 #include <CLI/CLI.hpp>
 #include <functional>
 
-#include "tools/io.h"
+#include "tools/output.h"
 
 namespace tools {
 
-// What a sub-command does once its options are read; the exit status comes of it.
+// Carries out a sub-command after its options are read. Returns the exit status.
 using Action = std::function<Status()>;
 
-// The sub-commands, in the order of the help. For each there is a function, AddFind and so on,
-// which adds it to the program and sets the action when it is what was asked for.
+// The sub-commands, in the order of the help. Each has a function (AddFind, AddStats, ...) that
+// adds it to the program. When a user calls the sub-command it sets the action.
 #define FOR_EACH_COMMAND(COMMAND) \
   COMMAND(Find)                   \
   COMMAND(Stats)                  \

@@ -25,7 +25,7 @@ constexpr BufferKind kBufferKinds[] = {
     {"telemetry", &NandExporter::getTelemetryListSelectors},
 };
 
-// Connects and gives the service back; the connection stays open without it.
+// Connects, and releases the service, which an open connection does not need.
 int32_t Open(uint32_t service, uint32_t *connection) {
   *connection = 0;
   const int32_t result = OpenService(service, kNandConnectionType, connection);
@@ -73,7 +73,7 @@ Presence Probe(const NandExporter &row) {
   return {true, connection != 0, result};
 }
 
-// Nothing between finding and keeping a handle may throw.
+// From finding a service to storing the connection no statement may throw: the handle would leak.
 Controller::Controller(const std::string &className, const std::string &what)
     : className_(className), what_(what) {
   NandExporter *row = FindRow(className);
@@ -99,7 +99,7 @@ Controller::~Controller() {
   if (result == 0) return;
   try {
     Note(name() + ": " + what_, "closing the connection failed, result " + Hexadecimal(result));
-  } catch (const std::bad_alloc &) {  // main says so
+  } catch (const std::bad_alloc &) {  // main complains of it
   }
 }
 

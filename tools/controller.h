@@ -11,16 +11,17 @@
 
 namespace tools {
 
-// What can be read from a controller: the name that people use, and the request's numbers by row.
+// A buffer that can be read from a controller: its name for people, and the slot of a row that
+// gives the numbers of the request.
 struct BufferKind {
   std::string_view name;
   SelectorGetter NandExporter::*selectors;
 };
 
-// All kinds, in the order in which they are listed.
+// All kinds, in the order in which messages list them.
 std::span<const BufferKind> BufferKinds();
 
-// The kind of that name, or of that stream of statistics: kvr and ftl are read from the same
+// The kind with that name, or the kind that holds the stream with that name: kvr and ftl share one
 // buffer. Null for an unknown name.
 const BufferKind *FindBufferKind(std::string_view name);
 
@@ -33,19 +34,20 @@ std::span<NandExporter> KnownControllers();
 // The row of the class, or null.
 NandExporter *FindRow(std::string_view className);
 
-// What there is of a driver class at the moment.
+// Whether a controller of a class is present, and whether it lets us connect.
 struct Presence {
   bool present = false;
-  bool opened = false;  // it was closed again at once
-  int32_t result = 0;   // of opening
+  bool opened = false;  // the connection is closed again
+  int32_t result = 0;   // the driver's, of opening
 };
 Presence Probe(const NandExporter &row);
 
-// A connection to a controller's driver, closed in every case.
+// A connection to a controller's driver. The destructor closes it.
 class Controller {
  public:
-  // Connects to the controller of the class, or, without one, to the first that is present. `what`
-  // is what it is wanted for, in complaints. Check `connected` then: if not, it has complained.
+  // Connects to the controller of the class; without a class, to the first that is present.
+  // Complaints name `what`, the buffer or stream to be read. When `connected` is false it has
+  // complained.
   Controller(const std::string &className, const std::string &what);
   ~Controller();
   Controller(const Controller &) = delete;
@@ -56,12 +58,12 @@ class Controller {
   // The row of the controller; null when none was found.
   const NandExporter *row() const { return row_; }
 
-  // The class; the one that was asked for, if any, while none was found.
+  // The class of the controller. When none was found: the class that was asked for, maybe empty.
   std::string name() const { return row_ == nullptr ? className_ : row_->className; }
 
   bool Offers(const BufferKind &kind) const { return row_->*kind.selectors != nullptr; }
 
-  // Reads a buffer. Without a value it has complained.
+  // Reads a buffer. Returns nothing after a complaint.
   std::optional<std::string> Read(const BufferKind &kind);
 
  private:

@@ -1,13 +1,15 @@
-// A file descriptor that is closed when its owner goes.
+// File descriptors.
 #ifndef TOOLS_DESCRIPTOR_H
 #define TOOLS_DESCRIPTOR_H
 
 #include <unistd.h>
 
+#include <string_view>
 #include <utility>
 
 namespace tools {
 
+// A descriptor that its owner closes.
 class Descriptor {
  public:
   // What open returned: negative when it failed.
@@ -28,6 +30,12 @@ class Descriptor {
  private:
   int number_;
 };
+
+// After a failed read (POLLIN) or write (POLLOUT): waits if it must, and says whether to try again.
+bool CanTryAgain(int descriptor, short events);
+
+// Writes all bytes and waits when it must. Returns 0, or the error number as in errno.
+int WriteAll(int descriptor, std::string_view bytes);
 
 }  // namespace tools
 

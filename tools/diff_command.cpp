@@ -1,4 +1,4 @@
-// morwick diff: what changed between two dumps.
+// morwick diff: prints what changed between two dumps.
 
 #include <fmt/format.h>
 
@@ -36,7 +36,8 @@ void PrintCsv(Output &output, const std::vector<Change> &changes, std::optional<
   }
 }
 
-// The time between two dumps by the controller's own clock, in seconds, if it went on.
+// The seconds between two dumps by the controller's own clock. Nothing when the clock did not
+// advance.
 std::optional<double> TimeBetween(const Statistics &old, const Statistics &now) {
   const std::optional<uint64_t> before = old.Find("calendarTime");
   const std::optional<uint64_t> after = now.Find("calendarTime");
@@ -60,7 +61,7 @@ Status Diff(const Options &options) {
     status = std::max(status, after->Check(now));
     if (!seconds) seconds = TimeBetween(*before, *after);
     changes = FindChanges(*before, *after, options.all, now.subject);
-    if (!changes) {  // their memory is needed to say so
+    if (!changes) {  // free their memory, to print the rest
       before.reset();
       after.reset();
       status = kBadData;

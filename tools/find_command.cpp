@@ -1,4 +1,4 @@
-// morwick find: which controllers there are and what they offer.
+// morwick find: lists the controllers and the buffers that they offer.
 
 #include <fmt/format.h>
 
@@ -22,7 +22,7 @@ struct Finding {
   }
 };
 
-// One line a class, the states in a column.
+// One line for each class, with aligned states.
 void PrintNormal(Output &output, const std::vector<Finding> &findings) {
   AlignedTable table(1, 1);
   for (const Finding &finding : findings) {

@@ -1,4 +1,4 @@
-// The JSON frame: what every object begins and ends with.
+// The beginning and the end that all JSON objects have.
 
 #include "tools/json.h"
 
@@ -32,7 +32,7 @@ Json::Json(Output &output, std::string_view command, const std::vector<Source> &
   EndObject();
 }
 
-// No copy of what is good as it is: an object is ended also where memory is refused.
+// Valid text is not copied, so that an object can be ended when memory is refused.
 void Json::Text(std::string_view text) {
   IsValidText(text) ? PlainText(text) : PlainText(ValidText(text));
 }

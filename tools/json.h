@@ -1,5 +1,5 @@
-// The JSON that every sub-command prints with -o json: one object, written as it goes and complete
-// also when the command fails. docs/morwick.schema.json describes it.
+// The JSON that each sub-command prints with -o json: one object. It is written piece by piece, and
+// is complete even when the command fails. docs/morwick.schema.json describes it.
 #ifndef TOOLS_JSON_H
 #define TOOLS_JSON_H
 
@@ -10,37 +10,37 @@
 #include <string>
 #include <string_view>
 
-#include "tools/io.h"
 #include "tools/memory.h"
+#include "tools/output.h"
 
 namespace tools {
 
-// Where the data comes from, or came from.
+// Where data comes from.
 struct Source {
   std::string_view kind;  // file, controller
-  std::string name;       // of a controller empty while none was found
+  std::string name;       // empty when no controller was found
 };
 
-// Numbers above it lose their last digits in readers that take all numbers for doubles; a text twin
-// stands beside them.
+// Many readers store all numbers as doubles, and larger numbers lose their last digits there. So a
+// text with the same digits stands beside each of them.
 constexpr uint64_t kLargestExact = uint64_t{1} << 53;
 
-// What is made of memory once the object has begun is little beside the reserve that is held for
-// it: a command reads and compares before.
+// Begin the object only after reading and comparing: from then on the command may need no more
+// memory than the reserve that the object holds.
 class Json {
  public:
-  // Begins the object: what made it, and where the data comes from. Throws std::bad_alloc, and
-  // writes nothing, where there is no memory to end it.
+  // Begins the object with its maker and its sources. When there is no memory for the reserve it
+  // writes nothing and throws std::bad_alloc.
   Json(Output &output, std::string_view command, const std::vector<Source> &sources = {});
 
   void Key(std::string_view key) { writer_.Key(key.data(), Length(key)); }
   // Bytes that are not UTF-8 are replaced.
   void Text(std::string_view text);
-  // Known to be UTF-8, such as what a parser names.
+  // For text that is certainly UTF-8, such as the name of a statistic.
   void PlainText(std::string_view text) { writer_.String(text.data(), Length(text)); }
   void Number(std::unsigned_integral auto number) { writer_.Uint64(number); }
   void Fraction(double number) { writer_.Double(number); }
-  // Digits, with a sign or without.
+  // A number that is already in decimal.
   void Digits(std::string_view digits) {
     writer_.RawValue(digits.data(), digits.size(), rapidjson::kNumberType);
   }
@@ -59,8 +59,9 @@ class Json {
     Number(number);
   }
 
-  // Numbers by that key, in an array or as the one that there is; once more as texts where one of
-  // them is too large for a double. `each` hands each value and its digits to what it is given.
+  // A member with one number or an array of them. When one is too large for a double, a second
+  // member (KEY_s) has them as texts. `each` calls the function that it gets with each value and
+  // its digits.
   template <typename Each>
   void Numbers(std::string_view key, bool array, Each each) {
     const auto print = [&](auto printOne) {
@@ -79,12 +80,12 @@ class Json {
     print([&](uint64_t, std::string_view digits) { PlainText(digits); });
   }
 
-  // Ends the object with the messages so far, which are forgotten then, and the status, which it
-  // returns: it is bad where memory was refused.
+  // Ends the object with the messages so far and the status. Forgets the messages. Returns the
+  // status; when memory was refused it is kBadData.
   Status Finish(Status status);
 
  private:
-  // What the writer puts its characters into.
+  // The writer's output.
   struct Stream {
     using Ch = char;
     void Put(char c) { output.Put(c); }
@@ -101,7 +102,7 @@ class Json {
 
   MemoryReserve reserve_{2 << 20};
   Stream stream_;
-  char room_[4096] = {};  // for the writer's stack, which so takes no memory from the heap
+  char room_[4096] = {};  // for the writer's stack, instead of memory from the heap
   Memory memory_{room_, sizeof room_};
   rapidjson::Writer<Stream, rapidjson::UTF8<>, rapidjson::UTF8<>, Memory> writer_{stream_,
                                                                                   &memory_};

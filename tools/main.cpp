@@ -14,7 +14,7 @@
 namespace tools {
 namespace {
 
-// Before main the argument parser sets itself up, where nobody would catch the exception.
+// The argument parser needs memory before main begins. Nobody could catch an exception there.
 [[gnu::constructor(101)]] void EndBeforeMainWithoutMemory() {
   std::set_new_handler([] {
     std::fputs("morwick: out of memory\n", stderr);
@@ -29,7 +29,7 @@ Status Print(const std::string &text) {
 }
 
 Status RefuseUsage(const std::string &reason, const std::string &help = "--help") {
-  PrintLine(reason + " (see morwick " + help + ")");
+  ComplainOfUsage(reason, help);
   return kBadUsage;
 }
 
@@ -55,17 +55,18 @@ void AddHelp(CLI::App &app, Action *action) {
   help->add_option("COMMAND", *name, "The sub-command");
   help->callback([=, &app] {
     const CLI::App *subject = name->empty() ? &app : FindCommand(app, *name);
-    if (subject == nullptr) throw CLI::ValidationError(*name, "not one of " + KnownCommands(app));
+    if (subject == nullptr)
+      throw CLI::ValidationError(*name, "is not a sub-command; choose from " + KnownCommands(app));
     const std::string path = name->empty() ? "morwick" : "morwick " + *name;
     *action = [=, &app] {
-      // app.help() would be that of the sub-command in use, which is this one.
+      // app.help() would explain the sub-command in use, which is this one.
       return Print(app.get_formatter()->make_help(subject, path, CLI::AppFormatMode::Normal));
     };
   });
 }
 
-// The parser takes the next word for the value of an option that ends in "=". Returns such an
-// option, or nothing.
+// Returns the first option with an empty value, such as --write=, or nothing. The argument parser
+// would take the next word as its value.
 std::string_view OptionWithEmptyValue(int argc, char **argv) {
   for (int i = 1; i < argc; ++i) {
     const std::string_view word = argv[i];
@@ -77,7 +78,7 @@ std::string_view OptionWithEmptyValue(int argc, char **argv) {
   return {};
 }
 
-// The same for a value that is a word of its own.
+// Returns the first option whose value is an empty word, or nothing.
 std::string OptionWithEmptyWord(const CLI::App &command) {
   for (const CLI::Option *option : command.get_options()) {
     if (option->nonpositional() && std::ranges::count(option->results(), "") > 0) {
@@ -99,11 +100,11 @@ Status Run(int argc, char **argv) {
   AddHelp(app, &action);
 
   const std::string first = argc > 1 ? argv[1] : "";
-  // Not app.get_option(), which would end the program where memory is refused.
+  // app.get_option() would end the program when memory is refused.
   const auto isFirst = [&](const CLI::Option *option) { return option->check_name(first); };
   if (FindCommand(app, first) == nullptr && app.get_options(isFirst).empty()) {
-    return RefuseUsage((first.empty() ? "a sub-command is needed, one of "
-                                      : "'" + first + "' is no sub-command, those are ") +
+    return RefuseUsage((first.empty() ? "name a sub-command: "
+                                      : "'" + first + "' is not a sub-command; choose from ") +
                        KnownCommands(app));
   }
   if (const std::string option(OptionWithEmptyValue(argc, argv)); !option.empty()) {

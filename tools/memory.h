@@ -1,4 +1,4 @@
-// Memory of the morwick command: how much it may take, and what happens when it is refused.
+// Memory of the morwick command: its limit, and what happens when memory is refused.
 #ifndef TOOLS_MEMORY_H
 #define TOOLS_MEMORY_H
 
@@ -6,26 +6,26 @@
 
 namespace tools {
 
-// Once, before anything else. From then on the command takes at most 1 GiB, so that a hostile dump
-// ends with a message, or less where its caller has set a lower limit. Memory that is refused to
-// C++ is remembered and ends as std::bad_alloc, unless a reserve can be given up for it.
+// Call it once, before anything else. From then on the command takes at most 1 GiB, or less when
+// its caller has set a lower limit: a hostile dump then ends with a message. When C++ is refused
+// memory, this is remembered. A reserve, if one is held, is given up; otherwise std::bad_alloc is
+// thrown.
 void LimitMemory();
 
-// For memory that is refused elsewhere than in C++'s own allocation: remembers it, and throws as
-// that does.
+// For memory that is refused outside of operator new: the first remembers it, the second also
+// throws std::bad_alloc.
 void NoteMemoryRefusal();
 [[noreturn]] void RefuseMemory();
 
-// Whether memory was refused so far. Streams swallow the exception, and what they print is cut: at
-// the end it is known all the same.
+// Whether memory was refused so far. Ask at the end of the program: a library may swallow the
+// exception and print only a part.
 bool MemoryWasRefused();
 
-// The same since the last call.
+// Whether memory was refused since the last call.
 bool TakeMemoryRefusal();
 
-// Room for what must be finished once it has begun, held if there is as much. It is given up for
-// the first allocation of C++ that is refused meanwhile; that one is then tried again. One at a
-// time.
+// A reserve for work that must be finished once it has begun. The first allocation of C++ that is
+// refused meanwhile gives it up and is tried again. Only one may exist at a time.
 class MemoryReserve {
  public:
   explicit MemoryReserve(size_t size);

@@ -1,4 +1,4 @@
-// What the morwick command says about its work.
+// The messages of the morwick command.
 
 #include "tools/messages.h"
 
@@ -16,7 +16,7 @@ namespace {
 constexpr size_t kMostKept = 1000;
 
 bool keeping = false;
-uint64_t linesSaid = 0;
+uint64_t linesPrinted = 0;
 std::vector<Message> kept;
 uint64_t leftOut = 0;
 
@@ -32,33 +32,34 @@ void Keep(std::string_view severity, std::string_view text) {
   ++leftOut;
 }
 
-void Say(std::string_view severity, const std::string &subject, const std::string &reason) {
-  const std::string text = subject + ": " + reason;
-  PrintLine(text);
+void Print(std::string_view severity, const std::string &text) {
+  ++linesPrinted;
+  const bool terminal = isatty(STDERR_FILENO) != 0;
+  std::fprintf(stderr, "morwick: %s\n", terminal ? PrintableLine(text).c_str() : text.c_str());
   Keep(severity, text);
 }
 
 }  // namespace
 
-void PrintLine(const std::string &text) {
-  ++linesSaid;
-  const bool terminal = isatty(STDERR_FILENO) != 0;
-  std::fprintf(stderr, "morwick: %s\n", terminal ? PrintableLine(text).c_str() : text.c_str());
-}
-
 void Complain(const std::string &subject, const std::string &reason) {
-  Say("error", subject, reason);
+  Print("error", subject + ": " + reason);
 }
 
-void Note(const std::string &subject, const std::string &reason) { Say("note", subject, reason); }
+void Note(const std::string &subject, const std::string &reason) {
+  Print("note", subject + ": " + reason);
+}
+
+void ComplainOfUsage(const std::string &reason, const std::string &help) {
+  Print("error", reason + " (see morwick " + help + ")");
+}
 
 void ComplainOfMemory() {
-  static bool said = false;
-  if (!std::exchange(said, true)) std::fputs("morwick: out of memory\n", stderr);
+  static bool printed = false;
+  if (!std::exchange(printed, true)) std::fputs("morwick: out of memory\n", stderr);
   Keep("error", "out of memory");
 }
 
-uint64_t LinesSaid() { return linesSaid; }
+uint64_t LinesPrinted() { return linesPrinted; }
 
 void KeepMessages() { keeping = true; }
 

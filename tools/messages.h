@@ -1,4 +1,4 @@
-// What the morwick command says about its work: lines on standard error, kept for JSON.
+// The messages of the morwick command: lines on standard error, which JSON repeats.
 #ifndef TOOLS_MESSAGES_H
 #define TOOLS_MESSAGES_H
 
@@ -12,53 +12,56 @@ namespace tools {
 
 enum Status {
   kGood = 0,
-  kBadData = 1,   // no controller; data that is bad or incomplete; output that cannot be written
-  kBadUsage = 2,  // wrong usage; input that cannot be read
+  kBadData = 1,     // no controller; data that is bad or incomplete; output that cannot be written
+  kBadUsage = 2,    // arguments that make no sense
+  kUnreadable = 2,  // input that cannot be read
 };
 
-// One line on standard error, as it stands; to a terminal without control characters.
-void PrintLine(const std::string &text);
-
-// A complaint is one line on standard error, and makes the status of the command bad; a note is a
-// line that does not.
+// A complaint tells why the status of the command is not good. A note leaves the status alone. Each
+// is one line on standard error; a terminal gets no control characters.
 void Complain(const std::string &subject, const std::string &reason);
 void Note(const std::string &subject, const std::string &reason);
 
-// Complaints of one kind, of which a hostile file makes millions: the first few are said, the
-// others counted.
+// Complains of wrong arguments; `help` are the arguments with which morwick explains the right
+// ones.
+void ComplainOfUsage(const std::string &reason, const std::string &help);
+
+// Complaints of one kind. A hostile file causes millions of them, so the first few are printed and
+// the others are counted.
 class RepeatedComplaint {
  public:
   explicit RepeatedComplaint(std::string subject) : subject_(std::move(subject)) {}
 
-  // `makeReason` is called for those that are said.
+  // Calls `makeReason` only for a complaint that is printed.
   template <typename MakeReason>
   void Add(MakeReason makeReason) {
-    if (++count_ <= kMostSaid) Complain(subject_, makeReason());
+    if (++count_ <= kMostPrinted) Complain(subject_, makeReason());
   }
 
-  // Says how many more there were, if any: "7 more" and what they do. True when there was any at
-  // all.
+  // Prints how many were only counted: "7 more records do not fit", where `whatTheyDo` is "records
+  // do not fit". True when there was any complaint.
   bool Finish(const std::string &whatTheyDo) const {
-    if (count_ > kMostSaid)
-      Complain(subject_, std::to_string(count_ - kMostSaid) + " more " + whatTheyDo);
+    if (count_ > kMostPrinted) {
+      Complain(subject_, std::to_string(count_ - kMostPrinted) + " more " + whatTheyDo);
+    }
     return count_ > 0;
   }
 
  private:
-  static constexpr uint64_t kMostSaid = 3;
+  static constexpr uint64_t kMostPrinted = 3;
 
   std::string subject_;
   uint64_t count_ = 0;
 };
 
-// The complaint that memory was refused. Its line is printed once, and takes no memory.
+// Complains that memory was refused. It needs no memory, and prints its line only once.
 void ComplainOfMemory();
 
-// From then on messages are kept, a thousand at most, for an object of JSON that prints them.
+// From then on messages are kept, a thousand at most, until an object of JSON prints them.
 void KeepMessages();
 
-// How many lines were said so far.
-uint64_t LinesSaid();
+// How many lines were printed so far.
+uint64_t LinesPrinted();
 
 struct Message {
   std::string_view severity;  // error, note
@@ -66,7 +69,7 @@ struct Message {
 };
 const std::vector<Message> &KeptMessages();
 
-// How many messages were not kept, because there are too many or for want of memory.
+// How many messages were not kept, because there were too many or memory was refused.
 uint64_t LeftOutMessages();
 
 void ForgetMessages();

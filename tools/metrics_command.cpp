@@ -1,4 +1,4 @@
-// morwick metrics: the statistics of a controller in the text format that Prometheus collects.
+// morwick metrics: prints the statistics of a controller in the text format of Prometheus.
 
 #include <sys/stat.h>
 
@@ -9,6 +9,7 @@
 #include <new>
 
 #include "tools/commands.h"
+#include "tools/input.h"
 #include "tools/options.h"
 #include "tools/statistics.h"
 #include "tools/text.h"
@@ -19,7 +20,7 @@ namespace {
 
 using std::chrono::steady_clock;
 
-constexpr mode_t kCollectorsMode = 0644;  // the collector is another user
+constexpr mode_t kCollectorsMode = 0644;  // the collector runs as another user
 
 struct Label {
   std::string key;
@@ -37,21 +38,21 @@ struct Options {
   std::vector<std::string> names;  // each of one of the streams
   Filter filter;
   std::string className;
-  std::string output;  // standard output when not named
+  std::string output;  // empty for standard output
 };
 
 struct Sample {
   std::string name;
-  std::string index;  // of an element of an array; empty for a single value
+  std::string index;  // the index of an array's element; empty for a single value
   uint64_t value;
 };
 
-// What came of one stream.
+// The result of reading one stream.
 struct Reading {
   MorwickStream stream = kMorwickKVR;
   bool good = false;
-  double seconds = 0;                    // it took
-  std::optional<double> timestamp = {};  // of the data, since 1970
+  double seconds = 0;                    // how long reading took
+  std::optional<double> timestamp = {};  // of the data, in seconds since 1970
   std::vector<Sample> samples = {};
 };
 
@@ -67,7 +68,7 @@ double FileTime(const std::string &file) {
          static_cast<double>(status.st_mtim.tv_nsec) * 1e-9;
 }
 
-// One sample a series: the last value, at the place of the first.
+// One sample for each series: its last value, in the place of its first.
 std::vector<Sample> SamplesOf(const Statistics &statistics) {
   std::vector<Sample> samples = {};
   std::map<std::pair<std::string, std::string>, size_t> places;
@@ -86,7 +87,7 @@ std::vector<Sample> SamplesOf(const Statistics &statistics) {
   return samples;
 }
 
-// Reads one stream; `readDump` does it.
+// Reads one stream by calling `readDump`.
 template <typename ReadDump>
 Reading Read(const Options &options, MorwickStream stream, ReadDump readDump) {
   Reading reading = {.stream = stream};
@@ -116,7 +117,7 @@ std::vector<Reading> ReadFiles(const Options &options) {
   return readings;
 }
 
-// The class of the controller is set when one was found.
+// Sets the class of the controller when one was found.
 std::vector<Reading> ReadLive(const Options &options, std::string *className) {
   Controller controller(options.className, "kvr");
   *className = controller.name();
@@ -139,7 +140,7 @@ class Exposition {
     text_ += std::string("# HELP ") + name + " " + help + "\n# TYPE " + name + " gauge\n";
   }
 
-  // A label without a value is left out.
+  // Adds a line. Labels without a value are left out.
   void Line(std::vector<Label> labels, const std::string &value) {
     labels.insert(labels.end(), options_.labels.begin(), options_.labels.end());
     std::string list;
@@ -214,7 +215,7 @@ Status Print(const Options &options) {
   return output.Finish(status);
 }
 
-// KEY=VALUE, with a key that Prometheus takes and that is not one of ours.
+// Splits KEY=VALUE. The key must be valid for Prometheus, and none of our own.
 Label SplitLabel(const std::string &text) {
   constexpr std::string_view kOurs[] = {"stream",     "name",    "index",
                                         "controller", "version", "platform"};
@@ -243,7 +244,7 @@ File SplitFile(const std::string &text) {
   return {*stream, text.substr(split + 1)};
 }
 
-// Takes one, whose `key` may be given once.
+// Appends a pair; each key may be given only once.
 template <typename Pair, typename Key>
 void TakeOnce(std::vector<Pair> *pairs, Pair pair, Key Pair::*key, const std::string &option,
               const std::string &text) {

@@ -1,4 +1,4 @@
-// What several sub-commands share in their options.
+// Options that several sub-commands share.
 
 #include "tools/options.h"
 
@@ -76,7 +76,8 @@ void AddController(CLI::App *command, std::string *className, const std::string 
 
 void AddWrite(CLI::App *command, std::string *file, const std::string &description) {
   const auto take = [=](const std::string &name) {
-    if (name == "-") throw CLI::ValidationError("--write", "standard output goes without it");
+    if (name == "-")
+      throw CLI::ValidationError("--write", "leave it out to write to standard output");
     *file = name;
   };
   command->add_option_function<std::string>("-w,--write", take, description)->type_name("FILE");

@@ -1,4 +1,4 @@
-// What several sub-commands share in their options.
+// Options that several sub-commands share.
 #ifndef TOOLS_OPTIONS_H
 #define TOOLS_OPTIONS_H
 
@@ -15,7 +15,7 @@ namespace tools {
 
 enum class Format { kNormal, kJson, kCsv };
 
-// -o, --output-format: one of the choices, of which the first is the default.
+// -o, --output-format: one of the choices. The first one is the default.
 void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &choices);
 
 // -s, --stream: required.
@@ -24,24 +24,25 @@ void AddStream(CLI::App *command, MorwickStream *stream);
 // -n, --names: names of statistics, separated by commas or in several options.
 void AddNames(CLI::App *command, std::vector<std::string> *names);
 
-// What these names select; all statistics without any. A name that no stream has is wrong usage.
+// The statistics with these names; all of them when there are no names. A name that no stream has
+// is wrong usage.
 using Filter = std::shared_ptr<const fleet::Selection>;
 Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
 
-// The same, but null where everything is wanted.
+// As Select, but null without names.
 Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
 
 // -c, --controller: a class that the library knows.
 void AddController(CLI::App *command, std::string *className, const std::string &description);
 
-// -w, --write: a file with a name; standard output is what there is without it.
+// -w, --write: the name of a file, instead of standard output.
 void AddWrite(CLI::App *command, std::string *file, const std::string &description);
 
-// Seconds, `least` or more, fractions too.
+// A number of seconds, at least `least`, with or without a fraction.
 CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds, double least,
                         const std::string &description);
 
-// A whole number of digits, at least `least` and at most `most`.
+// A whole number from `least` to `most`.
 void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,
                uint64_t most, const std::string &description);
 

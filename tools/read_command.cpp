@@ -1,4 +1,4 @@
-// morwick read: saves a buffer as the controller gave it.
+// morwick read: saves a buffer of a controller byte by byte.
 
 #include <memory>
 
@@ -12,7 +12,7 @@ namespace {
 
 struct Options {
   std::string kind;
-  std::string file;  // standard output when not named
+  std::string file;  // empty for standard output
   std::string className;
 };
 
@@ -23,7 +23,7 @@ Status Read(const Options &options) {
   }
   std::optional<std::string> bytes;
   {
-    Controller controller(options.className, options.kind);  // closed before anything is written
+    Controller controller(options.className, options.kind);  // close it before writing
     if (controller.connected()) bytes = controller.Read(*FindBufferKind(options.kind));
   }
   if (!bytes) return kBadData;

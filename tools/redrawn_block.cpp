@@ -17,15 +17,15 @@ void RedrawnBlock::Draw(std::vector<std::string> lines) {
 
 void RedrawnBlock::DrawAgain() {
   const auto [rows, columns] = output_.Window();
-  // A line that is longer than the window by now takes up several of its rows.
+  // After a resize, a line that is wider than the window takes several of its rows.
   size_t up = 0;
   for (const size_t length : drawn_) up += length == 0 ? 1 : (length + columns - 1) / columns;
-  if (said_ == LinesSaid() && up > 0) {
+  if (printed_ == LinesPrinted() && up > 0) {
     output_.Control(fmt::format("\r\033[{}A\033[J", std::min(up, rows - 1)));
   }
-  said_ = LinesSaid();
+  printed_ = LinesPrinted();
   drawn_.clear();
-  const size_t most = rows - 1;  // the cursor has the last one
+  const size_t most = rows - 1;  // the cursor needs the last row
   for (size_t i = 0; i < std::min(lines_.size(), most); ++i) {
     const bool cut = i + 1 == most && lines_.size() > most;
     const std::string line =

@@ -5,27 +5,27 @@
 #include <string>
 #include <vector>
 
-#include "tools/io.h"
+#include "tools/output.h"
 
 namespace tools {
 
-// Changes no mode of the terminal: whatever ends the process, nothing needs to be put back.
+// It changes no mode of the terminal, so that nothing must be restored when the process ends.
 class RedrawnBlock {
  public:
   explicit RedrawnBlock(Output &output) : output_(output) {}
 
-  // Draws the lines over those that were drawn last, cut to the window as it is now. Where
-  // something was said in between it stays, and the lines begin below it.
+  // Draws the lines over the last ones, cut to the size of the window. When a message was printed
+  // in between, it stays, and the lines begin below it.
   void Draw(std::vector<std::string> lines);
 
-  // The same once more, for a window of another size.
+  // Draws the last lines again, because the size of the window has changed.
   void DrawAgain();
 
  private:
   Output &output_;
   std::vector<std::string> lines_;
   std::vector<size_t> drawn_;  // the length of each line on the screen
-  uint64_t said_ = 0;
+  uint64_t printed_ = 0;
 };
 
 }  // namespace tools

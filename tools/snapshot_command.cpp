@@ -8,6 +8,7 @@
 
 #include "tools/commands.h"
 #include "tools/controller.h"
+#include "tools/input.h"
 #include "tools/options.h"
 #include "tools/snapshot_columns.h"
 #include "tools/snapshot_header.h"

@@ -7,8 +7,8 @@
 #include <string_view>
 #include <vector>
 
-#include "tools/io.h"
 #include "tools/json.h"
+#include "tools/output.h"
 
 namespace tools {
 

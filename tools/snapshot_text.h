@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "tools/io.h"
+#include "tools/output.h"
 #include "tools/snapshot_records.h"
 
 namespace tools {

@@ -1,4 +1,4 @@
-// Statistics: where a dump comes from, what a parser makes of it, and its entries.
+// Dumps, their parsed statistics, and the entries in these.
 
 #include "tools/statistics.h"
 
@@ -12,6 +12,7 @@
 
 #include "fleet/dump.h"
 #include "fleet/judge.h"
+#include "tools/input.h"
 #include "tools/memory.h"
 #include "tools/text.h"
 
@@ -21,7 +22,7 @@ namespace {
 static_assert(offsetof(KVRStatsCxt, namesHead) == offsetof(GenericParserCxt, namesHead));
 static_assert(offsetof(KVRStatsCxt, valuesHead) == offsetof(GenericParserCxt, valuesHead));
 
-// Whether the name is `base` and the number.
+// Whether the name consists of `base` and that number.
 bool IsElement(std::string_view name, std::string_view base, size_t number) {
   char digits[20];
   const char *end = std::to_chars(digits, std::end(digits), number).ptr;
@@ -73,7 +74,7 @@ Statistics::Statistics(const Dump &dump, MorwickStream stream, Filter filter)
     : row_(dump.row), stream_(stream), filter_(std::move(filter)) {
   const char *bytes = dump.bytes->data();
   const auto size = static_cast<uint32_t>(dump.bytes->size());
-  // After a parse that took all the memory that there is, what it gave is to be printed.
+  // A parse may use up all memory. Printing its entries still needs some.
   MemoryReserve reserve(8 << 20);
   errno = 0;
   switch (stream) {
@@ -83,13 +84,13 @@ Statistics::Statistics(const Dump &dump, MorwickStream stream, Filter filter)
     case kMorwickFTL: result_ = row_->ftlParseBufferToCxt(&context_.generic, bytes, size); break;
     case kMorwickMSP: result_ = row_->mspParseBufferToCxt(&context_.generic, bytes, size); break;
   }
-  outOfMemory_ = errno == ENOMEM;  // the heap's own word: not every parser reports each refusal
+  outOfMemory_ = errno == ENOMEM;  // malloc sets it; not every parser reports each refusal
 }
 
 Statistics::~Statistics() {
   if (stream_ == kMorwickKVR) {
     row_->releaseContext(&context_.kvr);
-  } else {  // the others share a context
+  } else {
     row_->releaseGenericParserCxt(&context_.generic);
   }
 }
@@ -112,7 +113,7 @@ Status Statistics::Check(const Dump &dump) const {
     Complain(dump.subject, fmt::format("out of memory after {} entries", count));
     return kBadData;
   }
-  // Of what could not be read to its end the end of the statistics says nothing.
+  // When bytes are missing, the place where the statistics end means nothing.
   if (dump.status != kGood) return dump.status;
   const fleet::Verdict verdict = fleet::JudgeDump(stream_, *dump.bytes);
   for (const std::string &fault : verdict.faults) Complain(dump.subject, fault);
@@ -143,7 +144,7 @@ std::vector<Figure> SummaryOf(const Statistics &statistics) {
       figures.back().values.push_back(MorwickSummaryValue(&statistics.summary(), &field, k));
     }
   }
-  // A field is 0 too when the dump lacked it: its entries tell.
+  // A field is also 0 when the dump lacks it, so look for its entry.
   std::vector<bool> present(figures.size());
   EntryGroups groups(statistics);
   while (const auto group = groups.Take()) {
@@ -152,7 +153,7 @@ std::vector<Figure> SummaryOf(const Statistics &statistics) {
   }
   size_t index = 0;
   std::erase_if(figures, [&](const Figure &) { return !present[index++]; });
-  // Sectors written to NAND for each one that the host wrote.
+  // How many sectors were written to NAND for each sector that the host wrote.
   const uint64_t *host = Find(figures, "hostWrites");
   const uint64_t *nand = Find(figures, "nandWrites");
   if (host != nullptr && nand != nullptr && *host > 0) {

@@ -1,4 +1,4 @@
-// Statistics: where a dump comes from, what a parser makes of it, and its entries.
+// Dumps, their parsed statistics, and the entries in these.
 #ifndef TOOLS_STATISTICS_H
 #define TOOLS_STATISTICS_H
 
@@ -10,29 +10,29 @@
 
 #include "morwick/morwick.h"
 #include "tools/controller.h"
-#include "tools/io.h"
 #include "tools/json.h"
 #include "tools/options.h"
+#include "tools/output.h"
 
 namespace tools {
 
-// A dump, and the row whose parsers are for it.
+// A dump, and the row whose parsers read it.
 struct Dump {
   Source source;
-  std::string subject;  // what it is called in complaints
+  std::string subject;  // its name in complaints
   const NandExporter *row = nullptr;
-  std::optional<std::string> bytes;  // none when nothing could be read
-  Status status = kGood;             // if not good it has complained, and bytes are missing
+  std::optional<std::string> bytes;  // nothing when not one byte could be read
+  Status status = kGood;             // not good after a complaint: some bytes are missing
 };
 
-// Reads the dump of a stream from a file, as one that was read from a controller of the class, or
-// of the first one known.
+// Reads the dump of a stream from a file. It is taken as the dump of a controller of that class;
+// without a class, of the first class that the library knows.
 Dump ReadDumpFile(const std::string &file, MorwickStream stream, const std::string &className);
 
-// Reads it from the controller of the class, or the first that is present.
+// Reads it from the controller of the class; without a class, from the first that is present.
 Dump ReadDumpLive(MorwickStream stream, const std::string &className);
 
-// Reads it through a connection that is there.
+// Reads it through an open connection.
 Dump ReadDump(Controller &controller, MorwickStream stream);
 
 // An entry of the two lists.
@@ -45,7 +45,7 @@ struct Entry {
   std::string_view digits() const { return valueNode->text; }
 };
 
-// Goes through the entries in their order; through those that the filter has, if there is one.
+// Goes through the entries in their order. With a filter it passes over those that do not match.
 class EntryIterator {
  public:
   using value_type = Entry;
@@ -84,7 +84,7 @@ class EntryIterator {
   const fleet::Selection *filter_ = nullptr;
 };
 
-// The lists of a dump, parsed through its row's slots.
+// The lists of a dump, parsed by the functions in its row.
 class Statistics {
  public:
   Statistics(const Dump &dump, MorwickStream stream, Filter filter = nullptr);
@@ -92,7 +92,7 @@ class Statistics {
   Statistics(const Statistics &) = delete;
   Statistics &operator=(const Statistics &) = delete;
 
-  // As the parser returned it.
+  // The parser's own result.
   uint64_t result() const { return result_; }
 
   EntryIterator begin() const {
@@ -100,16 +100,16 @@ class Statistics {
   }
   static std::default_sentinel_t end() { return std::default_sentinel; }
 
-  // The last value of that name, whether the filter has it or not.
+  // The last value of that name, also when the filter does not match it.
   std::optional<uint64_t> Find(std::string_view name) const;
 
-  // The summary fields; of the KVR stream only.
+  // The summary fields. Only the KVR stream has them.
   const KVRStatsCxt &summary() const { return context_.kvr; }
 
-  // Whether entries are missing for want of memory.
+  // Whether entries are missing because memory was refused.
   bool outOfMemory() const { return outOfMemory_; }
 
-  // Says what is wrong with the dump, and where its statistics end, if not at its end.
+  // Complains of what is wrong with the dump, and tells where its statistics end when bytes follow.
   Status Check(const Dump &dump) const;
 
  private:
@@ -118,18 +118,18 @@ class Statistics {
   Filter filter_;
   uint64_t result_ = 0;
   bool outOfMemory_ = false;
-  // Both begin with the same four fields, so that the lists are read from either.
+  // Both begin with the same four fields, so the lists can be read from either.
   union {
     KVRStatsCxt kvr;
     GenericParserCxt generic;
   } context_ = {};
 };
 
-// An entry, or consecutive ones that are the elements of one array: numbered from 0 without a gap.
+// One entry, or the elements of an array: entries that follow each other and are numbered from 0.
 struct EntryGroup {
   EntryIterator first;
   size_t count;
-  std::string_view base;  // the name, of an array what stands before the number
+  std::string_view base;  // the name, without the number of an array's element
 
   bool IsArray() const { return count > 1; }
 
@@ -141,26 +141,26 @@ struct EntryGroup {
   }
 };
 
-// Hands out the entries of statistics in their order, as groups.
+// Returns the entries of statistics in their order, in groups.
 class EntryGroups {
  public:
   explicit EntryGroups(const Statistics &statistics) : next_(statistics.begin()) {}
 
-  // Nothing behind the last one.
+  // The next group; nothing after the last.
   std::optional<EntryGroup> Take();
 
  private:
   EntryIterator next_;
 };
 
-// What the main figures are called, and their values, digits or a fraction.
+// One of the main figures: its name, and either its values or a fraction.
 struct Figure {
   std::string_view name;
   std::vector<uint64_t> values;
   std::string fraction = "";  // instead of values
 };
 
-// The summary fields that the dump had, in the order of KVRStatsCxt, and what follows from them.
+// The summary fields that the dump has, in the order of KVRStatsCxt, then the write amplification.
 std::vector<Figure> SummaryOf(const Statistics &statistics);
 
 }  // namespace tools

@@ -1,4 +1,4 @@
-// morwick stats: prints the statistics of a controller or in a dump.
+// morwick stats: prints the statistics of a controller or of a dump.
 
 #include <fmt/format.h>
 
@@ -6,6 +6,7 @@
 #include <memory>
 
 #include "tools/commands.h"
+#include "tools/input.h"
 #include "tools/options.h"
 #include "tools/statistics.h"
 
@@ -24,14 +25,14 @@ struct Options {
   bool inFull = false;
 };
 
-// "name[0..9]" for an array; as many characters as it has.
+// The length of the label of a group: "name", or "name[0..9]" for an array.
 size_t LabelLength(const EntryGroup &group) {
   if (!group.IsArray()) return group.base.size();
   return group.base.size() + std::string_view("[0..]").size() +
          std::to_string(group.count - 1).size();
 }
 
-// Labels that all take up the same width, with a colon after them.
+// Labels of equal width, each followed by a colon.
 class Labels {
  public:
   explicit Labels(Output &output) : output_(output) {}
@@ -50,7 +51,7 @@ class Labels {
   size_t width_ = 0;
 };
 
-// An array in one line.
+// Prints each group, so each array, in one line.
 void PrintGroups(Output &output, const Statistics &statistics) {
   Labels labels(output);
   for (EntryGroups groups(statistics); const auto group = groups.Take();) {

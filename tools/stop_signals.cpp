@@ -32,10 +32,10 @@ StopSignals::StopSignals() {
 
 StopSignals::End StopSignals::WaitUntil(steady_clock::time_point moment, Output &output) {
   sigset_t before;
-  sigprocmask(SIG_BLOCK, &signals_, &before);  // none is missed between question and sleep
+  sigprocmask(SIG_BLOCK, &signals_, &before);  // none is lost between the check and the wait
   bool reader = true;
   resized_ = 0;
-  int64_t left = 1;  // nanoseconds; without any, signals and reader are asked for all the same
+  int64_t left = 1;  // nanoseconds; the loop runs once even when the moment has passed
   while (stopped_ == 0 && resized_ == 0 && reader && left > 0) {
     left = std::max(nanoseconds(moment - steady_clock::now()).count(), int64_t{0});
     reader = output.WaitWithReader({left / 1000000000, left % 1000000000}, before);
@@ -48,7 +48,7 @@ StopSignals::End StopSignals::WaitUntil(steady_clock::time_point moment, Output 
 void StopSignals::EndProcess() {
   std::signal(stopped_, SIG_DFL);
   std::raise(stopped_);
-  std::abort();  // never comes here
+  std::abort();  // not reached
 }
 
 }  // namespace tools

@@ -1,31 +1,32 @@
-// Signals that ask a command to stop, taken where it suits the command.
+// Signals that ask a command to stop. The command takes them between two pieces of work.
 #ifndef TOOLS_STOP_SIGNALS_H
 #define TOOLS_STOP_SIGNALS_H
 
 #include <chrono>
 #include <csignal>
 
-#include "tools/io.h"
+#include "tools/output.h"
 
 namespace tools {
 
-// While there is one, SIGINT, SIGTERM and SIGHUP are remembered, so that what is printed stays
-// whole; a second one of them ends the process even if it hangs. The end of the terminal stays
-// ignored where it was (by nohup); an interrupt does not: a shell has it ignored by whatever it
-// starts in the background. A change of the terminal's size is remembered too.
+// While one exists, SIGINT, SIGTERM and SIGHUP are remembered, so that the output ends with a whole
+// line. A second signal of the same kind ends the process, even when it hangs. SIGHUP stays ignored
+// if it was ignored (by nohup). SIGINT does not stay ignored: shells ignore it for all background
+// jobs. SIGWINCH, a change of the window's size, is remembered too.
 class StopSignals {
  public:
   StopSignals();
 
-  // The signal that came, or 0.
+  // The signal that arrived, or 0.
   static int Stopped() { return stopped_; }
 
   enum class End { kTime, kResized, kStopped };
 
-  // Waits for the moment, for a signal, or until the reader of the output has gone away.
+  // Waits until the moment, until a signal arrives, or until the reader of the output has gone
+  // away.
   End WaitUntil(std::chrono::steady_clock::time_point moment, Output &output);
 
-  // Ends the process by the signal that came.
+  // Ends the process by the signal that arrived.
   [[noreturn]] static void EndProcess();
 
  private:

@@ -24,6 +24,7 @@
 #include "fleet/dump.h"
 #include "fleet/file_list.h"
 #include "tools/commands.h"
+#include "tools/input.h"
 #include "tools/memory.h"
 #include "tools/options.h"
 #include "tools/stop_signals.h"

@@ -9,15 +9,15 @@
 
 namespace tools {
 
-// For a terminal: each control character, and what is not UTF-8, becomes a question mark. In a line
-// that goes for line ends too, which would forge a second line; a text keeps its line ends.
+// For a terminal: each control character, and each byte that is not UTF-8, becomes a question mark.
+// A text keeps its line ends. A line does not, because they would forge a second line.
 std::string PrintableLine(std::string_view line);
 std::string PrintableText(std::string_view text);
 
-// How many bytes at the end begin a character of UTF-8 whose rest is not there yet: 0 to 3.
+// How many bytes at the end are the beginning of a UTF-8 character whose rest is missing: 0 to 3.
 size_t IncompleteEnd(std::string_view text);
 
-// For JSON: whether all of it is UTF-8; what is not becomes the replacement character.
+// For JSON. ValidText replaces each byte that is not UTF-8 by the replacement character.
 bool IsValidText(std::string_view text);
 std::string ValidText(std::string_view text);
 

@@ -1,4 +1,4 @@
-// morwick watch: what changes between successive readings of a controller.
+// morwick watch: prints what changes between readings of a controller.
 
 #include <fmt/chrono.h>
 #include <fmt/format.h>
@@ -39,7 +39,7 @@ struct Reading {
   system_clock::time_point time = system_clock::now();
   steady_clock::time_point moment = steady_clock::now();
   Dump dump;
-  std::optional<Statistics> statistics;  // there are none without a dump
+  std::optional<Statistics> statistics;  // none without a dump
 
   explicit Reading(const Options &options) {
     try {
@@ -51,7 +51,8 @@ struct Reading {
     }
   }
 
-  // The status of the reading, after complaints. Statistics that took all memory are given up.
+  // Complains of what is wrong, and returns the status. Statistics that used up all memory are
+  // freed.
   Status Check() {
     if (!statistics) return dump.status;
     const Status status = statistics->Check(dump);
@@ -60,7 +61,7 @@ struct Reading {
   }
 };
 
-// Since the epoch.
+// Seconds since 1970.
 std::string Seconds(system_clock::time_point time) {
   return ThreeDecimals(std::chrono::duration<double>(time.time_since_epoch()).count());
 }
@@ -76,7 +77,7 @@ void PrintCsv(Output &output, const Reading &now, const std::vector<Change> &cha
   }
 }
 
-// Readings one after the other, each with what changed since the last good one.
+// Reads again and again, and prints what changed since the last good reading.
 class Watcher {
  public:
   explicit Watcher(const Options &options) : options_(options) {
@@ -84,19 +85,20 @@ class Watcher {
     if (options.format == Format::kCsv) output_.Write("time,name,value,difference,rate\n");
   }
 
-  // False when there is nobody to read what is printed.
+  // Reads once. False when nobody reads the output any more.
   bool Read() {
     auto reading = std::make_unique<Reading>(options_);
-    // Later readings are of the same controller, and need not say again that it was found.
+    // Later readings are of the same controller. A search by class does not print that it was
+    // found.
     if (reading->statistics) options_.className = reading->dump.source.name;
     const Status status = reading->Check();
     worst_ = std::max(worst_, Print(*reading, status));
-    ForgetMessages();  // a watch may go on for ever
+    ForgetMessages();  // they would fill the memory of a long watch
     if (reading->statistics) last_ = std::move(reading);
     return output_.Flush();
   }
 
-  // False when the watch is to end.
+  // Waits. False when the watch must end.
   bool WaitUntil(steady_clock::time_point moment) {
     for (;;) {
       const StopSignals::End end = signals_.WaitUntil(moment, output_);
@@ -108,7 +110,7 @@ class Watcher {
   Status Finish() { return output_.Finish(worst_); }
 
  private:
-  // Returns the status of the reading and of the comparison.
+  // Prints one reading. Returns the worse status of the reading and of the comparison.
   Status Print(const Reading &now, Status status) {
     std::vector<Change> changes;
     std::optional<double> seconds;
@@ -158,7 +160,7 @@ class Watcher {
   RedrawnBlock block_{output_};
   bool redraws_ = false;
   Status worst_ = kGood;
-  std::unique_ptr<Reading> last_;  // that was good
+  std::unique_ptr<Reading> last_;  // the last good one
 };
 
 Status Watch(const Options &options) {
@@ -176,7 +178,7 @@ Status Watch(const Options &options) {
 }  // namespace
 
 void AddWatch(CLI::App &app, Action *action) {
-  constexpr double kLeastSeconds = 0.1;  // a reading keeps the controller from its work
+  constexpr double kLeastSeconds = 0.1;  // the controller does no other work while it is read
   CLI::App *command =
       app.add_subcommand("watch", "Print what changes between readings of a controller");
   const auto options = std::make_shared<Options>();

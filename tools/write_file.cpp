@@ -15,7 +15,7 @@
 #include <random>
 
 #include "tools/descriptor.h"
-#include "tools/io.h"
+#include "tools/output.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -27,16 +27,17 @@ constexpr int kMostLinks = 40;  // the kernel's own limit
 constexpr std::string_view kTemporary = ".tmp-";
 constexpr size_t kRandomLetters = 6;
 
-// A name in a folder. The folder is held open: what is done there stays there, also when somebody
-// renames it meanwhile.
+// A name in a folder. The folder is held open, so that all steps happen in the same folder, even
+// when it is renamed meanwhile.
 struct Place {
   Descriptor folder;
   std::string name;
 };
 
-// The place that a path means, seen from a folder. Errors are numbers as in errno, 0 for none.
+// Finds the folder and the name of a path. `from` is the folder that a relative path starts in.
+// This function and those below return 0, or the error number as in errno.
 int FindPlace(int from, const path &file, Place *place) {
-  // With a dot behind it, so that the kernel takes a link to a folder as one within a path.
+  // The dot makes the kernel follow a link to a folder under its rules for links within a path.
   const path parent = file.parent_path() / ".";
   Descriptor folder(openat(from, parent.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
   if (!folder.open()) return errno;
@@ -45,16 +46,15 @@ int FindPlace(int from, const path &file, Place *place) {
   return 0;
 }
 
-// The rule that the kernel keeps for opening (fs.protected_symlinks): in a folder where everybody
-// makes files and nobody removes those of others, a link is followed for its owner only, or where
-// it belongs to the owner of the folder.
+// The kernel's rule for open (fs.protected_symlinks). In a sticky folder that all can write to, a
+// link is followed only when it belongs to us or to the owner of the folder.
 bool MayFollow(const struct stat &folder, const struct stat &link) {
   const bool shared = (folder.st_mode & S_ISVTX) != 0 && (folder.st_mode & S_IWOTH) != 0;
   return !shared || link.st_uid == geteuid() || link.st_uid == folder.st_uid;
 }
 
-// The descriptor of this process that a link such as /proc/self/fd/1 stands for: what it leads to
-// is to be written through it, and not replaced.
+// The descriptor of this process that a link such as /proc/self/fd/1 means, if it means one. Its
+// file is written through the descriptor and is not replaced.
 std::optional<int> OwnDescriptor(const struct stat &folder, const std::string &name) {
   for (const char *own : {"/proc/self/fd", "/proc/thread-self/fd"}) {
     struct stat descriptors = {};
@@ -69,14 +69,14 @@ std::optional<int> OwnDescriptor(const struct stat &folder, const std::string &n
   return std::nullopt;
 }
 
-// What stands at a place: nothing, something to be replaced, or something to be written directly.
+// The place to write to, and how: replace a file there, or write directly.
 struct Target {
   Place place;
-  bool isFile = true;             // a regular file, or nothing yet
-  std::optional<int> descriptor;  // of this process, which stands for it
+  bool isFile = true;             // a regular file, or none yet: replace it
+  std::optional<int> descriptor;  // write to this descriptor instead
 };
 
-// Follows one link, from the place where it stands.
+// Follows one link: sets the target's place to where the link leads.
 int FollowLink(int link, Target *target) {
   std::array<char, PATH_MAX> text;
   const ssize_t length = readlinkat(link, "", text.data(), text.size());
@@ -88,7 +88,7 @@ int FollowLink(int link, Target *target) {
   return 0;
 }
 
-// Follows links to what is to be written.
+// Follows all links of a path to the place to write to.
 int FindTarget(const std::string &file, Target *target) {
   if (const int error = FindPlace(AT_FDCWD, file, &target->place)) return error;
   for (int links = 0;; ++links) {
@@ -111,7 +111,7 @@ int FindTarget(const std::string &file, Target *target) {
   }
 }
 
-// A name beside that one, which nobody can know before.
+// A name for a temporary file, which nobody can guess.
 std::string TemporaryName(const std::string &name) {
   constexpr std::string_view kLetters = "abcdefghijklmnopqrstuvwxyz234567";
   std::random_device random;
@@ -121,7 +121,7 @@ std::string TemporaryName(const std::string &name) {
   return temporary;
 }
 
-// Writes beside a file, under another name, what then takes its place.
+// Writes a temporary file under the name `beside`, then renames it.
 int Replace(const Place &place, const std::string &beside, std::string_view bytes,
             std::optional<mode_t> mode) {
   const int folder = place.folder.number();
@@ -147,7 +147,7 @@ int WriteThrough(const Place &place, std::string_view bytes) {
   if (!device.open()) return errno;
   struct stat status = {};
   if (fstat(device.number(), &status) != 0) return errno;
-  // Somebody has put a file there since: half of it would stay as it was.
+  // A file has taken its place meanwhile. Writing into it would leave its old end in place.
   if (S_ISREG(status.st_mode)) return EBUSY;
   return WriteAll(device.number(), bytes);
 }
@@ -158,7 +158,7 @@ int WriteTarget(const std::string &file, std::string_view bytes, std::optional<m
   if (target.descriptor) return WriteAll(*target.descriptor, bytes);
   if (!target.isFile) return WriteThrough(target.place, bytes);
   const std::string beside = TemporaryName(target.place.name);
-  // A signal waits meanwhile: if it ends the command, nothing is left beside the file.
+  // Signals wait meanwhile. So one that ends the command leaves no temporary file.
   sigset_t all, before;
   sigfillset(&all);
   sigprocmask(SIG_BLOCK, &all, &before);

@@ -10,10 +10,11 @@
 
 namespace tools {
 
-// Writes a file whole or not at all: beside it first, then renamed, with that mode or as the umask
-// gives it. A link stays a link, and the file that it leads to is written; a link that somebody
-// else has planted in a shared folder such as /tmp is refused. A device or a pipe is written
-// directly, and so is an open descriptor (/dev/stdout, /dev/fd/3). False after a complaint.
+// Writes a file whole or not at all: it writes a temporary file in the same folder and renames it.
+// The file gets `mode`, or the mode that the umask allows. A link stays a link, and its target is
+// written; but a link that another user planted in a shared folder such as /tmp is refused.
+// Devices, pipes and open descriptors (/dev/stdout, /dev/fd/3) are written directly. Returns false
+// after a complaint.
 bool WriteFile(const std::string &file, std::string_view bytes,
                std::optional<mode_t> mode = std::nullopt);
 
