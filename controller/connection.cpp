@@ -25,13 +25,13 @@ int findNandExporterNew(NandExporter **row) {
     if (service == 0) continue;
     uint32_t connection = 0;
     if (OpenService(service, kNandConnectionType, &connection) == 0) {
-      // The other prefix tells in a log which of the two searches found it.
+      // The prefix differs, so that a log tells which of the two searches found it.
       std::printf("Morwick_drel: findNandExporterNew: Controller found: %s\n", (*row)->className);
       (*row)->connection = connection;
       (*row)->service = service;
       return 1;
     }
-    // A driver that fails may leave a handle all the same; where it left none, 0 is refused.
+    // A driver that fails may still have set a handle. If not, it refuses 0.
     CloseService(connection);
     ReleaseObject(service);
   }
@@ -48,7 +48,7 @@ uint32_t TolkConnect(NandExporter **row) {
   if (row == nullptr) return 0;
   const uint32_t service = findNandExporter(row);
   if (service == 0) {
-    std::fputs("No class found", stderr);  // no line end: what the caller says follows on the line
+    std::fputs("No class found", stderr);  // the caller's text continues the line
     return 0;
   }
   uint32_t connection = 0;
@@ -76,7 +76,7 @@ int openKVRConnection(KVRConnection *record) {
     closeKVRConnection(record);
     return 0;
   }
-  // TolkConnect searches again: the driver may have gone, or another may come first by now.
+  // TolkConnect searches again: the driver may have gone, or another one may now come first.
   record->connection = TolkConnect(&record->exporter);
   if (record->exporter->getStatsSelectors == KVRGetStatsSelectors && record->connection != 0) {
     return 1;

@@ -1,4 +1,4 @@
-// Presence of a class, and reading buffers.
+// Finds the service of a class, and reads buffers.
 
 #include "morwick/controller.h"
 

@@ -1,4 +1,4 @@
-// The exporter table and the request numbers: what the library knows of each driver class.
+// The exporter table and the request numbers of each driver class.
 
 #include <cstddef>
 
@@ -28,7 +28,7 @@ SelectorPair *KVRGetSnapshotHeaderSelectors() { return &snapshotHeaderSelectors;
 
 namespace {
 
-// What is a class's own; the rest all rows share.
+// The parts of a row that differ between classes.
 struct Traits {
   const char *className;
   const char *matchKey;

@@ -14,7 +14,7 @@ set style fill solid 0.6
 set boxwidth 0.8
 unset key
 
-# The element's number stands behind the name; other names are left out.
+# An element's name ends with its number; other names are left out.
 number(text) = text[strlen(name) + 1:*]
 element(text) = text[1:strlen(name)] eq name && number(text) eq sprintf("%d", int(number(text) . "")) \
     ? int(number(text)) : NaN

@@ -11,7 +11,7 @@
 #include "morwick/morwick.h"
 
 static const char *const kEnds[] = {"",
-                                    "right behind a record",
+                                    "right after a record",
                                     "at an end record",
                                     "at a key that cannot be",
                                     "at a record that is cut",

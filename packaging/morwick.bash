@@ -15,10 +15,10 @@ _morwick() {
     line="{$(sed -n '1,/^Subcommands:/d; s/^  \([a-z]*\).*/\1/p' <<<"$help")}"
   else
     help=$("$program" help "$command" 2>/dev/null) || return
-    # The line of the option that wants a value, or else of what comes without one.
+    # The line of the option that needs a value, or else the line of the arguments.
     line=$([[ $previous == -* ]] && grep -E "^  (-.,)?$previous [A-Z]{2}|^  $previous,--[a-z-]+ [A-Z]{2}" <<<"$help") ||
       line=$(grep -E '^  (FILE|OLD|BUFFER|STREAM)' <<<"$help")
-    # Of a pair, words up to the sign, and a file behind it.
+    # STREAM=FILE: complete the stream before the sign, and a file after it.
     case $line in
       *STREAM=FILE*) [ "$before" = = ] && line=FILE || suffix="=" ;;
     esac

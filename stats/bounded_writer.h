@@ -1,5 +1,5 @@
-// Text into a caller's buffer, piece by piece. A piece fits when its NUL fits too; behind one that
-// did not, nothing fits any more.
+// Writes text into a caller's buffer, piece by piece. A piece fits when its NUL fits too. After a
+// piece that did not fit, no other piece fits.
 #ifndef STATS_BOUNDED_WRITER_H
 #define STATS_BOUNDED_WRITER_H
 
@@ -17,7 +17,7 @@ class BoundedWriter {
 
   uint64_t length() const { return static_cast<uint64_t>(position_ - start_); }
 
-  // Appends the piece. When it does not fit, as much of it as does, ended by a NUL, and returns
+  // Appends the piece. When it does not fit, appends the part that fits and a NUL, and returns
   // false.
   bool Append(std::string_view piece) {
     if (Fits(piece.size())) {
@@ -31,8 +31,8 @@ class BoundedWriter {
     return Fail();
   }
 
-  // Appends the first characters of an array. Where there is room the whole array is copied, which
-  // for a few characters takes less time than asking how many they are.
+  // Appends the first characters of an array. When there is room the whole array is copied: for a
+  // few characters this is faster than a copy of their exact number.
   template <size_t kRoom>
   bool AppendFirst(const char (&characters)[kRoom], size_t length) {
     if (!Fits(kRoom)) return Append(std::string_view(characters, length));
@@ -40,18 +40,19 @@ class BoundedWriter {
     return Advance(length);
   }
 
-  // Appends what `write` writes: it is given room for kRoom characters, and returns the end of what
-  // it wrote there.
+  // Appends the text that `write` writes. It gets room for kRoom characters and returns the end of
+  // its text.
   template <size_t kRoom, typename Write>
   bool AppendWritten(Write write) {
-    if (Fits(kRoom)) {  // nearly always: no second copy
+    if (Fits(kRoom)) {  // nearly always; it saves a copy
       return Advance(static_cast<size_t>(write(position_) - position_));
     }
     char text[kRoom];
     return Append(std::string_view(text, write(text)));
   }
 
-  // Appends what `print`, which is given room and its size, prints there as snprintf does.
+  // Appends the text that `print` prints. It gets room and its size, and returns what snprintf
+  // returns.
   template <typename Print>
   bool AppendPrinted(Print print) {
     const int length = print(position_, free_);
@@ -59,7 +60,7 @@ class BoundedWriter {
     return Advance(static_cast<size_t>(length));
   }
 
-  // Ends the text at this length, at most the present one. There must be a capacity.
+  // Cuts the text to this length, at most the present one. The capacity must not be 0.
   void EndAt(uint64_t length) { start_[length] = '\0'; }
 
  private:
@@ -78,7 +79,7 @@ class BoundedWriter {
 
   char *start_;
   char *position_;
-  uint64_t free_;  // the byte for the NUL included
+  uint64_t free_;  // with the byte for the NUL
 };
 
 }  // namespace morwick

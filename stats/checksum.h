@@ -1,4 +1,4 @@
-// Checksums of what is published letter for letter: an edit that was not meant does not compile.
+// Checksums of tables that are published letter by letter: an accidental edit does not compile.
 #ifndef STATS_CHECKSUM_H
 #define STATS_CHECKSUM_H
 
@@ -7,7 +7,7 @@
 
 namespace morwick {
 
-// FNV-1a, 32 bits. Give the checksum so far to go on with it.
+// FNV-1a, 32 bits. To continue a checksum, pass it as `sum`.
 constexpr uint32_t Checksum(std::string_view text, uint32_t sum = 0x811c9dc5) {
   for (const char c : text) sum = (sum ^ static_cast<uint8_t>(c)) * 0x01000193;
   return sum;

@@ -8,8 +8,8 @@
 
 namespace morwick {
 
-// The eight decimal digits of a value below 10^8, one a byte, the first digit in the lowest byte.
-// All digits are made at once, by multiplication, without a branch for each.
+// The eight decimal digits of a value below 10^8, one in each byte, the first digit in the lowest
+// byte. Multiplications make all digits at once, without a branch for each.
 constexpr uint64_t EightDigits(uint32_t value) {
   // Two groups of four digits, then four of two, then eight of one, each in its own lane. 10486 /
   // 2^20 is 1/100 for all numbers below 43,699, and 103 / 2^10 is 1/10 for all below 179.
@@ -21,7 +21,7 @@ constexpr uint64_t EightDigits(uint32_t value) {
 }
 
 constexpr uint64_t kAsciiZeros = 0x3030303030303030;
-constexpr uint64_t kZerosToBlanks = 0x1010101010101010;  // the bits in which '0' and ' ' differ
+constexpr uint64_t kZerosToBlanks = 0x1010101010101010;  // '0' and ' ' differ in this bit
 
 // Eight bytes, the lowest first.
 inline void StoreText(char *out, uint64_t text) {
@@ -29,14 +29,14 @@ inline void StoreText(char *out, uint64_t text) {
   std::memcpy(out, &text, sizeof text);
 }
 
-// Writes eight digits, leading zeros included.
+// Writes eight digits with leading zeros.
 inline char *WriteEightDigits(char *out, uint32_t value) {
   StoreText(out, EightDigits(value) | kAsciiZeros);
   return out + 8;
 }
 
-// Writes a value below 10^8 without leading zeros. All eight bytes at `out` are written, zeros
-// behind the last digit: one store costs less than the branch that would spare them.
+// Writes a value below 10^8 without leading zeros. It always writes eight bytes at `out`, zeros
+// after the last digit: one store costs less than a branch.
 inline char *WriteShortDecimal(char *out, uint32_t value) {
   const uint64_t digits = EightDigits(value);
   // The last digit counts even when it is 0.
@@ -45,9 +45,9 @@ inline char *WriteShortDecimal(char *out, uint32_t value) {
   return out + 8 - leadingZeros;
 }
 
-constexpr size_t kDecimalRoom = 24;  // what WriteDecimal may write at `out`
+constexpr size_t kDecimalRoom = 24;  // the most bytes that WriteDecimal writes at `out`
 
-// Writes any value without leading zeros and returns the end of it; zeros follow.
+// Writes any value without leading zeros and returns its end; zeros follow.
 inline char *WriteDecimal(char *out, uint64_t value) {
   constexpr uint64_t kGroup = 100000000;
   if (value < kGroup) return WriteShortDecimal(out, static_cast<uint32_t>(value));
@@ -62,10 +62,10 @@ inline char *WriteDecimal(char *out, uint64_t value) {
   return WriteEightDigits(out, low);
 }
 
-constexpr size_t kPaddedRoom = 16;  // what WritePadded may write at `out`
+constexpr size_t kPaddedRoom = 16;  // the most bytes that WritePadded writes at `out`
 
-// Writes the value right-aligned in at least `width` (1 to 8) characters and returns the end of it.
-// Length and padding are computed, not branched on: columns hold numbers of all lengths.
+// Writes the value right-aligned in at least `width` (1 to 8) characters and returns its end.
+// Length and padding are computed without branches, because columns hold numbers of all lengths.
 inline char *WritePadded(char *out, uint32_t value, uint32_t width, char pad) {
   constexpr uint32_t kGroup = 100000000;
   if (value >= kGroup) {  // nine or ten digits, wider than any column
@@ -76,7 +76,7 @@ inline char *WritePadded(char *out, uint32_t value, uint32_t width, char pad) {
   const int leadingBits = std::countr_zero(digits | uint64_t{1} << 56) & ~7;
   const uint64_t padding = (uint64_t{1} << leadingBits) - 1;  // a mask of the leading zeros
   const uint64_t text = (digits | kAsciiZeros) ^ (pad == ' ' ? padding & kZerosToBlanks : 0);
-  // As many leading characters go as are padding and not needed for the width.
+  // Drops the leading characters that are padding and that the width does not need.
   const int droppedBits = std::countr_zero(digits | uint64_t{1} << (64 - 8 * width)) & ~7;
   StoreText(out, text >> droppedBits);
   return out + 8 - droppedBits / 8;

@@ -1,4 +1,4 @@
-// The empty node that entries begin as copies of.
+// The empty node that each new entry is copied from.
 
 #include "stats/entry_list.h"
 

@@ -1,5 +1,5 @@
-// The two entry lists that every parser context begins with: appending to them and freeing them.
-// Written once for all contexts; `Context` is GenericParserCxt or KVRStatsCxt.
+// Appends to the two entry lists at the beginning of each parser context, and frees them. `Context`
+// is GenericParserCxt or KVRStatsCxt.
 #ifndef STATS_ENTRY_LIST_H
 #define STATS_ENTRY_LIST_H
 
@@ -18,24 +18,23 @@ constexpr size_t kLongestText = 98;
 static_assert(sizeof(ContextNode::text) >= kLongestText + 1);
 static_assert(sizeof(ContextNode::text) >= kDecimalRoom);
 
-// All zeros, defined out of the compiler's sight: a node copied from it is set in eight stores,
-// where one initialised on the spot would be cleared by a string instruction that takes longer than
-// both allocations.
+// All zeros. It is defined in another file so that the compiler copies it with eight stores. It
+// would clear a local node with a string instruction, which takes longer than both allocations.
 extern const ContextNode kEmptyNode;
 
-// A name node that is in no list yet; each entry of the name starts as a copy of it, which costs
+// A name node that is in no list yet. Each entry of the name starts as a copy of it. This costs
 // less than clearing a node and copying a text of varying length into it.
 class EntryName {
  public:
-  // Cut to what a node holds.
+  // A name that is too long for a node is cut.
   explicit EntryName(std::string_view name) { Append(name); }
 
   EntryName(std::string_view prefix, std::string_view name) : EntryName(prefix) { Append(name); }
 
   const ContextNode &node() const { return node_; }
 
-  // Puts an element's index behind the name in a copy of the node. Few arrays have as many as a
-  // hundred elements; for these, two digits by hand save a twentieth of the whole time of an entry.
+  // Appends an element's index to the name in a copy of the node. Most arrays have fewer than a
+  // hundred elements: writing two digits by hand saves a twentieth of an entry's time.
   void AppendIndex(ContextNode *copy, uint32_t index) const {
     char *end = copy->text + length_;
     if (index >= 100 || length_ > kLongestText - 2) {
@@ -59,8 +58,8 @@ class EntryName {
   size_t length_ = 0;
 };
 
-// Appends one entry and returns its name node, or null without a context or without memory for both
-// nodes; nothing is added then.
+// Appends one entry and returns its name node. Without a context, or without memory for both nodes,
+// it adds nothing and returns null.
 template <typename Context>
 ContextNode *AppendEntry(Context *ctx, const EntryName &name, uint64_t value) {
   if (ctx == nullptr) return nullptr;
@@ -97,9 +96,9 @@ inline uint64_t LoadElement(const uint8_t *bytes, uint32_t width) {
   return LoadLittleEndian64(padded);
 }
 
-// Appends one entry for each element of at most 8 bytes, named `name` and its index, or `name`
-// alone when there is just one. False when an element could not be added; the others are added all
-// the same.
+// Appends one entry for each element of at most 8 bytes. Its name is `name` and the index, or
+// `name` alone when there is only one element. False when memory was refused for an element; the
+// others are still added.
 template <typename Context>
 bool AppendElements(Context *ctx, const EntryName &name, const uint8_t *bytes, uint32_t width,
                     uint32_t count) {
@@ -115,19 +114,19 @@ bool AppendElements(Context *ctx, const EntryName &name, const uint8_t *bytes, u
   return allAdded;
 }
 
-// Frees a node, if there is one, and returns the next.
+// Frees a node that is not null, and returns the next one.
 inline ContextNode *FreeNode(ContextNode *node) {
   if (node == nullptr) return nullptr;
   ContextNode *next = node->next;
-  // Asked for early, where it is long in coming: a tenth of the time of large parses.
+  // Fetched early, because it is often not in the cache: saves a tenth of the time of large parses.
   if (next != nullptr) __builtin_prefetch(&next->next);
   std::free(node);
   return next;
 }
 
-// Frees the two lists side by side, in the order in which their nodes were allocated: freed one
-// list after the other, the heap hands the nodes of later parses out all over the place, and large
-// parses take six times as long.
+// Frees the two lists side by side, in the order in which their nodes were allocated. Freed one
+// list after the other, the heap would scatter the nodes of later parses, which then take six times
+// as long when they are large.
 template <typename Context>
 void FreeEntries(Context *ctx) {
   ContextNode *names = ctx->namesHead;

@@ -11,7 +11,7 @@ namespace {
 
 using Rules = StreamRules<kMorwickFTL>;
 
-// Adds what a scalar carries. It counts whether it could be added or not.
+// Adds the value of a scalar. It is counted even when memory was refused for it.
 void AddScalar(GenericParserCxt *ctx, const KnownRecord &record) {
   const MorwickKey &key = record.key;
   const uint64_t value = LoadLittleEndian64(record.values);
@@ -20,7 +20,7 @@ void AddScalar(GenericParserCxt *ctx, const KnownRecord &record) {
                      key.id);
 }
 
-// Adds the elements of an array. False when they could not all be added.
+// Adds the elements of an array. False when memory was refused for one of them.
 bool AddArray(GenericParserCxt *ctx, const KnownRecord &record) {
   const MorwickKey &key = record.key;
   if (Rules::LengthDiffers(key, record.length)) {

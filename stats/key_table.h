@@ -1,4 +1,4 @@
-// Key tables: rows in id order, and what is derived from them and checked at compile time.
+// Key tables: rows in the order of their ids. Look-up tables and checks are made at compile time.
 #ifndef STATS_KEY_TABLE_H
 #define STATS_KEY_TABLE_H
 
@@ -13,24 +13,24 @@
 
 namespace morwick {
 
-// What is written down of a key.
+// A key as the tables list it.
 struct KeyRow {
   uint32_t id;
   const char *name;
   uint32_t valueCount;
 };
 
-// Rows in id order, each id once, and for each id from the first to the last the number of its row,
-// counted from 1; 0 without one. Where it is defined nobody sees it, but the lookup is in sight of
-// every caller: called, it takes longer than the rest of a record's walk.
+// Rows in the order of their ids, each id once. For each id from the first to the last, `placeOfId`
+// has the number of its row counted from 1, or 0 without a row. The lookup is inline, because a
+// call would take longer than the rest of a record's walk.
 template <uint32_t kFirstId, size_t kIdCount, size_t kRowCount>
 struct KeyTable {
   std::array<MorwickKey, kRowCount> rows;
   std::array<uint16_t, kIdCount> placeOfId;
 
-  // In constant time; null for an id without a row.
+  // Takes constant time. Null for an id without a row.
   const MorwickKey *Find(uint32_t id) const {
-    const uint32_t index = id - kFirstId;  // wraps to a large number below the first
+    const uint32_t index = id - kFirstId;  // an id below the first gives a large number
     if (index >= kIdCount || placeOfId[index] == 0) return nullptr;
     return &rows[placeOfId[index] - 1U];
   }
@@ -39,7 +39,7 @@ struct KeyTable {
     return std::ranges::count_if(rows, [](const MorwickKey &row) { return row.valueCount > 1; });
   }
 
-  // Over ids, names and value counts of all rows.
+  // Covers ids, names and value counts of all rows.
   constexpr uint32_t RowsChecksum() const {
     uint32_t sum = Checksum("");
     for (const MorwickKey &row : rows) {
@@ -55,7 +55,7 @@ struct KeyTable {
   }
 };
 
-// The table of these rows, as many as it has room for.
+// Makes a table of the rows; their number must be that of the table.
 template <typename Table, size_t kRowCount>
 consteval Table MakeKeyTable(const std::array<KeyRow, kRowCount> &rows) {
   static_assert(std::tuple_size_v<decltype(Table::rows)> == kRowCount);

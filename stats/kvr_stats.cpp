@@ -11,10 +11,10 @@
 namespace morwick {
 namespace {
 
-// Takes over what a known key carries: its summary field and a pair for each of its values. False
-// when memory was refused for a pair; the others are appended all the same.
+// Stores a known key: sets its summary field and appends a pair for each of its values. False when
+// memory was refused for a pair; the other pairs are still appended.
 bool TakeRecord(KVRStatsCxt *ctx, const KnownRecord &record) {
-  if (record.valueCount == 0) return true;  // its values would run past the end of the buffer
+  if (record.valueCount == 0) return true;  // its values would exceed the buffer
   SetSummaryField(ctx, record.key.id, record.values);
   return AppendElements(ctx, EntryName(NameOf(record.key)), record.values,
                         StreamRules<kMorwickKVR>::kValueWidth, record.valueCount);
@@ -40,7 +40,7 @@ void KVRReleaseContext(KVRStatsCxt *ctx) {
   *ctx = {};
 }
 
-// The offsets that tools in other languages read by, on 64-bit hosts.
+// Tools in other languages read these offsets, on 64-bit hosts.
 static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, exportVersion) == 32);
 static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, hostReads) == 64);
 static_assert(sizeof(void *) != 8 || offsetof(KVRStatsCxt, IND_pool_free) == 144);

@@ -11,7 +11,7 @@ namespace {
 
 using Rules = StreamRules<kMorwickMSP>;
 
-// Adds the values of a record. False when they could not all be added.
+// Adds the values of a record. False when memory was refused for one of them.
 bool AddRecord(GenericParserCxt *ctx, const KnownRecord &record) {
   const MorwickKey &key = record.key;
   if (Rules::LengthDiffers(key, record.length)) {

@@ -11,7 +11,7 @@ namespace {
 
 constexpr uint64_t kPlainWidth = 8;
 
-// Takes plain text up to the next conversion or the end; a doubled % stands for one.
+// Takes plain text up to the next conversion or the end. %% means %.
 FormatText TakeText(std::string_view *rest) {
   FormatText text;
   while (!rest->empty()) {
@@ -23,7 +23,7 @@ FormatText TakeText(std::string_view *rest) {
   return text;
 }
 
-// At most 14 digits, or there would be no room in the format for the rest of the conversion.
+// At most 14 digits: a format with more has no room for the rest of the conversion.
 static_assert(kFormatRoom <= 20);
 uint64_t TakeNumber(std::string_view *rest) {
   uint64_t number = 0;
@@ -33,7 +33,7 @@ uint64_t TakeNumber(std::string_view *rest) {
   return number;
 }
 
-// Takes the conversion that is next, when it is of one of the types.
+// Takes the next conversion, if it has one of the types.
 std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_view types) {
   const std::string_view start = *rest;
   rest->remove_prefix(1);
@@ -53,13 +53,13 @@ std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_vie
 
   Conversion conversion;
   start.copy(conversion.text, start.size() - rest->size());
-  // The C library refuses a larger precision, which would cut nothing off a text.
+  // The C library refuses a larger precision. For a text it would make no difference.
   if (type == 's' && precision > INT_MAX) {
     char *point = &conversion.text[start.find('.')];
     point[0] = 's';
     point[1] = '\0';
   }
-  // A precision is a least number of digits, but a largest number of characters of a text.
+  // The precision of a number is its least number of digits; that of a text its most characters.
   conversion.least = std::max(width, type == 's' ? 0 : precision);
   conversion.plain = !hasPrecision && (type == 's' ? width == 0
                                                    : type == 'u' && width <= kPlainWidth &&
@@ -73,7 +73,8 @@ bool AppendText(BoundedWriter &writer, const FormatText &text) {
   return writer.AppendFirst(text.characters, text.length);
 }
 
-// As printf prints it; but what cannot fit is not begun, for its padding alone may take seconds.
+// Prints like printf. A text that cannot fit is not started, because its padding could take
+// seconds.
 template <typename Argument>
 bool AppendFormatted(BoundedWriter &writer, const Conversion &conversion, Argument argument) {
   return writer.AppendPrinted([&](char *room, size_t size) {

@@ -1,5 +1,5 @@
-// Print formats that come from outside: taken apart and checked first, so that the C library is
-// never asked for anything that was not checked.
+// Print formats that come from outside. They are parsed and checked first, so that the C library
+// only gets conversions that are known to be safe.
 #ifndef STATS_PRINT_FORMAT_H
 #define STATS_PRINT_FORMAT_H
 
@@ -25,14 +25,14 @@ struct FormatText {
 struct Conversion {
   char text[kFormatRoom] = {};  // ended by a NUL
   uint64_t least = 0;           // characters that it prints, whatever its argument
-  // A text as it stands, or an unsigned number in a field of at most eight characters: nearly all
-  // there is. Those are printed without the C library, in a fifth of the time.
+  // Nearly all conversions are a plain text, or an unsigned number in at most eight characters.
+  // These are printed without the C library, in a fifth of the time.
   bool plain = false;
   char pad = ' ';
   uint32_t width = 1;
 };
 
-// A format taken apart: plain text, then a conversion and plain text in turn.
+// A parsed format: plain text, then conversions, each followed by plain text.
 struct PrintFormat {
   static constexpr size_t kMostConversions = 2;
 
@@ -41,11 +41,11 @@ struct PrintFormat {
   size_t conversionCount = 0;
 };
 
-// What a format may ask for.
+// The arguments that a format may use.
 enum class Arguments { kOneNumber, kTwoNumbers, kOneText };
 
-// Takes apart a format shorter than kFormatRoom. Nothing when it asks for anything else than (fewer
-// of) these arguments.
+// Parses a format shorter than kFormatRoom. It may use fewer of these arguments. Returns nothing
+// when it uses any other.
 std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments);
 
 // As WritePadded does, where it fits.
@@ -54,7 +54,7 @@ inline bool PrintPadded(BoundedWriter &writer, uint32_t number, uint32_t width, 
       [=](char *room) { return WritePadded(room, number, width, pad); });
 }
 
-// Print what printf would. False when it does not fit, at a cost of no more than what fits.
+// Print like printf. False when the text does not fit; the cost then is that of the part that fits.
 bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,
                   std::span<const uint32_t> numbers);
 bool PrintText(BoundedWriter &writer, const PrintFormat &format, const char *text);

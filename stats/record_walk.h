@@ -136,8 +136,8 @@ static inline MorwickStep WalkToRecord(MorwickStream stream, const uint8_t *byte
 }
 
 /*
- * How many of a key's configured values the parser takes from a record. Those of KVR may run on
- * into the records behind it, but are taken all or not at all; others must lie in the record.
+ * How many of a key's configured values the parser takes from a record. KVR values may continue in
+ * the records after it, and all of them are taken or none; other values must lie in the record.
  */
 /*@ requires payload + length <= size;
     requires stream == kMorwickKVR || stream == kMorwickFTL || stream == kMorwickMSP;

@@ -1,5 +1,5 @@
-// The walk over the records of a dump for everyone: what the proved walk finds, with the key of
-// each record and what its parser makes of it.
+// The public walk over the records of a dump. The proved walk finds each record; this adds its key
+// and the values that a parser takes from it.
 
 #include "morwick/records.h"
 
@@ -24,7 +24,7 @@ std::span<const MorwickKey> KeysOf(MorwickStream stream) {
   return {};
 }
 
-// What ended the walk. The reader stays there.
+// Sets the end of the walk. Later calls return it again.
 int DescribeEnd(MorwickStep step, const WalkedRecord &walked, uint32_t valueWidth,
                 MorwickRecordReader &reader, MorwickRecord &record) {
   const uint64_t left = reader.size - walked.payload;
@@ -39,7 +39,8 @@ int DescribeEnd(MorwickStep step, const WalkedRecord &walked, uint32_t valueWidt
   return 0;
 }
 
-// One function for each stream, so that what its format says is a constant there: half the time.
+// One function for each stream, so that the format's rules are constants there. It takes half the
+// time.
 template <MorwickStream kStream>
 int NextRecord(MorwickRecordReader &reader, MorwickRecord &record) {
   using Rules = StreamRules<kStream>;

@@ -256,7 +256,7 @@ uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot, uint64_t 
   const auto [completed, done] = morwick::Render(
       static_cast<const uint8_t *>(snapshot), snapshot == nullptr ? 0 : snapshotSize,
       static_cast<const uint8_t *>(header), *outputSize, writer, state);
-  // The text ends behind the last complete line.
+  // The text ends after the last complete line.
   writer.EndAt(completed);
   *outputSize = completed + 1;
   return done ? 1 : 0;

@@ -8,8 +8,8 @@
 
 namespace morwick {
 
-// Published letter for letter, misspelling and missing line end (behind C) included: readers search
-// for it.
+// Published letter for letter, with its misspelling and the missing line end after C: readers
+// search for it.
 // clang-format off: one line of the text a line
 inline constexpr std::string_view kSnapshotLegend =
     "Key: \n"

@@ -1,6 +1,5 @@
-// What the parser of each stream makes of a record, beyond where it lies: its key, whether its
-// length is the configured one, and how its values are named. The parsers and morwick/records.h
-// share it.
+// The rules by which the parser of each stream takes a record: its key, whether its length is the
+// configured one, and how its values are named. The parsers and morwick/records.h share them.
 #ifndef STATS_STREAM_RULES_H
 #define STATS_STREAM_RULES_H
 
@@ -22,15 +21,15 @@ struct StreamRules {
     return kStatsKeys.Find(id);
   }
 
-  // Whether the parser reports it. KVR values are counted by the key alone, and FTL scalars may
-  // have more than the one value that is taken.
+  // Whether the parser reports the record's length as different. The KVR parser goes by the key
+  // alone, and an FTL scalar may carry more than its one value.
   static bool LengthDiffers(const MorwickKey &key, uint64_t length) {
     if constexpr (kStream == kMorwickKVR) return false;
     if (kStream == kMorwickFTL && key.valueCount == 1) return false;
     return length != uint64_t{key.valueCount} * kValueWidth;
   }
 
-  // What stands between the name of an array and the index of a value.
+  // The text between the name of an array and the index of a value.
   static std::string_view Separator(const MorwickKey &key) {
     return kStream == kMorwickFTL && key.valueCount > 1 ? "_" : "";
   }
@@ -46,8 +45,8 @@ struct KnownRecord {
 
 inline std::string_view NameOf(const MorwickKey &key) { return {key.name, key.nameLength}; }
 
-// Hands the records of known keys to `take` until it returns false, which comes to kMorwickRecord.
-// Returns what ended the walk.
+// Calls `take` with each record of a known key until it returns false. Returns what ended the walk;
+// kMorwickRecord when `take` did.
 template <MorwickStream kStream, typename Take>
 MorwickStep ForEachKnownRecord(const void *buffer, uint32_t size, Take take) {
   const auto *bytes = static_cast<const uint8_t *>(buffer);

@@ -13,7 +13,7 @@
 namespace morwick {
 namespace {
 
-// The width of a field's values, which may be an array.
+// The width of one value of a field; the field may be an array.
 template <typename Field>
 constexpr uint32_t kWidth = sizeof(std::remove_all_extents_t<Field>);
 
@@ -47,7 +47,7 @@ constexpr MorwickSummaryField kFields[] = {
 
 #undef FIELD
 
-// For each id up to the highest the number of its field, counted from 1; 0 without one.
+// For each id up to the highest: the number of its field counted from 1, or 0 without a field.
 constexpr auto kPlaceOfId = [] {
   std::array<uint8_t, std::ranges::max(kFields, {}, &MorwickSummaryField::id).id + 1> places = {};
   uint8_t place = 0;
@@ -55,7 +55,7 @@ constexpr auto kPlaceOfId = [] {
   return places;
 }();
 
-// With what is no summary field they take up the whole context: one that is forgotten does not
+// Fields, padding and the other members must fill the whole context. So a forgotten field does not
 // compile.
 constexpr size_t kPadding = 4;  // before hostReads
 constexpr size_t kOthers = offsetof(KVRStatsCxt, exportVersion) + sizeof(KVRStatsCxt::parseMarker) +

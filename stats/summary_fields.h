@@ -6,7 +6,7 @@
 
 namespace morwick {
 
-// Keeps the values of a key that has a summary field; its configured number of them must be there.
+// Stores the values of a key that has a summary field. The record must have the configured number.
 void SetSummaryField(KVRStatsCxt *ctx, uint32_t id, const uint8_t *values);
 
 }  // namespace morwick

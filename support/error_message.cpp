@@ -11,7 +11,8 @@ namespace {
 
 constexpr size_t kMessageSize = 1024;
 
-// The exported pointer is plain, for C; the library itself touches it only through this.
+// The exported pointer has a plain type, for C. The library uses it only through this atomic
+// reference.
 std::atomic_ref<char *> Stored() { return std::atomic_ref(GlobalAPIErrorMessage); }
 
 }  // namespace
@@ -26,7 +27,7 @@ void SetAPIErrorMessage(const char *format, ...) {
   va_start(arguments, format);
   std::vsnprintf(message, kMessageSize, format, arguments);
   va_end(arguments);
-  // Stored only when it is whole, so that no reader ever sees half a message.
+  // Stored only when it is complete, so that no reader sees half a message.
   char *none = nullptr;
   if (!Stored().compare_exchange_strong(none, message)) std::free(message);
 }

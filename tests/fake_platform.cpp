@@ -168,7 +168,7 @@ MatchingRequest *ServiceMatching(const char *className) {
   }
   const char *due = platform.row->className;
   if (due == nullptr) {
-    ADD_FAILURE() << "a search goes on behind the last row";
+    ADD_FAILURE() << "a search goes on after the last row";
     return nullptr;
   }
   EXPECT_STREQ(className, due) << "a search goes row by row";

@@ -17,14 +17,14 @@
 // "keeps state": it cannot be set.
 using Script = std::map<std::string, std::string>;
 
-// What the body did to a fresh platform with this script: what it printed, if anything, and behind
+// What the body did to a fresh platform with this script: what it printed, if anything, and after
 // a line end its calls, one a line. The test fails when it left a handle open or returned one that
 // was not.
 std::string Play(const Script &script, const std::function<void()> &body);
 
-// Plays the cases of a file under tests/cases, each against what is to come of it. A line "== name"
-// begins a case, "key: value" lines are its script, and behind a line "->" stands the outcome.
-// Keys of its own, `ownKeys`, the body reads from the script.
+// Plays the cases of a file under tests/cases and compares each outcome with the expected one. A
+// line "== name" begins a case, "key: value" lines are its script, and after a line "->" comes the
+// outcome. The body itself reads the keys in `ownKeys` from the script.
 void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
                const std::function<void(Script &)> &body);
 

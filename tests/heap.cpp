@@ -16,7 +16,7 @@ void *Counted(void *block) {
   return block;
 }
 
-// Fails every test that leaves a block behind.
+// Fails every test that leaks a block.
 class LeakListener : public testing::EmptyTestEventListener {
   void OnTestStart(const testing::TestInfo &) override { before_ = blocks; }
   void OnTestEnd(const testing::TestInfo &) override {

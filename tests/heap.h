@@ -1,5 +1,5 @@
-// The heap as tests need it: allocations are counted and can be refused, a test that leaves a block
-// behind fails, and buffers end where their allocation ends, so that AddressSanitizer sees one byte
+// The heap as tests need it: allocations are counted and can be refused, a test that leaks a block
+// fails, and buffers end where their allocation ends, so that AddressSanitizer sees one byte
 // too many.
 #ifndef TESTS_HEAP_H
 #define TESTS_HEAP_H

@@ -14,8 +14,8 @@
 namespace {
 
 // Parses once, unaligned, into contexts that hold an entry already, while the allocation with the
-// number `refused` fails. `how` is the kind, with "-context" or "-data" behind it where a null
-// pointer takes their place. What can be seen afterwards, as text; nothing is left behind.
+// number `refused` fails. `how` is the kind, with "-context" or "-data" after it when a null
+// pointer takes their place. Returns the visible result as text, and leaves no block.
 std::string Parse(const std::string &how, const std::string &stream, size_t refused) {
   const std::optional<Kind> named = KindOf(how.substr(0, how.find('-')));
   const std::string null = how.substr(std::min(how.size(), how.find('-')));

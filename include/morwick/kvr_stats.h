@@ -15,7 +15,7 @@
  *
  *     04 00 00 00  01 00 00 00    e8 03 00 00 00 00 00 00
  *
- * and the next header begins behind it. A record of length 0 is a header alone.
+ * and the next header begins after it. A record of length 0 is a header alone.
  *
  * Threads: no state outside the context and the buffer. One context belongs to one thread at a
  * time.
@@ -77,7 +77,7 @@ typedef struct KVRStatsCxt {
  * was parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above
  * 0x30000000 or a length past the end; `exportVersion` is then set to 0) and when memory is
  * refused. The entry that was refused memory is missing; the later elements of its array are still
- * appended, and the records after it are not read. Its summary field is set all the same. A null
+ * appended, and the records after it are not read. Its summary field is still set. A null
  * context or buffer gets 0. No message is recorded.
  */
 MORWICK_EXPORT int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size);

@@ -78,7 +78,7 @@ MORWICK_EXPORT uint32_t GetMatchingService(MatchingRequest *request);
  */
 MORWICK_EXPORT int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection);
 
-/* Closes the connection. A failure is reported, but the handle is gone all the same. */
+/* Closes the connection. A failure is reported, but the handle is closed in any case. */
 MORWICK_EXPORT int32_t CloseService(uint32_t connection);
 
 /* Gives back a service handle. */
@@ -133,7 +133,7 @@ MORWICK_EXPORT void RunMainQueue(void) __attribute__((noreturn));
 /*
  * Writes one message, formatted as printf does, to the system log at the default level. With that
  * level masked nothing is formatted. The text may bring a line end of its own. Never waits for
- * whoever reads the log: what there is no room for is lost, and later messages say how much was.
+ * a reader of the log: a message without room is lost, and later messages count the lost ones.
  */
 MORWICK_EXPORT void SystemLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
 

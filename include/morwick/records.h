@@ -44,7 +44,7 @@ typedef struct MorwickKey {
 /* What the walk met: a record, or what ended it. */
 typedef enum MorwickStep {
   kMorwickRecord,
-  kMorwickEndOfBuffer,  /* right behind a record: the buffer is whole */
+  kMorwickEndOfBuffer,  /* right after a record: the buffer is whole */
   kMorwickEndRecord,    /* a record with the end key of FTL or MSP */
   kMorwickBadKey,       /* a KVR or FTL header with a key above 0x30000000 */
   kMorwickTooLong,      /* a record that needs more bytes than are left */
@@ -61,8 +61,8 @@ typedef struct MorwickRecord {
   uint32_t id;
   uint64_t offset;         /* of its header in the buffer, in bytes */
   uint64_t length;         /* of its payload, in bytes, as the header says */
-  uint64_t left;           /* bytes in the buffer behind its header */
-  uint64_t following;      /* bytes in the buffer behind the record; 0 where it is too long */
+  uint64_t left;           /* bytes in the buffer after its header */
+  uint64_t following;      /* bytes in the buffer after the record; 0 when it is too long */
   const MorwickKey *key;   /* null for a key that the table does not know */
   const void *values;      /* the first value, little-endian */
   uint32_t valueWidth;     /* bytes of a value: 8, for MSP 4 */
@@ -115,7 +115,7 @@ MORWICK_EXPORT uint32_t MorwickValueName(MorwickStream stream, const MorwickKey 
 /* The number of keys of a stream; 0 for an unknown one. */
 MORWICK_EXPORT uint32_t MorwickKeyCount(MorwickStream stream);
 
-/* The key with that index in id order, counted from 0; null behind the last one. */
+/* The key with that index in id order, counted from 0; null after the last one. */
 MORWICK_EXPORT const MorwickKey *MorwickKeyAt(MorwickStream stream, uint32_t index);
 
 /* The key of that name, letter for letter; null when there is none, or for a null name. */

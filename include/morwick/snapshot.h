@@ -106,7 +106,7 @@ typedef struct SnapshotFieldDescriptor {
 
 /*
  * Renders `snapshotSize` bytes of SnapshotRecords: a legend, one line a record and an empty line.
- * Bytes behind the last whole record are ignored.
+ * Bytes after the last whole record are ignored.
  *
  * `*outputSize` is the capacity of `output` in bytes. Returns 1 and sets it to the length of the
  * text without its NUL. Returns 0 and leaves it alone when the text and its NUL do not fit:
@@ -168,7 +168,7 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * that its kind does not supply: one number, for kind 2 two, by d, i, u, o, x or X; for kind 3 one
  * text by s. A field of kind 3 without priorities is the exception: nothing is read for it, so it
  * prints its three labels wherever its offset points. The flags -, 0, +, blank and #, width and
- * precision may be any, but what is wider than 2^31 - 1 characters fits no buffer. When the 32 bits
+ * precision may be any, but a field wider than 2^31 - 1 characters fits no buffer. When the 32 bits
  * that tell an empty record lie outside the record, or no field is described, every record counts
  * as empty.
  */

@@ -62,7 +62,7 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
                                buffer.data(), &size),
               expected.result);
     EXPECT_EQ(buffer.substr(0, size), expected.reply);
-    // A call that fails writes nothing; one that cuts its reply short leaves zeros behind it.
+    // A call that fails writes nothing; one that cuts its reply short writes zeros after it.
     const std::string_view unwritten = expected.result == 0 ? std::string_view("#\0", 2) : "#";
     EXPECT_EQ(buffer.find_first_not_of(unwritten, size), std::string::npos);
     EXPECT_EQ(buffer.back(), '#');
