@@ -37,13 +37,10 @@ GOOD |= {name + ".gz": gzip.compress(GOOD[name + ".bin"], mtime=0) for name in (
 GOOD["long.bin"] = (GOOD["snapshot.bin"] * 2)[:252 * 500 + 9]
 
 PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
-OUTPUTS = {}  # what a shell does with those of "$@"
 with open("tests/cases/attack.txt") as file:
     for kind, words in (line.strip().split(": ", 1) for line in file if line[0] != "#"):
         words = words.replace("\\xff", "\udcff")  # a byte that is not UTF-8
-        if "$@" in words:
-            OUTPUTS[kind] = words
-        elif kind == "plain":
+        if kind == "plain":
             PROGRAMS.append(([MORWICK, *words.split()], "live"))
         else:
             PROGRAMS += [([MORWICK, *words.split(), "-o", form], "live") for form in kind.split()]
@@ -138,8 +135,8 @@ def ended_well(log):
         log.count(b": opened io service") == log.count(b": closing io service"))
 
 
-def refused_memory():
-    for program, scenario in PROGRAMS:
+def refused_memory(programs):
+    for program, scenario in programs:
         good = run(program, scenario, ALLOCATIONS="count")
         for number in range(int(take("count"))):
             yield partial(refuse, program, scenario, number + 1, good)
@@ -202,26 +199,6 @@ def exchange(number):
     good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (b"old", GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good
-
-
-def outputs():
-    for (program, scenario), kind in itertools.product(PROGRAMS, OUTPUTS):
-        if program == [GRELLON] or kind != "unread":
-            yield partial(spoil, program, scenario, kind)
-
-
-def spoil(program, scenario, kind):
-    good = run(program, scenario)
-    result = run(["bash", "-o", "pipefail", "-c", OUTPUTS[kind], "bash", *program], scenario)
-    if kind in ("errors closed", "slow"):
-        return result, result.status == good.status and same(program, result.output, good.output)
-    if program == [GRELLON] or not good.output:
-        return result, result.status == good.status
-    if kind.endswith("gone"):
-        result.fault = None
-        return result, result.status == 128 + signal.SIGPIPE
-    return result, result.status != 0 and (
-        kind.startswith("both") or b"standard output" in result.errors)
 
 
 def many_entries():
@@ -292,8 +269,8 @@ os.makedirs(ROOT)
 print("seed", SEED, flush=True)
 with ThreadPoolExecutor(os.cpu_count()) as workers:
     table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
-        "memory": refused_memory(), "signals": (partial(interrupt, n) for n in range(1000)),
-        "outputs": outputs(), "links": (partial(exchange, n) for n in range(1000)),
+        "daemon": refused_memory(PROGRAMS[:3]), "memory": refused_memory(PROGRAMS[3:]),
+        "signals": (partial(interrupt, n) for n in range(1000)), "links": (partial(exchange, n) for n in range(1000)),
         "bytes": [many_entries, *(partial(feed, n) for n in range(10000))]}.items()]
 print("attack      runs  findings  worst time")
 for row in table:

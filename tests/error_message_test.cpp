@@ -11,16 +11,9 @@
 
 #include "tests/heap.h"
 #include "tests/message.h"
-#include "tests/parsing.h"
+#include "tests/stream_notation.h"
 
 namespace {
-
-// A record of key 14, whose array has ten elements, with another number of them.
-std::string MismatchedArray(uint32_t length) {
-  std::string bytes(8 + size_t{8} * length, '\1');
-  const uint32_t header[] = {LittleEndian32(14), LittleEndian32(length)};
-  return bytes.replace(0, sizeof header, reinterpret_cast<const char *>(header), sizeof header);
-}
 
 TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
   RefuseAllocation(1);
@@ -54,12 +47,11 @@ TEST(ErrorMessageTest, IsOneOfThoseThatEightThreadsReportAtOnce) {
     std::set<std::string> possible;
     const char *seen[8] = {};  // by each thread, once it has reported
     for (int i = 0; i < 8; ++i) {
-      const std::string length =
-          std::to_string(i < 3 ? i + 1 : i + 11);  // never the configured ten
+      const std::string length = std::to_string(i < 3 ? i + 1 : i + 11);  // configured are ten
       possible.insert("KVRFTLParseBufferToCxt: hostWriteLogHisto(14): (#10) cfg elements != (" +
                       length + ") buffer elements");
       threads.emplace_back([&start, seenHere = &seen[i], length] {
-        const std::string bytes = MismatchedArray(static_cast<uint32_t>(std::stoul(length)));
+        const std::string bytes = Stream(kFTL, "14:" + length + " 1.." + length);
         Contexts contexts = {};
         start.arrive_and_wait();
         ParseInto(&contexts, kFTL, bytes.data(), bytes.size());

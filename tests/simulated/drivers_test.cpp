@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <csignal>
 #include <filesystem>
-#include <fstream>
 #include <sstream>
 
 #include "morwick/morwick.h"
@@ -95,19 +94,6 @@ TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
         << "two units of work, unless the scenario has others";
     EXPECT_EQ(CloseService(connection), 0);
   }
-}
-
-TEST(SimulatedDriversTest, ServesTheExampleDumps) {
-  setenv("GRELLON_SCENARIO", SOURCE "/packaging/scenarios/statistics.toml", 1);
-  const uint32_t connection = Connect("VeltoQRN3NVMeController");
-  const std::pair<uint32_t, std::string> dumps[] = {
-      {13, "kvr"}, {13, "ftl"}, {221, "msp"}, {22, "snapshot"}, {145, "snapshot_header"}};
-  for (const auto &[command, name] : dumps) {
-    std::ostringstream dump;
-    dump << std::ifstream(SOURCE "/examples/" + name + ".bin").rdbuf();
-    EXPECT_EQ(Read(connection, 9, command), dump.str()) << name;
-  }
-  CloseService(connection);
 }
 
 TEST(SimulatedDriversTest, RefusesAndReportsBadHandles) {

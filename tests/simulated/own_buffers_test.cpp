@@ -142,11 +142,7 @@ TEST(SimulatedOwnBuffersTest, MakesWhatEveryParserUnderstands) {
     ageBefore = age;
   }
   for (const char left : {'\1', '\0'}) {
-    const uint32_t request[6] = {39, 1025};
-    std::string reply(4, '#');
-    size_t size = reply.size();
-    EXPECT_EQ(CallStructMethod(connection, 9, request, sizeof request, reply.data(), &size), 0);
-    EXPECT_EQ(reply[0], left) << "two units are pending";
+    EXPECT_EQ(Read(connection, 9, 39, 1025)[0], left) << "two units are pending";
   }
   for (const uint32_t command : {13U, 221U, 22U, 145U}) {
     const uint32_t request[6] = {command};

@@ -1,9 +1,11 @@
 // The simulated scheduler, and which of its calls end a process.
 
+#include <algorithm>
 #include <chrono>
 #include <cstdio>
 
 #include "tests/simulated/platform.h"
+#include "tests/stream_notation.h"
 
 namespace {
 
@@ -54,25 +56,20 @@ TEST(SimulatedSchedulerDeathTest, EndsForABadScenarioOnlyWhereItMay) {
   RunMainQueue();
 }
 
-// Delays that are swapped would take a thousand seconds.
 TEST(SimulatedSchedulerDeathTest, RunsAndResumesOnSchedule) {
   GTEST_FLAG_SET(death_test_style, "threadsafe");
   const std::string checkIn = "^state 0 nnnn not deferred, ";
-  const struct {
-    const char *schedule, *journal;
-  } cases[] = {
-      {"runs = 0\nfirst_run_after = 1000", "$"},
-      {"runs = 3\nfirst_run_after = 0\ninterval = 0\nresume_after = 0\n"
-       "defer_at_check = [3, 0, 4, 1]",
-       "state 2 nnyy deferred, state 2 nnnn, state 2 nnny deferred, state 2 yyyy deferred, "
-       "state 2 nnnn, state 2 nnnn, $"},
-      {"first_run_after = 0\ninterval = 1000\nresume_after = 0\ndefer_at_check = [4]",
-       "state 2 nnny deferred, state 2 nnnn, $"},
-      {"runs = 2\nfirst_run_after = 0\ninterval = 0\nresume_after = 1000",
-       "state 2 nnnn, state 2 nnnn, $"},
-  };
-  for (const auto &[schedule, journal] : cases) {
-    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), checkIn + journal) << schedule;
+  CaseFile cases("schedules.txt");
+  for (std::string line; cases.Next(&line);) {
+    std::istringstream columns(line);
+    const double least = std::stod(TakeColumn(columns));
+    const std::string journal = checkIn + TakeColumn(columns) + " ?$";
+    std::string schedule = TakeColumn(columns);
+    std::ranges::replace(schedule, ';', '\n');
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), journal) << cases.where();
+    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
+    EXPECT_TRUE(least <= elapsed.count() && elapsed.count() < least + 1) << cases.where();
   }
   EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), testing::ExitedWithCode(0),
               "^$")
@@ -81,29 +78,6 @@ TEST(SimulatedSchedulerDeathTest, RunsAndResumesOnSchedule) {
   EXPECT_EXIT(PlaySchedule("first_run_after = 0"), testing::ExitedWithCode(0),
               checkIn + "state 2 nnnn, the run did not end its transaction\n$");
   unsetenv("FORGETFUL");
-}
-
-// A second before a run and two before resuming, unless the scenario has others.
-TEST(SimulatedSchedulerDeathTest, WaitsAsLongAsTheScenarioSays) {
-  GTEST_FLAG_SET(death_test_style, "threadsafe");
-  const struct {
-    const char *schedule;
-    double seconds;
-  } cases[] = {
-      {"interval = 0\nresume_after = 0", 1},
-      {"first_run_after = 0\nruns = 2", 1},
-      {"first_run_after = 0\ndefer_at_check = [1]", 2},
-      {"first_run_after = 0.25", 0.25},
-      {"first_run_after = 0\nruns = 2\ninterval = 0.25", 0.25},
-      {"first_run_after = 0\ndefer_at_check = [1]\nresume_after = 0.25", 0.25},
-  };
-  for (const auto &[schedule, seconds] : cases) {
-    const auto start = std::chrono::steady_clock::now();
-    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), "");
-    const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
-    EXPECT_GE(elapsed.count(), seconds) << schedule;
-    EXPECT_LT(elapsed.count(), seconds + 1) << schedule;
-  }
 }
 
 }  // namespace

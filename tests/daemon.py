@@ -1,0 +1,106 @@
+"""The daemon with random faults, with early signals, and with logs that nobody reads. GRELLON names it,
+FAST_SLEEP a library that makes its pauses a thousand times shorter."""
+import fcntl, os, random, re, socket, subprocess, tempfile, time
+from pathlib import Path
+from signal import SIGHUP, SIGINT, SIGTERM, SIGUSR1
+
+QUICK = ("schedule = { first_run_after = 0, interval = 0, resume_after = 0, runs = %d }\n"
+         "[[controller]]\nclass = 'VeltoQRN3NVMeController'\npending = %d\n")
+LONG = QUICK % (100000, 4000000000)
+ENVIRONMENT = os.environ | {"LD_PRELOAD": os.environ["FAST_SLEEP"], "GRELLON_SCENARIO": "scenario",
+                            "ASAN_OPTIONS": "verify_asan_link_order=0"}
+LOG, SCENARIO = Path("log"), Path("scenario")
+
+
+def start(*before, errors=None):
+    """The daemon, after the words of another command; the log is its outputs."""
+    with LOG.open("wb") as log:
+        return subprocess.Popen([*before, os.environ["GRELLON"]], env=ENVIRONMENT, stdout=log, stderr=errors or log)
+
+
+def wait_for(text, times=1):
+    end = time.monotonic() + 20
+    while LOG.read_text().count(text) < times:
+        assert time.monotonic() < end, f"in vain: {text}"
+        time.sleep(0.002)
+
+
+def early_signals():
+    """The scenario comes late, from a pipe. Signals that are blocked meanwhile are there afterwards: one to
+    yield means nothing before there is a run, one to stop leaves nothing to run. Others end the daemon
+    while it waits for the scenario."""
+    os.mkfifo(SCENARIO)
+    for option, signals, outcome in (
+            ("block", [SIGUSR1], (0, 1)), ("block", [SIGTERM], (0, 0)), ("block", [SIGHUP, SIGUSR1], (0, 0)),
+            *(("default", [each], (-each, 0)) for each in (SIGTERM, SIGINT, SIGHUP, SIGUSR1))):
+        daemon = start("env", f"--{option}-signal=USR1,TERM,INT,HUP")
+        with SCENARIO.open("w") as late:
+            for each in signals:
+                daemon.send_signal(each)
+            if option == "block":
+                late.write(QUICK % (1, 2))
+                late.close()
+            seen = daemon.wait(20), LOG.read_text().count("running")
+        assert seen == outcome and (outcome[0] == 0 or LOG.read_text() == ""), (option, signals, seen)
+    SCENARIO.unlink()
+
+
+def random_faults():
+    """A hundred runs that yield: no handle stays open, and memory is flat."""
+    draw, pages = random.Random(7), []
+    faults = {"vanish": 9, "refuse_open": 9, "fail_request": 4, "fail_close": 5}
+    SCENARIO.write_text(LONG + "".join(
+        f"{fault} = {[run for run in range(1, 401) if draw.randrange(one_in) == 0]}\n"
+        for fault, one_in in faults.items()))
+    daemon = start()
+    for run in range(100):
+        wait_for("running grellon", run + 1)
+        daemon.send_signal(SIGUSR1)
+        pages.append(int(Path(f"/proc/{daemon.pid}/statm").read_text().split()[1]))
+    daemon.terminate()
+    assert daemon.wait(20) == 0
+    assert (pages[99] - pages[20]) * os.sysconf("SC_PAGE_SIZE") <= 256 << 10, pages
+    log = LOG.read_text()
+    assert not re.search("still open|already released|is unknown", log), log
+    assert re.search(r"\ngrellon: (deferring|stopping) grellon daemon\n$", log), log[-99:]
+    for text in "status fail", "error closing", "deferring grellon", "stopping grellon":
+        assert text in log, f"never: {text}"
+
+
+def outputs_that_take_nothing():
+    """Whatever becomes of what it prints, it ends as it would have."""
+    for scenario, status in (QUICK % (1, 2), 0), (QUICK % (5, 2) + "vanish = [4]\nfail_close = true\n", 0), ("a = \n", 2):
+        SCENARIO.write_text(scenario)
+        for shell in ('"$0" >&-', '"$0" >&- 2>&-', '"$0" 2>&-', '"$0" > /dev/full', '"$0" > /dev/full 2>&1',
+                      '{ sleep 0.1; "$0"; } | true', '{ sleep 0.1; "$0" 2>&1; } | true',
+                      '"$0" 2>&1 | { sleep 0.1; cat; }'):
+            daemon = start("bash", "-o", "pipefail", "-c", shell)
+            assert daemon.wait(9) == status, (scenario, shell, LOG.read_text())
+
+
+def unread_logs():
+    """Neither standard error nor, where a folder may be put in the place of /dev, the system's log is read."""
+    _, full = os.pipe()
+    os.write(full, bytes(fcntl.fcntl(full, fcntl.F_GETPIPE_SZ)))
+    os.mkdir("dev")
+    Path("dev/null").touch()
+    log = socket.socket(socket.AF_UNIX, socket.SOCK_DGRAM)
+    log.bind("dev/log")
+    there = "mount --bind /dev/null dev/null && mount --rbind dev /dev && exec $0"
+    elsewhere = ["unshare", "-m", "bash", "-c", there] if os.system("unshare -m true") == 0 else []
+    SCENARIO.write_text(LONG)
+    daemon = start(*elsewhere, errors=full)
+    wait_for("Controller found")
+    time.sleep(2)  # for more lines than may wait
+    daemon.terminate()
+    assert daemon.wait(6) == 0
+    SCENARIO.write_text("a = \n")
+    assert start(errors=full).wait(9) == 2
+
+
+with tempfile.TemporaryDirectory() as folder:
+    os.chdir(folder)
+    early_signals()
+    random_faults()
+    outputs_that_take_nothing()
+    unread_logs()
