@@ -1,6 +1,6 @@
 """The daemon with random faults, with early signals, and with logs that nobody reads. GRELLON names it,
 FAST_SLEEP a library that makes its pauses a thousand times shorter."""
-import fcntl, os, random, re, socket, subprocess, tempfile, time
+import atexit, fcntl, os, random, re, socket, subprocess, tempfile, time
 from pathlib import Path
 from signal import SIGHUP, SIGINT, SIGTERM, SIGUSR1
 
@@ -15,7 +15,9 @@ LOG, SCENARIO = Path("log"), Path("scenario")
 def start(*before, errors=None):
     """The daemon, after the words of another command; the log is its outputs."""
     with LOG.open("wb") as log:
-        return subprocess.Popen([*before, os.environ["GRELLON"]], env=ENVIRONMENT, stdout=log, stderr=errors or log)
+        daemon = subprocess.Popen([*before, os.environ["GRELLON"]], env=ENVIRONMENT, stdout=log, stderr=errors or log)
+    atexit.register(daemon.kill)
+    return daemon
 
 
 def wait_for(text, times=1):
