@@ -270,7 +270,8 @@ print("seed", SEED, flush=True)
 with ThreadPoolExecutor(os.cpu_count()) as workers:
     table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
         "daemon": refused_memory(PROGRAMS[:3]), "memory": refused_memory(PROGRAMS[3:]),
-        "signals": (partial(interrupt, n) for n in range(1000)), "links": (partial(exchange, n) for n in range(1000)),
+        "signals": (partial(interrupt, n) for n in range(1000)),
+        "links": (partial(exchange, n) for n in range(1000)),
         "bytes": [many_entries, *(partial(feed, n) for n in range(10000))]}.items()]
 print("attack      runs  findings  worst time")
 for row in table:

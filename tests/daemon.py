@@ -15,7 +15,8 @@ LOG, SCENARIO = Path("log"), Path("scenario")
 def start(*before, errors=None):
     """The daemon, after the words of another command; the log is its outputs."""
     with LOG.open("wb") as log:
-        daemon = subprocess.Popen([*before, os.environ["GRELLON"]], env=ENVIRONMENT, stdout=log, stderr=errors or log)
+        daemon = subprocess.Popen([*before, os.environ["GRELLON"]], env=ENVIRONMENT, stdout=log,
+                                  stderr=errors or log)
     atexit.register(daemon.kill)
     return daemon
 
@@ -71,7 +72,8 @@ def random_faults():
 
 def outputs_that_take_nothing():
     """Whatever becomes of what it prints, it ends as it would have."""
-    for scenario, status in (QUICK % (1, 2), 0), (QUICK % (5, 2) + "vanish = [4]\nfail_close = true\n", 0), ("a = \n", 2):
+    faults = "vanish = [4]\nfail_close = true\n"
+    for scenario, status in (QUICK % (1, 2), 0), (QUICK % (5, 2) + faults, 0), ("a = \n", 2):
         SCENARIO.write_text(scenario)
         for shell in ('"$0" >&-', '"$0" >&- 2>&-', '"$0" 2>&-', '"$0" > /dev/full', '"$0" > /dev/full 2>&1',
                       '{ sleep 0.1; "$0"; } | true', '{ sleep 0.1; "$0" 2>&1; } | true',

@@ -41,7 +41,8 @@ def outcome(kind, fault, commands):
             rows.setdefault(text, [[] for _ in commands])[column].append(of.removesuffix(": ") or "x")
     cells = [[",".join(cell) or "." for cell in row] for row in rows.values()]
     widths = [max(map(len, column)) for column in zip(*cells)]
-    return [f"    {' '.join(map(str.ljust, row, widths))} | {text}".rstrip(" |") for text, row in zip(rows, cells)]
+    return [f"    {' '.join(map(str.ljust, row, widths))} | {text}".rstrip(" |")
+            for text, row in zip(rows, cells)]
 
 
 expected = CASES.read_text().splitlines()
