@@ -101,7 +101,7 @@ build_and_consume "$prefix" given
     export GRELLON_SCENARIO
     expect "$(./inspect 2>/dev/null | grep -v -e ^Morwick -e '^the ')" "$(
       "$prefix/bin/morwick" stats -s kvr --long "$prefix/share/morwick/examples/kvr.bin" | sed 's/ *: / /'
-      echo "240 bytes of statistics, which end right after a record")"
+      echo "256 bytes of statistics, which end right after a record")"
     ./inspect | grep -q "the snapshot header is whole"
   fi
   build=$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md")
