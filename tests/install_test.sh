@@ -70,6 +70,8 @@ for root in "" "$work/root"; do
     fi
   done
   unit=$(find "${root:-$work/installed}" -name grellon.service)
+  counts=$(find "${root:-$work/installed}" -name grellon-mtail.service -exec sed -n 's/^ExecStart=.* //p' {} +)
+  [ -f "$root$counts/grellon.mtail" ] || { echo "grellon-mtail.service counts nothing"; exit 1; }
   scenario=$root$(sed -n 's/^Environment=GRELLON_SCENARIO=//p' "$unit")
   [ -f "$scenario" ] || { echo "$unit plays nothing"; exit 1; }
 done
@@ -85,7 +87,8 @@ if [ "$platform" = simulated ]; then
 fi
 (cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
   bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md morwick/docs/morwick.schema.json \
-  morwick/docs/archive.md morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/examples/latency.gp) >/dev/null
+  morwick/docs/archive.md morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/packaging/grafana/morwick.json \
+  morwick/examples/latency.gp) >/dev/null
 build_and_consume "$prefix" given
 
 # The program that the README shows, built as it says, and the loop that the header of snapshots shows,
@@ -101,7 +104,7 @@ build_and_consume "$prefix" given
     export GRELLON_SCENARIO
     expect "$(./inspect 2>/dev/null | grep -v -e ^Morwick -e '^the ')" "$(
       "$prefix/bin/morwick" stats -s kvr --long "$prefix/share/morwick/examples/kvr.bin" | sed 's/ *: / /'
-      echo "240 bytes of statistics, which end right after a record")"
+      echo "256 bytes of statistics, which end right after a record")"
     ./inspect | grep -q "the snapshot header is whole"
   fi
   build=$(sed -n 's/^ *\(cc example.c .*\)/\1/p' "$source/README.md")

@@ -24,11 +24,12 @@ namespace {
 constexpr uint64_t kFirstPowerOn = 1704067200;  // 2024, in seconds since 1970
 constexpr uint64_t kHour = 3'600'000;           // in milliseconds
 constexpr uint64_t kMinute = 60'000;
+constexpr uint64_t kHoursAMonth = 730;
 constexpr double kSwing = 5'000;
 
-// The value at the first power-on, and how much each hour adds: an hour of the clock, or of work.
-// An array is a histogram: each element has half the value of the element before it.
-enum Pace { kByLoad, kByClock };
+// The value at the first power-on, and how much each hour of the clock, each hour of work or each
+// month adds. An array is a histogram: each element has half the value of the element before it.
+enum Pace { kByLoad, kByClock, kByMonth };
 struct Counter {
   uint32_t id;
   uint32_t elementCount;
@@ -58,6 +59,7 @@ constexpr Counter kStatistics[] = {
     {20, 1, 814, 129},                       // band erases
     {17, 1, 6, 2},                           // wear-level moves
     {45, 1, 12, 1},                          // erases of the block that had most of them
+    {47, 1, 7, 1, kByMonth},                 // blocks that went bad
     {28, 1, 40, 30},                         // sleeps
     {14, 10, 4'000'000, 600'000},            // host writes by size
     {15, 10, 9'000'000, 900'000},            // host reads by size
@@ -148,7 +150,7 @@ double PhaseAt(uint64_t time) {
   return 2 * std::numbers::pi * static_cast<double>(time % kMinute) / kMinute;
 }
 
-// The time that drives the counters. It is up to five seconds before or after the clock and never
+// The time that drives most counters. It is up to five seconds before or after the clock and never
 // goes back. The load is how much of it passes in a second.
 uint64_t BusyTime(uint64_t time) {
   return time + static_cast<uint64_t>(std::llround(kSwing * std::sin(PhaseAt(time))));
@@ -161,7 +163,8 @@ double LoadAt(uint64_t time) {
 
 // Multiplies whole hours and the rest separately: growth times milliseconds could exceed 64 bits.
 uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
-  const uint64_t time = counter.pace == kByClock ? clock : BusyTime(clock);
+  uint64_t time = counter.pace == kByLoad ? BusyTime(clock) : clock;
+  if (counter.pace == kByMonth) time /= kHoursAMonth;
   const uint64_t grown = time / kHour * counter.growth + time % kHour * counter.growth / kHour;
   return (counter.start + grown) >> element;
 }

@@ -129,6 +129,7 @@ TEST(SimulatedOwnBuffersTest, MakesWhatEveryParserUnderstands) {
     CheckSnapshot(connection, static_cast<uint32_t>(age / 1000));
     EXPECT_EQ(now.ftl.at(9), (powerOn + age) / 1000) << "the calendar time";
     EXPECT_EQ(now.ftl.at(10), age / 3'600'000) << "the hours";
+    EXPECT_EQ(now.ftl.at(19), 7 + age / 3'600'000 / 730) << "bad blocks, one more each month";
     const double angle = static_cast<double>(age % 60'000) / 60'000 * 2 * std::acos(-1);
     const uint64_t busy = age + static_cast<uint64_t>(std::llround(5000 * std::sin(angle)));
     EXPECT_EQ(now.msp.at(0), std::min<uint64_t>(900'000 + busy / 90, 4294967295));
