@@ -20,8 +20,9 @@ std::string TooLarge(uint64_t limit);
 // Reads dump after dump. One for each thread.
 class DumpReader {
  public:
-  // The bytes of the file with that name, which stay until the next call, and why they are not all of it, if so. A
-  // folder, and with `onlyFiles` what else is no regular file, is refused and not waited for.
+  // The bytes of the file with that name, which stay until the next call, and why they are not all
+  // of it, if so. A folder, and with `onlyFiles` what else is no regular file, is refused and not
+  // waited for.
   struct Dump {
     std::string_view bytes;
     std::string fault;

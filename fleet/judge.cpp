@@ -53,6 +53,12 @@ std::string Bytes(uint64_t count) {
   return std::to_string(count) + (count == 1 ? " byte" : " bytes");
 }
 
+std::string Verdict::Fault() const {
+  std::string all;
+  for (const std::string &fault : faults) all += (all.empty() ? "" : "; ") + fault;
+  return all;
+}
+
 void Judge::Take(const MorwickRecord &record) {
   hasValues_ = hasValues_ || record.valueCount > 0;
   if (record.lengthDiffers == 0 || ++otherLengths_ > kMostNamed) return;

@@ -17,6 +17,9 @@ std::string Bytes(uint64_t count);
 struct Verdict {
   std::vector<std::string> faults;  // none for a good dump
   std::string note;                 // what is remarkable, and no fault
+
+  // All of them in one line; empty for a good dump.
+  std::string Fault() const;
 };
 
 // Looks over a dump while somebody walks through its records.
