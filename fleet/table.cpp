@@ -18,7 +18,7 @@
 namespace fleet {
 namespace {
 
-constexpr uint64_t kBatchesAhead = 8;  // for each thread, before the first of them is taken
+constexpr uint64_t kBatchesAhead = 8;  // that each thread may make before one is taken
 
 // Makes rows. One for each thread.
 class RowMaker {
@@ -37,6 +37,7 @@ class RowMaker {
         ListedFile &file = batch->files[i];
         if (file.fault.empty()) file.fault = Read(file);
         append_({file, values_, present_}, &batch->rows);
+        batch->rowEnds.push_back(batch->rows.size());
       } catch (const std::bad_alloc &) {
         batch->rows.resize(before);
         batch->files.resize(i);
@@ -46,12 +47,12 @@ class RowMaker {
   }
 
  private:
-  // Takes the values of a dump, and says what is wrong with it.
+  // Reads the values of a dump, and returns its fault.
   std::string Read(const ListedFile &file) {
     const DumpReader::Dump dump = reader_.Read(file.name.c_str(), file.inFolder);
     if (!dump.fault.empty() && dump.bytes.empty()) return dump.fault;
     const Verdict verdict = filler_.Fill(dump.bytes, values_, present_);
-    // Of what could not be read to its end the end of the statistics says nothing.
+    // When bytes are missing, the place where the statistics end means nothing.
     return dump.fault.empty() ? verdict.Fault() : dump.fault;
   }
 
@@ -62,9 +63,10 @@ class RowMaker {
   std::vector<uint8_t> present_;
 };
 
-// As many as there are cores, and no more than there are descriptors for.
+// As many as there are cores, but not more than there are descriptors. Each thread may hold a dump
+// of the largest size, and all of them must fit the memory of the command.
 size_t ThreadCount(uint64_t jobs) {
-  constexpr uint64_t kMost = 256;
+  constexpr uint64_t kMost = 32;
   constexpr uint64_t kOtherDescriptors = 16;
   cpu_set_t cores;
   const bool known = sched_getaffinity(0, sizeof cores, &cores) == 0;
@@ -79,14 +81,14 @@ size_t ThreadCount(uint64_t jobs) {
 
 }  // namespace
 
-// Batches made by several threads and handed out in the order of their files.
+// Batches that several threads make, and that leave in the order of their files.
 class Table::OrderedBatches {
  public:
-  // Threads may be so many batches ahead of what is handed out.
+  // Threads make at most `ahead` batches before the first of them is taken.
   OrderedBatches(TableOptions options, FileList list, size_t ahead)
       : options_(std::move(options)), list_(std::move(list)), made_(ahead) {}
 
-  // What a thread does.
+  // The work of one thread.
   void Work() {
     std::optional<RowMaker> maker;
     for (;;) {
@@ -118,14 +120,14 @@ class Table::OrderedBatches {
     return Got::kBatch;
   }
 
-  // Threads take no more.
+  // Makes the threads end.
   void Stop() {
     const std::lock_guard lock(mutex_);
     stopped_ = true;
     isWanted_.notify_all();
   }
 
-  int listError() const { return list_.error(); }
+  const std::string &listFault() const { return list_.listFault(); }
   bool failed() const { return failed_; }
 
  private:
@@ -138,9 +140,9 @@ class Table::OrderedBatches {
     isWanted_.notify_all();
   }
 
-  // The next files. False when there are none, or no more are wanted.
+  // Takes the next files. False when there are none, or the threads must end.
   bool Take(Batch *batch, uint64_t *number) {
-    // Reading the list may take time: what is made meanwhile is handed out all the same.
+    // Reading the list may take time, so it has a lock of its own: batches leave meanwhile.
     const std::lock_guard listLock(listMutex_);
     {
       std::unique_lock lock(mutex_);
@@ -163,14 +165,14 @@ class Table::OrderedBatches {
   std::mutex listMutex_;
   FileList list_;
 
-  std::mutex mutex_;  // of all below
+  std::mutex mutex_;  // guards all members below
   std::condition_variable isMade_, isWanted_;
   std::vector<std::unique_ptr<Batch>> made_;  // by number, in a circle
   uint64_t taken_ = 0;
   uint64_t handedOut_ = 0;
   bool listEnded_ = false;
   bool stopped_ = false;
-  bool failed_ = false;  // for want of memory
+  bool failed_ = false;  // memory was refused
 };
 
 Table::Table(const TableOptions &options, FileList list) {
@@ -195,7 +197,7 @@ Table::Got Table::Next(std::unique_ptr<Batch> *batch, std::chrono::milliseconds 
   return got;
 }
 
-int Table::listError() const { return batches_->listError(); }
+const std::string &Table::listFault() const { return batches_->listFault(); }
 
 bool Table::outOfMemory() const { return batches_->failed(); }
 

@@ -1,5 +1,4 @@
-// Many dumps as one table: several threads make the rows, which are handed out in the order of the
-// files.
+// Many dumps as one table. Several threads make the rows, which come in the order of the files.
 #ifndef FLEET_TABLE_H
 #define FLEET_TABLE_H
 
@@ -17,7 +16,7 @@
 
 namespace fleet {
 
-// What is known of one dump: a value for each column, and 1 in `present` where the dump has it.
+// One dump: a value for each column, with 1 in `present` when the dump has it.
 struct Row {
   const ListedFile &file;  // with the dump's fault, empty for a good one
   std::span<const uint64_t> values;
@@ -28,35 +27,36 @@ struct TableOptions {
   MorwickStream stream = kMorwickKVR;
   std::shared_ptr<const Selection> selection = nullptr;
   uint64_t jobs = 0;  // threads; 0 for as many as there are cores
-  // Puts a row after those that were made before, in the form in which they are wanted.
+  // Appends a row to the rows, in the form that the caller wants.
   void (*appendRow)(const Row &row, std::string *rows) = nullptr;
   size_t batchSize = 16;  // dumps that a thread takes at once
 };
 
-// Some files in a row with the faults of their dumps, and their rows.
+// Consecutive files with the faults of their dumps, and their rows.
 struct Batch {
   std::vector<ListedFile> files;
   std::string rows;
-  bool outOfMemory = false;  // those that are missing
+  std::vector<size_t> rowEnds;  // for each file, in `rows`
+  bool outOfMemory = false;     // some files are missing
 };
 
 class Table {
  public:
-  // Begins to read. Throws std::bad_alloc when there is no memory or no thread to be had.
+  // Starts to read. Throws std::bad_alloc when memory or all threads are refused.
   Table(const TableOptions &options, FileList list);
-  // Ends before the last batch was taken too. A thread that waits for a pipe is left to itself.
+  // May end before the last batch was taken. A thread that waits for a pipe is detached.
   ~Table();
   Table(const Table &) = delete;
   Table &operator=(const Table &) = delete;
 
   enum class Got { kBatch, kNothingYet, kEnd };
 
-  // The next batch in turn, if it comes in time.
+  // The next batch, in order, if it is ready in time.
   Got Next(std::unique_ptr<Batch> *batch, std::chrono::milliseconds time);
 
-  // Why the list could not be read to its end, as in errno; known at the end.
-  int listError() const;
-  // Whether the end came early for want of memory.
+  // Why the list of names was not read to its end. Ask at the end.
+  const std::string &listFault() const;
+  // Whether the end came early because memory was refused.
   bool outOfMemory() const;
 
  private:

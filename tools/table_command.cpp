@@ -1,4 +1,4 @@
-// morwick table: many dumps as one table, a row each.
+// morwick table: prints many dumps as one table, one row each.
 
 #include <fmt/format.h>
 #include <malloc.h>
@@ -26,7 +26,7 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-// A field of CSV; in quotes where it needs them.
+// Appends a field of CSV, in quotes when it needs them.
 void AppendField(std::string *row, std::string_view field) {
   if (field.find_first_of(",\"\r\n") == std::string_view::npos) {
     row->append(field);
@@ -58,10 +58,10 @@ struct Options {
   bool endedByNul = false;
 };
 
-// A line on the terminal that says how far it has come.
+// A line on the terminal that tells how many dumps are done.
 class Progress {
  public:
-  // Of so many dumps, if that is known.
+  // `total` is the number of dumps, if it is known.
   Progress(bool isShown, std::optional<uint64_t> total) : isShown_(isShown) {
     if (total) ofTotal_ = fmt::format(" of {}", *total);
   }
@@ -87,8 +87,8 @@ class Progress {
   bool there_ = false;
 };
 
-// Threads of the command count against its own limit of memory: stacks and heaps of their own would
-// use up most of it.
+// The command limits its memory. Threads with stacks and heaps of the usual size would take most of
+// it.
 void KeepThreadsSmall() {
   constexpr size_t kStack = 512 << 10;
   mallopt(M_ARENA_MAX, 2);
@@ -99,7 +99,7 @@ void KeepThreadsSmall() {
   pthread_attr_destroy(&attributes);
 }
 
-// The list of names, if there is one. False, and said, when it cannot be opened.
+// Opens the list of names, if there is one. False after a complaint.
 bool OpenList(const Options &options, std::FILE **list) {
   *list = options.list.empty()  ? nullptr
           : options.list == "-" ? stdin
@@ -109,7 +109,7 @@ bool OpenList(const Options &options, std::FILE **list) {
   return false;
 }
 
-// Names from a pipe may come one by one, and each wants its row.
+// Whether names come through a pipe, maybe one by one: then each row is printed at once.
 bool IsPipe(std::FILE *list) {
   struct stat status = {};
   return list != nullptr && fstat(fileno(list), &status) == 0 && !S_ISREG(status.st_mode);
@@ -119,8 +119,8 @@ fleet::FileList FilesOf(const Options &options, std::FILE *list) {
   return fleet::FileList(options.files, list, options.endedByNul ? '\0' : '\n');
 }
 
-// How many files there are, found by going through all names once more, so that none is kept in
-// memory. Nothing when the names can be read only once.
+// Counts the files by going through all names, so that none is kept in memory. Nothing when the
+// names can be read only once.
 std::optional<uint64_t> CountFiles(const Options &options) {
   std::FILE *list = nullptr;
   if (options.list == "-" || !OpenList(options, &list)) return std::nullopt;
@@ -139,19 +139,31 @@ void PrintHeading(Output &output, const fleet::Selection &selection) {
   output.Put('\n');
 }
 
-// Says what is wrong with the dumps of a batch. Returns with how many something is.
+// Complains of the faults in a batch. Returns their number.
 uint64_t ComplainOf(const fleet::Batch &batch, Progress &progress) {
   uint64_t faults = 0;
   for (const fleet::ListedFile &file : batch.files) {
     if (file.fault.empty()) continue;
     if (faults++ == 0) progress.Clear();
-    Complain(file.name, file.fault);
+    Complain(DisplayName(file.name), file.fault);
   }
   return faults;
 }
 
-// Prints the rows as they come. Returns the status of the dumps; nothing when the rows are not to
-// their end, for a signal or because nobody takes them.
+// Writes the rows of a batch one by one, so that a signal ends the output after a whole row. False
+// when the output must end.
+bool WriteRows(Output &output, const fleet::Batch &batch) {
+  const std::string_view rows = batch.rows;
+  size_t begin = 0;
+  for (const size_t end : batch.rowEnds) {
+    if (StopSignals::Stopped() != 0 || !output.Write(rows.substr(begin, end - begin))) return false;
+    begin = end;
+  }
+  return true;
+}
+
+// Prints the rows when they are ready. Returns the status of the dumps; nothing when a signal or a
+// reader that has gone away ends the output early.
 std::optional<Status> PrintRows(Output &output, fleet::Table &table, Progress &progress) {
   using Got = fleet::Table::Got;
   uint64_t dumps = 0;
@@ -159,14 +171,14 @@ std::optional<Status> PrintRows(Output &output, fleet::Table &table, Progress &p
   while (StopSignals::Stopped() == 0) {
     std::unique_ptr<fleet::Batch> batch;
     Got got = table.Next(&batch, milliseconds(0));
+    progress.Show(dumps, faults);
     if (got == Got::kNothingYet) {
       if (!output.Flush()) return std::nullopt;
-      progress.Show(dumps, faults);
       got = table.Next(&batch, milliseconds(50));
     }
     if (got == Got::kEnd) return faults == 0 ? kGood : kBadData;
     if (got == Got::kNothingYet) continue;
-    if (!output.Write(batch->rows)) return std::nullopt;
+    if (!WriteRows(output, *batch)) return std::nullopt;
     dumps += batch->files.size();
     faults += ComplainOf(*batch, progress);
     if (batch->outOfMemory) RefuseMemory();
@@ -174,16 +186,16 @@ std::optional<Status> PrintRows(Output &output, fleet::Table &table, Progress &p
   return std::nullopt;
 }
 
-// The same, and says why the list or the rows are not to their end.
+// Prints the rows, and complains when the list of names ended early.
 std::optional<Status> PrintRows(const Options &options, std::FILE *list,
                                 std::optional<uint64_t> total, bool showProgress, Output &output) {
   fleet::Table table(options.table, FilesOf(options, list));
   Progress progress(showProgress, total);
   const std::optional<Status> status = PrintRows(output, table, progress);
   if (table.outOfMemory()) RefuseMemory();
-  if (!status || table.listError() == 0) return status;
+  if (!status || table.listFault().empty()) return status;
   progress.Clear();
-  Complain(DisplayName(options.list), std::strerror(table.listError()));
+  Complain(DisplayName(options.list), table.listFault());
   return kBadData;
 }
 
@@ -228,8 +240,8 @@ void AddTable(CLI::App &app, Action *action) {
     if (options->files.empty() && options->list.empty()) {
       throw CLI::ValidationError("FILE|FOLDER", "is needed, or --files-from");
     }
-    if (options->list == "-" && std::ranges::count(options->files, "-") > 0) {
-      throw CLI::ValidationError("--files-from", "standard input can be read only once");
+    if (std::ranges::count(options->files, "-") + (options->list == "-" ? 1 : 0) > 1) {
+      throw CLI::ValidationError("FILE|FOLDER", "standard input can be read only once");
     }
     options->table.selection = Select({&options->table.stream, 1}, options->names);
     *action = [=] { return PrintTable(*options); };
