@@ -28,7 +28,7 @@ bool Matches(const std::string &pattern, const std::string &name) {
   return fnmatch(pattern.c_str(), name.c_str(), 0) == 0;
 }
 
-// How many letters must be put in, taken out or exchanged to make one of the other.
+// How many letters must be inserted, removed or exchanged to turn one text into the other.
 size_t Distance(std::string_view one, std::string_view other) {
   std::vector<size_t> row(other.size() + 1);
   std::iota(row.begin(), row.end(), size_t{0});
@@ -50,15 +50,27 @@ std::string Lower(std::string text) {
   return text;
 }
 
-std::string ClosestName(MorwickStream stream, const std::string &name) {
+// A name that continues the text is closer than all others.
+std::string ClosestName(std::span<const MorwickStream> streams, const std::string &name) {
   const std::string text = Lower(name).substr(0, kMorwickNameRoom);
-  const auto keys = KeysOf(stream);
-  // Better one that goes on than one that is as far away.
-  const auto closest = std::ranges::min_element(keys, {}, [&](const MorwickKey *key) {
-    const std::string known = Lower(key->name);
-    return std::pair(!known.starts_with(text), Distance(text, known));
+  std::vector<std::string> known;
+  for (const MorwickStream stream : streams) {
+    for (const MorwickKey *key : KeysOf(stream)) {
+      known.emplace_back(key->name);
+      if (key->valueCount > 1) known.push_back(ValueName(stream, *key, key->valueCount, 0));
+    }
+  }
+  return *std::ranges::min_element(known, {}, [&](const std::string &each) {
+    const std::string lower = Lower(each);
+    return std::pair(!lower.starts_with(text), Distance(text, lower));
   });
-  return (*closest)->name;
+}
+
+// The label of an array where it is printed in one line.
+std::string LabelOf(MorwickStream stream, const MorwickKey &key) {
+  std::string label = ValueName(stream, key, key.valueCount, 0);
+  label.pop_back();
+  return label + "[0.." + std::to_string(key.valueCount - 1) + "]";
 }
 
 }  // namespace
@@ -69,12 +81,12 @@ Selection::Selection(std::span<const MorwickStream> streams, std::span<const std
     const bool isPattern = name.find_first_of("*?[") != std::string::npos;
     bool found = false;
     for (const MorwickStream stream : streams) {
-      found = (isPattern ? AddMatches(stream, name) : AddNamed(stream, name)) || found;
+      found = AddNamed(stream, name) || (isPattern && AddMatches(stream, name)) || found;
     }
     if (found) continue;
     if (isPattern) throw UnknownName("no statistic has a name like '" + name + "'");
     throw UnknownName("no statistic has the name '" + name + "'; the closest is " +
-                      ClosestName(streams.front(), name));
+                      ClosestName(streams, name));
   }
 }
 
@@ -87,8 +99,8 @@ void Selection::Add(MorwickStream stream, const MorwickKey &key, uint32_t index)
 
 bool Selection::AddNamed(MorwickStream stream, const std::string &name) {
   for (const MorwickKey *key : KeysOf(stream)) {
-    const bool all = name == key->name;
-    if (!all && !name.starts_with(key->name)) continue;
+    if (!name.starts_with(key->name)) continue;
+    const bool all = name == key->name || (key->valueCount > 1 && name == LabelOf(stream, *key));
     for (uint32_t i = 0; i < key->valueCount; ++i) {
       if (!all && name != ValueName(stream, *key, key->valueCount, i)) continue;
       Add(stream, *key, i);
@@ -127,7 +139,7 @@ ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
   }
 }
 
-// For the values of the key in turn; null when none has a column.
+// The columns of the key's values, in their order; null when none has a column.
 const uint32_t *ColumnFiller::ColumnsOf(const MorwickKey &key) const {
   const uint32_t first = firstOfId_[key.id - firstId_];
   return first == kNoColumn ? nullptr : &columns_[first];
@@ -143,7 +155,7 @@ Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
     judge.Take(record);
     const uint32_t *columns = record.valueCount == 0 ? nullptr : ColumnsOf(*record.key);
     if (columns == nullptr) continue;
-    // One value of an array has a name of its own, which no column has.
+    // An array with one value gives an entry with the name of the array, which has no column.
     if (record.valueCount == 1 && record.key->valueCount > 1) continue;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
       if (columns[i] == kNoColumn) continue;

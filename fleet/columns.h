@@ -1,4 +1,4 @@
-// The columns of a table of dumps: which statistics are asked for, and where a dump's values go.
+// The columns of a table of dumps: the selected statistics, and the places of a dump's values.
 #ifndef FLEET_COLUMNS_H
 #define FLEET_COLUMNS_H
 
@@ -15,14 +15,14 @@
 
 namespace fleet {
 
-// A name that no statistic of the stream has; says so, and suggests another one.
+// A name that no statistic has; the text suggests the closest one.
 class UnknownName : public std::invalid_argument {
   using std::invalid_argument::invalid_argument;
 };
 
-// Statistics by name. The name of an array stands for all its elements, that of an element for it
-// alone; * ? and [ ] in a name stand for what they stand for in a shell, and take an array whose
-// name matches, or else those elements that do. Throws UnknownName.
+// Statistics by name. The name of an array, or its label such as "name[0..9]", stands for all its
+// elements; the name of an element stands for that element. * ? and [ ] match as in a shell: first
+// the names of arrays, otherwise those of elements. Throws UnknownName.
 class Selection {
  public:
   struct Column {
@@ -31,15 +31,15 @@ class Selection {
     std::string name;
   };
 
-  // Without names: all values of all keys, in the order of the key table. Of several streams one
-  // must have each name.
+  // Without names: all values of all keys, in the order of the key table. At least one of the
+  // streams must have each name.
   Selection(std::span<const MorwickStream> streams, std::span<const std::string> names);
 
-  // In the order in which they were asked for, each once.
+  // In the order of the names, each column once.
   const std::vector<Column> &columns() const { return columns_; }
 
-  // Whether an entry of that name is asked for. A record that is too short gives an entry that is
-  // named like the array alone; it belongs to those who ask for its first element.
+  // Whether an entry of that name is selected. A record that is too short gives one entry with the
+  // name of the array; it counts as the first element.
   bool Has(std::string_view entryName) const { return names_.contains(entryName); }
 
  private:
@@ -55,13 +55,13 @@ class Selection {
   std::unordered_set<std::string, TextHash, std::equal_to<>> names_;
 };
 
-// Takes the values of dumps apart into columns.
+// Copies the values of dumps into columns.
 class ColumnFiller {
  public:
   ColumnFiller(MorwickStream stream, const Selection &selection);
 
-  // Sets the value of each column that the dump has, and `present` to 1 for it. What a dump lacks
-  // stays as it was. Where a name occurs twice the last value counts.
+  // Sets the value of each column that the dump has, and sets its `present` to 1. Other columns
+  // stay as they are. When a name occurs twice the last value counts.
   Verdict Fill(std::string_view dump, std::span<uint64_t> values, std::span<uint8_t> present) const;
 
  private:

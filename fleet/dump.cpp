@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <new>
 
 namespace fleet {
 namespace {
@@ -17,7 +18,7 @@ constexpr size_t kFirstRoom = 256 << 10;
 
 class OpenFile {
  public:
-  OpenFile(const char *name, int flags) : descriptor_(open(name, flags | O_RDONLY | O_CLOEXEC)) {}
+  explicit OpenFile(int descriptor) : descriptor_(descriptor) {}
   ~OpenFile() {
     if (descriptor_ >= 0) close(descriptor_);
   }
@@ -37,14 +38,15 @@ std::string Fault(int error) { return std::strerror(error); }
 std::string TooLarge(uint64_t limit) { return "larger than " + std::to_string(limit) + " bytes"; }
 
 DumpReader::Dump DumpReader::Read(const char *name, bool onlyFiles) {
-  // Opening a pipe waits for somebody who writes to it.
-  const bool isInput = std::strcmp(name, "-") == 0;
-  const OpenFile file(isInput ? "/dev/stdin" : name, onlyFiles ? O_NONBLOCK : 0);
-  if (file.descriptor() < 0) return {{}, Fault(errno)};
   struct stat status = {};
-  if (onlyFiles && fstat(file.descriptor(), &status) == 0 && !S_ISREG(status.st_mode)) {
+  if (onlyFiles && stat(name, &status) == 0 && !S_ISREG(status.st_mode)) {
     return {{}, "not a regular file"};
   }
+  // O_NONBLOCK: a pipe may have taken the file's place, and opening it would wait for a writer.
+  const OpenFile file(std::strcmp(name, "-") == 0
+                          ? fcntl(STDIN_FILENO, F_DUPFD_CLOEXEC, 0)
+                          : open(name, O_RDONLY | O_CLOEXEC | (onlyFiles ? O_NONBLOCK : 0)));
+  if (file.descriptor() < 0) return {{}, Fault(errno)};
   GzipReader reader([&](char *bytes, size_t room) -> ReadResult {
     for (;;) {
       const ssize_t count = read(file.descriptor(), bytes, room);
@@ -55,23 +57,22 @@ DumpReader::Dump DumpReader::Read(const char *name, bool onlyFiles) {
   size_t size = 0;
   for (;;) {
     if (size == capacity_) Grow();
-    // One byte above the limit is enough to know.
-    const size_t room = std::min<size_t>(capacity_, kLargestDump + 1) - size;
-    ReadResult more = reader.Read(buffer_.get() + size, room);
+    ReadResult more = reader.Read(buffer_.get() + size, capacity_ - size);
     size += more.count;
     if (size > kLargestDump) more.fault = TooLarge(kLargestDump);
     if (more.count == 0 || !more.fault.empty()) return {{buffer_.get(), size}, more.fault};
   }
 }
 
-// Dumps of the usual size never come here again.
-char *DumpReader::Grow() {
-  const size_t capacity = capacity_ == 0 ? kFirstRoom : capacity_ * 2;
-  auto buffer = std::make_unique_for_overwrite<char[]>(capacity);
-  std::copy_n(buffer_.get(), capacity_, buffer.get());
-  buffer_ = std::move(buffer);
+// Up to one byte above the limit, which is enough to notice a larger dump. The C library moves
+// large blocks without a second copy in memory.
+void DumpReader::Grow() {
+  const size_t capacity = std::min<size_t>(std::max(kFirstRoom, capacity_ * 2), kLargestDump + 1);
+  auto *bytes = static_cast<char *>(std::realloc(buffer_.get(), capacity));
+  if (bytes == nullptr) throw std::bad_alloc();
+  static_cast<void>(buffer_.release());
+  buffer_.reset(bytes);
   capacity_ = capacity;
-  return buffer_.get();
 }
 
 }  // namespace fleet

@@ -3,6 +3,7 @@
 #define FLEET_DUMP_H
 
 #include <cstdint>
+#include <cstdlib>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -11,7 +12,7 @@
 
 namespace fleet {
 
-// Dumps above this are refused, by what they contain when it is unpacked.
+// Larger dumps are refused. The size of a compressed dump is that of its content.
 constexpr uint64_t kLargestDump = 16 << 20;
 
 // "larger than 16777216 bytes".
@@ -20,8 +21,9 @@ std::string TooLarge(uint64_t limit);
 // Reads dump after dump. One for each thread.
 class DumpReader {
  public:
-  // The bytes of the file with that name, which stay until the next call, and why they are not all of it, if so. A
-  // folder, and with `onlyFiles` what else is no regular file, is refused and not waited for.
+  // Reads the file with that name; "-" is standard input. The bytes stay until the next call. When
+  // they are not the whole file, `fault` says why. With `onlyFiles` everything but a regular file
+  // is refused without opening it.
   struct Dump {
     std::string_view bytes;
     std::string fault;
@@ -29,9 +31,12 @@ class DumpReader {
   Dump Read(const char *name, bool onlyFiles);
 
  private:
-  char *Grow();
+  void Grow();
 
-  std::unique_ptr<char[]> buffer_;
+  struct Free {
+    void operator()(char *bytes) const { std::free(bytes); }
+  };
+  std::unique_ptr<char, Free> buffer_;
   size_t capacity_ = 0;
 };
 

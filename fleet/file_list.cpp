@@ -2,14 +2,14 @@
 
 #include "fleet/file_list.h"
 
+#include <dirent.h>
 #include <sys/stat.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
-#include <filesystem>
-#include <system_error>
+#include <new>
 #include <utility>
 
 namespace fleet {
@@ -20,18 +20,43 @@ bool IsFolder(const std::string &path) {
   return stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
-// The names in a folder, those of folders with a slash at their end: so they are sorted as the
-// paths of what is in them are. Returns the number of the error.
-int ListFolder(const std::string &path, std::vector<std::string> *names) {
-  std::error_code error;
-  for (std::filesystem::directory_iterator entry(path, error), end; entry != end;
-       entry.increment(error)) {
-    std::error_code unclear;
-    const bool isFolder = entry->is_directory(unclear);
-    names->push_back(entry->path().filename().string() + (isFolder ? "/" : ""));
+// The error of a call in words. Memory that was refused is no fault of a file.
+std::string FaultOf(int error) {
+  if (error == ENOMEM) throw std::bad_alloc();
+  return std::strerror(error);
+}
+
+// The entries of a folder, which scandir allocates.
+struct Entries {
+  dirent **list = nullptr;
+  int count = 0;
+
+  Entries() = default;
+  Entries(const Entries &) = delete;
+  Entries &operator=(const Entries &) = delete;
+  ~Entries() {
+    for (int i = 0; i < count; ++i) std::free(list[i]);
+    std::free(list);
   }
-  std::ranges::sort(*names);  // strings compare by bytes, whatever the language
-  return error.value();
+};
+
+// Lists the names in a folder, sorted by bytes. Names of folders end with a slash, so that they
+// sort like the paths of their files. Returns the error number as in errno.
+int ListFolder(const std::string &path, std::vector<std::string> *names) {
+  Entries entries;
+  const int count = scandir(path.c_str(), &entries.list, nullptr, nullptr);
+  if (count < 0) return errno;
+  entries.count = count;
+  for (int i = 0; i < count; ++i) {
+    const dirent &entry = *entries.list[i];
+    std::string name = entry.d_name;
+    if (name == "." || name == "..") continue;
+    const bool isUnclear = entry.d_type == DT_LNK || entry.d_type == DT_UNKNOWN;
+    if (isUnclear ? IsFolder(path + name) : entry.d_type == DT_DIR) name += '/';
+    names->push_back(std::move(name));
+  }
+  std::ranges::sort(*names);
+  return 0;
 }
 
 }  // namespace
@@ -71,37 +96,43 @@ bool FileList::NextName(std::string *name) {
     const ssize_t length = getdelim(&line, &room, end_, list_.get());
     const std::unique_ptr<char, void (*)(void *)> owned(line, std::free);
     if (length <= 0) {
-      error_ = errno;
+      if (errno != 0) listFault_ = FaultOf(errno);
       list_.reset();
       break;
     }
     *name = {line, static_cast<size_t>(length)};
     if (name->back() == end_) name->pop_back();
+    if (name->find('\0') != std::string::npos) {
+      listFault_ = "a line contains a NUL; use -0 when each name ends with one";
+      list_.reset();
+      break;
+    }
+    if (*name == "-") *name = "./-";
     if (!name->empty()) return true;
   }
   return false;
 }
 
-// Begins to go through a folder. True when that cannot be done, which `file` tells.
+// Starts to return the files of a folder. True when it cannot be read; `file` then tells why.
 bool FileList::Enter(const std::string &path, ListedFile *file) {
   const auto refuse = [&](const std::string &fault) {
     *file = {path, true, fault};
     return true;
   };
   struct stat status = {};
-  if (stat(path.c_str(), &status) != 0) return refuse(std::strerror(errno));
+  if (stat(path.c_str(), &status) != 0) return refuse(FaultOf(errno));
   const bool isAbove = std::ranges::any_of(folders_, [&](const Folder &folder) {
     return folder.device == status.st_dev && folder.inode == status.st_ino;
   });
-  if (isAbove) return refuse("a link back to a folder that it is in");
+  if (isAbove) return refuse("a link back to a folder that contains it");
   Folder folder = {path, {}, 0, status.st_dev, status.st_ino};
   const int error = ListFolder(path, &folder.names);
   folders_.push_back(std::move(folder));
-  return error != 0 && refuse(std::strerror(error));
+  return error != 0 && refuse(FaultOf(error));
 }
 
-// The next file of the innermost folder, or the fault of a folder in it. False when a folder was
-// begun instead.
+// Returns the next file of the innermost folder, or the fault of a folder in it. False when the
+// next entry was a folder, whose files come first.
 bool FileList::NextInFolder(ListedFile *file) {
   Folder &folder = folders_.back();
   const std::string path = folder.path + folder.names[folder.next++];

@@ -14,26 +14,26 @@ namespace fleet {
 struct ListedFile {
   std::string name;
   bool inFolder = false;
-  std::string fault;  // why there is nothing to be read, of a folder
+  std::string fault;  // why a folder cannot be read; later the fault of a dump
 };
 
-// Hands out the files that names stand for, in the order of the names. A folder stands for all
-// files in it and below, in byte order of their paths. Of a folder no more is kept in memory than
-// the names in it and in those above it.
+// Returns the files that names stand for, in the order of the names. A folder stands for all files
+// in it and below, in byte order of their paths; links are followed. Memory holds only the names in
+// one folder and in the folders above it. Throws std::bad_alloc.
 class FileList {
  public:
-  // Names from a list, if there is one, come after the others: one a line, or each ended by `end`.
-  // Empty ones are passed over. The stream is closed at the end.
+  // Names from a list, if there is one, come after the others; each ends with `end`. Empty names
+  // are passed over, and "-" is a file with that name. The stream is closed at the end.
   explicit FileList(std::vector<std::string> names, std::FILE *list = nullptr, char end = '\n');
 
   // False after the last one.
   bool Next(ListedFile *file);
 
-  // Why the list could not be read to its end, as in errno; 0 when it was.
-  int error() const { return error_; }
+  // Why the list was not read to its end; empty when it was.
+  const std::string &listFault() const { return listFault_; }
 
  private:
-  // A folder that is being gone through.
+  // A folder whose files are being returned.
   struct Folder {
     std::string path;  // with a slash at its end
     std::vector<std::string> names;
@@ -53,7 +53,7 @@ class FileList {
   size_t next_ = 0;
   std::unique_ptr<std::FILE, CloseFile> list_;
   char end_;
-  int error_ = 0;
+  std::string listFault_;
   std::vector<Folder> folders_;
 };
 

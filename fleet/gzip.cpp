@@ -43,7 +43,7 @@ ReadResult GzipReader::Read(char *bytes, size_t room) {
 ReadResult GzipReader::ReadFirst(char *bytes, size_t room) {
   begun_ = true;
   size_t count = 0;
-  // Not more than a block: it is handed on as it is, or unpacked to the same place.
+  // At most a block: it is returned as it is, or moved to the room for packed data.
   const size_t most = std::min(room, kBlock);
   while (count < std::min(most, sizeof kMagic)) {
     ReadResult more = read_(bytes + count, most - count);
@@ -76,13 +76,20 @@ ReadResult GzipReader::Inflate(char *bytes, size_t room) {
       stream.avail_in = static_cast<uInt>(more.count);
     }
     if (!inflation.inMember) {
+      // As gzip does, accept zeros after a member: tapes and block devices pad with them.
+      while (stream.avail_in > 0 && *stream.next_in == 0) {
+        ++stream.next_in;
+        --stream.avail_in;
+      }
+      if (stream.avail_in == 0) continue;
+      if (*stream.next_in != kMagic[0]) return {0, "other data follows the gzip data"};
       inflateReset(&stream);
       inflation.inMember = true;
     }
     const int result = inflate(&stream, Z_NO_FLUSH);
     if (result == Z_MEM_ERROR) throw std::bad_alloc();
     if (result == Z_STREAM_END) inflation.inMember = false;
-    // What came out before is handed out first: asked again, it fails in the same way.
+    // The bytes before the fault are returned first. The next call fails in the same way.
     const bool failed = result != Z_OK && result != Z_STREAM_END;
     if (failed && stream.avail_out == room) return {0, "the gzip data is damaged"};
     if (failed) break;

@@ -1,4 +1,4 @@
-// Data that may be compressed by gzip, read as what it contains.
+// Reads data that may be compressed by gzip.
 #ifndef FLEET_GZIP_H
 #define FLEET_GZIP_H
 
@@ -9,17 +9,17 @@
 
 namespace fleet {
 
-// What came of a call that reads.
+// The result of reading.
 struct ReadResult {
-  size_t count = 0;   // of bytes; 0 at the end
-  std::string fault;  // why reading failed, in words; empty when it did not
+  size_t count = 0;   // bytes; 0 at the end
+  std::string fault;  // why reading failed; empty when it did not
 };
 
-// Reads from somewhere at most `room` bytes, at least one but at the end.
+// Reads up to `room` bytes; 0 only at the end.
 using ReadBytes = std::function<ReadResult(char *bytes, size_t room)>;
 
-// Hands on what it reads, unpacked when the first two bytes are those of gzip. What is compressed
-// in several members is read as a whole.
+// Returns what it reads, unpacked when the first two bytes are those of gzip. Several members are
+// read as one text.
 class GzipReader {
  public:
   explicit GzipReader(ReadBytes read);
@@ -27,7 +27,7 @@ class GzipReader {
   GzipReader(const GzipReader &) = delete;
   GzipReader &operator=(const GzipReader &) = delete;
 
-  // What was unpacked before a fault has been handed out before.
+  // Bytes before a fault are returned by earlier calls.
   ReadResult Read(char *bytes, size_t room);
 
  private:
@@ -38,7 +38,7 @@ class GzipReader {
 
   ReadBytes read_;
   bool begun_ = false;
-  std::unique_ptr<Inflation> inflation_;  // none for what is not compressed
+  std::unique_ptr<Inflation> inflation_;  // null for data that is not compressed
 };
 
 }  // namespace fleet

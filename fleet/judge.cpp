@@ -9,7 +9,7 @@ namespace {
 
 constexpr uint64_t kMostNamed = 3;  // records of another length; a hostile dump has millions
 
-// The record that a fault is about; `where` it is.
+// Names a record in a fault; `where` tells its place.
 std::string Name(const MorwickRecord &record, const std::string &where) {
   const std::string name = record.key == nullptr ? "" : std::string(", ") + record.key->name;
   return "the record " + where + " (key " + std::to_string(record.id) + name + ") ";
@@ -19,7 +19,7 @@ std::string AtOffset(const MorwickRecord &record) {
   return "at offset " + std::to_string(record.offset);
 }
 
-// Why the records end there, when that is no good end.
+// Why the records end there; empty for a good end.
 std::string FaultOf(const MorwickRecord &end) {
   switch (end.step) {
     case kMorwickRecord:
@@ -34,7 +34,7 @@ std::string FaultOf(const MorwickRecord &end) {
   return "";
 }
 
-// What the first bytes say of data that is no dump; empty when they say nothing.
+// The format of data that is not a dump, by its first bytes; empty when they tell nothing.
 std::string_view FormatOf(std::string_view data) {
   constexpr std::pair<std::string_view, std::string_view> kFormats[] = {
       {"\x28\xb5\x2f\xfd", "zstd"},
@@ -53,6 +53,12 @@ std::string Bytes(uint64_t count) {
   return std::to_string(count) + (count == 1 ? " byte" : " bytes");
 }
 
+std::string Verdict::Fault() const {
+  std::string all;
+  for (const std::string &fault : faults) all += (all.empty() ? "" : "; ") + fault;
+  return all;
+}
+
 void Judge::Take(const MorwickRecord &record) {
   hasValues_ = hasValues_ || record.valueCount > 0;
   if (record.lengthDiffers == 0 || ++otherLengths_ > kMostNamed) return;
@@ -64,7 +70,7 @@ void Judge::Take(const MorwickRecord &record) {
 Verdict Judge::Finish(const MorwickRecord &end) {
   if (dump_.empty()) return {{"there is nothing in it"}, ""};
   const std::string fault = FaultOf(end);
-  if (const auto format = FormatOf(dump_); !format.empty() && !fault.empty()) {
+  if (const auto format = FormatOf(dump_); !format.empty() && (!fault.empty() || !hasValues_)) {
     return {{"this is " + std::string(format) + " data, and must be unpacked first"}, ""};
   }
   if (otherLengths_ > kMostNamed) {

@@ -1,4 +1,4 @@
-// What is wrong with a dump, in words: those that `stats`, `table` and the Python module say.
+// Tells what is wrong with a dump, in the words of `stats`, `table` and the Python module.
 #ifndef FLEET_JUDGE_H
 #define FLEET_JUDGE_H
 
@@ -16,18 +16,21 @@ std::string Bytes(uint64_t count);
 
 struct Verdict {
   std::vector<std::string> faults;  // none for a good dump
-  std::string note;                 // what is remarkable, and no fault
+  std::string note;                 // something to know that is no fault
+
+  // All of them in one line; empty for a good dump.
+  std::string Fault() const;
 };
 
-// Looks over a dump while somebody walks through its records.
+// Judges a dump while the caller walks through its records.
 class Judge {
  public:
   explicit Judge(std::string_view dump) : dump_(dump) {}
 
-  // For each record of the walk.
+  // Call it for each record of the walk.
   void Take(const MorwickRecord &record);
 
-  // For what ended it.
+  // Call it for the end of the walk.
   Verdict Finish(const MorwickRecord &end);
 
  private:
@@ -37,7 +40,7 @@ class Judge {
   bool hasValues_ = false;
 };
 
-// The same for somebody who does not walk.
+// The same, with a walk of its own.
 Verdict JudgeDump(MorwickStream stream, std::string_view dump);
 
 }  // namespace fleet

@@ -21,6 +21,9 @@ class RedrawnBlock {
   // Draws the last lines again, because the size of the window has changed.
   void DrawAgain();
 
+  // The next lines go below what is on the screen: another program has written there.
+  void Forget() { drawn_.clear(); }
+
  private:
   Output &output_;
   std::vector<std::string> lines_;

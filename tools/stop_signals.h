@@ -12,7 +12,8 @@ namespace tools {
 // While one exists, SIGINT, SIGTERM and SIGHUP are remembered, so that the output ends with a whole
 // line. A second signal of the same kind ends the process, even when it hangs. SIGHUP stays ignored
 // if it was ignored (by nohup). SIGINT does not stay ignored: shells ignore it for all background
-// jobs. SIGWINCH, a change of the window's size, is remembered too.
+// jobs. A change of the window's size (SIGWINCH) and a return from the background (SIGCONT) are
+// remembered too.
 class StopSignals {
  public:
   StopSignals();
@@ -20,7 +21,7 @@ class StopSignals {
   // The signal that arrived, or 0.
   static int Stopped() { return stopped_; }
 
-  enum class End { kTime, kResized, kStopped };
+  enum class End { kTime, kResized, kContinued, kStopped };
 
   // Waits until the moment, until a signal arrives, or until the reader of the output has gone
   // away.
@@ -31,7 +32,7 @@ class StopSignals {
 
  private:
   static volatile sig_atomic_t stopped_;
-  static volatile sig_atomic_t resized_;
+  static volatile sig_atomic_t redraw_;  // the signal that asks to draw again, or 0
   sigset_t signals_;
 };
 

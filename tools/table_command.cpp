@@ -1,28 +1,19 @@
-// morwick table: many dumps as one table, a row each.
+// morwick table: prints many dumps as one table, one row each.
 
 #include <fmt/format.h>
 #include <malloc.h>
 #include <pthread.h>
-#include <sched.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <charconv>
 #include <chrono>
-#include <condition_variable>
 #include <cstring>
 #include <memory>
-#include <mutex>
-#include <new>
 #include <optional>
-#include <system_error>
-#include <thread>
 
-#include "fleet/columns.h"
-#include "fleet/dump.h"
-#include "fleet/file_list.h"
+#include "fleet/table.h"
 #include "tools/commands.h"
 #include "tools/input.h"
 #include "tools/memory.h"
@@ -35,34 +26,7 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-constexpr size_t kBatchSize = 16;      // dumps that a thread takes at once
-constexpr uint64_t kBatchesAhead = 8;  // for each thread, before the first of them is printed
-
-struct Options {
-  MorwickStream stream = kMorwickKVR;
-  std::vector<std::string> names;
-  Filter selection;
-  std::vector<std::string> files;
-  std::string list;
-  bool endedByNul = false;
-  uint64_t jobs = 0;
-};
-
-// What is to be said of one dump.
-struct Complaint {
-  std::string file;
-  std::string fault;
-};
-
-// Some rows of the table, as they are printed.
-struct Batch {
-  std::vector<fleet::ListedFile> files;
-  std::string rows;
-  std::vector<Complaint> complaints;
-  bool outOfMemory = false;  // rows are missing
-};
-
-// A field of CSV; in quotes where it needs them.
+// Appends a field of CSV, in quotes when it needs them.
 void AppendField(std::string *row, std::string_view field) {
   if (field.find_first_of(",\"\r\n") == std::string_view::npos) {
     row->append(field);
@@ -73,164 +37,31 @@ void AppendField(std::string *row, std::string_view field) {
   *row += '"';
 }
 
-// Makes rows. One for each thread.
-class RowMaker {
- public:
-  explicit RowMaker(const Options &options)
-      : filler_(options.stream, *options.selection),
-        values_(options.selection->columns().size()),
-        present_(values_.size()) {}
-
-  void Make(Batch *batch) {
-    for (const fleet::ListedFile &file : batch->files) {
-      const size_t before = batch->rows.size();
-      try {
-        AddRow(file, batch);
-      } catch (const std::bad_alloc &) {
-        batch->rows.resize(before);
-        batch->outOfMemory = true;
-        return;
-      }
-    }
+void AppendRow(const fleet::Row &row, std::string *rows) {
+  AppendField(rows, row.file.name);
+  *rows += ',';
+  AppendField(rows, row.file.fault);
+  for (size_t i = 0; i < row.values.size(); ++i) {
+    *rows += ',';
+    if (row.present[i] == 0) continue;
+    char digits[20];
+    rows->append(digits, std::to_chars(digits, std::end(digits), row.values[i]).ptr);
   }
+  *rows += '\n';
+}
 
- private:
-  void AddRow(const fleet::ListedFile &file, Batch *batch) {
-    std::ranges::fill(present_, 0);
-    const std::string fault = file.fault.empty() ? Read(file) : file.fault;
-    std::string &rows = batch->rows;
-    AppendField(&rows, file.name);
-    rows += ',';
-    AppendField(&rows, fault);
-    for (size_t i = 0; i < values_.size(); ++i) {
-      rows += ',';
-      if (present_[i] == 0) continue;
-      char digits[20];
-      rows.append(digits, std::to_chars(digits, std::end(digits), values_[i]).ptr);
-    }
-    rows += '\n';
-    if (!fault.empty()) batch->complaints.push_back({file.name, fault});
-  }
-
-  // Takes the values of a dump, and says what is wrong with it.
-  std::string Read(const fleet::ListedFile &file) {
-    const fleet::DumpReader::Dump dump = reader_.Read(file.name.c_str(), file.inFolder);
-    if (!dump.fault.empty() && dump.bytes.empty()) return dump.fault;
-    const fleet::Verdict verdict = filler_.Fill(dump.bytes, values_, present_);
-    std::string fault = dump.fault;
-    // Of what could not be read to its end the end of the statistics says nothing.
-    if (!fault.empty()) return fault;
-    for (const std::string &each : verdict.faults) fault += (fault.empty() ? "" : "; ") + each;
-    return fault;
-  }
-
-  fleet::DumpReader reader_;
-  fleet::ColumnFiller filler_;
-  std::vector<uint64_t> values_;
-  std::vector<uint8_t> present_;
+struct Options {
+  fleet::TableOptions table = {.appendRow = AppendRow};
+  std::vector<std::string> names;
+  std::vector<std::string> files;
+  std::string list;
+  bool endedByNul = false;
 };
 
-// Batches made by several threads and handed out in the order of their files.
-class OrderedBatches {
- public:
-  // Threads may be so many batches ahead of what is handed out.
-  OrderedBatches(const Options &options, fleet::FileList list, size_t batchSize, size_t ahead)
-      : options_(options), list_(std::move(list)), batchSize_(batchSize), made_(ahead) {}
-
-  // What a thread does.
-  void Work() {
-    std::optional<RowMaker> maker;
-    for (;;) {
-      uint64_t number = 0;
-      auto batch = std::make_unique<Batch>();
-      try {
-        if (!maker) maker.emplace(options_);
-        if (!Take(batch.get(), &number)) return;
-      } catch (const std::bad_alloc &) {
-        Fail();
-        return;
-      }
-      maker->Make(batch.get());
-      const std::lock_guard lock(mutex_);
-      made_[number % made_.size()] = std::move(batch);
-      isMade_.notify_one();
-    }
-  }
-
-  enum class Got { kBatch, kNothingYet, kEnd };
-
-  // The next batch in turn, if it comes in time.
-  Got Next(std::unique_ptr<Batch> *batch, milliseconds time) {
-    std::unique_lock lock(mutex_);
-    std::unique_ptr<Batch> &next = made_[printed_ % made_.size()];
-    isMade_.wait_for(lock, time, [&] { return next != nullptr || AtEnd(); });
-    if (next == nullptr) return AtEnd() ? Got::kEnd : Got::kNothingYet;
-    *batch = std::move(next);
-    ++printed_;
-    isWanted_.notify_all();
-    return Got::kBatch;
-  }
-
-  // Threads take no more.
-  void Stop() {
-    const std::lock_guard lock(mutex_);
-    stopped_ = true;
-    isWanted_.notify_all();
-  }
-
-  int listError() const { return list_.error(); }
-  bool failed() const { return failed_; }
-
- private:
-  bool AtEnd() const { return failed_ || (listEnded_ && printed_ == taken_); }
-
-  void Fail() {
-    const std::lock_guard lock(mutex_);
-    failed_ = stopped_ = true;
-    isMade_.notify_one();
-    isWanted_.notify_all();
-  }
-
-  // The next files. False when there are none, or no more are wanted.
-  bool Take(Batch *batch, uint64_t *number) {
-    // Reading the list may take time: what is made meanwhile is handed out all the same.
-    const std::lock_guard listLock(listMutex_);
-    {
-      std::unique_lock lock(mutex_);
-      isWanted_.wait(lock, [&] { return stopped_ || taken_ < printed_ + made_.size(); });
-      if (stopped_ || listEnded_) return false;
-    }
-    fleet::ListedFile file;
-    while (batch->files.size() < batchSize_ && list_.Next(&file)) {
-      batch->files.push_back(std::move(file));
-    }
-    const std::lock_guard lock(mutex_);
-    listEnded_ = batch->files.size() < batchSize_;
-    if (listEnded_) isMade_.notify_one();
-    if (batch->files.empty()) return false;
-    *number = taken_++;
-    return true;
-  }
-
-  const Options options_;
-  std::mutex listMutex_;
-  fleet::FileList list_;
-  size_t batchSize_;
-
-  std::mutex mutex_;  // of all below
-  std::condition_variable isMade_, isWanted_;
-  std::vector<std::unique_ptr<Batch>> made_;  // by number, in a circle
-  uint64_t taken_ = 0;
-  uint64_t printed_ = 0;
-  bool listEnded_ = false;
-  bool stopped_ = false;
-  bool failed_ = false;  // for want of memory
-};
-
-// A line on the terminal that says how far it has come.
+// A line on the terminal that tells how many dumps are done.
 class Progress {
  public:
-  // Of so many dumps, if that is known.
+  // `total` is the number of dumps, if it is known.
   Progress(bool isShown, std::optional<uint64_t> total) : isShown_(isShown) {
     if (total) ofTotal_ = fmt::format(" of {}", *total);
   }
@@ -256,23 +87,8 @@ class Progress {
   bool there_ = false;
 };
 
-// As many as there are cores, and no more than there are descriptors for.
-size_t ThreadCount(uint64_t jobs) {
-  constexpr uint64_t kMost = 256;
-  constexpr uint64_t kOtherDescriptors = 16;
-  cpu_set_t cores;
-  const bool known = sched_getaffinity(0, sizeof cores, &cores) == 0;
-  uint64_t count = jobs > 0 ? jobs : known ? static_cast<uint64_t>(CPU_COUNT(&cores)) : 1;
-  rlimit limit = {};
-  if (getrlimit(RLIMIT_NOFILE, &limit) == 0) {
-    count = std::min<uint64_t>(
-        count, std::max<uint64_t>(limit.rlim_cur, kOtherDescriptors + 1) - kOtherDescriptors);
-  }
-  return static_cast<size_t>(std::clamp<uint64_t>(count, 1, kMost));
-}
-
-// Threads of the command count against its own limit of memory: stacks and heaps of their own would
-// use up most of it.
+// The command limits its memory. Threads with stacks and heaps of the usual size would take most of
+// it.
 void KeepThreadsSmall() {
   constexpr size_t kStack = 512 << 10;
   mallopt(M_ARENA_MAX, 2);
@@ -283,19 +99,7 @@ void KeepThreadsSmall() {
   pthread_attr_destroy(&attributes);
 }
 
-// Starts as many threads as can be had; without any the batches would not be made.
-std::vector<std::thread> StartThreads(const std::shared_ptr<OrderedBatches> &batches,
-                                      size_t count) {
-  std::vector<std::thread> threads;
-  try {
-    while (threads.size() < count) threads.emplace_back([batches] { batches->Work(); });
-  } catch (const std::system_error &) {
-    if (threads.empty()) throw std::bad_alloc();
-  }
-  return threads;
-}
-
-// The list of names, if there is one. False, and said, when it cannot be opened.
+// Opens the list of names, if there is one. False after a complaint.
 bool OpenList(const Options &options, std::FILE **list) {
   *list = options.list.empty()  ? nullptr
           : options.list == "-" ? stdin
@@ -305,7 +109,7 @@ bool OpenList(const Options &options, std::FILE **list) {
   return false;
 }
 
-// Names from a pipe may come one by one, and each wants its row.
+// Whether names come through a pipe, maybe one by one: then each row is printed at once.
 bool IsPipe(std::FILE *list) {
   struct stat status = {};
   return list != nullptr && fstat(fileno(list), &status) == 0 && !S_ISREG(status.st_mode);
@@ -315,8 +119,8 @@ fleet::FileList FilesOf(const Options &options, std::FILE *list) {
   return fleet::FileList(options.files, list, options.endedByNul ? '\0' : '\n');
 }
 
-// How many files there are, found by going through all names once more, so that none is kept in
-// memory. Nothing when the names can be read only once.
+// Counts the files by going through all names, so that none is kept in memory. Nothing when the
+// names can be read only once.
 std::optional<uint64_t> CountFiles(const Options &options) {
   std::FILE *list = nullptr;
   if (options.list == "-" || !OpenList(options, &list)) return std::nullopt;
@@ -335,69 +139,82 @@ void PrintHeading(Output &output, const fleet::Selection &selection) {
   output.Put('\n');
 }
 
-// Prints the rows as they come. Returns the status of the dumps; nothing when the rows are not to
-// their end, for a signal or because nobody takes them.
-std::optional<Status> PrintRows(Output &output, OrderedBatches &batches, Progress &progress) {
-  Status status = kGood;
+// Complains of the faults in a batch. Returns their number.
+uint64_t ComplainOf(const fleet::Batch &batch, Progress &progress) {
+  uint64_t faults = 0;
+  for (const fleet::ListedFile &file : batch.files) {
+    if (file.fault.empty()) continue;
+    if (faults++ == 0) progress.Clear();
+    Complain(DisplayName(file.name), file.fault);
+  }
+  return faults;
+}
+
+// Writes the rows of a batch one by one, so that a signal ends the output after a whole row. False
+// when the output must end.
+bool WriteRows(Output &output, const fleet::Batch &batch) {
+  const std::string_view rows = batch.rows;
+  size_t begin = 0;
+  for (const size_t end : batch.rowEnds) {
+    if (StopSignals::Stopped() != 0 || !output.Write(rows.substr(begin, end - begin))) return false;
+    begin = end;
+  }
+  return true;
+}
+
+// Prints the rows when they are ready. Returns the status of the dumps; nothing when a signal or a
+// reader that has gone away ends the output early.
+std::optional<Status> PrintRows(Output &output, fleet::Table &table, Progress &progress) {
+  using Got = fleet::Table::Got;
   uint64_t dumps = 0;
   uint64_t faults = 0;
   while (StopSignals::Stopped() == 0) {
-    std::unique_ptr<Batch> batch;
-    auto got = batches.Next(&batch, milliseconds(0));
-    if (got == OrderedBatches::Got::kNothingYet) {
+    std::unique_ptr<fleet::Batch> batch;
+    Got got = table.Next(&batch, milliseconds(0));
+    progress.Show(dumps, faults);
+    if (got == Got::kNothingYet) {
       if (!output.Flush()) return std::nullopt;
-      progress.Show(dumps, faults);
-      got = batches.Next(&batch, milliseconds(50));
+      got = table.Next(&batch, milliseconds(50));
     }
-    if (got == OrderedBatches::Got::kEnd) return status;
-    if (got == OrderedBatches::Got::kNothingYet) continue;
-    if (!output.Write(batch->rows)) return std::nullopt;
+    if (got == Got::kEnd) return faults == 0 ? kGood : kBadData;
+    if (got == Got::kNothingYet) continue;
+    if (!WriteRows(output, *batch)) return std::nullopt;
     dumps += batch->files.size();
-    faults += batch->complaints.size();
-    if (!batch->complaints.empty()) {
-      progress.Clear();
-      status = kBadData;
-    }
-    for (const auto &[file, fault] : batch->complaints) Complain(file, fault);
+    faults += ComplainOf(*batch, progress);
     if (batch->outOfMemory) RefuseMemory();
   }
   return std::nullopt;
 }
 
-Status PrintTable(const Options &options) {
+// Prints the rows, and complains when the list of names ended early.
+std::optional<Status> PrintRows(const Options &options, std::FILE *list,
+                                std::optional<uint64_t> total, bool showProgress, Output &output) {
+  fleet::Table table(options.table, FilesOf(options, list));
+  Progress progress(showProgress, total);
+  const std::optional<Status> status = PrintRows(output, table, progress);
+  if (table.outOfMemory()) RefuseMemory();
+  if (!status || table.listFault().empty()) return status;
+  progress.Clear();
+  Complain(DisplayName(options.list), table.listFault());
+  return kBadData;
+}
+
+Status PrintTable(Options options) {
   std::FILE *list = nullptr;
   if (!OpenList(options, &list)) return kBadUsage;
   const bool isPipe = IsPipe(list);
+  if (isPipe) options.table.batchSize = 1;
   const bool showProgress = isatty(STDERR_FILENO) != 0 && !OutputIsTerminal();
   std::optional<uint64_t> total;
   if (showProgress && !isPipe) total = CountFiles(options);
   StopSignals signals;
   Output output;
-  PrintHeading(output, *options.selection);
+  PrintHeading(output, *options.table.selection);
   KeepThreadsSmall();
-  const size_t count = ThreadCount(options.jobs);
-  const auto batches = std::make_shared<OrderedBatches>(
-      options, FilesOf(options, list), isPipe ? 1 : kBatchSize, count * kBatchesAhead);
-  std::vector<std::thread> threads = StartThreads(batches, count);
-  std::optional<Status> status;
-  bool outOfMemory = false;
-  try {
-    Progress progress(showProgress, total);
-    status = PrintRows(output, *batches, progress);
-  } catch (const std::bad_alloc &) {
-    outOfMemory = true;
-  }
-  batches->Stop();
-  // One that reads a pipe may never come to its end.
-  for (std::thread &thread : threads) status ? thread.join() : thread.detach();
-  if (outOfMemory || batches->failed()) RefuseMemory();
+  const auto status = PrintRows(options, list, total, showProgress, output);
   if (StopSignals::Stopped() != 0) {
     output.Flush();
     StopSignals::EndProcess();
-  }
-  if (status && batches->listError() != 0) {
-    Complain(DisplayName(options.list), std::strerror(batches->listError()));
-    status = kBadData;
   }
   return output.Finish(status.value_or(kBadData));
 }
@@ -409,7 +226,7 @@ void AddTable(CLI::App &app, Action *action) {
   const auto options = std::make_shared<Options>();
   command->add_option("FILE|FOLDER", options->files, "Dumps; a folder stands for all files in it")
       ->type_name("");
-  AddStream(command, &options->stream);
+  AddStream(command, &options->table.stream);
   AddNames(command, &options->names);
   CLI::Option *list =
       command
@@ -417,16 +234,16 @@ void AddTable(CLI::App &app, Action *action) {
                        "Read names of dumps from this file, a line each; - for standard input")
           ->type_name("FILE");
   command->add_flag("-0", options->endedByNul, "Names in the list end with a NUL")->needs(list);
-  AddNumber(command, "-j,--jobs", &options->jobs, 1, UINT32_MAX,
+  AddNumber(command, "-j,--jobs", &options->table.jobs, 1, UINT32_MAX,
             "Threads; without it as many as there are cores");
   command->callback([=] {
     if (options->files.empty() && options->list.empty()) {
       throw CLI::ValidationError("FILE|FOLDER", "is needed, or --files-from");
     }
-    if (options->list == "-" && std::ranges::count(options->files, "-") > 0) {
-      throw CLI::ValidationError("--files-from", "standard input can be read only once");
+    if (std::ranges::count(options->files, "-") + (options->list == "-" ? 1 : 0) > 1) {
+      throw CLI::ValidationError("FILE|FOLDER", "standard input can be read only once");
     }
-    options->selection = Select({&options->stream, 1}, options->names);
+    options->table.selection = Select({&options->table.stream, 1}, options->names);
     *action = [=] { return PrintTable(*options); };
   });
 }

@@ -102,7 +102,12 @@ class Watcher {
   bool WaitUntil(steady_clock::time_point moment) {
     for (;;) {
       const StopSignals::End end = signals_.WaitUntil(moment, output_);
-      if (end != StopSignals::End::kResized) return end == StopSignals::End::kTime;
+      switch (end) {
+        case StopSignals::End::kTime: return true;
+        case StopSignals::End::kStopped: return false;
+        case StopSignals::End::kContinued: block_.Forget(); [[fallthrough]];
+        case StopSignals::End::kResized: break;
+      }
       if (redraws_) block_.DrawAgain();
     }
   }
