@@ -56,17 +56,17 @@ Dump ReadDumpFile(const std::string &file, MorwickStream stream, const std::stri
 Dump ReadDump(Controller &controller, MorwickStream stream) {
   Dump dump;
   dump.source = {"controller", controller.name()};
-  dump.subject = controller.name() + ": " + std::string(NameOf(stream));
+  dump.subject = controller.name() + ": " + std::string(fleet::NameOf(stream));
   dump.row = controller.row();
   dump.status = kBadData;
   if (!controller.connected()) return dump;
-  dump.bytes = controller.Read(*FindBufferKind(NameOf(stream)));
+  dump.bytes = controller.Read(*FindBufferKind(fleet::NameOf(stream)));
   if (dump.bytes) dump.status = kGood;
   return dump;
 }
 
 Dump ReadDumpLive(MorwickStream stream, const std::string &className) {
-  Controller controller(className, std::string(NameOf(stream)));
+  Controller controller(className, std::string(fleet::NameOf(stream)));
   return ReadDump(controller, stream);
 }
 

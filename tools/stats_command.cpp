@@ -138,7 +138,7 @@ void PrintJsonEntries(Json &json, const Statistics &statistics) {
 Status PrintJson(Output &output, const Options &options, const Dump &dump,
                  const Statistics *statistics) {
   Json json(output, "stats", {dump.source});
-  json.Member("stream", NameOf(options.stream));
+  json.Member("stream", fleet::NameOf(options.stream));
   Status status = dump.status;
   if (statistics != nullptr) {
     json.Member("result", statistics->result());
