@@ -5,11 +5,15 @@
 #include <pybind11/numpy.h>
 
 #include <array>
+#include <cerrno>
+#include <memory>
+#include <new>
 #include <optional>
 
 #include "fleet/judge.h"
+#include "fleet/summary.h"
+#include "morwick/kvr_stats.h"
 #include "morwick/little_endian.h"
-#include "morwick/summary.h"
 
 namespace python {
 namespace {
@@ -57,6 +61,7 @@ Dump::Dump(py::handle data, py::handle stream)
       stream_(AsStream(stream)),
       names_(KeyNames::Of(stream_)),
       found_(names_.placeCount()) {
+  if (ViewOf(bytes_).size() > UINT32_MAX) throw py::value_error("data is larger than 4 GiB");
   std::optional<py::gil_scoped_release> release;
   if (ViewOf(bytes_).size() >= kWorthUnlocking) release.emplace();
   Walk();
@@ -138,6 +143,26 @@ py::list Dump::Entries() const {
 
 py::dict Dump::Summary() const {
   py::dict summary;
+  if (stream_ != kMorwickKVR) return summary;
+  const std::string_view dump = ViewOf(bytes_);
+  KVRStatsCxt fields = {};
+  const std::unique_ptr<KVRStatsCxt, decltype(&KVRReleaseContext)> owned(&fields,
+                                                                         KVRReleaseContext);
+  errno = 0;
+  KVRParseBufferToCxt(&fields, dump.data(), static_cast<uint32_t>(dump.size()));
+  if (errno == ENOMEM) throw std::bad_alloc();
+  const auto isPresent = [&](std::string_view name) { return Has(AsText(name)); };
+  for (const fleet::Figure &figure : fleet::Summarise(fields, isPresent)) {
+    const py::str name = AsText(figure.name);
+    if (figure.ratio) {
+      summary[name] = *figure.ratio;
+    } else if (figure.values.size() == 1) {
+      summary[name] = Number(figure.values[0]);
+    } else {
+      summary[name] = py::array_t<uint64_t>(static_cast<py::ssize_t>(figure.values.size()),
+                                            figure.values.data());
+    }
+  }
   return summary;
 }
 

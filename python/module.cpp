@@ -3,6 +3,7 @@
 #include <pybind11/stl.h>
 
 #include "morwick/morwick.h"
+#include "python/controller.h"
 #include "python/dump.h"
 #include "python/snapshot.h"
 #include "python/table.h"
@@ -23,6 +24,13 @@ PYBIND11_MODULE(_native, module) {
       .def_property_readonly("fault", &Dump::Fault)
       .def_property_readonly("end", &Dump::end)
       .def_property_readonly("data", &Dump::bytes);
+  py::class_<Connection>(module, "Connection")
+      .def(py::init<py::handle>())
+      .def_property_readonly("name", &Connection::name)
+      .def("offers", &Connection::Offers)
+      .def("read", &Connection::Read)
+      .def("close", &Connection::Close);
+  module.def("controllers", &Controllers);
   module.def("keys", &Keys);
   module.def("snapshot", &Snapshot);
   module.def("render", &Render);

@@ -10,9 +10,12 @@
 #include "fleet/snapshot_header.h"
 #include "fleet/snapshot_text.h"
 #include "morwick/snapshot.h"
+#include "morwick/snapshot_fields.h"
 
 namespace python {
 namespace {
+
+constexpr uint32_t kMostFields = 1024;  // their names take time by their number squared
 
 // What a header says, or the fixed layout without one.
 struct Layout {
@@ -39,20 +42,49 @@ Layout::Layout(py::handle object) : isFixed(object.is_none()) {
   recordCount = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
 }
 
+py::object LittleEndian(const py::dtype &type) { return type.attr("newbyteorder")("<"); }
+
+py::object OperationsType() {
+  PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
+  return LittleEndian(py::dtype::of<SnapshotOperations>());
+}
+
 // The numbers that have a name.
 py::object FixedType() {
-  PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
+  OperationsType();
   PYBIND11_NUMPY_DTYPE(SnapshotRecord, timestamp, preemptPercent, writes, reads, erasedBands,
                        hostReads, hostWrites, nandReads, nandWrites, collectedSectors,
                        wearLevelBands, intermediatePendingErase, userPendingErase, hysteresisTime,
                        qosDelaysExtreme, qosDelaysNormal, freeSegments, oldestCommandAge,
                        qosInterval, freeNodes, bufferFragments, bufferHighWater, expeditesSucceeded,
                        expeditesFailed, hostUnmaps, commandTagsMin, commandTagsMax);
-  return py::dtype::of<SnapshotRecord>().attr("newbyteorder")("<");
+  return LittleEndian(py::dtype::of<SnapshotRecord>());
 }
 
+// The numbers that the header describes. Those of the priorities of one field are a sub-array,
+// which goes by the label of the counts.
 py::object DescribedType(const Layout &layout) {
-  throw py::value_error("header: not yet" + std::to_string(layout.recordSize));
+  const py::object number = py::dtype("<u4");
+  const py::object operations = OperationsType();
+  py::list names;
+  py::list types;
+  py::list offsets;
+  MorwickSnapshotField field;
+  for (uint32_t i = 0; MorwickSnapshotFieldAt(layout.header.data(), i, &field) != 0; ++i) {
+    if (i == kMostFields) {
+      throw py::value_error("header: describes more than " + std::to_string(kMostFields) +
+                            " fields");
+    }
+    if (field.kind == kMorwickFieldWithoutNumber) continue;
+    names.append(AsText(field.names[0].label));
+    offsets.append(field.offset);
+    if (field.kind == kMorwickFieldPriorities) {
+      types.append(py::make_tuple(operations, py::make_tuple(field.priorities)));
+    } else {
+      types.append(number);
+    }
+  }
+  return py::dtype(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
 }
 
 }  // namespace
