@@ -19,11 +19,18 @@ void RequireBuffer(py::handle object, const char *name) {
 
 }  // namespace
 
-MorwickStream AsStream(py::handle stream) {
-  if (!py::isinstance<py::str>(stream)) {
-    throw py::type_error("stream must be a str, not " + TypeOf(stream));
+std::string AsString(py::handle object, const char *name) {
+  if (!py::isinstance<py::str>(object)) {
+    throw py::type_error(std::string(name) + " must be a str, not " + TypeOf(object));
   }
-  const auto text = stream.cast<std::string>();
+  Py_ssize_t size = 0;
+  const char *text = PyUnicode_AsUTF8AndSize(object.ptr(), &size);
+  if (text == nullptr) throw py::error_already_set();
+  return {text, static_cast<size_t>(size)};
+}
+
+MorwickStream AsStream(py::handle stream) {
+  const std::string text = AsString(stream, "stream");
   const auto found = fleet::StreamNamed(text);
   if (!found) throw py::value_error("stream must be 'kvr', 'ftl' or 'msp', not '" + text + "'");
   return *found;

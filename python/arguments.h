@@ -4,6 +4,7 @@
 
 #include <pybind11/pybind11.h>
 
+#include <string>
 #include <string_view>
 
 #include "morwick/records.h"
@@ -11,6 +12,9 @@
 namespace python {
 
 namespace py = pybind11;
+
+// A str, as UTF-8.
+std::string AsString(py::handle object, const char *name);
 
 // "kvr", "ftl" or "msp".
 MorwickStream AsStream(py::handle stream);

@@ -27,7 +27,8 @@ py::list Offered(const NandExporter &row) {
   return offered;
 }
 
-const fleet::BufferKind &KindOf(const std::string &name) {
+const fleet::BufferKind &KindOf(py::handle kindName) {
+  const std::string name = AsString(kindName, "what");
   const fleet::BufferKind *kind = fleet::FindBufferKind(name);
   if (kind != nullptr) return *kind;
   std::string known = "kvr, ftl";
@@ -41,7 +42,7 @@ const fleet::BufferKind &KindOf(const std::string &name) {
 
 // From finding a service to storing the connection nothing may throw: the handle would leak.
 Connection::Connection(py::handle className) {
-  const std::string name = className.is_none() ? "" : className.cast<std::string>();
+  const std::string name = className.is_none() ? "" : AsString(className, "name");
   if (!className.is_none() && fleet::FindRow(name) == nullptr) {
     throw py::value_error("name: there is no controller class '" + name + "'");
   }
@@ -71,11 +72,9 @@ Connection::Connection(py::handle className) {
   }
 }
 
-bool Connection::Offers(const std::string &kind) const {
-  return row_->*KindOf(kind).selectors != nullptr;
-}
+bool Connection::Offers(py::handle kind) const { return row_->*KindOf(kind).selectors != nullptr; }
 
-py::bytes Connection::Read(const std::string &kind) {
+py::bytes Connection::Read(py::handle kind) {
   const fleet::BufferKind &known = KindOf(kind);
   std::optional<fleet::Reply> reply;
   {

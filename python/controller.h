@@ -20,8 +20,8 @@ class Connection {
   Connection &operator=(const Connection &) = delete;
 
   std::string name() const { return row_->className; }
-  bool Offers(const std::string &kind) const;
-  py::bytes Read(const std::string &kind);
+  bool Offers(py::handle kind) const;
+  py::bytes Read(py::handle kind);
   // Raises what the driver says; the handle is gone all the same, and once only.
   void Close();
 

@@ -2,6 +2,7 @@
 
 #include <pybind11/stl.h>
 
+#include "fleet/streams.h"
 #include "morwick/morwick.h"
 #include "python/controller.h"
 #include "python/dump.h"
@@ -10,6 +11,9 @@
 
 PYBIND11_MODULE(_native, module) {
   using namespace python;
+  // Now, before there are threads that could wait for each other's lock.
+  for (const MorwickStream stream : fleet::kStreams) KeyNames::Of(stream);
+  RegisterRecords();
   module.attr("version") = MORWICK_VERSION_TEXT;
   module.attr("platform") = MORWICK_PLATFORM_NAME;
 

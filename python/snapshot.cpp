@@ -44,28 +44,11 @@ Layout::Layout(py::handle object) : isFixed(object.is_none()) {
 
 py::object LittleEndian(const py::dtype &type) { return type.attr("newbyteorder")("<"); }
 
-py::object OperationsType() {
-  PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
-  return LittleEndian(py::dtype::of<SnapshotOperations>());
-}
-
-// The numbers that have a name.
-py::object FixedType() {
-  OperationsType();
-  PYBIND11_NUMPY_DTYPE(SnapshotRecord, timestamp, preemptPercent, writes, reads, erasedBands,
-                       hostReads, hostWrites, nandReads, nandWrites, collectedSectors,
-                       wearLevelBands, intermediatePendingErase, userPendingErase, hysteresisTime,
-                       qosDelaysExtreme, qosDelaysNormal, freeSegments, oldestCommandAge,
-                       qosInterval, freeNodes, bufferFragments, bufferHighWater, expeditesSucceeded,
-                       expeditesFailed, hostUnmaps, commandTagsMin, commandTagsMax);
-  return LittleEndian(py::dtype::of<SnapshotRecord>());
-}
-
 // The numbers that the header describes. Those of the priorities of one field are a sub-array,
 // which goes by the label of the counts.
 py::object DescribedType(const Layout &layout) {
   const py::object number = py::dtype("<u4");
-  const py::object operations = OperationsType();
+  const py::object operations = LittleEndian(py::dtype::of<SnapshotOperations>());
   py::list names;
   py::list types;
   py::list offsets;
@@ -89,6 +72,17 @@ py::object DescribedType(const Layout &layout) {
 
 }  // namespace
 
+// The numbers that have a name.
+void RegisterRecords() {
+  PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
+  PYBIND11_NUMPY_DTYPE(SnapshotRecord, timestamp, preemptPercent, writes, reads, erasedBands,
+                       hostReads, hostWrites, nandReads, nandWrites, collectedSectors,
+                       wearLevelBands, intermediatePendingErase, userPendingErase, hysteresisTime,
+                       qosDelaysExtreme, qosDelaysNormal, freeSegments, oldestCommandAge,
+                       qosInterval, freeNodes, bufferFragments, bufferHighWater, expeditesSucceeded,
+                       expeditesFailed, hostUnmaps, commandTagsMin, commandTagsMax);
+}
+
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
   size_t count = 0;
@@ -96,8 +90,9 @@ py::object Snapshot(const py::object &data, py::handle header) {
     const Buffer buffer(data, "data");
     count = layout.RecordsOf(buffer.bytes()).size() / layout.recordSize;
   }
-  const py::object type = layout.isFixed ? FixedType() : DescribedType(layout);
-  return py::module_::import("numpy").attr("ndarray")(py::make_tuple(count), type, data);
+  const py::object type =
+      layout.isFixed ? LittleEndian(py::dtype::of<SnapshotRecord>()) : DescribedType(layout);
+  return py::module_::import("numpy").attr("frombuffer")(data, type, count);
 }
 
 py::str Render(py::handle data, py::handle header) {

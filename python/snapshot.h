@@ -6,6 +6,9 @@
 
 namespace python {
 
+// Tells NumPy of the fixed layout; once, before the others.
+void RegisterRecords();
+
 // The records of a snapshot in the layout of a header, or the fixed one with None, over the buffer
 // itself.
 py::object Snapshot(const py::object &data, py::handle header);

@@ -48,6 +48,27 @@ Batches ReadAll(fleet::Table &table, const py::object &progress) {
   return batches;
 }
 
+// Puts rows into columns, batch by batch: the values of a column that are written together lie side
+// by side.
+void Spread(Batches batches, size_t width, size_t count, uint64_t *values, bool *missing) {
+  const py::gil_scoped_release release;
+  const size_t rowSize = width * (sizeof(uint64_t) + 1);
+  size_t first = 0;
+  for (auto &batch : batches) {
+    const size_t rows = batch->files.size();
+    for (size_t column = 0; column < width; ++column) {
+      for (size_t row = 0; row < rows; ++row) {
+        const char *cells = batch->rows.data() + row * rowSize;
+        const size_t place = column * count + first + row;
+        std::memcpy(&values[place], cells + column * sizeof(uint64_t), sizeof(uint64_t));
+        missing[place] = cells[width * sizeof(uint64_t) + column] == 0;
+      }
+    }
+    first += rows;
+    batch.reset();
+  }
+}
+
 }  // namespace
 
 py::tuple Table(const std::vector<std::string> &files, py::handle stream,
@@ -77,27 +98,7 @@ py::tuple Table(const std::vector<std::string> &files, py::handle stream,
   const size_t count = listed.size();
   py::array_t<uint64_t> values({width, count});
   py::array_t<bool> missing({width, count});
-  uint64_t *value = values.mutable_data();
-  bool *isMissing = missing.mutable_data();
-  {
-    const py::gil_scoped_release release;
-    size_t first = 0;
-    for (auto &batch : batches) {
-      // A column's values of a batch lie side by side: written together, they are in the cache.
-      const size_t rows = batch->files.size();
-      const size_t stride = width * (sizeof(uint64_t) + 1);
-      for (size_t column = 0; column < width; ++column) {
-        for (size_t row = 0; row < rows; ++row) {
-          const char *cells = batch->rows.data() + row * stride;
-          const size_t place = column * count + first + row;
-          std::memcpy(&value[place], cells + column * sizeof(uint64_t), sizeof(uint64_t));
-          isMissing[place] = cells[width * sizeof(uint64_t) + column] == 0;
-        }
-      }
-      first += rows;
-      batch.reset();
-    }
-  }
+  Spread(std::move(batches), width, count, values.mutable_data(), missing.mutable_data());
   return py::make_tuple(listed, faults, columns, values, missing);
 }
 
