@@ -14,9 +14,9 @@
 #include "fleet/columns.h"
 #include "fleet/file_list.h"
 #include "fleet/gzip.h"
+#include "fleet/snapshot_header.h"
 #include "morwick/morwick.h"
 #include "platform/simulated/scenario.h"
-#include "tools/snapshot_header.h"
 
 namespace {
 
@@ -39,8 +39,8 @@ void CheckScenario(std::string_view text) {
 }
 
 void CheckHeader(std::string_view file) {
-  const std::string wrong = tools::CheckSnapshotHeader(file);
-  assert(wrong == tools::CheckSnapshotHeader(file));
+  const std::string wrong = fleet::CheckSnapshotHeader(file);
+  assert(wrong == fleet::CheckSnapshotHeader(file));
   if (!wrong.empty()) return;
   const std::vector<char> header(file.begin(), file.end());
   const std::vector<char> snapshot(1000, 'a');

@@ -3,6 +3,8 @@
 #ifndef STATS_PRINT_FORMAT_H
 #define STATS_PRINT_FORMAT_H
 
+#include <algorithm>
+#include <climits>
 #include <cstdint>
 #include <optional>
 #include <span>
@@ -19,6 +21,8 @@ constexpr size_t kFormatRoom = 16;  // of a descriptor's format, its NUL include
 struct FormatText {
   char characters[kFormatRoom] = {};
   size_t length = 0;
+
+  constexpr std::string_view view() const { return {characters, length}; }
 };
 
 // One conversion, such as %-08.3u.
@@ -44,9 +48,81 @@ struct PrintFormat {
 // The arguments that a format may use.
 enum class Arguments { kOneNumber, kTwoNumbers, kOneText };
 
+// Takes plain text up to the next conversion or the end. %% means %.
+constexpr FormatText TakeText(std::string_view *rest) {
+  FormatText text;
+  while (!rest->empty()) {
+    const bool percent = rest->front() == '%';
+    if (percent && !rest->starts_with("%%")) break;
+    text.characters[text.length++] = rest->front();
+    rest->remove_prefix(percent ? 2 : 1);
+  }
+  return text;
+}
+
+// At most 14 digits: a format with more has no room for the rest of the conversion.
+static_assert(kFormatRoom <= 20);
+constexpr uint64_t TakeNumber(std::string_view *rest) {
+  uint64_t number = 0;
+  for (; !rest->empty() && rest->front() >= '0' && rest->front() <= '9'; rest->remove_prefix(1)) {
+    number = number * 10 + static_cast<uint64_t>(rest->front() - '0');
+  }
+  return number;
+}
+
+// Takes the next conversion, if it has one of the types.
+constexpr std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_view types) {
+  constexpr uint64_t kPlainWidth = 8;
+  const std::string_view start = *rest;
+  rest->remove_prefix(1);
+  const size_t flagCount = std::min(rest->find_first_not_of("-0+ #"), rest->size());
+  const std::string_view flags = rest->substr(0, flagCount);
+  rest->remove_prefix(flagCount);
+  const uint64_t width = TakeNumber(rest);
+  const bool hasPrecision = rest->starts_with('.');
+  uint64_t precision = 0;
+  if (hasPrecision) {
+    rest->remove_prefix(1);
+    precision = TakeNumber(rest);
+  }
+  if (rest->empty() || types.find(rest->front()) == std::string_view::npos) return std::nullopt;
+  const char type = rest->front();
+  rest->remove_prefix(1);
+
+  Conversion conversion;
+  start.copy(conversion.text, start.size() - rest->size());
+  // The C library refuses a larger precision. For a text it would make no difference.
+  if (type == 's' && precision > INT_MAX) {
+    char *point = &conversion.text[start.find('.')];
+    point[0] = 's';
+    point[1] = '\0';
+  }
+  // The precision of a number is its least number of digits; that of a text its most characters.
+  conversion.least = std::max(width, type == 's' ? 0 : precision);
+  conversion.plain = !hasPrecision && (type == 's' ? width == 0
+                                                   : type == 'u' && width <= kPlainWidth &&
+                                                         flags.find('-') == std::string_view::npos);
+  conversion.pad = flags.find('0') == std::string_view::npos ? ' ' : '0';
+  conversion.width = static_cast<uint32_t>(std::clamp<uint64_t>(width, 1, kPlainWidth));
+  return conversion;
+}
+
 // Parses a format shorter than kFormatRoom. It may use fewer of these arguments. Returns nothing
 // when it uses any other.
-std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments);
+constexpr std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments) {
+  const std::string_view types = arguments == Arguments::kOneText ? "s" : "diuoxX";
+  const size_t most = arguments == Arguments::kTwoNumbers ? 2 : 1;
+  PrintFormat format;
+  format.texts[0] = TakeText(&text);
+  while (!text.empty()) {
+    if (format.conversionCount == most) return std::nullopt;
+    const std::optional<Conversion> conversion = TakeConversion(&text, types);
+    if (!conversion) return std::nullopt;
+    format.conversions[format.conversionCount] = *conversion;
+    format.texts[++format.conversionCount] = TakeText(&text);
+  }
+  return format;
+}
 
 // As WritePadded does, where it fits.
 inline bool PrintPadded(BoundedWriter &writer, uint32_t number, uint32_t width, char pad) {

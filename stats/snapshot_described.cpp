@@ -3,14 +3,13 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
-#include <iterator>
-#include <optional>
 #include <span>
 
 #include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
 #include "stats/bounded_writer.h"
 #include "stats/print_format.h"
+#include "stats/snapshot_fields.h"
 #include "stats/snapshot_legend.h"
 
 static_assert(sizeof(SnapshotHeader) == 36);
@@ -22,71 +21,16 @@ static_assert(offsetof(SnapshotFieldDescriptor, format) == 12);
 namespace morwick {
 namespace {
 
-constexpr uint32_t kNumberSize = sizeof(uint32_t);
-constexpr uint32_t kTripleSize = sizeof(SnapshotOperations);
-static_assert(kFormatRoom == sizeof SnapshotFieldDescriptor::format);
-
-// One field of the records, as its descriptor gives it.
-struct Field {
-  enum Kind : uint8_t { kNumber, kThousandths, kPriorities, kNothing };
-
-  Kind kind;
-  uint64_t offset;
-  uint32_t priorities;  // kPriorities only
-  PrintFormat format;
-};
-
-// What its format may ask for.
-Arguments ArgumentsOf(Field::Kind kind) {
-  if (kind == Field::kThousandths) return Arguments::kTwoNumbers;
-  if (kind == Field::kPriorities) return Arguments::kOneText;
-  return Arguments::kOneNumber;
-}
-
-// The field of a descriptor. Of kind kNothing when there is nothing to print, or when what it asks
-// for is not there.
-Field ReadField(const uint8_t *descriptor, uint32_t recordSize) {
-  constexpr Field::Kind kKinds[] = {Field::kNumber, Field::kNumber, Field::kThousandths,
-                                    Field::kPriorities};
-  Field field;
-  const uint32_t kind = LoadLittleEndian16(descriptor);
-  field.kind = kind < std::size(kKinds) ? kKinds[kind] : Field::kNothing;
-  field.offset = LoadLittleEndian32(descriptor + offsetof(SnapshotFieldDescriptor, fieldOffset));
-  field.priorities =
-      LoadLittleEndian32(descriptor + offsetof(SnapshotFieldDescriptor, fieldSize)) / kTripleSize;
-  // Labels alone: nothing is read, wherever the offset points.
-  if (field.kind == Field::kPriorities && field.priorities == 0) field.offset = 0;
-
-  const uint64_t size =
-      field.kind == Field::kPriorities ? uint64_t{field.priorities} * kTripleSize : kNumberSize;
-  const auto *text =
-      reinterpret_cast<const char *>(descriptor) + offsetof(SnapshotFieldDescriptor, format);
-  const std::string_view format(text, strnlen(text, kFormatRoom));
-  std::optional<PrintFormat> read;
-  if (field.offset + size <= recordSize && format.size() < kFormatRoom) {
-    read = ReadPrintFormat(format, ArgumentsOf(field.kind));
-  }
-  if (read) {
-    field.format = *read;
-  } else {
-    field.kind = Field::kNothing;
-  }
-  return field;
-}
-
 // The header's own numbers.
 struct HeaderNumbers {
   uint32_t formatVersion;
   uint32_t recordSize;
   uint32_t recordCount;
-  uint32_t descriptorTableOffset;
 
   explicit HeaderNumbers(const uint8_t *header)
       : formatVersion(LoadLittleEndian32(header + offsetof(SnapshotHeader, formatVersion))),
         recordSize(LoadLittleEndian32(header + offsetof(SnapshotHeader, recordSize))),
-        recordCount(LoadLittleEndian32(header + offsetof(SnapshotHeader, recordCount))),
-        descriptorTableOffset(
-            LoadLittleEndian32(header + offsetof(SnapshotHeader, descriptorTableOffset))) {}
+        recordCount(LoadLittleEndian32(header + offsetof(SnapshotHeader, recordCount))) {}
 
   // The index of the record that ends the rendering, the header's last or the first one that does
   // not lie in the snapshot whole. It is not printed itself.
@@ -105,41 +49,6 @@ bool AppendBanner(BoundedWriter &writer, const HeaderNumbers &numbers, const cha
          writer.Append("\n");
 }
 
-// The header's descriptor table.
-class DescriptorTable {
- public:
-  DescriptorTable(const uint8_t *table, uint32_t recordSize)
-      : descriptors_(table + sizeof(SnapshotDescriptorTable)),
-        count_(LoadLittleEndian32(table)),
-        recordSize_(recordSize) {}
-
-  uint32_t count() const { return count_; }
-  Field Read(uint32_t index) const { return ReadField(Descriptor(index), recordSize_); }
-
-  // Whether the field that tells an empty record lies in the records at all.
-  bool TellsEmptyRecords() const {
-    return count_ > 0 && EmptyOffset() + kNumberSize <= recordSize_;
-  }
-
-  bool IsEmpty(const uint8_t *record) const {
-    return LoadLittleEndian32(record + EmptyOffset()) == 0;
-  }
-
- private:
-  const uint8_t *Descriptor(uint32_t index) const {
-    return descriptors_ + sizeof(SnapshotFieldDescriptor) * size_t{index};
-  }
-
-  // A record is empty when its first described field is 0, whatever the kind of that field.
-  uint64_t EmptyOffset() const {
-    return LoadLittleEndian32(Descriptor(0) + offsetof(SnapshotFieldDescriptor, fieldOffset));
-  }
-
-  const uint8_t *descriptors_;
-  uint32_t count_;
-  uint32_t recordSize_;
-};
-
 // The first fields of a line, which are read once a call instead of once a record: half the time.
 class ReadyFields {
  public:
@@ -157,12 +66,13 @@ class ReadyFields {
 };
 
 // One value of each priority's triple, after its label.
-bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *label,
-                      const uint8_t *values, uint32_t width) {
-  if (!PrintText(writer, field.format, label)) return false;
-  for (uint32_t k = 0; k < field.priorities; ++k, values += kTripleSize) {
+bool AppendPriorities(BoundedWriter &writer, const Field &field, const uint8_t *triples,
+                      const TriplePart &part) {
+  if (!PrintText(writer, field.format, part.letter)) return false;
+  for (uint32_t k = 0; k < field.priorities; ++k, triples += kTripleSize) {
     if (k > 0 && !writer.Append("/")) return false;
-    if (!PrintPadded(writer, LoadLittleEndian32(values), width, ' ')) return false;
+    const uint32_t value = LoadLittleEndian32(triples + part.offset);
+    if (!PrintPadded(writer, value, part.width, ' ')) return false;
   }
   return true;
 }
@@ -183,11 +93,9 @@ bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *lab
       return PrintNumbers(writer, field.format, numbers);
     }
     case Field::kPriorities:
-      return AppendPriorities(writer, field, "O", value, 4) &&
-             AppendPriorities(writer, field, "L",
-                              value + offsetof(SnapshotOperations, totalLatency), 7) &&
-             AppendPriorities(writer, field, "M", value + offsetof(SnapshotOperations, maxLatency),
-                              5);
+      return AppendPriorities(writer, field, value, kTripleParts[0]) &&
+             AppendPriorities(writer, field, value, kTripleParts[1]) &&
+             AppendPriorities(writer, field, value, kTripleParts[2]);
     case Field::kNothing: break;
   }
   return true;
@@ -222,7 +130,7 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   if (*state >= last) return {0, true};
 
   // Only now: where no record is left the header needs no descriptor table.
-  const DescriptorTable table(header + numbers.descriptorTableOffset, numbers.recordSize);
+  const DescriptorTable table(header);
   // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
   if (!table.TellsEmptyRecords()) *state = last;
   const auto recordAt = [&](uint32_t index) {

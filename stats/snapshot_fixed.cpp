@@ -1,86 +1,17 @@
 // Snapshots of the fixed record layout as text.
 
 #include <cstddef>
-#include <iterator>
 #include <utility>
 
 #include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
 #include "stats/bounded_writer.h"
 #include "stats/decimal.h"
+#include "stats/snapshot_columns.h"
 #include "stats/snapshot_legend.h"
 
 namespace morwick {
 namespace {
-
-// What of a field is printed.
-enum class Part { kWhole, kThousands, kHundredths };
-
-struct Column {
-  char label[5];
-  uint16_t offset;
-  uint8_t width;
-  char pad = ' ';
-  Part part = Part::kWhole;
-};
-
-#define FIELD(name) offsetof(SnapshotRecord, name)
-
-// The line, in print order. The command has the order too, and a session holds the two together.
-constexpr Column kColumns[] = {
-    {"T=", FIELD(timestamp), 4, '0'},
-    {" E=", FIELD(erasedBands), 2, '0'},
-    {" HR=", FIELD(hostReads), 4},
-    {" HW=", FIELD(hostWrites), 4},
-    {" NR=", FIELD(nandReads), 4},
-    {" NW=", FIELD(nandWrites), 4},
-    {" TH=", FIELD(hysteresisTime), 8, ' ', Part::kThousands},
-    {".", FIELD(hysteresisTime), 2, '0', Part::kHundredths},
-    {" GC=", FIELD(collectedSectors), 4},
-    {" W=", FIELD(wearLevelBands), 2},
-    {" BI=", FIELD(intermediatePendingErase), 3},
-    {" BU=", FIELD(userPendingErase), 3},
-    {" V=", FIELD(freeNodes), 5},
-    {" BF=", FIELD(bufferFragments), 2},
-    {"/", FIELD(bufferHighWater), 2},
-    {" P=", FIELD(preemptPercent), 2},
-    {" H=", FIELD(qosDelaysNormal), 2},
-    {"/", FIELD(qosDelaysExtreme), 2},
-    {" X=", FIELD(expeditesSucceeded), 2},
-    {"/", FIELD(expeditesFailed), 2},
-    {" L=", FIELD(oldestCommandAge), 3},
-    {"/", FIELD(qosInterval), 3},
-    {" C=", FIELD(commandTagsMin), 2},
-    {"/", FIELD(commandTagsMax), 2},
-    {" S=", FIELD(freeSegments), 4},
-    {" U=", FIELD(hostUnmaps), 8},
-    {" RO=", FIELD(reads[0].count), 4},
-    {"/", FIELD(reads[1].count), 4},
-    {"/", FIELD(reads[2].count), 4},
-    {"/", FIELD(reads[3].count), 4},
-    {" RL=", FIELD(reads[0].totalLatency), 7},
-    {"/", FIELD(reads[1].totalLatency), 7},
-    {"/", FIELD(reads[2].totalLatency), 7},
-    {"/", FIELD(reads[3].totalLatency), 7},
-    {" RM=", FIELD(reads[0].maxLatency), 5},
-    {"/", FIELD(reads[1].maxLatency), 5},
-    {"/", FIELD(reads[2].maxLatency), 5},
-    {"/", FIELD(reads[3].maxLatency), 5},
-    {" WO=", FIELD(writes[0].count), 4},
-    {"/", FIELD(writes[1].count), 4},
-    {"/", FIELD(writes[2].count), 4},
-    {"/", FIELD(writes[3].count), 4},
-    {" WL=", FIELD(writes[0].totalLatency), 7},
-    {"/", FIELD(writes[1].totalLatency), 7},
-    {"/", FIELD(writes[2].totalLatency), 7},
-    {"/", FIELD(writes[3].totalLatency), 7},
-    {" WM=", FIELD(writes[0].maxLatency), 5},
-    {"/", FIELD(writes[1].maxLatency), 5},
-    {"/", FIELD(writes[2].maxLatency), 5},
-    {"/", FIELD(writes[3].maxLatency), 5},
-};
-
-#undef FIELD
 
 static_assert(sizeof(SnapshotRecord) == 252);
 static_assert(offsetof(SnapshotRecord, reads) == 56);
@@ -92,7 +23,7 @@ static_assert(offsetof(SnapshotRecord, commandTagsMax) == 216);
 
 constexpr size_t kLabelRoom = 4;    // copied whole: shorter than asking for its length
 constexpr size_t kNumberRoom = 10;  // digits of the largest number
-constexpr size_t kLineRoom = std::size(kColumns) * (kLabelRoom + kNumberRoom) + 1;
+constexpr size_t kLineRoom = kColumnCount * (kLabelRoom + kNumberRoom) + 1;
 
 constexpr uint32_t PartOf(uint32_t value, Part part) {
   switch (part) {
@@ -121,7 +52,7 @@ char *WriteColumns(char *end, const uint8_t *record, std::index_sequence<kIndice
 
 // Writes the record's line and returns its length.
 size_t WriteLine(char (&line)[kLineRoom + kPaddedRoom], const uint8_t *record) {
-  char *end = WriteColumns(line, record, std::make_index_sequence<std::size(kColumns)>());
+  char *end = WriteColumns(line, record, std::make_index_sequence<kColumnCount>());
   *end++ = '\n';
   return static_cast<size_t>(end - line);
 }

@@ -88,7 +88,7 @@ fi
 (cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
   bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md morwick/docs/morwick.schema.json \
   morwick/docs/archive.md morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/packaging/grafana/morwick.json \
-  morwick/examples/latency.gp) >/dev/null
+  morwick/examples/latency.gp morwick/examples/fleet.py morwick/examples/fleet.png) >/dev/null
 build_and_consume "$prefix" given
 
 # The program that the README shows, built as it says, and the loop that the header of snapshots shows,

@@ -28,6 +28,12 @@ void *calloc(size_t number, size_t size) { return Refuses() ? NULL : __libc_call
 
 void *realloc(void *block, size_t size) { return Refuses() ? NULL : __libc_realloc(block, size); }
 
+/* For a process that chooses itself: counts anew, and refuses that one. Returns the number so far. */
+unsigned long RefuseAllocation(unsigned long number) {
+  refused = number;
+  return atomic_exchange(&count, 0);
+}
+
 __attribute__((constructor)) static void Begin(void) {
   const char *number = getenv("REFUSE");
   refused = number == NULL ? 0 : strtoul(number, NULL, 10);

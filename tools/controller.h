@@ -1,46 +1,22 @@
-// Finds controllers, connects to them and reads their buffers.
+// Connects to controllers and reads their buffers, with complaints.
 #ifndef TOOLS_CONTROLLER_H
 #define TOOLS_CONTROLLER_H
 
 #include <optional>
-#include <span>
 #include <string>
-#include <string_view>
 
-#include "morwick/morwick.h"
+#include "fleet/controllers.h"
 
 namespace tools {
 
-// A buffer that can be read from a controller: its name for people, and the slot of a row that
-// gives the numbers of the request.
-struct BufferKind {
-  std::string_view name;
-  SelectorGetter NandExporter::*selectors;
-};
-
-// All kinds, in the order in which messages list them.
-std::span<const BufferKind> BufferKinds();
-
-// The kind with that name, or the kind that holds the stream with that name: kvr and ftl share one
-// buffer. Null for an unknown name.
-const BufferKind *FindBufferKind(std::string_view name);
-
-// A driver's result code, as messages show it.
-std::string Hexadecimal(int32_t result);
-
-// The rows of the table that have a class.
-std::span<NandExporter> KnownControllers();
-
-// The row of the class, or null.
-NandExporter *FindRow(std::string_view className);
-
-// Whether a controller of a class is present, and whether it lets us connect.
-struct Presence {
-  bool present = false;
-  bool opened = false;  // the connection is closed again
-  int32_t result = 0;   // the driver's, of opening
-};
-Presence Probe(const NandExporter &row);
+using fleet::BufferKind;
+using fleet::BufferKinds;
+using fleet::FindBufferKind;
+using fleet::FindRow;
+using fleet::Hexadecimal;
+using fleet::KnownControllers;
+using fleet::Presence;
+using fleet::Probe;
 
 // A connection to a controller's driver. The destructor closes it.
 class Controller {

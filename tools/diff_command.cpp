@@ -70,7 +70,7 @@ Status Diff(const Options &options) {
   Output output;
   if (options.format == Format::kJson) {
     Json json(output, "diff", {{"old", options.oldFile}, {"new", options.newFile}});
-    json.Member("stream", NameOf(options.stream));
+    json.Member("stream", fleet::NameOf(options.stream));
     PrintChanges(json, changes.value_or(std::vector<Change>()), seconds);
     status = json.Finish(status);
   } else if (changes && options.format == Format::kCsv) {

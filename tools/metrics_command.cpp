@@ -101,7 +101,7 @@ Reading Read(const Options &options, MorwickStream stream, ReadDump readDump) {
       reading.good = statistics.Check(dump) == kGood;
     }
   } catch (const std::bad_alloc &) {
-    Complain(std::string(NameOf(stream)), "out of memory");
+    Complain(std::string(fleet::NameOf(stream)), "out of memory");
   }
   reading.seconds = std::chrono::duration<double>(steady_clock::now() - start).count();
   return reading;
@@ -165,7 +165,7 @@ class Exposition {
 };
 
 Label StreamLabel(const Reading &reading) {
-  return {"stream", std::string(NameOf(reading.stream))};
+  return {"stream", std::string(fleet::NameOf(reading.stream))};
 }
 
 std::string Compose(const Options &options, const std::string &className,
@@ -237,7 +237,7 @@ Label SplitLabel(const std::string &text) {
 
 File SplitFile(const std::string &text) {
   const size_t split = text.find('=');
-  const std::optional<MorwickStream> stream = StreamNamed(text.substr(0, split));
+  const std::optional<MorwickStream> stream = fleet::StreamNamed(text.substr(0, split));
   if (split == std::string::npos || !stream) {
     throw CLI::ValidationError("STREAM=FILE", text + " does not begin with kvr=, ftl= or msp=");
   }

@@ -42,8 +42,8 @@ void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &cho
 
 void AddStream(CLI::App *command, MorwickStream *stream) {
   std::vector<std::string> names;
-  for (const MorwickStream each : kStreams) names.emplace_back(NameOf(each));
-  const auto take = [=](const std::string &name) { *stream = *StreamNamed(name); };
+  for (const MorwickStream each : fleet::kStreams) names.emplace_back(fleet::NameOf(each));
+  const auto take = [=](const std::string &name) { *stream = *fleet::StreamNamed(name); };
   command->add_option_function<std::string>("-s,--stream", take, "Which statistics")
       ->check(CLI::IsMember(names))
       ->required();

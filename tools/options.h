@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "fleet/columns.h"
-#include "tools/streams.h"
+#include "fleet/streams.h"
 
 namespace tools {
 

@@ -6,12 +6,12 @@
 #include <memory>
 #include <new>
 
+#include "fleet/snapshot_header.h"
 #include "tools/commands.h"
 #include "tools/controller.h"
 #include "tools/input.h"
 #include "tools/options.h"
 #include "tools/snapshot_columns.h"
-#include "tools/snapshot_header.h"
 #include "tools/snapshot_records.h"
 #include "tools/snapshot_summary.h"
 #include "tools/snapshot_text.h"
@@ -79,9 +79,9 @@ Snapshot Prepare(const Options &options) {
     snapshot.header = std::move(header.bytes);
   }
   if (snapshot.status != kGood || !snapshot.header) return snapshot;
-  std::string wrong = CheckSnapshotHeader(*snapshot.header);
+  std::string wrong = fleet::CheckSnapshotHeader(*snapshot.header);
   if (wrong.empty() && (options.format != Format::kNormal || options.summary)) {
-    const uint32_t recordSize = LoadSnapshotHeader(*snapshot.header).recordSize;
+    const uint32_t recordSize = fleet::LoadSnapshotHeader(*snapshot.header).recordSize;
     if (recordSize != sizeof(SnapshotRecord)) {
       wrong = "record size " + std::to_string(recordSize) + " is not that of the fixed layout, " +
               std::to_string(sizeof(SnapshotRecord));
@@ -180,7 +180,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   size_t recordSize = sizeof(SnapshotRecord);
   uint64_t promised = UINT64_MAX;
   if (snapshot.header) {
-    const SnapshotHeader numbers = LoadSnapshotHeader(*snapshot.header);
+    const SnapshotHeader numbers = fleet::LoadSnapshotHeader(*snapshot.header);
     recordSize = numbers.recordSize;
     promised = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
   }

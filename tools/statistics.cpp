@@ -8,13 +8,13 @@
 #include <cerrno>
 #include <charconv>
 #include <cstddef>
+#include <unordered_set>
 #include <utility>
 
 #include "fleet/dump.h"
 #include "fleet/judge.h"
 #include "tools/input.h"
 #include "tools/memory.h"
-#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -28,11 +28,6 @@ bool IsElement(std::string_view name, std::string_view base, size_t number) {
   const char *end = std::to_chars(digits, std::end(digits), number).ptr;
   return name.starts_with(base) &&
          name.substr(base.size()) == std::string_view(digits, static_cast<size_t>(end - digits));
-}
-
-const uint64_t *Find(const std::vector<Figure> &figures, std::string_view name) {
-  const auto found = std::ranges::find(figures, name, &Figure::name);
-  return found == figures.end() ? nullptr : found->values.data();
 }
 
 }  // namespace
@@ -56,17 +51,17 @@ Dump ReadDumpFile(const std::string &file, MorwickStream stream, const std::stri
 Dump ReadDump(Controller &controller, MorwickStream stream) {
   Dump dump;
   dump.source = {"controller", controller.name()};
-  dump.subject = controller.name() + ": " + std::string(NameOf(stream));
+  dump.subject = controller.name() + ": " + std::string(fleet::NameOf(stream));
   dump.row = controller.row();
   dump.status = kBadData;
   if (!controller.connected()) return dump;
-  dump.bytes = controller.Read(*FindBufferKind(NameOf(stream)));
+  dump.bytes = controller.Read(*FindBufferKind(fleet::NameOf(stream)));
   if (dump.bytes) dump.status = kGood;
   return dump;
 }
 
 Dump ReadDumpLive(MorwickStream stream, const std::string &className) {
-  Controller controller(className, std::string(NameOf(stream)));
+  Controller controller(className, std::string(fleet::NameOf(stream)));
   return ReadDump(controller, stream);
 }
 
@@ -135,32 +130,13 @@ std::optional<EntryGroup> EntryGroups::Take() {
   return group;
 }
 
-std::vector<Figure> SummaryOf(const Statistics &statistics) {
-  std::vector<Figure> figures;
-  for (uint32_t i = 0; i < MorwickSummaryFieldCount(); ++i) {
-    const MorwickSummaryField &field = *MorwickSummaryFieldAt(i);
-    figures.push_back({field.name, {}});
-    for (uint32_t k = 0; k < field.valueCount; ++k) {
-      figures.back().values.push_back(MorwickSummaryValue(&statistics.summary(), &field, k));
-    }
-  }
+std::vector<fleet::Figure> SummaryOf(const Statistics &statistics) {
   // A field is also 0 when the dump lacks it, so look for its entry.
-  std::vector<bool> present(figures.size());
+  std::unordered_set<std::string_view> names;
   EntryGroups groups(statistics);
-  while (const auto group = groups.Take()) {
-    const auto figure = std::ranges::find(figures, group->base, &Figure::name);
-    if (figure != figures.end()) present[static_cast<size_t>(figure - figures.begin())] = true;
-  }
-  size_t index = 0;
-  std::erase_if(figures, [&](const Figure &) { return !present[index++]; });
-  // How many sectors were written to NAND for each sector that the host wrote.
-  const uint64_t *host = Find(figures, "hostWrites");
-  const uint64_t *nand = Find(figures, "nandWrites");
-  if (host != nullptr && nand != nullptr && *host > 0) {
-    const double ratio = static_cast<double>(*nand) / static_cast<double>(*host);
-    figures.push_back({"writeAmplification", {}, ThreeDecimals(ratio)});
-  }
-  return figures;
+  while (const auto group = groups.Take()) names.insert(group->base);
+  return fleet::Summarise(statistics.summary(),
+                          [&](std::string_view name) { return names.contains(name); });
 }
 
 }  // namespace tools

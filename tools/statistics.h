@@ -8,6 +8,7 @@
 #include <string_view>
 #include <vector>
 
+#include "fleet/summary.h"
 #include "morwick/morwick.h"
 #include "tools/controller.h"
 #include "tools/json.h"
@@ -153,15 +154,8 @@ class EntryGroups {
   EntryIterator next_;
 };
 
-// One of the main figures: its name, and either its values or a fraction.
-struct Figure {
-  std::string_view name;
-  std::vector<uint64_t> values;
-  std::string fraction = "";  // instead of values
-};
-
 // The summary fields that the dump has, in the order of KVRStatsCxt, then the write amplification.
-std::vector<Figure> SummaryOf(const Statistics &statistics);
+std::vector<fleet::Figure> SummaryOf(const Statistics &statistics);
 
 }  // namespace tools
 

@@ -9,6 +9,7 @@
 #include "tools/input.h"
 #include "tools/options.h"
 #include "tools/statistics.h"
+#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -82,15 +83,15 @@ void PrintEntries(Output &output, const Statistics &statistics) {
 }
 
 void PrintSummary(Output &output, const Statistics &statistics) {
-  const std::vector<Figure> figures = SummaryOf(statistics);
+  const std::vector<fleet::Figure> figures = SummaryOf(statistics);
   Labels labels(output);
-  for (const Figure &figure : figures) labels.Measure(figure.name.size());
-  for (const Figure &figure : figures) {
+  for (const fleet::Figure &figure : figures) labels.Measure(figure.name.size());
+  for (const fleet::Figure &figure : figures) {
     labels.Print(figure.name);
     for (size_t i = 0; i < figure.values.size(); ++i) {
       output.Write(fmt::format("{}{}", i > 0 ? " " : "", figure.values[i]));
     }
-    output.Write(figure.fraction + "\n");
+    output.Write((figure.ratio ? ThreeDecimals(*figure.ratio) : "") + "\n");
   }
 }
 
@@ -107,10 +108,10 @@ void PrintCsv(Output &output, const Statistics &statistics) {
 void PrintJsonSummary(Json &json, const Statistics &statistics) {
   json.Key("summary");
   json.BeginObject();
-  for (const Figure &figure : SummaryOf(statistics)) {
-    if (figure.values.empty()) {
+  for (const fleet::Figure &figure : SummaryOf(statistics)) {
+    if (figure.ratio) {
       json.Key(figure.name);
-      json.Digits(figure.fraction);
+      json.Digits(ThreeDecimals(*figure.ratio));
       continue;
     }
     json.Numbers(figure.name, figure.values.size() > 1, [&](auto print) {
@@ -138,7 +139,7 @@ void PrintJsonEntries(Json &json, const Statistics &statistics) {
 Status PrintJson(Output &output, const Options &options, const Dump &dump,
                  const Statistics *statistics) {
   Json json(output, "stats", {dump.source});
-  json.Member("stream", NameOf(options.stream));
+  json.Member("stream", fleet::NameOf(options.stream));
   Status status = dump.status;
   if (statistics != nullptr) {
     json.Member("result", statistics->result());

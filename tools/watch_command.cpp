@@ -46,7 +46,7 @@ struct Reading {
       dump = ReadDumpLive(options.stream, options.className);
       if (dump.bytes) statistics.emplace(dump, options.stream, options.filter);
     } catch (const std::bad_alloc &) {
-      Complain(std::string(NameOf(options.stream)), "out of memory");
+      Complain(std::string(fleet::NameOf(options.stream)), "out of memory");
       dump.status = kBadData;
     }
   }
@@ -143,7 +143,7 @@ class Watcher {
   Status PrintJson(const Reading &now, const std::vector<Change> &changes,
                    std::optional<double> seconds, Status status) {
     Json json(output_, "watch", {now.dump.source});
-    json.Member("stream", NameOf(options_.stream));
+    json.Member("stream", fleet::NameOf(options_.stream));
     json.Key("time");
     json.Digits(Seconds(now.time));
     tools::PrintChanges(json, changes, seconds);

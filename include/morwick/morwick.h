@@ -15,6 +15,7 @@
 #include "morwick/platform.h"
 #include "morwick/records.h"
 #include "morwick/snapshot.h"
+#include "morwick/snapshot_fields.h"
 #include "morwick/snapshot_header.h"
 #include "morwick/summary.h"
 

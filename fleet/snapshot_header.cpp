@@ -1,6 +1,6 @@
 // Reads and checks snapshot headers.
 
-#include "tools/snapshot_header.h"
+#include "fleet/snapshot_header.h"
 
 #include <array>
 #include <cstddef>
@@ -8,7 +8,7 @@
 #include "morwick/little_endian.h"
 #include "morwick/snapshot_header.h"
 
-namespace tools {
+namespace fleet {
 namespace {
 
 constexpr uint32_t kLargestRecord = 1 << 20;
@@ -36,4 +36,4 @@ SnapshotHeader LoadSnapshotHeader(std::string_view file) {
   return header;
 }
 
-}  // namespace tools
+}  // namespace fleet

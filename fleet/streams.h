@@ -1,6 +1,6 @@
 // The streams of statistics, by the names that people use for them.
-#ifndef TOOLS_STREAMS_H
-#define TOOLS_STREAMS_H
+#ifndef FLEET_STREAMS_H
+#define FLEET_STREAMS_H
 
 #include <optional>
 #include <string>
@@ -8,7 +8,7 @@
 
 #include "morwick/records.h"
 
-namespace tools {
+namespace fleet {
 
 inline constexpr MorwickStream kStreams[] = {kMorwickKVR, kMorwickFTL, kMorwickMSP};
 
@@ -29,6 +29,6 @@ constexpr std::optional<MorwickStream> StreamNamed(std::string_view name) {
   return std::nullopt;
 }
 
-}  // namespace tools
+}  // namespace fleet
 
 #endif

@@ -1,0 +1,120 @@
+// Controllers and connections to them.
+
+#include "python/controller.h"
+
+#include <cerrno>
+#include <new>
+#include <optional>
+#include <utility>
+
+namespace python {
+namespace {
+
+// The package's own exception, with the driver's result if there is one.
+[[noreturn]] void Fail(const std::string &message, std::optional<int32_t> result) {
+  const py::object type = py::module_::import("morwick").attr("ControllerError");
+  py::object code = py::none();
+  if (result) code = py::int_(static_cast<uint32_t>(*result));
+  PyErr_SetObject(type.ptr(), type(message, code).ptr());
+  throw py::error_already_set();
+}
+
+py::list Offered(const NandExporter &row) {
+  py::list offered;
+  for (const fleet::BufferKind &kind : fleet::BufferKinds()) {
+    if (row.*kind.selectors != nullptr) offered.append(AsText(kind.name));
+  }
+  return offered;
+}
+
+const fleet::BufferKind &KindOf(py::handle kindName) {
+  const std::string name = AsString(kindName, "what");
+  const fleet::BufferKind *kind = fleet::FindBufferKind(name);
+  if (kind != nullptr) return *kind;
+  std::string known = "kvr, ftl";
+  for (const fleet::BufferKind &each : fleet::BufferKinds()) {
+    known += ", " + std::string(each.name);
+  }
+  throw py::value_error("what must be one of " + known + ", not '" + name + "'");
+}
+
+}  // namespace
+
+// From finding a service to storing the connection nothing may throw: the handle would leak.
+Connection::Connection(py::handle className) {
+  const std::string name = className.is_none() ? "" : AsString(className, "name");
+  if (!className.is_none() && fleet::FindRow(name) == nullptr) {
+    throw py::value_error("name: there is no controller class '" + name + "'");
+  }
+  int32_t result = 0;
+  bool outOfMemory = false;
+  {
+    const py::gil_scoped_release release;
+    for (const NandExporter &row : fleet::KnownControllers()) {
+      if (!className.is_none() && name != row.className) continue;
+      errno = 0;
+      const uint32_t service = MorwickFindService(&row);
+      outOfMemory = service == 0 && errno == ENOMEM;
+      if (service == 0) continue;
+      row_ = &row;
+      result = fleet::Open(service, &connection_);
+      break;
+    }
+  }
+  if (outOfMemory) throw std::bad_alloc();
+  if (row_ == nullptr) {
+    Fail(name.empty() ? "no controller is present" : name + ": the controller is not present", {});
+  }
+  if (connection_ == 0) {
+    Fail(std::string(row_->className) + ": the connection was refused, result " +
+             fleet::Hexadecimal(result),
+         result);
+  }
+}
+
+bool Connection::Offers(py::handle kind) const { return row_->*KindOf(kind).selectors != nullptr; }
+
+py::bytes Connection::Read(py::handle kind) {
+  const fleet::BufferKind &known = KindOf(kind);
+  std::optional<fleet::Reply> reply;
+  {
+    const py::gil_scoped_release release;
+    const std::lock_guard lock(mutex_);
+    if (connection_ != 0) reply = fleet::ReadBuffer(connection_, *row_, known);
+  }
+  if (!reply) throw py::value_error("the controller is closed");
+  if (reply->bytes) return *reply->bytes;
+  Fail(name() + ": " + std::string(known.name) + ": " + reply->fault, reply->result);
+}
+
+int32_t Connection::CloseHandle() {
+  const std::lock_guard lock(mutex_);
+  const uint32_t connection = std::exchange(connection_, 0);
+  return connection == 0 ? 0 : CloseService(connection);
+}
+
+void Connection::Close() {
+  int32_t result = 0;
+  {
+    const py::gil_scoped_release release;
+    result = CloseHandle();
+  }
+  if (result == 0) return;
+  Fail(name() + ": closing the connection failed, result " + fleet::Hexadecimal(result), result);
+}
+
+py::list Controllers() {
+  py::list all;
+  for (const NandExporter &row : fleet::KnownControllers()) {
+    fleet::Presence presence;
+    {
+      const py::gil_scoped_release release;
+      presence = fleet::Probe(row);
+    }
+    all.append(py::make_tuple(row.className, presence.present, presence.opened,
+                              static_cast<uint32_t>(presence.result), py::tuple(Offered(row))));
+  }
+  return all;
+}
+
+}  // namespace python

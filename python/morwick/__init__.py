@@ -1,0 +1,394 @@
+"""Statistics and snapshots of storage controllers, as values of Python and NumPy.
+
+A dump is what a controller answers when it is asked for its statistics: the bytes that
+`morwick read kvr -w FILE` saves, or that Controller.read gives. It is of one of three
+streams, "kvr", "ftl" or "msp", which keys() lists.
+
+    >>> import morwick
+    >>> s = morwick.parse(open("kvr.bin", "rb").read())
+    >>> s["hostWrites"]
+    123456789
+    >>> s["readCountHisto"]
+    array([900,  80,   7,   1,   0], dtype=uint64)
+    >>> s.fault is None
+    True
+
+A snapshot is a time series, one record for each interval:
+
+    >>> records = morwick.snapshot(open("snapshot.bin", "rb").read())
+    >>> records["reads"]["maxLatency"].max()
+    4200
+
+Many dumps are one table:
+
+    >>> t = morwick.table("fleet/", names=["hostWrites", "nandWrites"])
+    >>> t["nandWrites"] / t["hostWrites"]
+
+And what is in this machine answers for itself:
+
+    >>> with morwick.Controller() as c:
+    ...     c.statistics("kvr")["powerOnHours"]
+
+Dumps, snapshots and headers come from devices and files, and are not trusted: whatever is
+in them, nothing beyond their bytes is read. All functions may be called from several
+threads at once.
+
+__version__ is the library's version, `platform` the platform that it was built for.
+"""
+
+from __future__ import annotations
+
+import operator
+import os
+import sys
+from collections.abc import Callable, ItemsView, Iterable, Iterator, KeysView, Mapping, ValuesView
+from types import TracebackType
+from typing import Any, NamedTuple, Union
+
+import numpy as np
+import numpy.typing as npt
+
+from . import _native
+
+__all__ = [
+    "Controller", "ControllerClass", "ControllerError", "Key", "Statistics", "Table",
+    "controllers", "keys", "parse", "platform", "render", "snapshot", "table",
+]  # fmt: skip
+
+__version__: str = _native.version
+platform: str = _native.platform
+
+Path = Union[str, bytes, "os.PathLike[str]", "os.PathLike[bytes]"]
+
+
+class Key(NamedTuple):
+    """A statistic that the library knows."""
+
+    id: int
+    """Its number in the dump."""
+    name: str
+    size: int
+    """How many values it has: 1, or more for an array."""
+
+
+def keys(stream: str) -> list[Key]:
+    """All statistics of a stream ("kvr", "ftl" or "msp"), in the order of their ids.
+
+    ValueError: there is no such stream.
+    """
+    return [Key(*key) for key in _native.keys(stream)]
+
+
+class Statistics(Mapping[str, Any]):
+    """The statistics in a dump, by name, in the dump's order.
+
+    A value is an int, from 0 to 2**64 - 1, or for an array a new NumPy array of uint64, of
+    shape (n,). Where a name occurs more than once the last record counts. What a dump lacks
+    raises KeyError, which is not the same as 0. Values are made when they are asked for; the
+    bytes stay as they were when the dump was parsed.
+    """
+
+    __slots__ = ("_dump", "_stream", "_values")
+
+    # Values are arrays too, which have no one truth to compare by.
+    __eq__ = object.__eq__
+    __hash__ = object.__hash__
+
+    def __init__(self, data: Any, stream: str = "kvr") -> None:
+        self._dump = _native.Dump(data, stream)
+        self._stream = stream
+        self._values: dict[str, Any] | None = None
+
+    def _all(self) -> dict[str, Any]:
+        if self._values is None:
+            self._values = self._dump.values()
+        return self._values
+
+    def __getitem__(self, name: str) -> Any:
+        return self._dump.value(name)
+
+    def __contains__(self, name: object) -> bool:
+        return self._dump.has(name)
+
+    def __iter__(self) -> Iterator[str]:
+        return iter(self._all())
+
+    def __len__(self) -> int:
+        return self._dump.size
+
+    def keys(self) -> KeysView[str]:
+        return self._all().keys()
+
+    def values(self) -> ValuesView[Any]:
+        return self._all().values()
+
+    def items(self) -> ItemsView[str, Any]:
+        return self._all().items()
+
+    @property
+    def entries(self) -> list[tuple[str, int]]:
+        """All values with their names, repeated ones included, as `morwick stats -o csv` lists
+        them. The elements of an array have a name each, such as readCountHisto0."""
+        return self._dump.entries()
+
+    @property
+    def summary(self) -> dict[str, Any]:
+        """The main figures of a kvr dump: those of its fields that have a place of their own in
+        the library, and writeAmplification, a float: sectors written to NAND for each one that
+        the host wrote. Empty for the other streams."""
+        return self._dump.summary()
+
+    @property
+    def fault(self) -> str | None:
+        """What is wrong with the dump, and where its statistics end; None for a good dump. The
+        words are those of `morwick stats`."""
+        return self._dump.fault
+
+    @property
+    def end(self) -> int:
+        """The offset in bytes at which the statistics end: the dump's size, or the place of the
+        end record or of a fault."""
+        return self._dump.end
+
+    def __repr__(self) -> str:
+        return f"<morwick.Statistics of {self._stream}: {len(self)} names, fault: {self.fault}>"
+
+    def __reduce__(self) -> tuple[Any, ...]:
+        return Statistics, (self._dump.data, self._stream)
+
+
+def parse(data: Any, stream: str = "kvr") -> Statistics:
+    """The statistics in a dump.
+
+    `data` is any object with a buffer, such as bytes, bytearray, memoryview, mmap or an array;
+    it may be changed afterwards. Bad data is no exception: what could be read is there, and
+    `fault` tells the rest.
+
+    TypeError: `data` has no buffer. ValueError: there is no such stream, or `data` has 4 GiB or
+    more.
+    """
+    return Statistics(data, stream)
+
+
+def snapshot(data: Any, header: Any = None) -> npt.NDArray[np.void]:
+    """The records of a snapshot as a NumPy structured array of shape (n,), over the buffer
+    itself: nothing is copied, and the array keeps the buffer from being closed or resized.
+
+    All numbers are little-endian uint32, as they are stored. Without a header the records are
+    of the fixed layout, of 252 bytes, with the names of SnapshotRecord in morwick/snapshot.h;
+    `reads` and `writes` have shape (n, 4), by priority, with the fields count, totalLatency and
+    maxLatency (microseconds). Bytes after the last whole record are left out.
+
+    With a header, which `morwick read snapshot_header` saves, the fields are those that it
+    describes, each under its label, such as "TH" for the format " TH=%8u.%02u". Numbers that
+    are printed with a fraction are in thousandths. Numbers by priority are one field under the
+    label of their counts, such as "RO", of shape (n, priorities), with the same three fields.
+    As in the text, the last record that the header promises is left out. Records that were
+    not filled, whose first field is 0, have no line in the text, and are there.
+
+    TypeError: an argument has no buffer. BufferError: `data` is not contiguous. ValueError:
+    the header is not whole, and says what is wrong.
+    """
+    return _native.snapshot(data, header)
+
+
+def render(data: Any, header: Any = None) -> str:
+    """The text of a snapshot: in the fixed layout, or the one that the header describes.
+
+    A line whose text is longer than 8 MiB, which a hostile header can ask for, is left out.
+    Bytes of a header's text that are not UTF-8 are kept by surrogateescape. Errors are those of
+    snapshot().
+    """
+    return _native.render(data, header)
+
+
+class Table(Mapping[str, "np.ma.MaskedArray[Any, np.dtype[np.uint64]]"]):
+    """Many dumps: a row each, and a column for each statistic.
+
+    table[name] is a NumPy masked array of uint64, in which the values are masked that a dump
+    lacks. `files` are the names of the files, `faults` what is wrong with each, None for a good
+    dump. Leave rows with a fault out before you rank: a cut dump has less, not better, figures.
+    """
+
+    __eq__ = object.__eq__
+    __hash__ = object.__hash__
+
+    def __init__(self, files: list[str], faults: list[str | None], names: list[str],
+                 values: npt.NDArray[np.uint64], missing: npt.NDArray[np.bool_]) -> None:  # fmt: skip
+        self.files = files
+        self.faults = faults
+        self._columns = {name: column for column, name in enumerate(names)}
+        self._values = values
+        self._missing = missing
+
+    def __getitem__(self, name: str) -> np.ma.MaskedArray[Any, np.dtype[np.uint64]]:
+        column = self._columns[name]
+        return np.ma.MaskedArray(self._values[column], self._missing[column])  # type: ignore[no-untyped-call]
+
+    def __iter__(self) -> Iterator[str]:
+        return iter(self._columns)
+
+    def __len__(self) -> int:
+        return len(self._columns)
+
+    def __repr__(self) -> str:
+        return f"<morwick.Table of {len(self.files)} files: {len(self)} columns>"
+
+    def to_pandas(self) -> Any:
+        """The table as a pandas.DataFrame with the columns file, fault and those of the
+        statistics, in nullable UInt64. ImportError: pandas is not installed."""
+        import pandas  # type: ignore[import]
+
+        columns: dict[str, Any] = {"file": self.files, "fault": self.faults}
+        for name, column in self._columns.items():
+            columns[name] = pandas.arrays.IntegerArray(self._values[column], self._missing[column])
+        return pandas.DataFrame(columns)
+
+
+def table(files: Path | Iterable[Path], stream: str = "kvr", names: str | Iterable[str] | None = None,
+          jobs: int | None = None, progress: Callable[[int, int], object] | None = None) -> Table:  # fmt: skip
+    """Reads many dumps into one table, as `morwick table` does, in the order of the files.
+
+    `files` is a path or several; a folder stands for all files in it and below, and dumps may
+    be compressed by gzip. `names` are the statistics that are wanted: the name of an array
+    stands for all its elements, "host*" for all names that begin so; without it there is a
+    column for every value of every known key. `jobs` is the number of threads, as many as
+    there are cores without it. `progress` is called now and then, and at the end, with the
+    number of dumps that were read and how many of them have a fault; what it raises ends the
+    reading. So does Ctrl-C. Python's lock is released meanwhile.
+
+    A file that cannot be read is no exception: its row has a fault.
+
+    TypeError: an argument is of a wrong type. ValueError: there is no such stream, or no
+    statistic of such a name, or `jobs` is below 1.
+    """
+    if progress is not None and not callable(progress):
+        raise TypeError(f"progress must be callable, not {type(progress).__name__}")
+    return Table(*_native.table(_paths(files), stream, _names(names), _jobs(jobs), progress))
+
+
+def _items(argument: Any, name: str, what: str) -> Iterator[Any]:
+    try:
+        return iter(argument)
+    except TypeError:
+        raise TypeError(f"{name} must be {what}, not {type(argument).__name__}") from None
+
+
+def _paths(files: Path | Iterable[Path]) -> list[bytes]:
+    one = isinstance(files, (str, bytes, os.PathLike))
+    paths = []
+    for file in [files] if one else _items(files, "files", "a path or an iterable of paths"):
+        if not isinstance(file, (str, bytes, os.PathLike)):
+            raise TypeError(f"files must hold paths, not {type(file).__name__}")
+        paths.append(os.fsencode(file))
+        if b"\0" in paths[-1]:
+            raise ValueError("files: a path has a null byte in it")
+    return paths
+
+
+def _names(names: str | Iterable[str] | None) -> list[bytes]:
+    if names is None:
+        return []
+    listed = [names] if isinstance(names, str) else list(_items(names, "names", "an iterable of str"))
+    for name in listed:
+        if not isinstance(name, str):
+            raise TypeError(f"names must hold str, not {type(name).__name__}")
+    if not listed:
+        raise ValueError("names is empty; leave it out for all statistics")
+    return [name.encode("utf-8", "surrogateescape") for name in listed]
+
+
+def _jobs(jobs: int | None) -> int:
+    if jobs is None:
+        return 0
+    try:
+        number = operator.index(jobs)
+    except TypeError:
+        raise TypeError(f"jobs must be an int, not {type(jobs).__name__}") from None
+    if number < 1:
+        raise ValueError(f"jobs must be at least 1, not {number}")
+    return min(number, sys.maxsize)
+
+
+class ControllerError(Exception):
+    """A controller that is absent or has failed. `result` is the driver's result code, None
+    where the driver was not asked or did not fail."""
+
+    def __init__(self, message: str, result: int | None = None) -> None:
+        super().__init__(message, result)
+        self.result = result
+
+    def __str__(self) -> str:
+        return str(self.args[0])
+
+
+class ControllerClass(NamedTuple):
+    """A class of controllers that the library knows, and what there is of it in this machine."""
+
+    name: str
+    present: bool
+    opened: bool
+    """Whether a connection could be opened; it is closed again."""
+    result: int
+    """The driver's result code of opening it; 0 for success."""
+    offers: tuple[str, ...]
+    """What Controller.read can read."""
+
+
+def controllers() -> list[ControllerClass]:
+    """All known classes of controllers, in the order in which Controller() looks for them."""
+    return [ControllerClass(*each) for each in _native.controllers()]
+
+
+class Controller:
+    """A connection to a controller, to be used with `with`: it is closed at the end of the
+    block, whatever happens, and at the latest when the object goes.
+
+    `name` is a class of controllers(); without it the first one that is present is taken.
+
+    ControllerError: it is not present, or its driver refuses. ValueError: there is no such
+    class. A controller that is closed raises ValueError when it is read from.
+    """
+
+    def __init__(self, name: str | None = None) -> None:
+        self._connection = _native.Connection(name)
+
+    @property
+    def name(self) -> str:
+        """The class."""
+        return self._connection.name
+
+    def read(self, what: str) -> bytes:
+        """What the controller answers: "kvr", "ftl" (both are in "statistics"), "msp",
+        "snapshot", "snapshot_header", "band", "defects" or "telemetry".
+
+        Waits for the answer; Python's lock is released meanwhile. ControllerError: the driver
+        fails, or the class does not offer it. ValueError: there is nothing of that name.
+        """
+        return self._connection.read(what)
+
+    def statistics(self, stream: str = "kvr") -> Statistics:
+        """Reads and parses the statistics of a stream."""
+        _native.keys(stream)  # raises when there is none
+        return parse(self.read(stream), stream)
+
+    def snapshot(self) -> npt.NDArray[np.void]:
+        """Reads the snapshot, in the layout of the controller's own header if it offers one."""
+        header = self.read("snapshot_header") if self._connection.offers("snapshot_header") else None
+        return snapshot(self.read("snapshot"), header)
+
+    def close(self) -> None:
+        """Closes the connection; a second time does nothing. ControllerError: the driver says
+        that it failed; the connection is gone all the same."""
+        self._connection.close()
+
+    def __enter__(self) -> Controller:
+        return self
+
+    def __exit__(self, kind: type[BaseException] | None, error: BaseException | None,
+                 trace: TracebackType | None) -> None:  # fmt: skip
+        try:
+            self.close()
+        except ControllerError:
+            if error is None:
+                raise

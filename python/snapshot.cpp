@@ -1,0 +1,121 @@
+// Snapshots as NumPy records, and as the library's text.
+
+#include "python/snapshot.h"
+
+#include <pybind11/numpy.h>
+
+#include <algorithm>
+#include <string>
+
+#include "fleet/snapshot_header.h"
+#include "fleet/snapshot_text.h"
+#include "morwick/snapshot.h"
+#include "morwick/snapshot_fields.h"
+
+namespace python {
+namespace {
+
+constexpr uint32_t kMostFields = 1024;  // their names take time by their number squared
+
+// What a header says, or the fixed layout without one.
+struct Layout {
+  explicit Layout(py::handle object);
+
+  // The bytes of the records that there are.
+  std::string_view RecordsOf(std::string_view data) const {
+    return data.substr(0, std::min<uint64_t>(data.size() / recordSize, recordCount) * recordSize);
+  }
+
+  bool isFixed;
+  std::string header;
+  uint64_t recordSize = sizeof(SnapshotRecord);
+  uint64_t recordCount = UINT64_MAX;
+};
+
+Layout::Layout(py::handle object) : isFixed(object.is_none()) {
+  if (isFixed) return;
+  header = ViewOf(AsBytes(object, "header"));
+  const std::string wrong = fleet::CheckSnapshotHeader(header);
+  if (!wrong.empty()) throw py::value_error("header: " + wrong);
+  const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
+  recordSize = numbers.recordSize;
+  recordCount = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
+}
+
+py::object LittleEndian(const py::dtype &type) { return type.attr("newbyteorder")("<"); }
+
+// The numbers that the header describes. Those of the priorities of one field are a sub-array,
+// which goes by the label of the counts.
+py::object DescribedType(const Layout &layout) {
+  const py::object number = py::dtype("<u4");
+  const py::object operations = LittleEndian(py::dtype::of<SnapshotOperations>());
+  py::list names;
+  py::list types;
+  py::list offsets;
+  MorwickSnapshotField field;
+  for (uint32_t i = 0; MorwickSnapshotFieldAt(layout.header.data(), i, &field) != 0; ++i) {
+    if (i == kMostFields) {
+      throw py::value_error("header: describes more than " + std::to_string(kMostFields) +
+                            " fields");
+    }
+    if (field.kind == kMorwickFieldWithoutNumber) continue;
+    names.append(AsText(field.names[0].label));
+    offsets.append(field.offset);
+    if (field.kind == kMorwickFieldPriorities) {
+      types.append(py::make_tuple(operations, py::make_tuple(field.priorities)));
+    } else {
+      types.append(number);
+    }
+  }
+  return py::dtype(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
+}
+
+}  // namespace
+
+// The numbers that have a name.
+void RegisterRecords() {
+  PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
+  PYBIND11_NUMPY_DTYPE(SnapshotRecord, timestamp, preemptPercent, writes, reads, erasedBands,
+                       hostReads, hostWrites, nandReads, nandWrites, collectedSectors,
+                       wearLevelBands, intermediatePendingErase, userPendingErase, hysteresisTime,
+                       qosDelaysExtreme, qosDelaysNormal, freeSegments, oldestCommandAge,
+                       qosInterval, freeNodes, bufferFragments, bufferHighWater, expeditesSucceeded,
+                       expeditesFailed, hostUnmaps, commandTagsMin, commandTagsMax);
+}
+
+py::object Snapshot(const py::object &data, py::handle header) {
+  const Layout layout(header);
+  size_t count = 0;
+  {
+    const Buffer buffer(data, "data");
+    count = layout.RecordsOf(buffer.bytes()).size() / layout.recordSize;
+  }
+  const py::object type =
+      layout.isFixed ? LittleEndian(py::dtype::of<SnapshotRecord>()) : DescribedType(layout);
+  return py::module_::import("numpy").attr("frombuffer")(data, type, count);
+}
+
+py::str Render(py::handle data, py::handle header) {
+  const Layout layout(header);
+  const Buffer buffer(data, "data");
+  std::string text;
+  const fleet::TakeText take = [&](std::string_view more) {
+    text += more;
+    return true;
+  };
+  {
+    const py::gil_scoped_release release;
+    const std::string_view records = layout.RecordsOf(buffer.bytes());
+    if (layout.isFixed) {
+      fleet::FixedText fixed(take);
+      fixed.Begin();
+      fixed.Print(records);
+      fixed.End();
+    } else {
+      fleet::DescribedText(take, layout.header).Print(records, [](uint32_t) {});
+    }
+  }
+  return AsText(text);
+}
+
+}  // namespace python

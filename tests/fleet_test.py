@@ -1,0 +1,124 @@
+"""Holds what Dask makes of 2,000 dumps against `morwick table`: with a scheduler and two workers that are
+processes of their own, at a terminal, with a worker that is killed half-way, and without a cluster.
+Usage: fleet_test.py MORWICK SOURCE"""
+import bisect, contextlib, csv, io, os, pathlib, re, subprocess, sys, tempfile, textwrap, time
+from concurrent.futures import ThreadPoolExecutor
+
+morwick, source = sys.argv[1:]
+sys.path.append(source + "/examples")  # where no worker looks
+import fleet, pandas
+from dask.distributed import Client
+
+word = lambda key, value: bytes([key, 0, 0, 0, 1, 0, 0, 0]) + value.to_bytes(8, "little")
+spoilt = {  # each would stand out if a fault, or what is missing, were taken for a value
+    101: b"", 303: b"PK\3\4xxxxyyyyzzzz", 505: word(4, 1) + word(18, 900) + word(47, 900) + b"cut",
+    707: word(4, 0) + word(18, 900) + word(47, 0), 909: word(18, 900) + word(47, 0), 911: word(7, 5),
+    1111: word(4, 2**64 - 1) + word(18, 2**64 - 3) + word(47, 2**63 + 1)}
+
+
+def as_rows(table):
+    return [["" if pandas.isna(value) else str(value) for value in row] for row in table.itertuples(index=False)]
+
+
+def ten_of(rows):
+    """Those that stand out, by other means."""
+    drives = {os.path.dirname(row[0]): row for row in rows if not row[1]}.values()
+    figures = [(file, int(nand) / int(host) if nand and host.strip("0") else None, int(bad) if bad else None)
+               for file, _, host, nand, bad in drives]
+    columns = {i: sorted(row[i] for row in figures if row[i] is not None) for i in (1, 2)}
+    share = lambda all, value: (bisect.bisect_left(all, value) + bisect.bisect(all, value) + 1) / len(all)
+    return sorted(figures, reverse=True, key=lambda row: (
+        max([share(columns[i], row[i]) for i in (1, 2) if row[i] is not None], default=0)))[:10]
+
+
+def wait_for(condition):
+    for _ in range(600):
+        if found := condition():
+            return found
+        time.sleep(0.1)
+    raise TimeoutError
+
+
+def write_to(pipe, data):
+    try:
+        writer = os.open(pipe, os.O_WRONLY | os.O_NONBLOCK)
+    except OSError:  # nobody reads there yet
+        return False
+    with open(writer, "wb") as file:
+        return file.write(data)
+
+
+def start(*words):
+    words += "--host", "127.0.0.1", "--dashboard-address", "127.0.0.1:0", "--scheduler-file", "scheduler.json"
+    return subprocess.Popen([sys.executable, "-m", "dask", *words], cwd="cluster", stdout=log, stderr=log)
+
+
+with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, open(work + "/log", "w+") as log:
+    os.chdir(work)
+    os.mkdir("cluster")
+    subprocess.run([sys.executable, source + "/examples/make_fleet.py", "fleet"], check=True)
+    files = fleet.list_dumps(work + "/fleet")
+    assert len(files) == 2000
+    for index, dump in spoilt.items():
+        pathlib.Path(files[index]).write_bytes(dump)
+    table = subprocess.run([morwick, "table", "-s", "kvr", "-n", ",".join(fleet.NAMES), work + "/fleet"],
+                           capture_output=True, text=True).stdout
+    rows = list(csv.reader(io.StringIO(table)))[1:]
+    assert [row[0] for row in rows] == files and sum(row[1] != "" for row in rows) == 3
+    processes = [start("scheduler", "--port", "0")]
+    try:
+        processes += [start("worker", "--no-nanny", "--nthreads", "1") for _ in range(2)]
+        with Client(scheduler_file="cluster/scheduler.json") as client:
+            client.wait_for_workers(2, timeout=60)
+            scheduler = client.scheduler.address
+
+            screen = subprocess.run(
+                [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # that long at most
+                 sys.executable, source + "/examples/fleet.py", work + "/fleet", "--scheduler", scheduler],
+                capture_output=True, text=True).stdout.splitlines()
+            assert screen[0].startswith("reading: 100%|█") and "10/10" in screen[0], screen
+            assert screen[1:4] == [f"fleet.py: {row[0]}: {row[1]}" for row in rows if row[1]], screen
+            assert [line.split() for line in screen[5:16]] == [
+                [file, f"{amplification:.3f}", str(bad)] for file, amplification, bad in ten_of(rows)
+            ] + [[]], screen
+            assert screen[-1].endswith("status 1"), screen
+            assert pathlib.Path("fleet.png").read_bytes().startswith(b"\x89PNG")
+
+            # What the page shows, on this machine and on the cluster.
+            page = pathlib.Path(source + "/docs/archive.md").read_text()
+            lines = textwrap.dedent(re.search("    import glob.*?\n(?=[^ \n])", page, re.DOTALL)[0])
+            lines = lines.replace("/var/lib/dumps", work + "/fleet")
+            highest = sorted((row for row in rows if not row[1] and row[3] and row[2].strip("0")),
+                             key=lambda row: -int(row[3]) / int(row[2]))[:10]
+            for script in lines, lines.replace("processes=False", repr(scheduler)):
+                with contextlib.redirect_stdout(io.StringIO()) as printed:
+                    exec(script, names := {})
+                names["client"].close()
+                shown = [line.split()[0] for line in printed.getvalue().splitlines()[1:]]
+                assert shown == [row[0] for row in highest], shown
+
+            # One dump is a pipe. The worker that comes to it waits there, and is killed.
+            pipe = work + "/pipe"
+            os.mkfifo(pipe)
+            wait_for(lambda: not any(client.has_what().values()))  # nothing of what was before
+            read = threads.submit(fleet.read, files[:1100] + [pipe] + files[1100:], scheduler)
+            wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
+            [waiting] = [worker for worker, parts in client.processing().items() if parts]
+            assert client.has_what()[waiting], "parts that it has read must be lost too"
+            pid = client.run(os.getpid, workers=[waiting])[waiting]
+            [process] = [process for process in processes if process.pid == pid]
+            process.kill()
+            process.wait()
+            wait_for(lambda: write_to(pipe, spoilt[1111]))
+            assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
+            assert len(client.scheduler_info()["workers"]) == 1
+        assert as_rows(fleet.read(files)) == rows, "without a cluster"
+    except BaseException:
+        log.seek(0)
+        print(log.read(), file=sys.stderr)
+        raise
+    finally:
+        for process in processes:
+            process.kill()
+            process.wait()
+print("2,000 dumps agree")
