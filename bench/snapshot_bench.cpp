@@ -1,5 +1,7 @@
 // Both snapshot renderings, in ns per line of 2,000 records of mixed magnitudes, beside the plain
-// version (one snprintf a piece) and, for the fixed layout, beside libfmt with compiled formats.
+// version (one snprintf a piece) and, for the fixed layout, beside libfmt with compiled formats;
+// and the ways to write a line of the fixed layout, also for numbers of up to 26 bits, eight
+// digits.
 
 #include <benchmark/benchmark.h>
 #include <fmt/compile.h>
@@ -11,19 +13,23 @@
 #include <vector>
 
 #include "morwick/morwick.h"
+#include "stats/snapshot_lines.h"
 
 namespace {
 
 constexpr uint32_t kRecords = 2000;
 
 // The last record of the described rendering is never printed, so there is one more.
+template <unsigned kBits = 32>
 const std::vector<SnapshotRecord> &Records() {
   static const std::vector<SnapshotRecord> records = [] {
     std::mt19937 random(1);
     std::vector<SnapshotRecord> made(kRecords + 1);
     for (SnapshotRecord &record : made) {
       uint32_t words[sizeof record / 4];
-      for (uint32_t &word : words) word = static_cast<uint32_t>(random() >> random() % 32);
+      for (uint32_t &word : words) {
+        word = static_cast<uint32_t>(random() >> (32 - kBits) >> random() % kBits);
+      }
       words[0] |= 1;  // not empty
       std::memcpy(&record, words, sizeof record);
     }
@@ -154,8 +160,8 @@ size_t FmtFixed(char *output, size_t) {
 
 size_t Fixed(char *output, size_t capacity) {
   uint64_t size = capacity;
-  if (KVRParseSnapshotBuffer(Records().data(), kRecords * sizeof(SnapshotRecord), output, &size) !=
-      1) {
+  if (KVRParseSnapshotBuffer(Records<>().data(), kRecords * sizeof(SnapshotRecord), output,
+                             &size) != 1) {
     std::abort();
   }
   return size;
@@ -217,7 +223,7 @@ size_t Described(char *output, size_t capacity) {
   static const Header header;
   uint64_t size = capacity;
   uint32_t state = 0;
-  if (KVRParseSnapshotBufferWithInplaceParser(Records().data(),
+  if (KVRParseSnapshotBufferWithInplaceParser(Records<>().data(),
                                               sizeof(SnapshotRecord) * Records().size(), output,
                                               &size, &header, &state) != 1) {
     std::abort();
@@ -230,11 +236,28 @@ std::vector<char> &Buffer() {
   return buffer;
 }
 
+void CountLines(benchmark::State &state) {
+  state.counters["ns/line"] = benchmark::Counter(
+      kRecords * 1e-9, benchmark::Counter::kIsIterationInvariantRate | benchmark::Counter::kInvert);
+}
+
 template <size_t (*Render)(char *, size_t)>
 void Measure(benchmark::State &state) {
   for (auto _ : state) benchmark::DoNotOptimize(Render(Buffer().data(), Buffer().size()));
-  state.counters["ns/line"] = benchmark::Counter(
-      kRecords * 1e-9, benchmark::Counter::kIsIterationInvariantRate | benchmark::Counter::kInvert);
+  CountLines(state);
+}
+
+template <unsigned kBits>
+void MeasureLines(benchmark::State &state, const morwick::LineKernel &kernel) {
+  if (!kernel.runs()) return state.SkipWithError("this processor has none");
+  for (auto _ : state) {
+    char *end = Buffer().data();
+    for (uint32_t i = 0; i < kRecords; ++i) {
+      end = kernel.write(end, reinterpret_cast<const uint8_t *>(&Records<kBits>()[i]));
+    }
+    benchmark::DoNotOptimize(end);
+  }
+  CountLines(state);
 }
 
 BENCHMARK(Measure<Fixed>)->Name("fixed/formatter");
@@ -256,6 +279,11 @@ int main(int argc, char **argv) {
       Text(Described) != Text(PlainDescribed)) {
     std::fputs("the versions differ in their text\n", stderr);
     return 1;
+  }
+  for (const morwick::LineKernel &kernel : morwick::LineKernels()) {
+    const std::string name = std::string("line/") + kernel.name;
+    benchmark::RegisterBenchmark((name + "/mixed").c_str(), MeasureLines<32>, kernel);
+    benchmark::RegisterBenchmark((name + "/8 digits").c_str(), MeasureLines<26>, kernel);
   }
   benchmark::Initialize(&argc, argv);
   benchmark::RunSpecifiedBenchmarks();
