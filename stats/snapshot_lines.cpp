@@ -164,7 +164,7 @@ constexpr LineKernel kKernels[] = {
               __builtin_cpu_supports("avx512vbmi2");
      },
      WriteAvx512},
-    {"AVX2", [] { return __builtin_cpu_supports("avx2") != 0; }, WriteAvx2},
+    {"AVX2", []() -> bool { return __builtin_cpu_supports("avx2"); }, WriteAvx2},
 #endif
     {"scalar", [] { return true; }, WriteLine},
 };
