@@ -55,9 +55,11 @@ Connection::Connection(py::handle className) {
       errno = 0;
       const uint32_t service = MorwickFindService(&row);
       outOfMemory = service == 0 && errno == ENOMEM;
+      if (outOfMemory) break;
       if (service == 0) continue;
       row_ = &row;
       result = fleet::Open(service, &connection_);
+      outOfMemory = connection_ == 0 && errno == ENOMEM;
       break;
     }
   }

@@ -42,13 +42,38 @@ Layout::Layout(py::handle object) : isFixed(object.is_none()) {
   recordCount = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
 }
 
-py::object LittleEndian(const py::dtype &type) { return type.attr("newbyteorder")("<"); }
+// The fixed layout, with the numbers that have a name. Made once, and never freed: NumPy ends the
+// process where memory is refused to newbyteorder, and objects of the interpreter must not be given
+// back after its end.
+struct FixedTypes {
+  static const FixedTypes &Get() {
+    static const FixedTypes *const types = new FixedTypes;
+    return *types;
+  }
+
+  py::object operations;
+  py::object record;
+
+ private:
+  FixedTypes() {
+    PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
+    PYBIND11_NUMPY_DTYPE(SnapshotRecord, timestamp, preemptPercent, writes, reads, erasedBands,
+                         hostReads, hostWrites, nandReads, nandWrites, collectedSectors,
+                         wearLevelBands, intermediatePendingErase, userPendingErase, hysteresisTime,
+                         qosDelaysExtreme, qosDelaysNormal, freeSegments, oldestCommandAge,
+                         qosInterval, freeNodes, bufferFragments, bufferHighWater,
+                         expeditesSucceeded, expeditesFailed, hostUnmaps, commandTagsMin,
+                         commandTagsMax);
+    operations = py::dtype::of<SnapshotOperations>().attr("newbyteorder")("<");
+    record = py::dtype::of<SnapshotRecord>().attr("newbyteorder")("<");
+  }
+};
 
 // The numbers that the header describes. Those of the priorities of one field are a sub-array,
 // which goes by the label of the counts.
 py::object DescribedType(const Layout &layout) {
   const py::object number = py::dtype("<u4");
-  const py::object operations = LittleEndian(py::dtype::of<SnapshotOperations>());
+  const py::object &operations = FixedTypes::Get().operations;
   py::list names;
   py::list types;
   py::list offsets;
@@ -72,16 +97,7 @@ py::object DescribedType(const Layout &layout) {
 
 }  // namespace
 
-// The numbers that have a name.
-void RegisterRecords() {
-  PYBIND11_NUMPY_DTYPE(SnapshotOperations, count, totalLatency, maxLatency);
-  PYBIND11_NUMPY_DTYPE(SnapshotRecord, timestamp, preemptPercent, writes, reads, erasedBands,
-                       hostReads, hostWrites, nandReads, nandWrites, collectedSectors,
-                       wearLevelBands, intermediatePendingErase, userPendingErase, hysteresisTime,
-                       qosDelaysExtreme, qosDelaysNormal, freeSegments, oldestCommandAge,
-                       qosInterval, freeNodes, bufferFragments, bufferHighWater, expeditesSucceeded,
-                       expeditesFailed, hostUnmaps, commandTagsMin, commandTagsMax);
-}
+void PrepareLayouts() { FixedTypes::Get(); }
 
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
@@ -90,8 +106,7 @@ py::object Snapshot(const py::object &data, py::handle header) {
     const Buffer buffer(data, "data");
     count = layout.RecordsOf(buffer.bytes()).size() / layout.recordSize;
   }
-  const py::object type =
-      layout.isFixed ? LittleEndian(py::dtype::of<SnapshotRecord>()) : DescribedType(layout);
+  const py::object type = layout.isFixed ? FixedTypes::Get().record : DescribedType(layout);
   return py::module_::import("numpy").attr("frombuffer")(data, type, count);
 }
 

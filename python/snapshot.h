@@ -6,8 +6,8 @@
 
 namespace python {
 
-// Tells NumPy of the fixed layout; once, before the others.
-void RegisterRecords();
+// Before the others, when the module is loaded.
+void PrepareLayouts();
 
 // The records of a snapshot in the layout of a header, or the fixed one with None, over the buffer
 // itself.

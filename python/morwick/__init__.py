@@ -95,26 +95,26 @@ class Statistics(Mapping[str, Any]):
     __hash__ = object.__hash__
 
     def __init__(self, data: Any, stream: str = "kvr") -> None:
-        self._dump = _native.Dump(data, stream)
+        self._dump = _native.parse(data, stream)
         self._stream = stream
         self._values: dict[str, Any] | None = None
 
     def _all(self) -> dict[str, Any]:
         if self._values is None:
-            self._values = self._dump.values()
+            self._values = _native.values(self._dump)
         return self._values
 
     def __getitem__(self, name: str) -> Any:
-        return self._dump.value(name)
+        return _native.value(self._dump, name)
 
     def __contains__(self, name: object) -> bool:
-        return self._dump.has(name)
+        return _native.has(self._dump, name)
 
     def __iter__(self) -> Iterator[str]:
         return iter(self._all())
 
     def __len__(self) -> int:
-        return self._dump.size
+        return _native.size(self._dump)
 
     def keys(self) -> KeysView[str]:
         return self._all().keys()
@@ -129,32 +129,32 @@ class Statistics(Mapping[str, Any]):
     def entries(self) -> list[tuple[str, int]]:
         """All values with their names, repeated ones included, as `morwick stats -o csv` lists
         them. The elements of an array have a name each, such as readCountHisto0."""
-        return self._dump.entries()
+        return _native.entries(self._dump)
 
     @property
     def summary(self) -> dict[str, Any]:
         """The main figures of a kvr dump: those of its fields that have a place of their own in
         the library, and writeAmplification, a float: sectors written to NAND for each one that
         the host wrote. Empty for the other streams."""
-        return self._dump.summary()
+        return _native.summary(self._dump)
 
     @property
     def fault(self) -> str | None:
         """What is wrong with the dump, and where its statistics end; None for a good dump. The
         words are those of `morwick stats`."""
-        return self._dump.fault
+        return _native.fault(self._dump)
 
     @property
     def end(self) -> int:
         """The offset in bytes at which the statistics end: the dump's size, or the place of the
         end record or of a fault."""
-        return self._dump.end
+        return _native.end(self._dump)
 
     def __repr__(self) -> str:
         return f"<morwick.Statistics of {self._stream}: {len(self)} names, fault: {self.fault}>"
 
     def __reduce__(self) -> tuple[Any, ...]:
-        return Statistics, (self._dump.data, self._stream)
+        return Statistics, (_native.data(self._dump), self._stream)
 
 
 def parse(data: Any, stream: str = "kvr") -> Statistics:
@@ -351,12 +351,12 @@ class Controller:
     """
 
     def __init__(self, name: str | None = None) -> None:
-        self._connection = _native.Connection(name)
+        self._connection = _native.connect(name)
 
     @property
     def name(self) -> str:
         """The class."""
-        return self._connection.name
+        return _native.name(self._connection)
 
     def read(self, what: str) -> bytes:
         """What the controller answers: "kvr", "ftl" (both are in "statistics"), "msp",
@@ -365,7 +365,7 @@ class Controller:
         Waits for the answer; Python's lock is released meanwhile. ControllerError: the driver
         fails, or the class does not offer it. ValueError: there is nothing of that name.
         """
-        return self._connection.read(what)
+        return _native.read(self._connection, what)
 
     def statistics(self, stream: str = "kvr") -> Statistics:
         """Reads and parses the statistics of a stream."""
@@ -374,13 +374,14 @@ class Controller:
 
     def snapshot(self) -> npt.NDArray[np.void]:
         """Reads the snapshot, in the layout of the controller's own header if it offers one."""
-        header = self.read("snapshot_header") if self._connection.offers("snapshot_header") else None
+        offered = _native.offers(self._connection, "snapshot_header")
+        header = self.read("snapshot_header") if offered else None
         return snapshot(self.read("snapshot"), header)
 
     def close(self) -> None:
         """Closes the connection; a second time does nothing. ControllerError: the driver says
         that it failed; the connection is gone all the same."""
-        self._connection.close()
+        _native.close(self._connection)
 
     def __enter__(self) -> Controller:
         return self

@@ -55,7 +55,8 @@ def dumps(tmp_path_factory):
         for seed in range(COUNT):
             (folder / f"{stream}-{seed}").write_bytes(random_dump(stream, seed))
         for seed in (SOURCE / "fuzz/seeds").glob("*/*"):
-            (folder / f"{stream}-seed-{seed.name}").write_bytes(seed.read_bytes()[1:])
+            if seed.name != "gzip":  # which the command unpacks
+                (folder / f"{stream}-seed-{seed.name}").write_bytes(seed.read_bytes()[1:])
         for example in EXAMPLES:
             (folder / f"{stream}-{example.name}").write_bytes(example.read_bytes())
     return folder
@@ -110,7 +111,8 @@ def test_statistics_are_those_of_the_command(dumps, stream):
         summary = {name: plain(value) for name, value in statistics.summary.items()}
         if "writeAmplification" in summary:
             summary["writeAmplification"] = float(f"{summary['writeAmplification']:.3f}")
-        assert list(summary.items()) == list(report.get("summary", {}).items()), file
+        said = report.get("summary", {}).items()  # a large number comes once more, as NAME_s
+        assert list(summary.items()) == [item for item in said if not item[0].endswith("_s")], file
         said = [message["text"] for message in report["messages"] if message["severity"] == "error"]
         assert (statistics.fault or "") == "; ".join(text.removeprefix(f"{file}: ") for text in said)
         faults += statistics.fault is not None
@@ -194,7 +196,7 @@ def test_described_snapshot_has_what_the_header_describes():
 
 
 @given(strategies.binary(max_size=400), strategies.sampled_from(STREAMS))
-@settings(max_examples=50 if SANITIZED else 300, deadline=None)
+@settings(max_examples=50 if SANITIZED else 300, deadline=None, database=None)
 def test_any_bytes_are_read_the_same_from_any_buffer(data, stream):
     statistics = morwick.parse(data, stream)
     values = {name: plain(value) for name, value in statistics.items()}
@@ -206,7 +208,7 @@ def test_any_bytes_are_read_the_same_from_any_buffer(data, stream):
 
 @given(strategies.lists(strategies.tuples(strategies.integers(0, len(HEADER) - 1), strategies.integers(0, 255)), max_size=6),
        strategies.binary(max_size=40))
-@settings(max_examples=50 if SANITIZED else 300, deadline=None)
+@settings(max_examples=50 if SANITIZED else 300, deadline=None, database=None)
 def test_any_header_is_refused_or_describes_what_is_there(changes, tail):
     header = bytearray(HEADER)
     for place, value in changes:
@@ -234,10 +236,11 @@ def test_views_keep_their_buffers():
     assert records["timestamp"][0] == 77
     view = memoryview(data)
     records = morwick.snapshot(view)[::2]
-    with pytest.raises(BufferError):
-        view.release()
-    del records
     view.release()
+    with pytest.raises(BufferError):
+        data.clear()
+    assert records["timestamp"][0] == 77
+    del records
     data.clear()
     with pytest.raises(ValueError):
         morwick.parse(view)
@@ -387,6 +390,9 @@ def test_memory_that_is_refused_or_given_back(then):
                     try:
                         refuse(number); call(); error = None
                     except MemoryError as raised: error = raised
+                    except ValueError as raised:  # NumPy's own word, when it makes a type
+                        assert "tuple" in str(raised); error = raised
+                    except morwick.ControllerError as raised: error = raised  # the driver's own
                     if refuse(0) < number: break
                 assert error is None and number > 3, (call, number)
                 call()
