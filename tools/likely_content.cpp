@@ -4,8 +4,8 @@
 
 #include <algorithm>
 
+#include "fleet/streams.h"
 #include "morwick/snapshot.h"
-#include "tools/streams.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -38,7 +38,7 @@ bool LooksLikeStatistics(MorwickStream stream, std::string_view beginning) {
 
 std::string_view OtherThanSnapshot(std::string_view beginning) {
   if (LooksLikeText(beginning)) return "text";
-  for (const MorwickStream stream : kStreams) {
+  for (const MorwickStream stream : fleet::kStreams) {
     if (LooksLikeStatistics(stream, beginning)) return "statistics";
   }
   return "";
