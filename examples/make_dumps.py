@@ -60,10 +60,15 @@ def record(second):
 
 (folder / "snapshot.bin").write_bytes(b"".join(record(second) for second in range(1, 121)))
 
-descriptors = [
-    (0, 0, 4, b"T=%04u"), (0, 108, 4, b" HR=%4u"), (0, 112, 4, b" HW=%4u"),
-    (2, 156, 4, b" TH=%8u.%02u"), (3, 56, 48, b" R%s="), (3, 8, 48, b" W%s="),
-]
+# The records as the fixed layout has them. A format with two numbers is that of thousandths.
+descriptors = [(2 if layout.count(b"%") == 2 else 0, offset, 4, layout) for offset, layout in (
+    (0, b"T=%04u"), (104, b" E=%02u"), (108, b" HR=%4u"), (112, b" HW=%4u"), (116, b" NR=%4u"),
+    (120, b" NW=%4u"), (156, b" TH=%8u.%02u"), (124, b" GC=%4u"), (132, b" W=%2u"),
+    (144, b" BI=%3u"), (148, b" BU=%3u"), (180, b" V=%5u"), (188, b" BF=%2u"), (192, b"/%2u"),
+    (4, b" P=%2u"), (164, b" H=%2u"), (160, b"/%2u"), (200, b" X=%2u"), (204, b"/%2u"),
+    (172, b" L=%3u"), (176, b"/%3u"), (212, b" C=%2u"), (216, b"/%2u"), (168, b" S=%4u"),
+    (208, b" U=%8u"))]
+descriptors += [(3, 56, 48, b" R%s="), (3, 8, 48, b" W%s=")]
 text = b"Example layout\0\0"
 table = 36 + len(text)
 (folder / "snapshot_header.bin").write_bytes(

@@ -17,6 +17,7 @@
 #include "fleet/snapshot_header.h"
 #include "morwick/morwick.h"
 #include "platform/simulated/scenario.h"
+#include "tools/snapshot_columns.h"
 
 namespace {
 
@@ -50,6 +51,8 @@ void CheckHeader(std::string_view file) {
   KVRParseSnapshotBufferWithInplaceParser(snapshot.data(), snapshot.size(), output.data(), &size,
                                           header.data(), &state);
   assert(size >= 1 && size <= output.size() && output[size - 1] == '\0');
+  const tools::SnapshotColumns columns(header.data());
+  assert(columns.fault().empty() != columns.all().empty());
 }
 
 // A selection has each column once, and asks for all of its names.

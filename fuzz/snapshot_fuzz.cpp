@@ -1,15 +1,21 @@
-// Both snapshot renderings. The input: a capacity, the number of descriptors, a header with so many
-// descriptors, and the snapshot.
+// Both snapshot renderings, and the fields and columns beside them: each number of a column stands
+// in the text. The input: a capacity, the number of descriptors, a header with so many descriptors,
+// and the snapshot.
 
 #include <cassert>
 #include <cstddef>
+#include <cstdio>
 #include <cstring>
+#include <set>
 #include <string>
 #include <vector>
 
 #include "morwick/morwick.h"
+#include "tools/snapshot_columns.h"
 
 namespace {
+
+using tools::SnapshotColumn;
 
 constexpr uint32_t kTableOffset = sizeof(SnapshotHeader) + 12;
 
@@ -65,6 +71,67 @@ void CheckWithoutTable(std::vector<char> header, const std::vector<char> &snapsh
   assert(RenderDescribed(alone, snapshot, capacity) == RenderDescribed(header, snapshot, capacity));
 }
 
+// As the format, which the fields have passed, prints the number.
+std::string Printed(const MorwickSnapshotField &field, const char *format, uint32_t number) {
+  std::vector<char> text(8192);
+#pragma clang diagnostic ignored "-Wformat-nonliteral"
+  const int length =
+      field.kind == kMorwickFieldThousandths
+          ? std::snprintf(text.data(), text.size(), format, number / 1000, number % 1000 / 10)
+          : std::snprintf(text.data(), text.size(), format, number);
+  assert(length >= 0 && static_cast<size_t>(length) < text.size());
+  return text.data();
+}
+
+// The columns of a line, in its order. The fields lie in the record.
+void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn> &columns,
+               std::string_view record, const std::string &line) {
+  size_t at = 0;
+  auto column = columns.begin();
+  MorwickSnapshotField field;
+  for (uint32_t i = 0; MorwickSnapshotFieldAt(header.data(), i, &field) == 1; ++i) {
+    const char *format = &header[kTableOffset + 8 + i * sizeof(SnapshotFieldDescriptor) +
+                                 offsetof(SnapshotFieldDescriptor, format)];
+    const bool isTriple = field.kind == kMorwickFieldPriorities;
+    const uint32_t count = isTriple                                   ? 3 * field.priorities
+                           : field.kind == kMorwickFieldWithoutNumber ? 0
+                                                                      : 1;
+    for (uint32_t k = 0; k < count; ++k, ++column) {
+      assert(column != columns.end() && column->offset + 4ULL <= record.size());
+      const uint32_t number = LoadLittleEndian32(&record[column->offset]);
+      const std::string text = isTriple ? std::to_string(number) : Printed(field, format, number);
+      at = line.find(text, at);
+      assert(at != std::string::npos);
+      at += text.size();
+    }
+  }
+  assert(column == columns.end());
+}
+
+// Each record alone, in place of the second of two: no banner is before its line.
+void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t capacity) {
+  const tools::SnapshotColumns columns(header.data());
+  std::set<std::string> names;
+  for (const SnapshotColumn &column : columns.all()) assert(names.insert(column.name).second);
+  const uint32_t recordSize = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)]);
+  if (recordSize == 0) return;
+  const uint32_t count = 3;
+  std::memcpy(&header[offsetof(SnapshotHeader, recordCount)], &count, sizeof count);
+  for (; snapshot.size() >= recordSize; snapshot.remove_prefix(recordSize)) {
+    const std::string_view record = snapshot.substr(0, recordSize);
+    std::vector<char> two(recordSize);
+    two.insert(two.end(), record.begin(), record.end());
+    std::vector<char> output(capacity);
+    uint32_t state = 1;
+    uint64_t size = capacity;
+    const bool fits = KVRParseSnapshotBufferWithInplaceParser(two.data(), two.size(), output.data(),
+                                                              &size, header.data(), &state) == 1;
+    if (!fits || !columns.fault().empty()) continue;
+    assert(columns.LeavesOut(record) == (size == 1));
+    if (size > 1) CheckLine(header, columns.all(), record, {output.data(), size - 1});
+  }
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
@@ -76,6 +143,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   assert(RenderDescribed(header, snapshot, capacity) ==
          RenderDescribed(header, snapshot, capacity));
   CheckWithoutTable(header, snapshot, capacity);
+  CheckColumns(header, input, capacity);
   assert(RenderFixed(snapshot, capacity) == RenderFixed(snapshot, capacity));
   return 0;
 }

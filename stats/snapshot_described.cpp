@@ -66,13 +66,12 @@ class ReadyFields {
 };
 
 // One value of each priority's triple, after its label.
-bool AppendPriorities(BoundedWriter &writer, const Field &field, const uint8_t *triples,
-                      const TriplePart &part) {
-  if (!PrintText(writer, field.format, part.letter)) return false;
-  for (uint32_t k = 0; k < field.priorities; ++k, triples += kTripleSize) {
+bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *label,
+                      const uint8_t *values, uint32_t width) {
+  if (!PrintText(writer, field.format, label)) return false;
+  for (uint32_t k = 0; k < field.priorities; ++k, values += kTripleSize) {
     if (k > 0 && !writer.Append("/")) return false;
-    const uint32_t value = LoadLittleEndian32(triples + part.offset);
-    if (!PrintPadded(writer, value, part.width, ' ')) return false;
+    if (!PrintPadded(writer, LoadLittleEndian32(values), width, ' ')) return false;
   }
   return true;
 }
@@ -93,9 +92,10 @@ bool AppendPriorities(BoundedWriter &writer, const Field &field, const uint8_t *
       return PrintNumbers(writer, field.format, numbers);
     }
     case Field::kPriorities:
-      return AppendPriorities(writer, field, value, kTripleParts[0]) &&
-             AppendPriorities(writer, field, value, kTripleParts[1]) &&
-             AppendPriorities(writer, field, value, kTripleParts[2]);
+      for (const auto &[letter, offset, width] : kTripleParts) {
+        if (!AppendPriorities(writer, field, letter, value + offset, width)) return false;
+      }
+      return true;
     case Field::kNothing: break;
   }
   return true;

@@ -114,7 +114,7 @@ build_and_consume "$prefix" given
   expect "$(./a.out "$prefix/share/morwick/examples/kvr.bin")" "123456789 sectors written"
   {
     printf '#include <%s>\n' morwick/morwick.h stdio.h stdlib.h
-    echo 'static char header[228], snapshot[1 << 20]; int main(void) { fread(header, 1, 228, stdin);'
+    echo 'static char header[816], snapshot[1 << 20]; int main(void) { fread(header, 1, sizeof header, stdin);'
     echo 'const uint64_t snapshotSize = fread(snapshot, 1, sizeof snapshot, stdin);'
     sed -n '/^ \*     uint64_t room/,/^ \*     free/{s/^ \*//; s/4096/16/; p}' "$prefix/include/morwick/snapshot.h"
     echo '}'

@@ -1,75 +1,46 @@
-// The columns of the fixed snapshot layout, in the order of the text: their names for CSV and JSON,
-// and where their numbers lie in a record. A session holds them against the text.
+// The numbers of a snapshot's records as columns, in any layout.
 #ifndef TOOLS_SNAPSHOT_COLUMNS_H
 #define TOOLS_SNAPSHOT_COLUMNS_H
 
-#include <cstddef>
+#include <cstdint>
+#include <string>
 #include <string_view>
+#include <vector>
 
-#include "morwick/snapshot.h"
+#include "morwick/snapshot_fields.h"
 
 namespace tools {
 
 struct SnapshotColumn {
-  std::string_view name;
-  size_t offset;
+  std::string name;  // each one another
+  std::string label;
+  MorwickFieldKind kind;
+  uint32_t offset;  // of its 32 bits in the record
 };
 
-#define FIELD(name) offsetof(SnapshotRecord, name)
+class SnapshotColumns {
+ public:
+  // One for each number, in the order of the text. Null stands for the fixed layout; any other
+  // header has passed its check.
+  explicit SnapshotColumns(const char *header);
 
-constexpr SnapshotColumn kSnapshotColumns[] = {
-    {"T", FIELD(timestamp)},
-    {"E", FIELD(erasedBands)},
-    {"HR", FIELD(hostReads)},
-    {"HW", FIELD(hostWrites)},
-    {"NR", FIELD(nandReads)},
-    {"NW", FIELD(nandWrites)},
-    {"TH_us", FIELD(hysteresisTime)},  // as in the record; the text has milliseconds
-    {"GC", FIELD(collectedSectors)},
-    {"W", FIELD(wearLevelBands)},
-    {"BI", FIELD(intermediatePendingErase)},
-    {"BU", FIELD(userPendingErase)},
-    {"V", FIELD(freeNodes)},
-    {"BF_fragments", FIELD(bufferFragments)},
-    {"BF_high_water", FIELD(bufferHighWater)},
-    {"P", FIELD(preemptPercent)},
-    {"H_normal", FIELD(qosDelaysNormal)},
-    {"H_extreme", FIELD(qosDelaysExtreme)},
-    {"X_succeeded", FIELD(expeditesSucceeded)},
-    {"X_failed", FIELD(expeditesFailed)},
-    {"L_age", FIELD(oldestCommandAge)},
-    {"L_interval", FIELD(qosInterval)},
-    {"C_min", FIELD(commandTagsMin)},
-    {"C_max", FIELD(commandTagsMax)},
-    {"S", FIELD(freeSegments)},
-    {"U", FIELD(hostUnmaps)},
-    {"RO_0", FIELD(reads[0].count)},
-    {"RO_1", FIELD(reads[1].count)},
-    {"RO_2", FIELD(reads[2].count)},
-    {"RO_3", FIELD(reads[3].count)},
-    {"RL_0", FIELD(reads[0].totalLatency)},
-    {"RL_1", FIELD(reads[1].totalLatency)},
-    {"RL_2", FIELD(reads[2].totalLatency)},
-    {"RL_3", FIELD(reads[3].totalLatency)},
-    {"RM_0", FIELD(reads[0].maxLatency)},
-    {"RM_1", FIELD(reads[1].maxLatency)},
-    {"RM_2", FIELD(reads[2].maxLatency)},
-    {"RM_3", FIELD(reads[3].maxLatency)},
-    {"WO_0", FIELD(writes[0].count)},
-    {"WO_1", FIELD(writes[1].count)},
-    {"WO_2", FIELD(writes[2].count)},
-    {"WO_3", FIELD(writes[3].count)},
-    {"WL_0", FIELD(writes[0].totalLatency)},
-    {"WL_1", FIELD(writes[1].totalLatency)},
-    {"WL_2", FIELD(writes[2].totalLatency)},
-    {"WL_3", FIELD(writes[3].totalLatency)},
-    {"WM_0", FIELD(writes[0].maxLatency)},
-    {"WM_1", FIELD(writes[1].maxLatency)},
-    {"WM_2", FIELD(writes[2].maxLatency)},
-    {"WM_3", FIELD(writes[3].maxLatency)},
+  // Why the records are no table; empty when they are.
+  const std::string &fault() const { return fault_; }
+
+  const std::vector<SnapshotColumn> &all() const { return columns_; }
+
+  // Where the numbers with that label are, one for each priority; those of thousandths are none.
+  std::vector<uint32_t> OffsetsOf(std::string_view label) const;
+
+  // Whether the text leaves the record out. It is whole, and there is no fault.
+  bool LeavesOut(std::string_view record) const;
+
+ private:
+  std::vector<SnapshotColumn> columns_;
+  std::string fault_;
+  bool fixed_;
+  uint32_t emptyOffset_ = 0;  // of 32 bits that are 0 in a record that is left out
 };
-
-#undef FIELD
 
 }  // namespace tools
 

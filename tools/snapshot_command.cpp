@@ -10,11 +10,13 @@
 #include "tools/commands.h"
 #include "tools/controller.h"
 #include "tools/input.h"
+#include "tools/likely_content.h"
 #include "tools/options.h"
 #include "tools/snapshot_columns.h"
 #include "tools/snapshot_records.h"
 #include "tools/snapshot_summary.h"
 #include "tools/snapshot_text.h"
+#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -38,7 +40,8 @@ struct Snapshot {
   std::string name;                   // in complaints
   std::optional<std::string> header;  // none: the fixed layout
   std::string headerName;
-  std::string bytes;  // of a controller
+  std::string bytes;                       // of a controller
+  std::optional<SnapshotColumns> columns;  // where they are needed
   Status status = kGood;
 };
 
@@ -63,6 +66,20 @@ void ReadLive(const Options &options, Snapshot *snapshot) {
   snapshot->status = kGood;
 }
 
+// Checks the header, if there is one, and reads the columns from it where they are needed. What is
+// wrong with it, empty for a good one.
+std::string CheckLayout(const Options &options, Snapshot *snapshot) {
+  if (snapshot->header) {
+    std::string wrong = fleet::CheckSnapshotHeader(*snapshot->header);
+    if (!wrong.empty()) return wrong;
+  }
+  if (options.format == Format::kNormal && !options.summary) return "";
+  snapshot->columns.emplace(snapshot->header ? snapshot->header->data() : nullptr);
+  if (!snapshot->columns->fault().empty() || !options.summary) return snapshot->columns->fault();
+  const std::string missing = MissingForSummary(*snapshot->columns);
+  return missing.empty() ? "" : "does not describe " + missing + ", which --summary needs";
+}
+
 // Everything but the records of a file.
 Snapshot Prepare(const Options &options) {
   Snapshot snapshot;
@@ -78,15 +95,8 @@ Snapshot Prepare(const Options &options) {
     snapshot.status = header.status;
     snapshot.header = std::move(header.bytes);
   }
-  if (snapshot.status != kGood || !snapshot.header) return snapshot;
-  std::string wrong = fleet::CheckSnapshotHeader(*snapshot.header);
-  if (wrong.empty() && (options.format != Format::kNormal || options.summary)) {
-    const uint32_t recordSize = fleet::LoadSnapshotHeader(*snapshot.header).recordSize;
-    if (recordSize != sizeof(SnapshotRecord)) {
-      wrong = "record size " + std::to_string(recordSize) + " is not that of the fixed layout, " +
-              std::to_string(sizeof(SnapshotRecord));
-    }
-  }
+  if (snapshot.status != kGood) return snapshot;
+  const std::string wrong = CheckLayout(options, &snapshot);
   if (!wrong.empty()) {
     Complain(snapshot.headerName, wrong);
     snapshot.status = kBadData;
@@ -94,16 +104,18 @@ Snapshot Prepare(const Options &options) {
   return snapshot;
 }
 
-// Calls `take` with each record, and `goesOn` after each block that came, until that returns false.
-// False when reading has failed.
+// Calls `take` with each record that the text has too, and `goesOn` after each block that came,
+// until that returns false. False when reading has failed.
 template <typename TakeRecord, typename GoesOn>
-bool ForEachRecord(SnapshotRecords &records, TakeRecord take, GoesOn goesOn) {
+bool ForEachRecord(SnapshotRecords &records, const SnapshotColumns &columns, TakeRecord take,
+                   GoesOn goesOn) {
   do {
     const auto block = records.Next();
     if (!block) return false;
     if (block->empty()) return true;
-    for (size_t at = 0; at < block->size(); at += sizeof(SnapshotRecord)) {
-      take(block->substr(at, sizeof(SnapshotRecord)));
+    for (size_t at = 0; at < block->size(); at += records.recordSize()) {
+      const std::string_view record = block->substr(at, records.recordSize());
+      if (!columns.LeavesOut(record)) take(record);
     }
   } while (goesOn());
   return true;
@@ -111,39 +123,42 @@ bool ForEachRecord(SnapshotRecords &records, TakeRecord take, GoesOn goesOn) {
 
 // Prints each record when it has come.
 template <typename PrintRecord>
-bool PrintEachRecord(Output &output, SnapshotRecords &records, PrintRecord print) {
-  return ForEachRecord(records, print, [&] { return output.Flush(); });
+bool PrintEachRecord(Output &output, SnapshotRecords &records, const SnapshotColumns &columns,
+                     PrintRecord print) {
+  return ForEachRecord(records, columns, print, [&] { return output.Flush(); });
 }
 
-bool PrintCsv(Output &output, SnapshotRecords &records) {
-  const auto separator = [](const SnapshotColumn &column) {
-    return &column == &*std::rbegin(kSnapshotColumns) ? '\n' : ',';
-  };
-  for (const SnapshotColumn &column : kSnapshotColumns) {
-    output.Write(column.name);
-    output.Put(separator(column));
+bool PrintCsv(Output &output, SnapshotRecords &records, const SnapshotColumns &columns) {
+  std::string row;
+  for (const SnapshotColumn &column : columns.all()) {
+    if (!row.empty()) row += ',';
+    AppendCsvField(&row, column.name);
   }
-  return PrintEachRecord(output, records, [&](std::string_view record) {
-    for (const SnapshotColumn &column : kSnapshotColumns) {
+  output.Write(row += '\n');
+  return PrintEachRecord(output, records, columns, [&](std::string_view record) {
+    row.clear();
+    for (const SnapshotColumn &column : columns.all()) {
+      if (!row.empty()) row += ',';
       char digits[16];
-      const char *end =
-          std::to_chars(digits, std::end(digits), LoadLittleEndian32(&record[column.offset])).ptr;
-      output.Write({digits, static_cast<size_t>(end - digits)});
-      output.Put(separator(column));
+      row.append(
+          digits,
+          std::to_chars(digits, std::end(digits), LoadLittleEndian32(&record[column.offset])).ptr);
     }
+    output.Write(row += '\n');
   });
 }
 
-bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
+bool PrintRows(Output &output, Json &json, SnapshotRecords &records,
+               const SnapshotColumns &columns) {
   json.Key("columns");
   json.BeginArray();
-  for (const SnapshotColumn &column : kSnapshotColumns) json.PlainText(column.name);
+  for (const SnapshotColumn &column : columns.all()) json.Text(column.name);
   json.EndArray();
   json.Key("rows");
   json.BeginArray();
-  const bool good = PrintEachRecord(output, records, [&](std::string_view record) {
+  const bool good = PrintEachRecord(output, records, columns, [&](std::string_view record) {
     json.BeginArray();
-    for (const SnapshotColumn &column : kSnapshotColumns) {
+    for (const SnapshotColumn &column : columns.all()) {
       json.Number(LoadLittleEndian32(&record[column.offset]));
     }
     json.EndArray();
@@ -152,9 +167,22 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records) {
   return good;
 }
 
+// Nothing is written before all records have come: an object that was begun must be ended.
+bool PrintSummary(Output &output, Json *json, SnapshotRecords &records,
+                  const SnapshotColumns &columns) {
+  SnapshotSummary summary(columns);
+  const bool good = ForEachRecord(
+      records, columns, [&](std::string_view record) { summary.Add(record); }, [] { return true; });
+  if (json == nullptr) {
+    summary.Print(output);
+  } else {
+    summary.Print(*json);
+  }
+  return good;
+}
+
 // Says where the records end, when that is not as promised.
-Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, size_t recordSize,
-                uint64_t promised) {
+Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, uint64_t promised) {
   const auto ofPromised = [&] {
     return std::to_string(promised) + " records that " + snapshot.headerName + " promises";
   };
@@ -168,7 +196,7 @@ Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, size_t
              "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
     return kBadData;
   }
-  if (records.rest() > recordSize) {  // more than the record that is not printed
+  if (records.rest() > records.recordSize()) {  // more than the record that is not printed
     Note(snapshot.name, "goes on behind the " + ofPromised());
   }
   return kGood;
@@ -199,22 +227,18 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     Complain(snapshot.name, "there is nothing in it");
     return kBadData;
   }
+  const std::string_view other = OtherThanSnapshot(records.loaded());
+  if (!snapshot.header && !other.empty()) {
+    Note(snapshot.name, "looks like " + std::string(other) + ", not like a snapshot");
+  }
   Status status = kGood;
   bool good = true;
   if (options.summary) {
-    SnapshotSummary summary;
-    // Nothing is written before all records have come: an object that was begun must be ended.
-    good = ForEachRecord(
-        records, [&](std::string_view record) { summary.Add(record); }, [] { return true; });
-    if (json == nullptr) {
-      summary.Print(output);
-    } else {
-      summary.Print(*json);
-    }
+    good = PrintSummary(output, json, records, *snapshot.columns);
   } else if (json != nullptr) {
-    good = PrintRows(output, *json, records);
+    good = PrintRows(output, *json, records, *snapshot.columns);
   } else if (options.format == Format::kCsv) {
-    good = PrintCsv(output, records);
+    good = PrintCsv(output, records, *snapshot.columns);
   } else if (snapshot.header) {
     status = PrintDescribedText(output, records, *snapshot.header, snapshot.name);
   } else {
@@ -222,7 +246,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   }
   if (!good || status == kBadUsage) return kBadUsage;  // reading has failed
   if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
-  return std::max(status, JudgeEnd(snapshot, records, recordSize, promised));
+  return std::max(status, JudgeEnd(snapshot, records, promised));
 }
 
 Status Print(const Options &options) {

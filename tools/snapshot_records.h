@@ -25,6 +25,13 @@ class SnapshotRecords {
   // which may be read. Without a value, reading has failed.
   std::optional<std::string_view> Next();
 
+  // What was read, and not handed out yet.
+  std::string_view loaded() const {
+    return std::string_view(buffer_).substr(recordSize_ + used_, filled_ - used_);
+  }
+
+  size_t recordSize() const { return recordSize_; }
+
   // How many records were handed out.
   uint64_t count() const { return count_; }
 

@@ -8,18 +8,17 @@
 #include <cstdio>
 
 #include "morwick/little_endian.h"
-#include "morwick/snapshot.h"
 
 namespace tools {
 namespace {
 
 constexpr size_t kSlowest = 5;
-constexpr size_t kPriorities = std::extent_v<decltype(SnapshotRecord::reads)>;
+constexpr std::pair<unsigned, const char *> kPercentiles[] = {
+    {50, "median_latency_us"}, {95, "p95_latency_us"}, {99, "p99_latency_us"}};
 
 constexpr char kExplanation[] = R"(
-Latencies in microseconds. An interval's latency is its mean: total latency by operations, of
-all priorities. Percentiles are of these means, by nearest rank; intervals without operations
-are left out. The maximum is of a single operation.
+Latencies in microseconds, of the operations of all priorities. The median and the percentiles,
+by nearest rank, lie between the two bounds that are given. An interval's latency is its mean.
 
 )";
 
@@ -42,28 +41,66 @@ void Member(Json &json, std::string_view key, std::optional<double> number) {
   number ? json.Fraction(*number) : json.Null();
 }
 
+void PrintBounds(Json &json, std::optional<LatencyBounds::Bounds> bounds) {
+  if (!bounds) {
+    json.Null();
+    return;
+  }
+  json.BeginObject();
+  json.Member("least", bounds->least);
+  json.Member("most", bounds->most);
+  json.EndObject();
+}
+
 }  // namespace
 
-void SnapshotSummary::Operations::Add(std::string_view record, size_t operations, size_t host,
-                                      size_t nand) {
-  const uint32_t timestamp = LoadLittleEndian32(&record[offsetof(SnapshotRecord, timestamp)]);
-  hostSectors += LoadLittleEndian32(&record[host]);
-  nandSectors += LoadLittleEndian32(&record[nand]);
+std::string MissingForSummary(const SnapshotColumns &columns) {
+  std::string missing;
+  for (const std::string_view label :
+       {"RO", "RL", "RM", "WO", "WL", "WM", "HR", "HW", "NR", "NW", "T"}) {
+    const size_t count = columns.OffsetsOf(label).size();
+    // Latencies are there for each number of operations.
+    const bool isLatency = label.ends_with('L') || label.ends_with('M');
+    const std::string operations = {label[0], 'O'};
+    if (count > 0 && (!isLatency || count == columns.OffsetsOf(operations).size())) continue;
+    missing.append(missing.empty() ? "" : ", ").append(label);
+  }
+  return missing;
+}
+
+SnapshotSummary::Operations::Operations(std::string_view itsName, char letter,
+                                        const SnapshotColumns &columns)
+    : name(itsName) {
+  const auto offsetsOf = [&](char first, char second) {
+    return columns.OffsetsOf(std::string{first, second});
+  };
+  counts = offsetsOf(letter, 'O');
+  totals = offsetsOf(letter, 'L');
+  maxima = offsetsOf(letter, 'M');
+  host = offsetsOf('H', letter).front();
+  nand = offsetsOf('N', letter).front();
+}
+
+void SnapshotSummary::Operations::Add(uint32_t timestamp, std::string_view record) {
+  const auto number = [&](uint32_t offset) { return LoadLittleEndian32(&record[offset]); };
+  hostSectors += number(host);
+  nandSectors += number(nand);
   uint64_t operationsHere = 0;
   uint64_t latencyHere = 0;
-  for (size_t k = 0; k < kPriorities; ++k) {
-    const std::string_view triple = record.substr(operations + k * sizeof(SnapshotOperations));
-    operationsHere += LoadLittleEndian32(&triple[offsetof(SnapshotOperations, count)]);
-    latencyHere += LoadLittleEndian32(&triple[offsetof(SnapshotOperations, totalLatency)]);
-    const uint32_t most = LoadLittleEndian32(&triple[offsetof(SnapshotOperations, maxLatency)]);
-    if (most > 0 && (!maximum || most > maximum->latency)) maximum = {timestamp, double(most)};
+  for (size_t k = 0; k < counts.size(); ++k) {
+    const SnapshotOperations group = {number(counts[k]), number(totals[k]), number(maxima[k])};
+    bounds.Add(group);
+    operationsHere += group.count;
+    latencyHere += group.totalLatency;
+    if (group.maxLatency > 0 && (!maximum || group.maxLatency > maximum->latency)) {
+      maximum = {timestamp, double(group.maxLatency)};
+    }
   }
   count += operationsHere;
   totalLatency += latencyHere;
   if (operationsHere == 0) return;
   const Interval interval = {
       timestamp, static_cast<double>(latencyHere) / static_cast<double>(operationsHere)};
-  means.push_back(interval.latency);
   // Of two that are equally slow the earlier one stays in front.
   slowest.insert(std::ranges::upper_bound(slowest, interval.latency, std::ranges::greater(),
                                           &Interval::latency),
@@ -76,36 +113,35 @@ std::optional<double> SnapshotSummary::Operations::Mean() const {
   return static_cast<double>(totalLatency) / static_cast<double>(count);
 }
 
-std::optional<double> SnapshotSummary::Operations::Percentile(unsigned percent) {
-  if (means.empty()) return std::nullopt;
-  const size_t rank = (means.size() * percent + 99) / 100;  // counted from 1, rounded up
-  const auto place = means.begin() + static_cast<ptrdiff_t>(rank - 1);
-  std::nth_element(means.begin(), place, means.end());
-  return *place;
-}
-
 std::optional<double> SnapshotSummary::Operations::NandPerHost() const {
   if (hostSectors == 0) return std::nullopt;
   return static_cast<double>(nandSectors) / static_cast<double>(hostSectors);
 }
 
+SnapshotSummary::SnapshotSummary(const SnapshotColumns &columns)
+    : timestamp_(columns.OffsetsOf("T").front()),
+      reads_("reads", 'R', columns),
+      writes_("writes", 'W', columns) {}
+
 void SnapshotSummary::Add(std::string_view record) {
   ++intervals_;
-  reads_.Add(record, offsetof(SnapshotRecord, reads), offsetof(SnapshotRecord, hostReads),
-             offsetof(SnapshotRecord, nandReads));
-  writes_.Add(record, offsetof(SnapshotRecord, writes), offsetof(SnapshotRecord, hostWrites),
-              offsetof(SnapshotRecord, nandWrites));
+  const uint32_t timestamp = LoadLittleEndian32(&record[timestamp_]);
+  reads_.Add(timestamp, record);
+  writes_.Add(timestamp, record);
 }
 
-void SnapshotSummary::Print(Output &output) {
+void SnapshotSummary::Print(Output &output) const {
   output.Write("Intervals: " + std::to_string(intervals_) + kExplanation);
-  output.Write("        operations       mean     median        p95        p99    maximum\n");
-  for (Operations *each : {&reads_, &writes_}) {
+  output.Write(
+      "        operations       mean          median             p95             p99    maximum\n");
+  for (const Operations *each : {&reads_, &writes_}) {
     std::string line(each->name);
     line.resize(6, ' ');
     line += Column(std::to_string(each->count), 12) + Column(OneDecimal(each->Mean()), 11);
-    for (const unsigned percent : {50U, 95U, 99U}) {
-      line += Column(OneDecimal(each->Percentile(percent)), 11);
+    for (const auto &[percent, key] : kPercentiles) {
+      const auto bounds = each->bounds.Percentile(percent);
+      line += Column(
+          bounds ? std::to_string(bounds->least) + " to " + std::to_string(bounds->most) : "-", 16);
     }
     if (each->maximum) {
       line += Column(Decimal(each->maximum->latency, "%.0f"), 11) +
@@ -134,18 +170,19 @@ void SnapshotSummary::Print(Output &output) {
   }
 }
 
-void SnapshotSummary::Print(Json &json) {
+void SnapshotSummary::Print(Json &json) const {
   json.Key("summary");
   json.BeginObject();
   json.Member("intervals", intervals_);
-  for (Operations *each : {&reads_, &writes_}) {
+  for (const Operations *each : {&reads_, &writes_}) {
     json.Key(each->name);
     json.BeginObject();
     json.Member("operations", each->count);
     Member(json, "mean_latency_us", each->Mean());
-    Member(json, "median_latency_us", each->Percentile(50));
-    Member(json, "p95_latency_us", each->Percentile(95));
-    Member(json, "p99_latency_us", each->Percentile(99));
+    for (const auto &[percent, key] : kPercentiles) {
+      json.Key(key);
+      PrintBounds(json, each->bounds.Percentile(percent));
+    }
     if (each->maximum) {
       Member(json, "maximum_latency_us", each->maximum->latency);
       json.Member("maximum_at", each->maximum->timestamp);

@@ -4,22 +4,30 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
 #include <string_view>
 #include <vector>
 
 #include "tools/json.h"
+#include "tools/latency_bounds.h"
 #include "tools/output.h"
+#include "tools/snapshot_columns.h"
 
 namespace tools {
 
+// The labels that the summary needs and the columns lack: "RM, HR"; empty when there are all.
+std::string MissingForSummary(const SnapshotColumns &columns);
+
 class SnapshotSummary {
  public:
-  // Takes one record of the fixed layout.
+  // No label must be missing.
+  explicit SnapshotSummary(const SnapshotColumns &columns);
+
   void Add(std::string_view record);
 
   // Once, when all records were taken.
-  void Print(Output &output);
-  void Print(Json &json);
+  void Print(Output &output) const;
+  void Print(Json &json) const;
 
  private:
   // An interval, by its timestamp, and a latency in microseconds.
@@ -30,23 +38,30 @@ class SnapshotSummary {
 
   // The reads, or the writes, of all priorities.
   struct Operations {
+    // `letter` is that of their labels.
+    Operations(std::string_view name, char letter, const SnapshotColumns &columns);
+
+    void Add(uint32_t timestamp, std::string_view record);
+    std::optional<double> Mean() const;
+    std::optional<double> NandPerHost() const;
+
     std::string_view name;
+    // Where the numbers are, those of operations by priority.
+    std::vector<uint32_t> counts, totals, maxima;
+    uint32_t host, nand;
+
     uint64_t count = 0;
     uint64_t totalLatency = 0;
     std::optional<Interval> maximum = {};
-    std::vector<double> means = {};      // of each interval with operations
+    LatencyBounds bounds = {};
     std::vector<Interval> slowest = {};  // by mean, the slowest first
     uint64_t hostSectors = 0;
     uint64_t nandSectors = 0;
-
-    void Add(std::string_view record, size_t operations, size_t host, size_t nand);
-    std::optional<double> Mean() const;
-    std::optional<double> Percentile(unsigned percent);  // nearest rank
-    std::optional<double> NandPerHost() const;
   };
 
-  Operations reads_{.name = "reads"};
-  Operations writes_{.name = "writes"};
+  uint32_t timestamp_;  // where it is
+  Operations reads_;
+  Operations writes_;
   uint64_t intervals_ = 0;
 };
 

@@ -19,6 +19,7 @@
 #include "tools/memory.h"
 #include "tools/options.h"
 #include "tools/stop_signals.h"
+#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -26,21 +27,10 @@ namespace {
 using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 
-// Appends a field of CSV, in quotes when it needs them.
-void AppendField(std::string *row, std::string_view field) {
-  if (field.find_first_of(",\"\r\n") == std::string_view::npos) {
-    row->append(field);
-    return;
-  }
-  *row += '"';
-  for (const char c : field) row->append(c == '"' ? 2 : 1, c);
-  *row += '"';
-}
-
 void AppendRow(const fleet::Row &row, std::string *rows) {
-  AppendField(rows, row.file.name);
+  AppendCsvField(rows, row.file.name);
   *rows += ',';
-  AppendField(rows, row.file.fault);
+  AppendCsvField(rows, row.file.fault);
   for (size_t i = 0; i < row.values.size(); ++i) {
     *rows += ',';
     if (row.present[i] == 0) continue;

@@ -59,6 +59,16 @@ bool IsValidText(std::string_view text) { return utf8::is_valid(text.begin(), te
 
 std::string ValidText(std::string_view text) { return Clean(text, IsAnything, "\xef\xbf\xbd"); }
 
+void AppendCsvField(std::string *row, std::string_view field) {
+  if (field.find_first_of(",\"\r\n") == std::string_view::npos) {
+    row->append(field);
+    return;
+  }
+  *row += '"';
+  for (const char c : field) row->append(c == '"' ? 2 : 1, c);
+  *row += '"';
+}
+
 std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most) {
   uint64_t number = 0;
   const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);

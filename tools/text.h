@@ -21,6 +21,9 @@ size_t IncompleteEnd(std::string_view text);
 bool IsValidText(std::string_view text);
 std::string ValidText(std::string_view text);
 
+// Appends a field of CSV (RFC 4180), in quotes where it needs them.
+void AppendCsvField(std::string *row, std::string_view field);
+
 // A whole number of decimal digits and nothing else, at most `most`.
 std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most);
 

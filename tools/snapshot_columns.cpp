@@ -1,0 +1,73 @@
+// The numbers of a snapshot's records as columns.
+
+#include "tools/snapshot_columns.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <set>
+
+#include "morwick/little_endian.h"
+
+namespace tools {
+namespace {
+
+// Above what any controller would have. The fields' names take time by their number squared.
+constexpr uint32_t kMostFields = 1024;
+constexpr uint64_t kMostColumns = 16384;
+
+uint32_t FieldCount(const char *header) {
+  return LoadLittleEndian32(
+      header + LoadLittleEndian32(header + offsetof(SnapshotHeader, descriptorTableOffset)));
+}
+
+}  // namespace
+
+SnapshotColumns::SnapshotColumns(const char *header) : fixed_(header == nullptr) {
+  if (header != nullptr && FieldCount(header) > kMostFields) {
+    fault_ = "describes more than " + std::to_string(kMostFields) + " fields";
+    return;
+  }
+  std::set<std::string> names;
+  MorwickSnapshotField field;
+  for (uint32_t i = 0; MorwickSnapshotFieldAt(header, i, &field) != 0; ++i) {
+    if (i == 0) emptyOffset_ = field.offset;
+    if (columns_.size() + field.priorities * 3ULL > kMostColumns) {
+      fault_ = "describes more than " + std::to_string(kMostColumns) + " numbers";
+      columns_.clear();
+      return;
+    }
+    if (field.kind == kMorwickFieldWithoutNumber) continue;
+    const bool isTriple = field.kind == kMorwickFieldPriorities;
+    for (uint32_t part = 0; part < (isTriple ? 3 : 1); ++part) {
+      const auto &[label, column] = field.names[part];
+      for (uint32_t k = 0; k < std::max(field.priorities, 1U); ++k) {
+        std::string name = column;
+        if (isTriple) name.append("_").append(std::to_string(k));
+        // Labels differ, but one may be RO_0 and another the RO of priorities.
+        while (!names.insert(name).second) name += "_2";
+        const size_t offset =
+            field.offset + k * sizeof(SnapshotOperations) + part * sizeof(uint32_t);
+        columns_.push_back({name, label, field.kind, static_cast<uint32_t>(offset)});
+      }
+    }
+  }
+  if (columns_.empty()) fault_ = "describes no number that is printed";
+}
+
+std::vector<uint32_t> SnapshotColumns::OffsetsOf(std::string_view label) const {
+  std::vector<uint32_t> offsets;
+  for (const SnapshotColumn &column : columns_) {
+    if (column.label == label && column.kind != kMorwickFieldThousandths) {
+      offsets.push_back(column.offset);
+    }
+  }
+  return offsets;
+}
+
+bool SnapshotColumns::LeavesOut(std::string_view record) const {
+  if (fixed_) return false;
+  return uint64_t{emptyOffset_} + sizeof(uint32_t) > record.size() ||
+         LoadLittleEndian32(&record[emptyOffset_]) == 0;
+}
+
+}  // namespace tools
