@@ -174,7 +174,9 @@ inline constexpr FixedField kFixedFields[] = {
 #undef FIELD
 
 constexpr Field FixedFieldAt(size_t index) {
-  return ReadField(kFixedFields[index].descriptor, sizeof(SnapshotRecord));
+  // A copy: under UndefinedBehaviorSanitizer GCC compares no address of a global when it compiles.
+  const SnapshotFieldDescriptor descriptor = kFixedFields[index].descriptor;
+  return ReadField(descriptor, sizeof(SnapshotRecord));
 }
 
 }  // namespace morwick
