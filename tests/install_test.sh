@@ -85,7 +85,7 @@ if [ "$platform" = simulated ]; then
   GRELLON_SCENARIO=$scenarios/empty.toml "$prefix/sbin/grellon" 2>&1 | grep -q "stopping grellon"
   GRELLON_SCENARIO=$scenario "$prefix/bin/morwick" find >/dev/null 2>&1
 fi
-(cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/libmorwick.3 \
+(cd "$prefix/share" && ls man/man8/grellon.8 man/man1/morwick.1 man/man3/{libmorwick,morwick_records}.3 \
   bash-completion/completions/morwick doc/morwick/CHANGES.md morwick/docs/scenario.md morwick/docs/morwick.schema.json \
   morwick/docs/archive.md morwick/docs/fleet.md morwick/packaging/prometheus/morwick.rules.yml morwick/packaging/grafana/morwick.json \
   morwick/examples/latency.gp morwick/examples/fleet.py morwick/examples/fleet.png) >/dev/null
@@ -96,7 +96,7 @@ build_and_consume "$prefix" given
 (
   cd "$work"
   # shellcheck disable=SC2046,SC2086  # lists of flags
-  cc -std=c11 -Wall -Wextra -Werror $flags "$prefix/share/morwick/examples/inspect.c" -o inspect \
+  cc -std=c11 -Wall -Wextra -Werror $flags "$prefix/share/doc/libmorwick-dev/examples/inspect.c" -o inspect \
     $(pkg-config --cflags --libs morwick)
   export LD_LIBRARY_PATH=$prefix/lib
   if [ "$platform" = simulated ]; then
