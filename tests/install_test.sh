@@ -127,6 +127,6 @@ build_and_consume "$prefix" given
 
 cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \
   -DCMAKE_C_FLAGS="$flags" -DCMAKE_CXX_FLAGS="$flags" >/dev/null
-cmake --build "$work/static" --target morwick >/dev/null
+cmake --build "$work/static" --target morwick header-pages >/dev/null
 cmake --install "$work/static" --prefix "$work/archives" --component libmorwick-dev >/dev/null
 build_and_consume "$work/archives" static
