@@ -44,13 +44,15 @@ struct Entries {
 // sort like the paths of their files. Returns the error number as in errno.
 int ListFolder(const std::string &path, std::vector<std::string> *names) {
   Entries entries;
-  const int count = scandir(path.c_str(), &entries.list, nullptr, nullptr);
+  const auto isOther = [](const dirent *entry) {
+    return std::strcmp(entry->d_name, ".") == 0 || std::strcmp(entry->d_name, "..") == 0 ? 0 : 1;
+  };
+  const int count = scandir(path.c_str(), &entries.list, isOther, nullptr);
   if (count < 0) return errno;
   entries.count = count;
   for (int i = 0; i < count; ++i) {
     const dirent &entry = *entries.list[i];
     std::string name = entry.d_name;
-    if (name == "." || name == "..") continue;
     const bool isUnclear = entry.d_type == DT_LNK || entry.d_type == DT_UNKNOWN;
     if (isUnclear ? IsFolder(path + name) : entry.d_type == DT_DIR) name += '/';
     names->push_back(std::move(name));

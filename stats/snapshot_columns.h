@@ -35,14 +35,14 @@ inline constexpr std::array<Column, kColumnCount> kColumns = [] {
     column->label[label.length] = '\0';
     ++column;
   };
-  for (size_t i = 0; i < std::size(kFixedFields); ++i) {
+  for (size_t i = 0; i != std::size(kFixedFields); ++i) {
     const Field field = FixedFieldAt(i);
     const auto &[texts, conversions, conversionCount] = field.format;
     if (field.kind == Field::kPriorities) {
       for (const TriplePart &part : kTripleParts) {
         for (uint32_t k = 0; k < field.priorities; ++k) {
           add(k == 0 ? TripleLabel(field, part) : FormatText{"/", 1},
-              field.offset + k * kTripleSize + part.offset, part.width, ' ');
+              field.offset + uint64_t{k} * kTripleSize + part.offset, part.width, ' ');
         }
       }
       continue;
@@ -59,7 +59,7 @@ inline constexpr std::array<Column, kColumnCount> kColumns = [] {
 static_assert(kColumns.back().width > 0, "there are fewer columns");
 static_assert(
     [] {
-      for (size_t i = 0; i < std::size(kFixedFields); ++i) {
+      for (size_t i = 0; i != std::size(kFixedFields); ++i) {
         const Field field = FixedFieldAt(i);
         const auto &[texts, conversions, conversionCount] = field.format;
         for (size_t k = 0; k < conversionCount; ++k) {

@@ -28,7 +28,8 @@ void *calloc(size_t number, size_t size) { return Refuses() ? NULL : __libc_call
 
 void *realloc(void *block, size_t size) { return Refuses() ? NULL : __libc_realloc(block, size); }
 
-/* For a process that chooses itself: counts anew, and refuses that one. Returns the number so far. */
+/* For a process that chooses itself: counts anew, and refuses that one. Returns the number so far.
+ */
 unsigned long RefuseAllocation(unsigned long number) {
   refused = number;
   return atomic_exchange(&count, 0);

@@ -135,7 +135,7 @@ class LineKernelTest : public testing::TestWithParam<size_t> {
   std::mt19937_64 random_{1};
 };
 
-INSTANTIATE_TEST_SUITE_P(, LineKernelTest,
+INSTANTIATE_TEST_SUITE_P(Each, LineKernelTest,
                          testing::Range<size_t>(0, morwick::LineKernels().size() - 1));
 
 TEST_P(LineKernelTest, WritesNumbersOfEachLengthInEachColumn) {

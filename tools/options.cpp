@@ -27,6 +27,7 @@ std::string FormatName(Format format) {
 
 void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &choices) {
   std::vector<std::string> names;
+  names.reserve(choices.size());
   for (const Format choice : choices) names.push_back(FormatName(choice));
   *format = choices.front();
   const auto take = [=](const std::string &name) {

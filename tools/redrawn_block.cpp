@@ -16,7 +16,7 @@ void RedrawnBlock::Draw(std::vector<std::string> lines) {
 }
 
 void RedrawnBlock::DrawAgain() {
-  const auto [rows, columns] = output_.Window();
+  const auto [rows, columns] = Output::Window();
   // After a resize, a line that is wider than the window takes several of its rows.
   size_t up = 0;
   for (const size_t length : drawn_) up += length == 0 ? 1 : (length + columns - 1) / columns;

@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <charconv>
 #include <chrono>
+#include <cstdio>
 #include <cstring>
 #include <memory>
 #include <optional>
@@ -66,7 +67,7 @@ class Progress {
   }
 
   void Clear() {
-    if (there_) fmt::print(stderr, "\r\033[K");
+    if (there_) std::fputs("\r\033[K", stderr);
     there_ = false;
   }
 
