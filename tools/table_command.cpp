@@ -201,6 +201,7 @@ Status PrintTable(Options options) {
   StopSignals signals;
   Output output;
   PrintHeading(output, *options.table.selection);
+  output.Flush();
   KeepThreadsSmall();
   const auto status = PrintRows(options, list, total, showProgress, output);
   if (StopSignals::Stopped() != 0) {
