@@ -80,7 +80,8 @@ void CheckNames(MorwickStream stream, std::string_view text) {
 
 // Each name that is not empty is handed out once, in an empty folder, where no name is a folder.
 void CheckList(char end, std::string_view text) {
-  if (text.empty() || text.find_first_of("/.") != std::string_view::npos) return;
+  if (text.empty() || text.find_first_of("/.-") != std::string_view::npos) return;
+  if (end == '\n') text = text.substr(0, text.find('\0'));  // refused from there on
   std::vector<std::string> expected;
   std::istringstream names{std::string(text)};
   for (std::string name; std::getline(names, name, end);) {
