@@ -22,7 +22,7 @@ class Connection {
   std::string name() const { return row_->className; }
   bool Offers(py::handle kind) const;
   py::bytes Read(py::handle kind);
-  // Raises what the driver says; the handle is gone all the same, and once only.
+  // Raises what the driver says; the handle is closed in any case, and only once.
   void Close();
 
  private:

@@ -25,7 +25,7 @@ inline uint32_t ColumnValue(const Column &column, const uint8_t *record) {
   return value;
 }
 
-// Writes the record's line and returns its end. `line` has room for kLineRoom characters; behind
+// Writes the record's line and returns its end. `line` has room for kLineRoom characters; after
 // the line anything may be left there.
 using LineWriter = char *(char *line, const uint8_t *record);
 

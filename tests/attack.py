@@ -262,7 +262,7 @@ def carry_out(attack, jobs, pool):
     return len(times), sum(found), max(times)
 
 
-for ignored in STOP:  # by whoever runs this in the background, and then by all that it runs
+for ignored in STOP:  # a shell ignores it for background jobs, and so do all programs that they start
     signal.signal(ignored, signal.SIG_DFL)
 shutil.rmtree(ROOT, ignore_errors=True)
 os.makedirs(ROOT)

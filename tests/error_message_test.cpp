@@ -1,4 +1,4 @@
-// The error message: the first of the process, whole, whoever reports it.
+// The error message is the first one of the process, complete, from any thread.
 
 #include "morwick/error_message.h"
 

@@ -22,7 +22,7 @@ namespace {
 constexpr auto kFixed = KVRParseSnapshotBuffer;
 constexpr auto kDescribed = KVRParseSnapshotBufferWithInplaceParser;
 
-// What a call left behind.
+// The result of a call.
 struct Rendered {
   uint64_t result;
   uint64_t size;  // as the call set it
@@ -286,7 +286,7 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
 
 TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
   const std::string records(reinterpret_cast<const char *>(kWords), kSize);
-  const std::string legend = Render("", 1338).text;  // no room for the line end behind it
+  const std::string legend = Render("", 1338).text;  // no room for the line end after it
   // What the header says where no record is printed: the numbers and the text, and a table nowhere.
   const auto bare = [](std::string header) {
     constexpr uint32_t kNowhere = 0xfffffff0;

@@ -197,7 +197,7 @@ Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, uint64
     return kBadData;
   }
   if (records.rest() > records.recordSize()) {  // more than the record that is not printed
-    Note(snapshot.name, "goes on behind the " + ofPromised());
+    Note(snapshot.name, "goes on after the " + ofPromised());
   }
   return kGood;
 }

@@ -47,7 +47,7 @@ class SnapshotRecords {
   uint64_t most_;
   uint64_t count_ = 0;
   std::string buffer_;
-  size_t filled_ = 0;  // behind the room of one record
+  size_t filled_ = 0;  // after the room of one record
   size_t used_ = 0;    // of what is filled, the block that was handed out
 };
 

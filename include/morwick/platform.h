@@ -1,7 +1,7 @@
 /*
  * The platform contract: the driver registry, driver connections, the background-activity scheduler
  * and the system log. Library and daemon are written against it, tools call the driver through it,
- * and whoever ports them implements it.
+ * and a port to another system implements it.
  *
  * PORTING. A platform is a folder under platform/ whose CMakeLists.txt makes the library target
  * `morwick-platform`, which defines every function below with C linkage. Configure with

@@ -45,7 +45,7 @@ enum { kMorwickFieldNameRoom = 32 };
  *
  * The column is the label, or the name that says more, where the fixed layout has a field of that
  * kind and label: TH_us for TH, BF_fragments for BF, and BF_high_water for what a format such as
- * "/%2u" prints right behind BF. A label that came before stays as it is, and what is behind it.
+ * "/%2u" prints right after BF. A label that came before stays as it is, and what is behind it.
  */
 typedef struct MorwickFieldName {
   char label[kMorwickFieldNameRoom];
@@ -63,7 +63,7 @@ typedef struct MorwickSnapshotField {
 
 /*
  * Sets `*field` to the field with that index, counted from 0 in print order, and returns 1. Returns
- * 0, and leaves it alone, behind the last one. A null header stands for the fixed layout; any other
+ * 0, and leaves it alone, after the last one. A null header stands for the fixed layout; any other
  * must have passed MorwickCheckSnapshotHeader, and may have any alignment. A null field gets 0.
  *
  * A field whose kind is not kMorwickFieldWithoutNumber lies in the records that the header

@@ -380,7 +380,7 @@ class Controller:
 
     def close(self) -> None:
         """Closes the connection; a second time does nothing. ControllerError: the driver says
-        that it failed; the connection is gone all the same."""
+        that it failed; the connection is closed in any case."""
         _native.close(self._connection)
 
     def __enter__(self) -> Controller:
