@@ -23,6 +23,7 @@ uint32_t MorwickFindService(const NandExporter *row) {
 
 MorwickReadResult MorwickReadBuffer(uint32_t connection, const NandExporter *row,
                                     const SelectorPair *selectors, MorwickBuffer *buffer) {
+  if (buffer == nullptr) return kMorwickReadFailed;
   *buffer = {};
   if (row == nullptr || selectors == nullptr) return kMorwickReadFailed;
   const MorwickRequest request = MorwickMakeRequest(selectors, 0);

@@ -46,7 +46,11 @@ py::bytes AsBytes(py::handle object, const char *name) {
 
 Buffer::Buffer(py::handle object, const char *name) {
   RequireBuffer(object, name);
-  if (PyObject_GetBuffer(object.ptr(), &view_, PyBUF_SIMPLE) != 0) throw py::error_already_set();
+  if (PyObject_GetBuffer(object.ptr(), &view_, PyBUF_SIMPLE) == 0) return;
+  if (PyErr_ExceptionMatches(PyExc_MemoryError) != 0) throw py::error_already_set();
+  // The cause stays attached, such as a view that was released.
+  py::raise_from(PyExc_BufferError, (std::string(name) + " gives no contiguous buffer").c_str());
+  throw py::error_already_set();
 }
 
 std::string_view ViewOf(const py::bytes &bytes) {

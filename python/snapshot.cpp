@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <string>
 
+#include "fleet/dump.h"
 #include "fleet/snapshot_header.h"
 #include "fleet/snapshot_text.h"
 #include "morwick/snapshot.h"
@@ -16,6 +17,7 @@ namespace python {
 namespace {
 
 constexpr uint32_t kMostFields = 1024;  // their names take time by their number squared
+constexpr size_t kLargestHeader = 1 << 20;
 
 // What a header says, or the fixed layout without one.
 struct Layout {
@@ -35,6 +37,9 @@ struct Layout {
 Layout::Layout(py::handle object) : isFixed(object.is_none()) {
   if (isFixed) return;
   header = ViewOf(AsBytes(object, "header"));
+  if (header.size() > kLargestHeader) {
+    throw py::value_error("header: " + fleet::TooLarge(kLargestHeader));
+  }
   const std::string wrong = fleet::CheckSnapshotHeader(header);
   if (!wrong.empty()) throw py::value_error("header: " + wrong);
   const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
@@ -78,11 +83,10 @@ py::object DescribedType(const Layout &layout) {
   py::list types;
   py::list offsets;
   MorwickSnapshotField field;
+  if (MorwickSnapshotFieldAt(layout.header.data(), kMostFields, &field) != 0) {
+    throw py::value_error("header: describes more than " + std::to_string(kMostFields) + " fields");
+  }
   for (uint32_t i = 0; MorwickSnapshotFieldAt(layout.header.data(), i, &field) != 0; ++i) {
-    if (i == kMostFields) {
-      throw py::value_error("header: describes more than " + std::to_string(kMostFields) +
-                            " fields");
-    }
     if (field.kind == kMorwickFieldWithoutNumber) continue;
     names.append(AsText(field.names[0].label));
     offsets.append(field.offset);

@@ -20,7 +20,7 @@ enum {
   kHighestId = 0x30000000 /* of KVR and FTL: a key above it is bad */
 };
 
-/* A record, or what ends the records. Behind the buffer's last whole header id and length are 0. */
+/* A record, or what ends the records. After the buffer's last whole header id and length are 0. */
 struct WalkedRecord {
   uint32_t id;
   uint64_t offset;  /* of the header */

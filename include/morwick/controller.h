@@ -70,8 +70,8 @@ typedef struct MorwickBuffer {
  * Reads a buffer through a connection to the row's driver: the statistics with the pair of
  * `getStatsSelectors`, a snapshot with that of `getSnapshotSelectors` and so on. A reply that fills
  * the room may have been cut: it is asked for again with twice the room. Blocks until the
- * controller has answered. Whatever comes of it `*buffer` is set, and may be freed; it is all zeros
- * with a null row or pair, which fails.
+ * controller has answered. `*buffer` is set in any case, and may be freed. A null row, pair or
+ * buffer fails; the buffer is then all zeros.
  */
 MORWICK_EXPORT MorwickReadResult MorwickReadBuffer(uint32_t connection, const NandExporter *row,
                                                    const SelectorPair *selectors,

@@ -13,7 +13,9 @@
  *         printf("%s = %llu\n", name, (unsigned long long)MorwickValue(&record, i));
  *       }
  *     }
- *     if (record.step != kMorwickEndOfBuffer) printf("ends at %llu\n", record.offset);
+ *     if (record.step != kMorwickEndOfBuffer && record.step != kMorwickEndRecord) {
+ *       printf("bad from offset %llu on\n", (unsigned long long)record.offset);
+ *     }
  *
  * Any alignment will do. kvr_stats.h and msp_stats.h draw the records.
  *
@@ -54,7 +56,8 @@ typedef enum MorwickStep {
 /*
  * A record, or what ended the walk. `values` points into the buffer. With a step other than
  * kMorwickRecord there are no values; `key` is null; and for kMorwickEndOfBuffer and
- * kMorwickPartOfHeader `id` and `length` are 0.
+ * kMorwickPartOfHeader `id` and `length` are 0. For kMorwickPartOfHeader `left` counts the bytes of
+ * that part.
  */
 typedef struct MorwickRecord {
   MorwickStep step;
@@ -88,17 +91,17 @@ MORWICK_EXPORT void MorwickStartRecords(MorwickRecordReader *reader, MorwickStre
                                         const void *buffer, uint64_t size);
 
 /*
- * Hands out the next record and returns 1, or returns 0 at the end, which `*record` then describes;
- * every further call does the same. Records of length 0 are passed over where the parser passes
- * over them, in FTL and MSP.
+ * Sets `*record` to the next record and returns 1. At the end it describes the end there and
+ * returns 0, now and at each later call. In FTL and MSP it passes over records of length 0, as the
+ * parsers do. With a null pointer it returns 0 and sets nothing.
  *
  * The values are those that the stream's parser takes: of a KVR record as many as are configured,
- * which may run on into what follows it, or none where they would run past the end of the buffer;
+ * which may continue in the records after it, or none when they would exceed the buffer;
  * of an FTL or MSP record as many as both the configuration and the record have.
  */
 MORWICK_EXPORT int MorwickNextRecord(MorwickRecordReader *reader, MorwickRecord *record);
 
-/* The value with that index, counted from 0; 0 for an index that there is none at. */
+/* The value with that index, counted from 0; 0 when the record has no such value. */
 MORWICK_EXPORT uint64_t MorwickValue(const MorwickRecord *record, uint32_t index);
 
 /* Room for every name, with its NUL. */
@@ -106,8 +109,9 @@ enum { kMorwickNameRoom = 100 };
 
 /*
  * Writes the name under which a parser adds the value with that index of a record of `valueCount`
- * values, at most kMorwickNameRoom bytes with the NUL, and returns its length without. Null
- * pointers get 0, and where there is a `name` the empty text.
+ * values, at most kMorwickNameRoom bytes with the NUL, and returns its length without. The index is
+ * not compared with `valueCount`. For a null key it returns 0 and writes an empty name; for a null
+ * name it returns 0.
  */
 MORWICK_EXPORT uint32_t MorwickValueName(MorwickStream stream, const MorwickKey *key,
                                          uint32_t valueCount, uint32_t index, char *name);

@@ -6,7 +6,8 @@
  *     MorwickSnapshotField field;
  *     for (uint32_t i = 0; MorwickSnapshotFieldAt(header, i, &field); ++i) {
  *       if (field.kind == kMorwickFieldNumber || field.kind == kMorwickFieldThousandths) {
- *         printf("%s %u\n", field.names[0].column, LoadLittleEndian32(record + field.offset));
+ *         const uint32_t number = LoadLittleEndian32(record + field.offset); // little_endian.h
+ *         printf("%s %u\n", field.names[0].column, number);
  *       }
  *     }
  *
@@ -26,7 +27,7 @@ extern "C" {
 
 typedef enum MorwickFieldKind {
   kMorwickFieldWithoutNumber, /* its descriptor prints nothing, or text alone */
-  kMorwickFieldNumber,        /* 32 bits */
+  kMorwickFieldNumber,        /* 32 bits without a sign, whatever the format prints */
   kMorwickFieldThousandths,   /* 32 bits, stored in thousandths of what is printed */
   kMorwickFieldPriorities     /* SnapshotOperations, one for each priority */
 } MorwickFieldKind;

@@ -34,7 +34,7 @@ enum { kMorwickHeaderTextRoom = 120 };
  * Checks a header of `size` bytes, of any alignment: its text (where the format version asks for
  * it), its descriptor table and its descriptors must lie inside, and its records must have a size.
  * Formats and fields need no check: the renderings look at each themselves. Unless `text` is null
- * it gets what is wrong, in a few words with the value that is, at most kMorwickHeaderTextRoom
+ * it gets the fault in a few words with the bad value, at most kMorwickHeaderTextRoom
  * bytes with the NUL; the empty text for a whole header.
  */
 MORWICK_EXPORT MorwickHeaderFault MorwickCheckSnapshotHeader(const void *header, uint64_t size,

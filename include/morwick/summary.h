@@ -29,7 +29,7 @@ MORWICK_EXPORT uint32_t MorwickSummaryFieldCount(void);
 /* The field with that index, in the order of KVRStatsCxt, counted from 0; null after the last. */
 MORWICK_EXPORT const MorwickSummaryField *MorwickSummaryFieldAt(uint32_t index);
 
-/* A value of a context's field, by its index from 0; 0 for an index that there is none at, and for
+/* A value of a context's field, by its index from 0; 0 when the field has no such value, and for
  * null pointers. A field is 0 too when no buffer had its key. */
 MORWICK_EXPORT uint64_t MorwickSummaryValue(const KVRStatsCxt *ctx,
                                             const MorwickSummaryField *field, uint32_t index);

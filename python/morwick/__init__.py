@@ -88,7 +88,7 @@ class Statistics(Mapping[str, Any]):
     bytes stay as they were when the dump was parsed.
     """
 
-    __slots__ = ("_dump", "_stream", "_values")
+    __slots__ = ("_dump", "_stream")
 
     # Values are arrays too, which have no one truth to compare by.
     __eq__ = object.__eq__
@@ -97,12 +97,9 @@ class Statistics(Mapping[str, Any]):
     def __init__(self, data: Any, stream: str = "kvr") -> None:
         self._dump = _native.parse(data, stream)
         self._stream = stream
-        self._values: dict[str, Any] | None = None
 
     def _all(self) -> dict[str, Any]:
-        if self._values is None:
-            self._values = _native.values(self._dump)
-        return self._values
+        return _native.values(self._dump)
 
     def __getitem__(self, name: str) -> Any:
         return _native.value(self._dump, name)
@@ -162,7 +159,8 @@ def parse(data: Any, stream: str = "kvr") -> Statistics:
 
     `data` is any object with a buffer, such as bytes, bytearray, memoryview, mmap or an array;
     it may be changed afterwards. Bad data is no exception: what could be read is there, and
-    `fault` tells the rest.
+    `fault` tells the rest. Data that gzip has compressed is not unpacked; use gzip.decompress,
+    or `table`, which unpacks files.
 
     TypeError: `data` has no buffer. ValueError: there is no such stream, or `data` has 4 GiB or
     more.
