@@ -11,15 +11,15 @@
 
 namespace fleet {
 
-// Takes a text as it comes. False when no more is wanted.
+// Gets the text piece by piece. Returns false to end the rendering.
 using TakeText = std::function<bool(std::string_view text)>;
 
-// In the fixed layout: the legend, a line for each record, and an empty line at the end.
+// Text of the fixed layout: the legend, a line for each record, and an empty line at the end.
 class FixedText {
  public:
   explicit FixedText(TakeText take) : take_(std::move(take)) {}
 
-  // Each is false when no more is wanted.
+  // Each returns false when `take` has ended the rendering.
   bool Begin();
   bool Print(std::string_view block);
   bool End() { return take_("\n"); }
@@ -32,17 +32,17 @@ class FixedText {
   size_t legend_ = 0;
 };
 
-// In the layout of a header, which is whole. A text of a record that is longer than kMostText
-// is passed over.
+// Text of the layout that a whole header describes. It passes over records whose text is longer
+// than kMostText.
 class DescribedText {
  public:
   static constexpr size_t kMostText = 8 << 20;
 
   DescribedText(TakeText take, std::string header);
 
-  // Prints the records of a block; in front of each block but the first lies room of one record,
-  // which may be read. `passedOver` is called with the index of a record that does not fit. False
-  // when no more is wanted.
+  // Prints the records of a block. Before each block but the first there must be room for one
+  // record that may be read. Calls `passedOver` with the index of each record that does not fit.
+  // False when `take` has ended the rendering.
   bool Print(std::string_view block, const std::function<void(uint32_t index)> &passedOver);
 
  private:

@@ -89,8 +89,8 @@ Name PlainLabel(const Field &field, size_t part) {
   return label;
 }
 
-// The number of a label that came before, from 2 on, and behind those that labels of the layout
-// itself end in; 1 for one that did not.
+// The number that a repeated label gets: from 2 on, and above the numbers at the end of the
+// layout's own labels. 1 for a label that was not there before.
 uint64_t NumberOf(const Layout &layout, uint32_t index, size_t part, std::string_view label) {
   uint64_t before = 0;
   uint64_t largest = 1;
@@ -111,9 +111,8 @@ uint64_t NumberOf(const Layout &layout, uint32_t index, size_t part, std::string
   return before == 0 ? 1 : largest + before;
 }
 
-// The column's name where it says more than the label: of a field that the fixed layout has too, or
-// of a number behind a slash that it has right behind such a field. A label that came before, here
-// or there, has no such name.
+// The column's name when it tells more than the label. Fields of the fixed layout have such names,
+// and so has a number after a slash that follows such a field. A repeated label has none.
 std::string_view ColumnName(const Layout &layout, uint32_t index) {
   const auto isSecond = [](const Field &field) {
     return field.kind == Field::kNumber && field.format.texts[0].view() == "/";

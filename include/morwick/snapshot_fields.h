@@ -46,7 +46,8 @@ enum { kMorwickFieldNameRoom = 32 };
  *
  * The column is the label, or the name that says more, where the fixed layout has a field of that
  * kind and label: TH_us for TH, BF_fragments for BF, and BF_high_water for what a format such as
- * "/%2u" prints right after BF. A label that came before stays as it is, and what is behind it.
+ * "/%2u" prints right after BF. For a repeated label, and for the number right after it, the column
+ * is the label.
  */
 typedef struct MorwickFieldName {
   char label[kMorwickFieldNameRoom];
