@@ -7,11 +7,13 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <charconv>
 #include <chrono>
 #include <cstdio>
 #include <cstring>
 #include <memory>
+#include <new>
 #include <optional>
 
 #include "fleet/table.h"
@@ -96,6 +98,7 @@ bool OpenList(const Options &options, std::FILE **list) {
           : options.list == "-" ? stdin
                                 : std::fopen(options.list.c_str(), "re");
   if (*list != nullptr || options.list.empty()) return true;
+  if (errno == ENOMEM) throw std::bad_alloc();
   Complain(options.list, std::strerror(errno));
   return false;
 }
