@@ -1,7 +1,6 @@
 // Both snapshot renderings, in ns per line of 2,000 records of mixed magnitudes, beside the plain
 // version (one snprintf a piece) and, for the fixed layout, beside libfmt with compiled formats;
-// and the ways to write a line of the fixed layout, also for numbers of up to 26 bits, eight
-// digits.
+// and the ways to write a line of the fixed layout, also for numbers of one length.
 
 #include <benchmark/benchmark.h>
 #include <fmt/compile.h>
@@ -19,8 +18,9 @@ namespace {
 
 constexpr uint32_t kRecords = 2000;
 
-// The last record of the described rendering is never printed, so there is one more.
-template <unsigned kBits = 32>
+// Numbers of up to kBits bits above the smallest one. The last record of the described rendering
+// is never printed, so there is one more.
+template <unsigned kBits = 32, uint32_t kSmallest = 0>
 const std::vector<SnapshotRecord> &Records() {
   static const std::vector<SnapshotRecord> records = [] {
     std::mt19937 random(1);
@@ -28,7 +28,7 @@ const std::vector<SnapshotRecord> &Records() {
     for (SnapshotRecord &record : made) {
       uint32_t words[sizeof record / 4];
       for (uint32_t &word : words) {
-        word = static_cast<uint32_t>(random() >> (32 - kBits) >> random() % kBits);
+        word = kSmallest + static_cast<uint32_t>(random() >> (32 - kBits) >> random() % kBits);
       }
       words[0] |= 1;  // not empty
       std::memcpy(&record, words, sizeof record);
@@ -247,13 +247,13 @@ void Measure(benchmark::State &state) {
   CountLines(state);
 }
 
-template <unsigned kBits>
+template <unsigned kBits, uint32_t kSmallest>
 void MeasureLines(benchmark::State &state, const morwick::LineKernel &kernel) {
   if (!kernel.runs()) return state.SkipWithError("this processor has none");
   for (auto _ : state) {
     char *end = Buffer().data();
     for (uint32_t i = 0; i < kRecords; ++i) {
-      end = kernel.write(end, reinterpret_cast<const uint8_t *>(&Records<kBits>()[i]));
+      end = kernel.write(end, reinterpret_cast<const uint8_t *>(&Records<kBits, kSmallest>()[i]));
     }
     benchmark::DoNotOptimize(end);
   }
@@ -282,8 +282,14 @@ int main(int argc, char **argv) {
   }
   for (const morwick::LineKernel &kernel : morwick::LineKernels()) {
     const std::string name = std::string("line/") + kernel.name;
-    benchmark::RegisterBenchmark((name + "/mixed").c_str(), MeasureLines<32>, kernel);
-    benchmark::RegisterBenchmark((name + "/8 digits").c_str(), MeasureLines<26>, kernel);
+    const auto add = [&](const char *numbers,
+                         void (*measure)(benchmark::State &, const morwick::LineKernel &)) {
+      benchmark::RegisterBenchmark((name + numbers).c_str(), measure, kernel);
+    };
+    add("/mixed", MeasureLines<32, 0>);
+    add("/1 digit", MeasureLines<3, 0>);
+    add("/up to 8 digits", MeasureLines<26, 0>);
+    add("/10 digits", MeasureLines<30, 1U << 31>);
   }
   benchmark::Initialize(&argc, argv);
   benchmark::RunSpecifiedBenchmarks();
