@@ -4,41 +4,15 @@
 
 #include <bit>
 #include <cmath>
-#include <iterator>
-
-namespace {
-
-constexpr uint64_t kPowersOfTen[] = {
-    1,
-    10,
-    100,
-    1000,
-    10000,
-    100000,
-    1000000,
-    10000000,
-    100000000,
-    1000000000,
-    10000000000,
-    100000000000,
-    1000000000000,
-    10000000000000,
-    100000000000000,
-    1000000000000000,
-    10000000000000000,
-    100000000000000000,
-    1000000000000000000,
-};
-
-}  // namespace
 
 uint64_t roundSig(uint64_t value, uint64_t sig) {
+  constexpr uint64_t kMostDropped = 18;  // digits
   if (value == 0) return 0;
   const auto digits = static_cast<uint64_t>(std::log10(static_cast<double>(value)) + 1.0);
   if (digits <= sig) return value;
-  const uint64_t dropped = digits - sig;
-  if (dropped >= std::size(kPowersOfTen)) return 0;
-  const uint64_t divisor = kPowersOfTen[dropped];
+  if (digits - sig > kMostDropped) return 0;
+  uint64_t divisor = 1;
+  for (uint64_t kept = sig; kept < digits; ++kept) divisor *= 10;
   uint64_t quotient = value / divisor;
   if (value % divisor >= divisor / 2) ++quotient;
   uint64_t rounded = 0;
