@@ -10,8 +10,7 @@
 #include "bench/streams.h"
 #include "morwick/morwick.h"
 #include "stats/entry_list.h"
-#include "stats/msp_keys.h"
-#include "stats/stats_keys.h"
+#include "stats/key_table.h"
 
 namespace {
 

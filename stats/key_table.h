@@ -69,6 +69,12 @@ consteval Table MakeKeyTable(const std::array<KeyRow, kRowCount> &rows) {
   return table;
 }
 
+// Of the 64-bit statistics record stream, and of the MSP statistics record stream.
+using StatsKeyTable = KeyTable<1, 659, 568>;
+using MSPKeyTable = KeyTable<4096, 4119, 95>;
+extern const StatsKeyTable kStatsKeys;
+extern const MSPKeyTable kMSPKeys;
+
 }  // namespace morwick
 
 #endif

@@ -1,7 +1,7 @@
 // The keys of the MSP statistics record stream, in id order: id, name, 32-bit elements. Names are
 // published letter for letter.
 
-#include "stats/msp_keys.h"
+#include "stats/key_table.h"
 
 namespace morwick {
 namespace {

@@ -1,7 +1,7 @@
 // The keys of the 64-bit statistics record stream, in id order: id, name, 64-bit elements. Names
 // are published letter for letter, odd spellings included.
 
-#include "stats/stats_keys.h"
+#include "stats/key_table.h"
 
 namespace morwick {
 namespace {

@@ -6,9 +6,8 @@
 #include <cstdint>
 #include <string_view>
 
-#include "stats/msp_keys.h"
+#include "stats/key_table.h"
 #include "stats/record_walk.h"
-#include "stats/stats_keys.h"
 
 namespace morwick {
 
