@@ -26,39 +26,21 @@ std::string FaultOf(int error) {
   return std::strerror(error);
 }
 
-// The entries of a folder, which scandir allocates.
-struct Entries {
-  dirent **list = nullptr;
-  int count = 0;
-
-  Entries() = default;
-  Entries(const Entries &) = delete;
-  Entries &operator=(const Entries &) = delete;
-  ~Entries() {
-    for (int i = 0; i < count; ++i) std::free(list[i]);
-    std::free(list);
-  }
-};
-
 // Lists the names in a folder, sorted by bytes. Names of folders end with a slash, so that they
 // sort like the paths of their files. Returns the error number as in errno.
 int ListFolder(const std::string &path, std::vector<std::string> *names) {
-  Entries entries;
-  const auto isOther = [](const dirent *entry) {
-    return std::strcmp(entry->d_name, ".") == 0 || std::strcmp(entry->d_name, "..") == 0 ? 0 : 1;
-  };
-  const int count = scandir(path.c_str(), &entries.list, isOther, nullptr);
-  if (count < 0) return errno;
-  entries.count = count;
-  for (int i = 0; i < count; ++i) {
-    const dirent &entry = *entries.list[i];
-    std::string name = entry.d_name;
-    const bool isUnclear = entry.d_type == DT_LNK || entry.d_type == DT_UNKNOWN;
-    if (isUnclear ? IsFolder(path + name) : entry.d_type == DT_DIR) name += '/';
+  const std::unique_ptr<DIR, int (*)(DIR *)> folder(opendir(path.c_str()), closedir);
+  if (folder == nullptr) return errno;
+  for (errno = 0; const dirent *entry = readdir(folder.get()); errno = 0) {
+    std::string name = entry->d_name;
+    if (name == "." || name == "..") continue;
+    const bool isUnclear = entry->d_type == DT_LNK || entry->d_type == DT_UNKNOWN;
+    if (isUnclear ? IsFolder(path + name) : entry->d_type == DT_DIR) name += '/';
     names->push_back(std::move(name));
   }
+  const int error = errno;
   std::ranges::sort(*names);
-  return 0;
+  return error;
 }
 
 }  // namespace
@@ -129,8 +111,9 @@ bool FileList::Enter(const std::string &path, ListedFile *file) {
   if (isAbove) return refuse("a link back to a folder that contains it");
   Folder folder = {path, {}, 0, status.st_dev, status.st_ino};
   const int error = ListFolder(path, &folder.names);
+  if (error != 0) return refuse(FaultOf(error));
   folders_.push_back(std::move(folder));
-  return error != 0 && refuse(FaultOf(error));
+  return false;
 }
 
 // Returns the next file of the innermost folder, or the fault of a folder in it. False when the
