@@ -11,27 +11,12 @@
 #include <cstring>
 #include <new>
 
+#include "fleet/descriptor.h"
+
 namespace fleet {
 namespace {
 
 constexpr size_t kFirstRoom = 256 << 10;
-
-class OpenFile {
- public:
-  explicit OpenFile(int descriptor) : descriptor_(descriptor) {}
-  ~OpenFile() {
-    if (descriptor_ >= 0) close(descriptor_);
-  }
-  OpenFile(const OpenFile &) = delete;
-  OpenFile &operator=(const OpenFile &) = delete;
-
-  int descriptor() const { return descriptor_; }
-
- private:
-  int descriptor_;
-};
-
-std::string Fault(int error) { return std::strerror(error); }
 
 }  // namespace
 
@@ -43,15 +28,15 @@ DumpReader::Dump DumpReader::Read(const char *name, bool onlyFiles) {
     return {{}, "not a regular file"};
   }
   // O_NONBLOCK: a pipe may have taken the file's place, and opening it would wait for a writer.
-  const OpenFile file(std::strcmp(name, "-") == 0
-                          ? fcntl(STDIN_FILENO, F_DUPFD_CLOEXEC, 0)
-                          : open(name, O_RDONLY | O_CLOEXEC | (onlyFiles ? O_NONBLOCK : 0)));
-  if (file.descriptor() < 0) return {{}, Fault(errno)};
+  const Descriptor file(std::strcmp(name, "-") == 0
+                            ? fcntl(STDIN_FILENO, F_DUPFD_CLOEXEC, 0)
+                            : open(name, O_RDONLY | O_CLOEXEC | (onlyFiles ? O_NONBLOCK : 0)));
+  if (!file.open()) return {{}, std::strerror(errno)};
   GzipReader reader([&](char *bytes, size_t room) -> ReadResult {
     for (;;) {
-      const ssize_t count = read(file.descriptor(), bytes, room);
+      const ssize_t count = read(file.number(), bytes, room);
       if (count >= 0) return {static_cast<size_t>(count), ""};
-      if (errno != EINTR) return {0, Fault(errno)};
+      if (errno != EINTR) return {0, std::strerror(errno)};
     }
   });
   size_t size = 0;

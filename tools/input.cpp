@@ -62,7 +62,7 @@ fleet::ReadResult Input::ReadRaw(char *bytes, size_t room) {
       ShowProgress();
       return {static_cast<size_t>(count), ""};
     }
-    if (!CanTryAgain(descriptor_, POLLIN)) error_ = errno;
+    if (!fleet::CanTryAgain(descriptor_, POLLIN)) error_ = errno;
   }
   return {0, std::strerror(error_)};
 }

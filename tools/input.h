@@ -6,8 +6,8 @@
 #include <optional>
 #include <string>
 
+#include "fleet/descriptor.h"
 #include "fleet/gzip.h"
-#include "tools/descriptor.h"
 #include "tools/messages.h"
 
 namespace tools {
@@ -40,7 +40,7 @@ class Input {
   void ClearProgress();
 
   std::string name_;
-  Descriptor file_;
+  fleet::Descriptor file_;
   int descriptor_;  // of the file, or standard input
   int error_ = 0;   // of opening it
   uint64_t size_ = 0;

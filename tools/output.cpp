@@ -14,7 +14,7 @@
 #include <cstring>
 #include <utility>
 
-#include "tools/descriptor.h"
+#include "fleet/descriptor.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -59,7 +59,7 @@ bool Output::Flush() {
 }
 
 void Output::Control(std::string_view sequence) {
-  if (Flush()) error_ = WriteAll(outputDescriptor, sequence);
+  if (Flush()) error_ = fleet::WriteAll(outputDescriptor, sequence);
 }
 
 Output::Size Output::Window() {
@@ -77,7 +77,7 @@ bool Output::WaitWithReader(const timespec &time, const sigset_t &mask) {
 
 bool Output::WriteOut(std::string_view bytes) {
   if (error_ == 0) {
-    error_ = WriteAll(outputDescriptor, terminal_ ? PrintableText(bytes) : bytes);
+    error_ = fleet::WriteAll(outputDescriptor, terminal_ ? PrintableText(bytes) : bytes);
   }
   return error_ == 0;
 }

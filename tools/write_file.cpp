@@ -14,13 +14,15 @@
 #include <filesystem>
 #include <random>
 
-#include "tools/descriptor.h"
+#include "fleet/descriptor.h"
 #include "tools/output.h"
 #include "tools/text.h"
 
 namespace tools {
 namespace {
 
+using fleet::Descriptor;
+using fleet::WriteAll;
 using std::filesystem::path;
 
 constexpr int kMostLinks = 40;  // the kernel's own limit

@@ -1,12 +1,12 @@
 // File descriptors.
 
-#include "tools/descriptor.h"
+#include "fleet/descriptor.h"
 
 #include <poll.h>
 
 #include <cerrno>
 
-namespace tools {
+namespace fleet {
 
 bool CanTryAgain(int descriptor, short events) {
   if (errno == EINTR) return true;
@@ -27,4 +27,4 @@ int WriteAll(int descriptor, std::string_view bytes) {
   return 0;
 }
 
-}  // namespace tools
+}  // namespace fleet

@@ -1,13 +1,13 @@
 // File descriptors.
-#ifndef TOOLS_DESCRIPTOR_H
-#define TOOLS_DESCRIPTOR_H
+#ifndef FLEET_DESCRIPTOR_H
+#define FLEET_DESCRIPTOR_H
 
 #include <unistd.h>
 
 #include <string_view>
 #include <utility>
 
-namespace tools {
+namespace fleet {
 
 // A descriptor that its owner closes.
 class Descriptor {
@@ -37,6 +37,6 @@ bool CanTryAgain(int descriptor, short events);
 // Writes all bytes and waits when it must. Returns 0, or the error number as in errno.
 int WriteAll(int descriptor, std::string_view bytes);
 
-}  // namespace tools
+}  // namespace fleet
 
 #endif
