@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <charconv>
 #include <cstddef>
 #include <unordered_set>
 #include <utility>
@@ -24,10 +23,9 @@ static_assert(offsetof(KVRStatsCxt, valuesHead) == offsetof(GenericParserCxt, va
 
 // Whether the name consists of `base` and that number.
 bool IsElement(std::string_view name, std::string_view base, size_t number) {
-  char digits[20];
-  const char *end = std::to_chars(digits, std::end(digits), number).ptr;
+  const fmt::format_int digits(number);
   return name.starts_with(base) &&
-         name.substr(base.size()) == std::string_view(digits, static_cast<size_t>(end - digits));
+         name.substr(base.size()) == std::string_view(digits.data(), digits.size());
 }
 
 }  // namespace

@@ -49,10 +49,6 @@ struct Entry {
 // Goes through the entries in their order. With a filter it passes over those that do not match.
 class EntryIterator {
  public:
-  using value_type = Entry;
-  using difference_type = std::ptrdiff_t;
-
-  EntryIterator() = default;
   EntryIterator(Entry entry, const fleet::Selection *filter) : entry_(entry), filter_(filter) {
     PassOver();
   }
@@ -64,14 +60,6 @@ class EntryIterator {
     PassOver();
     return *this;
   }
-  EntryIterator operator++(int) {
-    const EntryIterator before = *this;
-    ++*this;
-    return before;
-  }
-  bool operator==(const EntryIterator &other) const {
-    return entry_.nameNode == other.entry_.nameNode;
-  }
   bool operator==(std::default_sentinel_t) const { return entry_.nameNode == nullptr; }
 
  private:
@@ -81,8 +69,8 @@ class EntryIterator {
     }
   }
 
-  Entry entry_ = {};
-  const fleet::Selection *filter_ = nullptr;
+  Entry entry_;
+  const fleet::Selection *filter_;
 };
 
 // The lists of a dump, parsed by the functions in its row.
