@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <memory>
 
+#include "tools/aligned_table.h"
 #include "tools/commands.h"
 #include "tools/input.h"
 #include "tools/options.h"
@@ -33,36 +34,25 @@ size_t LabelLength(const EntryGroup &group) {
          std::to_string(group.count - 1).size();
 }
 
-// Labels of equal width, each followed by a colon.
-class Labels {
- public:
-  explicit Labels(Output &output) : output_(output) {}
-
-  void Measure(size_t length) { width_ = std::max(width_, length); }
-
-  void Print(std::string_view label) {
-    static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');
-    output_.Write(label);
-    output_.Write(std::string_view(blanks).substr(0, width_ - label.size()));
-    output_.Write(" : ");
-  }
-
- private:
-  Output &output_;
-  size_t width_ = 0;
-};
+// Each label stands left in the width of the longest one.
+void PrintLabel(Output &output, std::string_view label, size_t width) {
+  static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');
+  output.Write(label);
+  output.Write(std::string_view(blanks).substr(0, width - label.size()));
+  output.Write(" : ");
+}
 
 // Prints each group, so each array, in one line.
 void PrintGroups(Output &output, const Statistics &statistics) {
-  Labels labels(output);
+  size_t width = 0;
   for (EntryGroups groups(statistics); const auto group = groups.Take();) {
-    labels.Measure(LabelLength(*group));
+    width = std::max(width, LabelLength(*group));
   }
   for (EntryGroups groups(statistics); const auto group = groups.Take();) {
     if (group->IsArray()) {
-      labels.Print(fmt::format("{}[0..{}]", group->base, group->count - 1));
+      PrintLabel(output, fmt::format("{}[0..{}]", group->base, group->count - 1), width);
     } else {
-      labels.Print(group->base);
+      PrintLabel(output, group->base, width);
     }
     group->ForEach([&](const Entry &entry, size_t i) {
       if (i > 0) output.Put(' ');
@@ -73,26 +63,23 @@ void PrintGroups(Output &output, const Statistics &statistics) {
 }
 
 void PrintEntries(Output &output, const Statistics &statistics) {
-  Labels labels(output);
-  for (const Entry &entry : statistics) labels.Measure(entry.name().size());
+  size_t width = 0;
+  for (const Entry &entry : statistics) width = std::max(width, entry.name().size());
   for (const Entry &entry : statistics) {
-    labels.Print(entry.name());
+    PrintLabel(output, entry.name(), width);
     output.Write(entry.digits());
     output.Put('\n');
   }
 }
 
 void PrintSummary(Output &output, const Statistics &statistics) {
-  const std::vector<fleet::Figure> figures = SummaryOf(statistics);
-  Labels labels(output);
-  for (const fleet::Figure &figure : figures) labels.Measure(figure.name.size());
-  for (const fleet::Figure &figure : figures) {
-    labels.Print(figure.name);
-    for (size_t i = 0; i < figure.values.size(); ++i) {
-      output.Write(fmt::format("{}{}", i > 0 ? " " : "", figure.values[i]));
-    }
-    output.Write((figure.ratio ? ThreeDecimals(*figure.ratio) : "") + "\n");
+  AlignedTable table(1, 1);
+  for (const fleet::Figure &figure : SummaryOf(statistics)) {
+    table.Add(
+        {std::string(figure.name), fmt::format(": {}{}", fmt::join(figure.values, " "),
+                                               figure.ratio ? ThreeDecimals(*figure.ratio) : "")});
   }
+  table.Print(output);
 }
 
 void PrintCsv(Output &output, const Statistics &statistics) {
