@@ -18,7 +18,7 @@ using bench::Stream;
 
 // The plain version: the same walk and the same lists.
 template <typename Context>
-bool PlainAdd(Context *context, const char *prefix, const char *name, uint64_t value) {
+void PlainAdd(Context *context, const char *prefix, const char *name, uint64_t value) {
   auto *valueNode = static_cast<ContextNode *>(std::calloc(1, sizeof(ContextNode)));
   auto *nameNode = static_cast<ContextNode *>(std::calloc(1, sizeof(ContextNode)));
   if (valueNode == nullptr || nameNode == nullptr) std::abort();
@@ -34,7 +34,6 @@ bool PlainAdd(Context *context, const char *prefix, const char *name, uint64_t v
   std::snprintf(nameNode->text, 99, "%s%s", prefix, name);
   std::snprintf(valueNode->text, 99, "%llu", static_cast<unsigned long long>(value));
   valueNode->value = value;
-  return true;
 }
 
 template <typename Element, typename Context>
@@ -51,30 +50,18 @@ void PlainAddAll(Context *context, const char *name, const char *separator, cons
   }
 }
 
-template <typename Context>
-void PlainStats(Context *context, const Stream &stream, const char *separator) {
+// `kUnit` is that of the length in the header, in bytes.
+template <typename Word, size_t kUnit, typename Element, typename Context>
+void PlainParse(Context *context, const Stream &stream, const auto &keys, const char *separator) {
   const char *position = stream.buffer.data();
   const char *end = position + stream.buffer.size();
   while (position < end) {
-    uint32_t header[2];
+    Word header[2];
     std::memcpy(header, position, sizeof header);
-    position += 8;
-    const MorwickKey *key = morwick::kStatsKeys.Find(header[0]);
-    PlainAddAll<uint64_t>(context, key->name, separator, position, key->valueCount);
-    position += size_t{header[1]} * 8;
-  }
-}
-
-void PlainMSP(GenericParserCxt *context, const Stream &stream) {
-  const char *position = stream.buffer.data();
-  const char *end = position + stream.buffer.size();
-  while (position < end) {
-    uint16_t header[2];
-    std::memcpy(header, position, sizeof header);
-    position += 4;
-    const MorwickKey *key = morwick::kMSPKeys.Find(header[0]);
-    PlainAddAll<uint32_t>(context, key->name, "", position, key->valueCount);
-    position += header[1];
+    position += sizeof header;
+    const MorwickKey *key = keys.Find(header[0]);
+    PlainAddAll<Element>(context, key->name, separator, position, key->valueCount);
+    position += header[1] * kUnit;
   }
 }
 
@@ -111,35 +98,26 @@ void KVR(const Stream &stream) {
 
 void PlainKVR(const Stream &stream) {
   KVRStatsCxt context = {};
-  PlainStats(&context, stream, "");
+  PlainParse<uint32_t, 8, uint64_t>(&context, stream, morwick::kStatsKeys, "");
   KVRReleaseContext(&context);
 }
 
-void FTL(const Stream &stream) {
+template <auto *kParse>
+void Generic(const Stream &stream) {
   GenericParserCxt context = {};
-  if (KVRFTLParseBufferToCxt(&context, stream.buffer.data(), Size(stream)) != stream.entries) {
-    std::abort();
-  }
+  if (kParse(&context, stream.buffer.data(), Size(stream)) != stream.entries) std::abort();
   ReleaseGenericParserCxt(&context);
 }
 
 void PlainFTL(const Stream &stream) {
   GenericParserCxt context = {};
-  PlainStats(&context, stream, "_");
+  PlainParse<uint32_t, 8, uint64_t>(&context, stream, morwick::kStatsKeys, "_");
   ReleaseGenericParserCxt(&context);
 }
 
-void MSP(const Stream &stream) {
+void PlainMSP(const Stream &stream) {
   GenericParserCxt context = {};
-  if (KVRMSPParseBufferToCxt(&context, stream.buffer.data(), Size(stream)) != stream.entries) {
-    std::abort();
-  }
-  ReleaseGenericParserCxt(&context);
-}
-
-void PlainMSPAndRelease(const Stream &stream) {
-  GenericParserCxt context = {};
-  PlainMSP(&context, stream);
+  PlainParse<uint16_t, 1, uint32_t>(&context, stream, morwick::kMSPKeys, "");
   ReleaseGenericParserCxt(&context);
 }
 
@@ -206,13 +184,13 @@ const bool kRegistered = [] {
     add("KVR/walk", stats, Walk<kMorwickKVR, uint64_t>);
     add("KVR/plain", stats, PlainKVR);
     add("KVR/heap", stats, Heap);
-    add("FTL/parser", stats, FTL);
+    add("FTL/parser", stats, Generic<KVRFTLParseBufferToCxt>);
     add("FTL/walk", stats, Walk<kMorwickFTL, uint64_t>);
     add("FTL/plain", stats, PlainFTL);
     add("FTL/heap", stats, Heap);
-    add("MSP/parser", msp, MSP);
+    add("MSP/parser", msp, Generic<KVRMSPParseBufferToCxt>);
     add("MSP/walk", msp, Walk<kMorwickMSP, uint32_t>);
-    add("MSP/plain", msp, PlainMSPAndRelease);
+    add("MSP/plain", msp, PlainMSP);
     add("MSP/heap", msp, Heap);
   }
   return true;
