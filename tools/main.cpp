@@ -1,5 +1,7 @@
 // morwick: the command for people and scripts that work with controller statistics.
 
+#include <fmt/format.h>
+
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdio>
@@ -7,6 +9,7 @@
 #include <exception>
 #include <memory>
 #include <new>
+#include <ranges>
 
 #include "tools/commands.h"
 #include "tools/memory.h"
@@ -34,18 +37,14 @@ Status RefuseUsage(const std::string &reason, const std::string &help = "--help"
 }
 
 const CLI::App *FindCommand(const CLI::App &app, const std::string &name) {
-  for (const CLI::App *command : app.get_subcommands({})) {
-    if (command->get_name() == name) return command;
-  }
-  return nullptr;
+  const auto found =
+      app.get_subcommands([&](const CLI::App *command) { return command->get_name() == name; });
+  return found.empty() ? nullptr : found.front();
 }
 
 std::string KnownCommands(const CLI::App &app) {
-  std::string known;
-  for (const CLI::App *command : app.get_subcommands({})) {
-    known += (known.empty() ? "" : ", ") + command->get_name();
-  }
-  return known;
+  const auto names = app.get_subcommands({}) | std::views::transform(&CLI::App::get_name);
+  return fmt::format("{}", fmt::join(names, ", "));
 }
 
 // morwick help [COMMAND]
@@ -65,27 +64,29 @@ void AddHelp(CLI::App &app, Action *action) {
   });
 }
 
-// Returns the first option with an empty value, such as --write=, or nothing. The argument parser
-// would take the next word as its value.
-std::string_view OptionWithEmptyValue(int argc, char **argv) {
+void RefuseMissingValue(const std::string &option) {
+  throw CLI::ValidationError(option, "a value is missing");
+}
+
+// Refuses an option with an empty value, such as --write=. The argument parser would take the next
+// word as its value.
+void RefuseEmptyValues(int argc, char **argv) {
   for (int i = 1; i < argc; ++i) {
     const std::string_view word = argv[i];
     if (word == "--") break;
     if (word.starts_with("--") && word.find('=') == word.size() - 1) {
-      return word.substr(0, word.size() - 1);
+      RefuseMissingValue(std::string(word.substr(0, word.size() - 1)));
     }
   }
-  return {};
 }
 
-// Returns the first option whose value is an empty word, or nothing.
-std::string OptionWithEmptyWord(const CLI::App &command) {
+// Refuses an option whose value is an empty word.
+void RefuseEmptyWords(const CLI::App &command) {
   for (const CLI::Option *option : command.get_options()) {
     if (option->nonpositional() && std::ranges::count(option->results(), "") > 0) {
-      return option->get_name();
+      RefuseMissingValue(option->get_name());
     }
   }
-  return {};
 }
 
 Status Run(int argc, char **argv) {
@@ -107,21 +108,16 @@ Status Run(int argc, char **argv) {
                                       : "'" + first + "' is not a sub-command; choose from ") +
                        KnownCommands(app));
   }
-  if (const std::string option(OptionWithEmptyValue(argc, argv)); !option.empty()) {
-    return RefuseUsage(option + ": a value is missing", "help " + first);
-  }
   try {
+    RefuseEmptyValues(argc, argv);
     app.parse(argc, argv);
+    RefuseEmptyWords(*app.get_subcommands().front());
   } catch (const CLI::CallForHelp &) {
     return Print(app.help());
   } catch (const CLI::CallForVersion &version) {
     return Print(version.what() + std::string("\n"));
   } catch (const CLI::Error &error) {
     return RefuseUsage(error.what(), "help " + first);
-  }
-  if (const std::string option = OptionWithEmptyWord(*app.get_subcommands().front());
-      !option.empty()) {
-    return RefuseUsage(option + ": a value is missing", "help " + first);
   }
   return action();
 }
