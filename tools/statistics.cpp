@@ -34,7 +34,7 @@ Dump ReadDumpFile(const std::string &file, MorwickStream stream, const std::stri
   Dump dump;
   dump.source = {"file", file};
   dump.subject = DisplayName(file);
-  dump.row = className.empty() ? nand_exporters : FindRow(className);
+  dump.row = className.empty() ? nand_exporters : fleet::FindRow(className);
   if (stream == kMorwickMSP && dump.row->mspParseBufferToCxt == nullptr) {
     Complain(dump.subject, std::string(dump.row->className) + " has no MSP statistics");
     dump.status = kBadUsage;
@@ -63,7 +63,8 @@ Dump ReadDumpLive(MorwickStream stream, const std::string &className) {
   return ReadDump(controller, stream);
 }
 
-Statistics::Statistics(const Dump &dump, MorwickStream stream, Filter filter)
+Statistics::Statistics(const Dump &dump, MorwickStream stream,
+                       std::shared_ptr<const fleet::Selection> filter)
     : row_(dump.row), stream_(stream), filter_(std::move(filter)) {
   const char *bytes = dump.bytes->data();
   const auto size = static_cast<uint32_t>(dump.bytes->size());

@@ -3,16 +3,18 @@
 #define TOOLS_STATISTICS_H
 
 #include <iterator>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
+#include "fleet/columns.h"
+#include "fleet/streams.h"
 #include "fleet/summary.h"
 #include "morwick/morwick.h"
 #include "tools/controller.h"
 #include "tools/json.h"
-#include "tools/options.h"
 #include "tools/output.h"
 
 namespace tools {
@@ -76,7 +78,8 @@ class EntryIterator {
 // The lists of a dump, parsed by the functions in its row.
 class Statistics {
  public:
-  Statistics(const Dump &dump, MorwickStream stream, Filter filter = nullptr);
+  Statistics(const Dump &dump, MorwickStream stream,
+             std::shared_ptr<const fleet::Selection> filter);
   ~Statistics();
   Statistics(const Statistics &) = delete;
   Statistics &operator=(const Statistics &) = delete;
@@ -104,7 +107,7 @@ class Statistics {
  private:
   const NandExporter *row_;
   MorwickStream stream_;
-  Filter filter_;
+  std::shared_ptr<const fleet::Selection> filter_;
   uint64_t result_ = 0;
   bool outOfMemory_ = false;
   // Both begin with the same four fields, so the lists can be read from either.
