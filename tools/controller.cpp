@@ -13,14 +13,15 @@ namespace tools {
 // From finding a service to storing the connection no statement may throw: the handle would leak.
 Controller::Controller(const std::string &className, const std::string &what)
     : className_(className), what_(what) {
-  NandExporter *row = FindRow(className);
+  NandExporter *row = fleet::FindRow(className);
   errno = 0;
   const uint32_t service = row == nullptr ? findNandExporter(&row) : MorwickFindService(row);
   if (service != 0) {
     row_ = row;
     const int32_t result = fleet::Open(service, &connection_);
     if (connection_ != 0) return;
-    Complain(name() + ": " + what, "the connection was refused, result " + Hexadecimal(result));
+    Complain(name() + ": " + what,
+             "the connection was refused, result " + fleet::Hexadecimal(result));
   } else if (errno == ENOMEM) {
     RefuseMemory();
   } else if (className.empty()) {
@@ -35,7 +36,8 @@ Controller::~Controller() {
   const int32_t result = CloseService(connection_);
   if (result == 0) return;
   try {
-    Note(name() + ": " + what_, "closing the connection failed, result " + Hexadecimal(result));
+    Note(name() + ": " + what_,
+         "closing the connection failed, result " + fleet::Hexadecimal(result));
   } catch (const std::bad_alloc &) {  // main complains of it
   }
 }

@@ -10,13 +10,7 @@
 namespace tools {
 
 using fleet::BufferKind;
-using fleet::BufferKinds;
 using fleet::FindBufferKind;
-using fleet::FindRow;
-using fleet::Hexadecimal;
-using fleet::KnownControllers;
-using fleet::Presence;
-using fleet::Probe;
 
 // A connection to a controller's driver. The destructor closes it.
 class Controller {

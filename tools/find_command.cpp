@@ -4,9 +4,9 @@
 
 #include <memory>
 
+#include "fleet/controllers.h"
 #include "tools/aligned_table.h"
 #include "tools/commands.h"
-#include "tools/controller.h"
 #include "tools/json.h"
 #include "tools/options.h"
 
@@ -15,7 +15,7 @@ namespace {
 
 struct Finding {
   const NandExporter *row;
-  Presence presence;
+  fleet::Presence presence;
 
   std::string_view State() const {
     return !presence.present ? "absent" : presence.opened ? "present" : "refusing";
@@ -28,10 +28,10 @@ void PrintNormal(Output &output, const std::vector<Finding> &findings) {
   for (const Finding &finding : findings) {
     std::string line = fmt::format(": {}", finding.State());
     if (finding.presence.present && !finding.presence.opened) {
-      line += ", result " + Hexadecimal(finding.presence.result);
+      line += ", result " + fleet::Hexadecimal(finding.presence.result);
     }
     line += ", offers";
-    for (const BufferKind &kind : BufferKinds()) {
+    for (const fleet::BufferKind &kind : fleet::BufferKinds()) {
       if (finding.row->*kind.selectors != nullptr) line += fmt::format(" {}", kind.name);
     }
     table.Add({finding.row->className, line});
@@ -52,7 +52,7 @@ Status PrintJson(Output &output, const std::vector<Finding> &findings, Status st
     }
     json.Key("offers");
     json.BeginArray();
-    for (const BufferKind &kind : BufferKinds()) {
+    for (const fleet::BufferKind &kind : fleet::BufferKinds()) {
       if (finding.row->*kind.selectors != nullptr) json.PlainText(kind.name);
     }
     json.EndArray();
@@ -65,8 +65,8 @@ Status PrintJson(Output &output, const std::vector<Finding> &findings, Status st
 Status Find(Format format) {
   std::vector<Finding> findings;
   Status status = kBadData;
-  for (const NandExporter &row : KnownControllers()) {
-    findings.push_back({&row, Probe(row)});
+  for (const NandExporter &row : fleet::KnownControllers()) {
+    findings.push_back({&row, fleet::Probe(row)});
     if (findings.back().presence.opened) status = kGood;
   }
   Output output;

@@ -6,7 +6,7 @@
 
 #include <algorithm>
 
-#include "tools/controller.h"
+#include "fleet/controllers.h"
 #include "tools/messages.h"
 #include "tools/text.h"
 
@@ -71,7 +71,7 @@ Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std:
 
 void AddController(CLI::App *command, std::string *className, const std::string &description) {
   std::vector<std::string> known;
-  for (const NandExporter &row : KnownControllers()) known.emplace_back(row.className);
+  for (const NandExporter &row : fleet::KnownControllers()) known.emplace_back(row.className);
   command->add_option("-c,--controller", *className, description)->check(CLI::IsMember(known));
 }
 

@@ -39,7 +39,7 @@ void AddRead(CLI::App &app, Action *action) {
   CLI::App *command = app.add_subcommand("read", "Save a buffer of a controller as it came");
   const auto options = std::make_shared<Options>();
   std::vector<std::string> kinds;
-  for (const BufferKind &kind : BufferKinds()) kinds.emplace_back(kind.name);
+  for (const BufferKind &kind : fleet::BufferKinds()) kinds.emplace_back(kind.name);
   kinds.insert(kinds.end(), {"kvr", "ftl"});
   command->add_option("BUFFER", options->kind, "Which buffer")
       ->check(CLI::IsMember(kinds))
