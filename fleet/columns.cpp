@@ -24,10 +24,6 @@ std::string ValueName(MorwickStream stream, const MorwickKey &key, uint32_t coun
   return {name.data(), length};
 }
 
-bool Matches(const std::string &pattern, const std::string &name) {
-  return fnmatch(pattern.c_str(), name.c_str(), 0) == 0;
-}
-
 // How many letters must be inserted, removed or exchanged to turn one text into the other.
 size_t Distance(std::string_view one, std::string_view other) {
   std::vector<size_t> row(other.size() + 1);
@@ -81,7 +77,7 @@ Selection::Selection(std::span<const MorwickStream> streams, std::span<const std
     const bool isPattern = name.find_first_of("*?[") != std::string::npos;
     bool found = false;
     for (const MorwickStream stream : streams) {
-      found = AddNamed(stream, name) || (isPattern && AddMatches(stream, name)) || found;
+      found = AddAll(stream, name, false) || (isPattern && AddAll(stream, name, true)) || found;
     }
     if (found) continue;
     if (isPattern) throw UnknownName("no statistic has a name like '" + name + "'");
@@ -97,26 +93,17 @@ void Selection::Add(MorwickStream stream, const MorwickKey &key, uint32_t index)
   if (index == 0) names_.insert(ValueName(stream, key, 1, 0));
 }
 
-bool Selection::AddNamed(MorwickStream stream, const std::string &name) {
-  for (const MorwickKey *key : KeysOf(stream)) {
-    if (!name.starts_with(key->name)) continue;
-    const bool all = name == key->name || (key->valueCount > 1 && name == LabelOf(stream, *key));
-    for (uint32_t i = 0; i < key->valueCount; ++i) {
-      if (!all && name != ValueName(stream, *key, key->valueCount, i)) continue;
-      Add(stream, *key, i);
-      if (!all) return true;
-    }
-    if (all) return true;
-  }
-  return false;
-}
-
-bool Selection::AddMatches(MorwickStream stream, const std::string &pattern) {
+bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPattern) {
+  const auto matches = [&](const std::string &known) {
+    return isPattern ? fnmatch(name.c_str(), known.c_str(), 0) == 0 : name == known;
+  };
   bool any = false;
   for (const MorwickKey *key : KeysOf(stream)) {
-    const bool all = Matches(pattern, key->name);
+    if (!isPattern && !name.starts_with(key->name)) continue;
+    const bool isLabel = !isPattern && key->valueCount > 1 && name == LabelOf(stream, *key);
+    const bool all = isLabel || matches(key->name);
     for (uint32_t i = 0; i < key->valueCount; ++i) {
-      if (!all && !Matches(pattern, ValueName(stream, *key, key->valueCount, i))) continue;
+      if (!all && !matches(ValueName(stream, *key, key->valueCount, i))) continue;
       Add(stream, *key, i);
       any = true;
     }

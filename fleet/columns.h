@@ -48,8 +48,8 @@ class Selection {
   };
 
   void Add(MorwickStream stream, const MorwickKey &key, uint32_t index);
-  bool AddMatches(MorwickStream stream, const std::string &pattern);
-  bool AddNamed(MorwickStream stream, const std::string &name);
+  // The values of that name, or whose names match the pattern. False when there are none.
+  bool AddAll(MorwickStream stream, const std::string &name, bool isPattern);
 
   std::vector<Column> columns_;
   std::unordered_set<std::string, TextHash, std::equal_to<>> names_;
