@@ -13,12 +13,11 @@
 namespace tools {
 namespace {
 
-constexpr std::pair<std::string_view, Format> kFormats[] = {
-    {"normal", Format::kNormal}, {"json", Format::kJson}, {"csv", Format::kCsv}};
-
-std::string FormatName(Format format) {
-  for (const auto &[name, known] : kFormats) {
-    if (known == format) return std::string(name);
+std::string NameOf(Format format) {
+  switch (format) {
+    case Format::kNormal: return "normal";
+    case Format::kJson: return "json";
+    case Format::kCsv: return "csv";
   }
   return "";
 }
@@ -26,14 +25,11 @@ std::string FormatName(Format format) {
 }  // namespace
 
 void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &choices) {
-  std::vector<std::string> names;
-  names.reserve(choices.size());
-  for (const Format choice : choices) names.push_back(FormatName(choice));
+  std::vector<std::string> names(choices.size());
+  std::ranges::transform(choices, names.begin(), NameOf);
   *format = choices.front();
   const auto take = [=](const std::string &name) {
-    for (const auto &[known, choice] : kFormats) {
-      if (name == known) *format = choice;
-    }
+    *format = *std::ranges::find(choices, name, NameOf);
     if (*format == Format::kJson) KeepMessages();
   };
   command->add_option_function<std::string>("-o,--output-format", take, "How to print")
