@@ -3,14 +3,13 @@
 #include "tools/input.h"
 
 #include <fcntl.h>
+#include <fmt/format.h>
 #include <poll.h>
 #include <sys/ioctl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <chrono>
-#include <cstdio>
 #include <cstring>
 
 #include "fleet/dump.h"
@@ -20,13 +19,6 @@ namespace tools {
 namespace {
 
 constexpr size_t kBlockSize = 64 << 10;
-
-int64_t MillisecondsNow() {
-  using std::chrono::steady_clock;
-  return std::chrono::duration_cast<std::chrono::milliseconds>(
-             steady_clock::now().time_since_epoch())
-      .count();
-}
 
 }  // namespace
 
@@ -38,9 +30,8 @@ std::string DisplayName(const std::string &file) {
 Input::Input(const std::string &file, bool showProgress)
     : name_(DisplayName(file)),
       file_(file == "-" ? -1 : open(file.c_str(), O_RDONLY | O_CLOEXEC)),
-      descriptor_(file == "-" ? STDIN_FILENO : file_.number()) {
-  if (descriptor_ < 0) error_ = errno;
-  if (showProgress && isatty(STDERR_FILENO) != 0) nextProgress_ = MillisecondsNow() + 1000;
+      descriptor_(file == "-" ? STDIN_FILENO : file_.number()),
+      progress_(showProgress && isatty(STDERR_FILENO) != 0, std::chrono::seconds(1)) {
   struct stat status = {};
   if (fstat(descriptor_, &status) == 0 && S_ISREG(status.st_mode)) {
     size_ = static_cast<uint64_t>(status.st_size);
@@ -59,7 +50,11 @@ fleet::ReadResult Input::ReadRaw(char *bytes, size_t room) {
     const ssize_t count = read(descriptor_, bytes, room);
     if (count >= 0) {
       read_ += static_cast<size_t>(count);
-      ShowProgress();
+      if (progress_.IsDue()) {
+        const std::string total = size_ == 0 ? "" : " of " + std::to_string(size_ >> 10);
+        fmt::print(stderr, "\rmorwick: {}: {}{} KiB read", PrintableLine(name_), read_ >> 10,
+                   total);
+      }
       return {static_cast<size_t>(count), ""};
     }
     if (!fleet::CanTryAgain(descriptor_, POLLIN)) error_ = errno;
@@ -68,23 +63,8 @@ fleet::ReadResult Input::ReadRaw(char *bytes, size_t room) {
 }
 
 void Input::ComplainOf(const std::string &fault) {
-  ClearProgress();
+  progress_.Clear();
   Complain(name_, fault);
-}
-
-// One line on the terminal, written again and again in the same place.
-void Input::ShowProgress() {
-  if (nextProgress_ == INT64_MAX || MillisecondsNow() < nextProgress_) return;
-  nextProgress_ = MillisecondsNow() + 200;
-  progressShown_ = true;
-  const std::string total = size_ == 0 ? "" : " of " + std::to_string(size_ >> 10);
-  std::fprintf(stderr, "\rmorwick: %s: %llu%s KiB read", PrintableLine(name_).c_str(),
-               static_cast<unsigned long long>(read_ >> 10), total.c_str());
-}
-
-void Input::ClearProgress() {
-  if (progressShown_) std::fputs("\r\033[K", stderr);
-  progressShown_ = false;
 }
 
 void NoteUnreadInput() {

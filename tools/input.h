@@ -2,6 +2,7 @@
 #ifndef TOOLS_INPUT_H
 #define TOOLS_INPUT_H
 
+#include <cerrno>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -21,9 +22,6 @@ std::string DisplayName(const std::string &file);
 class Input {
  public:
   explicit Input(const std::string &file, bool showProgress = true);
-  ~Input() { ClearProgress(); }
-  Input(const Input &) = delete;
-  Input &operator=(const Input &) = delete;
 
   // The size of a regular file; 0 for everything else.
   uint64_t size() const { return size_; }
@@ -36,17 +34,14 @@ class Input {
 
  private:
   fleet::ReadResult ReadRaw(char *bytes, size_t room);
-  void ShowProgress();
-  void ClearProgress();
 
   std::string name_;
   fleet::Descriptor file_;
-  int descriptor_;  // of the file, or standard input
-  int error_ = 0;   // of opening it
+  int descriptor_;                           // of the file, or standard input
+  int error_ = descriptor_ < 0 ? errno : 0;  // of opening it
   uint64_t size_ = 0;
   uint64_t read_ = 0;
-  bool progressShown_ = false;
-  int64_t nextProgress_ = INT64_MAX;  // in milliseconds; never without a terminal
+  ProgressLine progress_;
   fleet::GzipReader reader_{[this](char *bytes, size_t room) { return ReadRaw(bytes, room); }};
 };
 

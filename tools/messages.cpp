@@ -11,6 +11,10 @@
 #include "tools/text.h"
 
 namespace tools {
+
+using std::chrono::milliseconds;
+using std::chrono::steady_clock;
+
 namespace {
 
 constexpr size_t kMostKept = 1000;
@@ -51,6 +55,22 @@ void Note(const std::string &subject, const std::string &reason) {
 
 void ComplainOfUsage(const std::string &reason, const std::string &help) {
   Print("error", reason + " (see morwick " + help + ")");
+}
+
+ProgressLine::ProgressLine(bool isShown, milliseconds delay)
+    : next_(isShown ? steady_clock::now() + delay : steady_clock::time_point::max()) {}
+
+bool ProgressLine::IsDue() {
+  const auto now = steady_clock::now();
+  if (now < next_) return false;
+  next_ = now + milliseconds(200);
+  isThere_ = true;
+  return true;
+}
+
+void ProgressLine::Clear() {
+  if (isThere_) std::fputs("\r\033[K", stderr);
+  isThere_ = false;
 }
 
 void ComplainOfMemory() {

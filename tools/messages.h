@@ -2,6 +2,7 @@
 #ifndef TOOLS_MESSAGES_H
 #define TOOLS_MESSAGES_H
 
+#include <chrono>
 #include <cstdint>
 #include <string>
 #include <string_view>
@@ -52,6 +53,26 @@ class RepeatedComplaint {
 
   std::string subject_;
   uint64_t count_ = 0;
+};
+
+// A line on the terminal that tells how far the work is. It is written again and again in the same
+// place.
+class ProgressLine {
+ public:
+  // The line stays away for the first milliseconds; for ever where it is not shown.
+  ProgressLine(bool isShown, std::chrono::milliseconds delay);
+  ~ProgressLine() { Clear(); }
+  ProgressLine(const ProgressLine &) = delete;
+  ProgressLine &operator=(const ProgressLine &) = delete;
+
+  // Whether to write it now, at its beginning.
+  bool IsDue();
+  // Call it before another line is printed.
+  void Clear();
+
+ private:
+  std::chrono::steady_clock::time_point next_;
+  bool isThere_ = false;
 };
 
 // Complains that memory was refused. It needs no memory, and prints its line only once.

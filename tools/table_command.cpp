@@ -28,7 +28,6 @@ namespace tools {
 namespace {
 
 using std::chrono::milliseconds;
-using std::chrono::steady_clock;
 
 void AppendRow(const fleet::Row &row, std::string *rows) {
   AppendCsvField(rows, row.file.name);
@@ -49,35 +48,6 @@ struct Options {
   std::vector<std::string> files;
   std::string list;
   bool endedByNul = false;
-};
-
-// A line on the terminal that tells how many dumps are done.
-class Progress {
- public:
-  // `total` is the number of dumps, if it is known.
-  Progress(bool isShown, std::optional<uint64_t> total) : isShown_(isShown) {
-    if (total) ofTotal_ = fmt::format(" of {}", *total);
-  }
-  ~Progress() { Clear(); }
-
-  void Show(uint64_t dumps, uint64_t faults) {
-    if (!isShown_ || steady_clock::now() < next_) return;
-    next_ = steady_clock::now() + milliseconds(200);
-    there_ = true;
-    fmt::print(stderr, "\r\033[Kmorwick: dumps read: {}{}, with a fault: {}", dumps, ofTotal_,
-               faults);
-  }
-
-  void Clear() {
-    if (there_) std::fputs("\r\033[K", stderr);
-    there_ = false;
-  }
-
- private:
-  bool isShown_;
-  std::string ofTotal_;
-  steady_clock::time_point next_ = steady_clock::now() + milliseconds(300);
-  bool there_ = false;
 };
 
 // The command limits its memory. Threads with stacks and heaps of the usual size would take most of
@@ -113,15 +83,15 @@ fleet::FileList FilesOf(const Options &options, std::FILE *list) {
   return fleet::FileList(options.files, list, options.endedByNul ? '\0' : '\n');
 }
 
-// Counts the files by going through all names, so that none is kept in memory. Nothing when the
-// names can be read only once.
-std::optional<uint64_t> CountFiles(const Options &options) {
+// Counts the files by going through all names, so that none is kept in memory. Returns " of 7", or
+// nothing when the names can be read only once.
+std::string OfTotal(const Options &options) {
   std::FILE *list = nullptr;
-  if (options.list == "-" || !OpenList(options, &list)) return std::nullopt;
+  if (options.list == "-" || !OpenList(options, &list)) return "";
   fleet::FileList files = FilesOf(options, list);
   uint64_t count = 0;
   for (fleet::ListedFile file; files.Next(&file);) ++count;
-  return count;
+  return fmt::format(" of {}", count);
 }
 
 void PrintHeading(Output &output, const fleet::Selection &selection) {
@@ -134,7 +104,7 @@ void PrintHeading(Output &output, const fleet::Selection &selection) {
 }
 
 // Complains of the faults in a batch. Returns their number.
-uint64_t ComplainOf(const fleet::Batch &batch, Progress &progress) {
+uint64_t ComplainOf(const fleet::Batch &batch, ProgressLine &progress) {
   uint64_t faults = 0;
   for (const fleet::ListedFile &file : batch.files) {
     if (file.fault.empty()) continue;
@@ -158,14 +128,18 @@ bool WriteRows(Output &output, const fleet::Batch &batch) {
 
 // Prints the rows when they are ready. Returns the status of the dumps; nothing when a signal or a
 // reader that has gone away ends the output early.
-std::optional<Status> PrintRows(Output &output, fleet::Table &table, Progress &progress) {
+std::optional<Status> PrintRows(Output &output, fleet::Table &table, ProgressLine &progress,
+                                const std::string &ofTotal) {
   using Got = fleet::Table::Got;
   uint64_t dumps = 0;
   uint64_t faults = 0;
   while (StopSignals::Stopped() == 0) {
     std::unique_ptr<fleet::Batch> batch;
     Got got = table.Next(&batch, milliseconds(0));
-    progress.Show(dumps, faults);
+    if (progress.IsDue()) {
+      fmt::print(stderr, "\r\033[Kmorwick: dumps read: {}{}, with a fault: {}", dumps, ofTotal,
+                 faults);
+    }
     if (got == Got::kNothingYet) {
       if (!output.Flush()) return std::nullopt;
       got = table.Next(&batch, milliseconds(50));
@@ -181,11 +155,11 @@ std::optional<Status> PrintRows(Output &output, fleet::Table &table, Progress &p
 }
 
 // Prints the rows, and complains when the list of names ended early.
-std::optional<Status> PrintRows(const Options &options, std::FILE *list,
-                                std::optional<uint64_t> total, bool showProgress, Output &output) {
+std::optional<Status> PrintRows(const Options &options, std::FILE *list, const std::string &ofTotal,
+                                bool showProgress, Output &output) {
   fleet::Table table(options.table, FilesOf(options, list));
-  Progress progress(showProgress, total);
-  const std::optional<Status> status = PrintRows(output, table, progress);
+  ProgressLine progress(showProgress, milliseconds(300));
+  const std::optional<Status> status = PrintRows(output, table, progress, ofTotal);
   if (table.outOfMemory()) RefuseMemory();
   if (!status || table.listFault().empty()) return status;
   progress.Clear();
@@ -199,14 +173,13 @@ Status PrintTable(Options options) {
   const bool isPipe = IsPipe(list);
   if (isPipe) options.table.batchSize = 1;
   const bool showProgress = isatty(STDERR_FILENO) != 0 && !OutputIsTerminal();
-  std::optional<uint64_t> total;
-  if (showProgress && !isPipe) total = CountFiles(options);
+  const std::string ofTotal = showProgress && !isPipe ? OfTotal(options) : "";
   StopSignals signals;
   Output output;
   PrintHeading(output, *options.table.selection);
   output.Flush();
   KeepThreadsSmall();
-  const auto status = PrintRows(options, list, total, showProgress, output);
+  const auto status = PrintRows(options, list, ofTotal, showProgress, output);
   if (StopSignals::Stopped() != 0) {
     output.Flush();
     StopSignals::EndProcess();
