@@ -126,42 +126,35 @@ bool WriteRows(Output &output, const fleet::Batch &batch) {
   return true;
 }
 
-// Prints the rows when they are ready. Returns the status of the dumps; nothing when a signal or a
-// reader that has gone away ends the output early.
-std::optional<Status> PrintRows(Output &output, fleet::Table &table, ProgressLine &progress,
-                                const std::string &ofTotal) {
+// Prints the rows when they are ready, until a signal or a reader that has gone away ends the
+// output early. Complains when the list of names ended early.
+Status PrintRows(const Options &options, std::FILE *list, const std::string &ofTotal,
+                 bool showProgress, Output &output) {
   using Got = fleet::Table::Got;
+  fleet::Table table(options.table, FilesOf(options, list));
+  ProgressLine progress(showProgress, milliseconds(300));
   uint64_t dumps = 0;
   uint64_t faults = 0;
-  while (StopSignals::Stopped() == 0) {
+  for (Got got = Got::kNothingYet; got != Got::kEnd;) {
+    if (StopSignals::Stopped() != 0) return kBadData;
     std::unique_ptr<fleet::Batch> batch;
-    Got got = table.Next(&batch, milliseconds(0));
+    got = table.Next(&batch, milliseconds(0));
     if (progress.IsDue()) {
       fmt::print(stderr, "\r\033[Kmorwick: dumps read: {}{}, with a fault: {}", dumps, ofTotal,
                  faults);
     }
     if (got == Got::kNothingYet) {
-      if (!output.Flush()) return std::nullopt;
+      if (!output.Flush()) return kBadData;
       got = table.Next(&batch, milliseconds(50));
     }
-    if (got == Got::kEnd) return faults == 0 ? kGood : kBadData;
-    if (got == Got::kNothingYet) continue;
-    if (!WriteRows(output, *batch)) return std::nullopt;
+    if (got != Got::kBatch) continue;
+    if (!WriteRows(output, *batch)) return kBadData;
     dumps += batch->files.size();
     faults += ComplainOf(*batch, progress);
     if (batch->outOfMemory) RefuseMemory();
   }
-  return std::nullopt;
-}
-
-// Prints the rows, and complains when the list of names ended early.
-std::optional<Status> PrintRows(const Options &options, std::FILE *list, const std::string &ofTotal,
-                                bool showProgress, Output &output) {
-  fleet::Table table(options.table, FilesOf(options, list));
-  ProgressLine progress(showProgress, milliseconds(300));
-  const std::optional<Status> status = PrintRows(output, table, progress, ofTotal);
   if (table.outOfMemory()) RefuseMemory();
-  if (!status || table.listFault().empty()) return status;
+  if (table.listFault().empty()) return faults == 0 ? kGood : kBadData;
   progress.Clear();
   Complain(DisplayName(options.list), table.listFault());
   return kBadData;
@@ -179,12 +172,12 @@ Status PrintTable(Options options) {
   PrintHeading(output, *options.table.selection);
   output.Flush();
   KeepThreadsSmall();
-  const auto status = PrintRows(options, list, ofTotal, showProgress, output);
+  const Status status = PrintRows(options, list, ofTotal, showProgress, output);
   if (StopSignals::Stopped() != 0) {
     output.Flush();
     StopSignals::EndProcess();
   }
-  return output.Finish(status.value_or(kBadData));
+  return output.Finish(status);
 }
 
 }  // namespace
