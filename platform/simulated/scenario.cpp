@@ -69,8 +69,66 @@ void CheckText(std::string_view text) {
   }
 }
 
-// One table of the file. Each Read takes one key, and leaves the target alone when the key is
-// absent. A key that no Read has asked for is unknown.
+[[noreturn]] void Reject(const toml::node &node, std::string_view key, const std::string &reason) {
+  Refuse(node.source(), Quoted(key) + " " + reason);
+}
+
+// Each Convert takes the value of a key.
+void Convert(const toml::node &node, std::string_view key, bool *target) {
+  const auto value = node.value_exact<bool>();
+  if (!value) Reject(node, key, "must be true or false");
+  *target = *value;
+}
+
+void Convert(const toml::node &node, std::string_view key, uint32_t *target, uint32_t least = 0) {
+  const auto value = node.value_exact<int64_t>();
+  if (!value) Reject(node, key, "must be a whole number");
+  if (*value < least || *value > std::numeric_limits<uint32_t>::max()) {
+    Reject(node, key, "must be between " + std::to_string(least) + " and 4294967295");
+  }
+  *target = static_cast<uint32_t>(*value);
+}
+
+void Convert(const toml::node &node, std::string_view key, std::vector<uint32_t> *target,
+             uint32_t least = 0) {
+  const toml::array *array = node.as_array();
+  if (array == nullptr) Reject(node, key, "must be a list of whole numbers");
+  for (const toml::node &element : *array) Convert(element, key, &target->emplace_back(), least);
+}
+
+void Convert(const toml::node &node, std::string_view key, Fault *target) {
+  if (node.is_boolean()) return Convert(node, key, &target->always);
+  if (node.is_array()) return Convert(node, key, &target->calls, 1);
+  Reject(node, key, "must be true, false or a list of call numbers");
+}
+
+void Convert(const toml::node &node, std::string_view key, std::chrono::milliseconds *target) {
+  if (!node.is_number()) Reject(node, key, "must be a number of seconds");
+  const double seconds = node.value<double>().value_or(-1);
+  if (!(seconds >= 0 && seconds <= kLongestSeconds)) {
+    Reject(node, key, "must be between 0 and 1000000 seconds");
+  }
+  *target = std::chrono::milliseconds(std::llround(seconds * 1000));
+}
+
+// Names that are not absolute are relative to `folder`.
+void AddFile(const toml::node &node, std::string_view key, std::vector<std::string> *target,
+             std::string_view folder) {
+  const std::string name = node.value_exact<std::string>().value_or("");
+  if (name.empty() || name.find('\0') != std::string::npos) {
+    Reject(node, key, "must be a file or a list of files");
+  }
+  target->push_back(name[0] == '/' ? name : std::string(folder) + name);
+}
+
+void Convert(const toml::node &node, std::string_view key, std::vector<std::string> *target,
+             std::string_view folder) {
+  const toml::array *array = node.as_array();
+  if (array == nullptr || array->empty()) return AddFile(node, key, target, folder);
+  for (const toml::node &element : *array) AddFile(element, key, target, folder);
+}
+
+// One table of the file. A key that nobody has asked for is unknown.
 class TableReader {
  public:
   explicit TableReader(const toml::table &table) : table_(table) {}
@@ -86,84 +144,13 @@ class TableReader {
     return table_.get(key);
   }
 
-  void Read(std::string_view key, bool *target) {
-    const toml::node *node = Find(key);
-    if (node == nullptr) return;
-    if (const auto value = node->value_exact<bool>()) {
-      *target = *value;
-    } else {
-      Reject(*node, key, "must be true or false");
-    }
-  }
-
-  void Read(std::string_view key, uint32_t *target) {
-    if (const toml::node *node = Find(key)) ReadNumber(*node, key, 0, target);
-  }
-
-  void Read(std::string_view key, std::vector<uint32_t> *target, uint32_t least) {
-    const toml::node *node = Find(key);
-    if (node == nullptr) return;
-    const toml::array *array = node->as_array();
-    if (array == nullptr) Reject(*node, key, "must be a list of whole numbers");
-    for (const toml::node &element : *array) {
-      ReadNumber(element, key, least, &target->emplace_back());
-    }
-  }
-
-  void Read(std::string_view key, Fault *target) {
-    const toml::node *node = Find(key);
-    if (node == nullptr) return;
-    if (node->is_boolean()) return Read(key, &target->always);
-    if (node->is_array()) return Read(key, &target->calls, 1);
-    Reject(*node, key, "must be true, false or a list of call numbers");
-  }
-
-  void Read(std::string_view key, std::chrono::milliseconds *target) {
-    const toml::node *node = Find(key);
-    if (node == nullptr) return;
-    if (!node->is_number()) Reject(*node, key, "must be a number of seconds");
-    const double seconds = node->value<double>().value_or(-1);
-    if (!(seconds >= 0 && seconds <= kLongestSeconds)) {
-      Reject(*node, key, "must be between 0 and 1000000 seconds");
-    }
-    *target = std::chrono::milliseconds(std::llround(seconds * 1000));
-  }
-
-  // A file or a list of files. Names that are not absolute are relative to `folder`.
-  void Read(std::string_view key, std::vector<std::string> *target, std::string_view folder) {
-    const toml::node *node = Find(key);
-    if (node == nullptr) return;
-    const toml::array *array = node->as_array();
-    if (array == nullptr) return ReadFileName(*node, key, folder, target);
-    if (array->empty()) Reject(*node, key, kNotFiles);
-    for (const toml::node &element : *array) ReadFileName(element, key, folder, target);
+  // Leaves the target alone when the key is absent.
+  template <typename Target>
+  void Read(std::string_view key, Target *target, auto... rules) {
+    if (const toml::node *node = Find(key)) Convert(*node, key, target, rules...);
   }
 
  private:
-  static constexpr const char *kNotFiles = "must be a file or a list of files";
-
-  static void ReadFileName(const toml::node &node, std::string_view key, std::string_view folder,
-                           std::vector<std::string> *target) {
-    const std::string name = node.value_exact<std::string>().value_or("");
-    if (name.empty() || name.find('\0') != std::string::npos) Reject(node, key, kNotFiles);
-    target->push_back(name[0] == '/' ? name : std::string(folder) + name);
-  }
-
-  [[noreturn]] static void Reject(const toml::node &node, std::string_view key,
-                                  const std::string &reason) {
-    Refuse(node.source(), Quoted(key) + " " + reason);
-  }
-
-  static void ReadNumber(const toml::node &node, std::string_view key, uint32_t least,
-                         uint32_t *target) {
-    const auto value = node.value_exact<int64_t>();
-    if (!value) Reject(node, key, "must be a whole number");
-    if (*value < least || *value > std::numeric_limits<uint32_t>::max()) {
-      Reject(node, key, "must be between " + std::to_string(least) + " and 4294967295");
-    }
-    *target = static_cast<uint32_t>(*value);
-  }
-
   const toml::table &table_;
   std::set<std::string_view> known_;
 };
@@ -211,7 +198,7 @@ void ReadSchedule(TableReader &reader, Schedule *schedule) {
   reader.Read("first_run_after", &schedule->firstRunAfter);
   reader.Read("interval", &schedule->interval);
   reader.Read("resume_after", &schedule->resumeAfter);
-  reader.Read("defer_at_check", &schedule->deferAtCheck, 0);
+  reader.Read("defer_at_check", &schedule->deferAtCheck);
 }
 
 Scenario ReadScenario(const toml::table &table, std::string_view folder) {
