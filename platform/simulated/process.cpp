@@ -26,43 +26,33 @@ void TakeStandardStreams() {
   if (descriptor >= 0) close(descriptor);
 }
 
-// nohup starts a process with SIGHUP ignored, so that it goes on when the terminal is closed.
-bool OutlivesTerminal() {
-  struct sigaction hangup = {};
-  return sigaction(SIGHUP, nullptr, &hangup) == 0 && hangup.sa_handler == SIG_IGN;
-}
-
 const sigset_t &WaitedFor() {
   static const sigset_t signals = [] {
     sigset_t set;
     sigemptyset(&set);
     for (const int signal : {SIGUSR1, SIGTERM, SIGINT}) sigaddset(&set, signal);
-    if (!OutlivesTerminal()) sigaddset(&set, SIGHUP);
+    // nohup starts a process with SIGHUP ignored, so that it goes on when the terminal is closed.
+    struct sigaction hangup = {};
+    sigaction(SIGHUP, nullptr, &hangup);
+    if (hangup.sa_handler != SIG_IGN) sigaddset(&set, SIGHUP);
     return set;
   }();
   return signals;
 }
 
-// The failing write reports these two; they must not end the daemon.
-void IgnoreSignals() {
+const Scenario &Take() {
+  TakeStandardStreams();
+  // The failing write reports these two; they must not end the daemon.
   signal(SIGPIPE, SIG_IGN);
   signal(SIGXFSZ, SIG_IGN);
-}
-
-const Scenario *LoadOrEnd() {
+  const Scenario *scenario = nullptr;
   try {
-    if (const Scenario *scenario = TheScenario()) return scenario;
+    scenario = TheScenario();
   } catch (const std::bad_alloc &) {
     EndWithoutMemory();
   }
-  std::exit(2);
-}
-
-const Scenario &Take() {
-  TakeStandardStreams();
-  IgnoreSignals();
+  if (scenario == nullptr) std::exit(2);
   // Until here any signal ends the process: the scenario may come from a pipe that stays open.
-  const Scenario *scenario = LoadOrEnd();
   // The signals are blocked before a second thread starts. So they never interrupt the activity's
   // sleep.
   pthread_sigmask(SIG_BLOCK, &WaitedFor(), nullptr);
