@@ -1,5 +1,6 @@
 // morwick metrics: prints the statistics of a controller in the text format of Prometheus.
 
+#include <fmt/format.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -74,14 +75,11 @@ std::vector<Sample> SamplesOf(const Statistics &statistics) {
   std::map<std::pair<std::string, std::string>, size_t> places;
   for (EntryGroups groups(statistics); const auto group = groups.Take();) {
     group->ForEach([&](const Entry &entry, size_t i) {
-      const Sample sample = {std::string(group->base), group->IsArray() ? std::to_string(i) : "",
-                             entry.value()};
-      const auto [place, isNew] = places.try_emplace({sample.name, sample.index}, samples.size());
-      if (isNew) {
-        samples.push_back(sample);
-      } else {
-        samples[place->second].value = sample.value;
-      }
+      const std::string name(group->base);
+      const std::string index = group->IsArray() ? std::to_string(i) : "";
+      const auto [place, isNew] = places.try_emplace({name, index}, samples.size());
+      if (isNew) samples.push_back({name, index, 0});
+      samples[place->second].value = entry.value();
     });
   }
   return samples;
@@ -130,74 +128,59 @@ std::vector<Reading> ReadLive(const Options &options, std::string *className) {
   return readings;
 }
 
-// The exposition, family by family.
-class Exposition {
- public:
-  explicit Exposition(const Options &options) : options_(options) {}
-
-  void Family(const char *name, const char *help) {
-    family_ = name;
-    text_ += std::string("# HELP ") + name + " " + help + "\n# TYPE " + name + " gauge\n";
-  }
-
-  // Adds a line. Labels without a value are left out.
-  void Line(std::vector<Label> labels, const std::string &value) {
-    labels.insert(labels.end(), options_.labels.begin(), options_.labels.end());
-    std::string list;
-    for (const auto &[key, label] : labels) {
-      if (label.empty()) continue;
-      list += (list.empty() ? "" : ",") + key + "=\"";
-      for (const char c : ValidText(label)) {
-        if (c == '\\' || c == '"') list += '\\';
-        list += c == '\n' ? std::string("\\n") : std::string(1, c);
-      }
-      list += '"';
+// Labels as they stand in a line, without those that have no value.
+std::string ListOf(const std::vector<Label> &labels) {
+  std::string list;
+  for (const auto &[key, label] : labels) {
+    if (label.empty()) continue;
+    list += (list.empty() ? "" : ",") + key + "=\"";
+    for (const char c : ValidText(label)) {
+      if (c == '\\' || c == '"') list += '\\';
+      list += c == '\n' ? std::string("\\n") : std::string(1, c);
     }
-    text_ += family_ + "{" + list + "} " + value + "\n";
+    list += '"';
   }
-
-  const std::string &text() const { return text_; }
-
- private:
-  const Options &options_;
-  std::string family_;
-  std::string text_;
-};
-
-Label StreamLabel(const Reading &reading) {
-  return {"stream", std::string(fleet::NameOf(reading.stream))};
+  return list;
 }
 
+// The exposition, family by family.
 std::string Compose(const Options &options, const std::string &className,
                     const std::vector<Reading> &readings) {
-  Exposition exposition(options);
-  exposition.Family("morwick_info", "What was read, and with what.");
-  exposition.Line({{"controller", className},
-                   {"version", MORWICK_VERSION},
-                   {"platform", MORWICK_PLATFORM_NAME}},
-                  "1");
-  exposition.Family("morwick_read_success", "Whether the stream was read whole and good.");
+  std::string text;
+  std::string family;
+  const auto begin = [&](const char *name, const char *help) {
+    family = name;
+    text += fmt::format("# HELP {0} {1}\n# TYPE {0} gauge\n", name, help);
+  };
+  const auto add = [&](std::vector<Label> labels, const std::string &value) {
+    labels.insert(labels.end(), options.labels.begin(), options.labels.end());
+    text += fmt::format("{}{{{}}} {}\n", family, ListOf(labels), value);
+  };
+  const auto streamOf = [](const Reading &reading) {
+    return Label{"stream", std::string(fleet::NameOf(reading.stream))};
+  };
+  begin("morwick_info", "What was read, and with what.");
+  add({{"controller", className},
+       {"version", MORWICK_VERSION},
+       {"platform", MORWICK_PLATFORM_NAME}},
+      "1");
+  begin("morwick_read_success", "Whether the stream was read whole and good.");
+  for (const Reading &reading : readings) add({streamOf(reading)}, reading.good ? "1" : "0");
+  begin("morwick_read_duration_seconds", "How long reading the stream took.");
   for (const Reading &reading : readings) {
-    exposition.Line({StreamLabel(reading)}, reading.good ? "1" : "0");
+    add({streamOf(reading)}, std::to_string(reading.seconds));
   }
-  exposition.Family("morwick_read_duration_seconds", "How long reading the stream took.");
+  begin("morwick_read_timestamp_seconds", "When the stream was read, or its file made.");
   for (const Reading &reading : readings) {
-    exposition.Line({StreamLabel(reading)}, std::to_string(reading.seconds));
+    if (reading.timestamp) add({streamOf(reading)}, std::to_string(*reading.timestamp));
   }
-  exposition.Family("morwick_read_timestamp_seconds",
-                    "When the stream was read, or its file made.");
+  begin("morwick_statistic", "A statistic that the storage controller reports.");
   for (const Reading &reading : readings) {
-    if (!reading.timestamp) continue;
-    exposition.Line({StreamLabel(reading)}, std::to_string(*reading.timestamp));
-  }
-  exposition.Family("morwick_statistic", "A statistic that the storage controller reports.");
-  for (const Reading &reading : readings) {
-    for (const Sample &sample : reading.samples) {
-      exposition.Line({StreamLabel(reading), {"name", sample.name}, {"index", sample.index}},
-                      std::to_string(sample.value));
+    for (const auto &[name, index, value] : reading.samples) {
+      add({streamOf(reading), {"name", name}, {"index", index}}, std::to_string(value));
     }
   }
-  return exposition.text();
+  return text;
 }
 
 Status Print(const Options &options) {
@@ -244,14 +227,19 @@ File SplitFile(const std::string &text) {
   return {*stream, text.substr(split + 1)};
 }
 
-// Appends a pair; each key may be given only once.
+// Takes pairs that `split` makes of texts; each key may be given only once.
 template <typename Pair, typename Key>
-void TakeOnce(std::vector<Pair> *pairs, Pair pair, Key Pair::*key, const std::string &option,
-              const std::string &text) {
-  if (std::ranges::find(*pairs, pair.*key, key) != pairs->end()) {
-    throw CLI::ValidationError(option, text.substr(0, text.find('=')) + " is given twice");
-  }
-  pairs->push_back(std::move(pair));
+auto TakeOnce(std::vector<Pair> *pairs, Key Pair::*key, Pair (*split)(const std::string &text),
+              const std::string &option) {
+  return [=](const std::vector<std::string> &texts) {
+    for (const std::string &text : texts) {
+      Pair pair = split(text);
+      if (std::ranges::find(*pairs, pair.*key, key) != pairs->end()) {
+        throw CLI::ValidationError(option, text.substr(0, text.find('=')) + " is given twice");
+      }
+      pairs->push_back(std::move(pair));
+    }
+  };
 }
 
 }  // namespace
@@ -260,24 +248,16 @@ void AddMetrics(CLI::App &app, Action *action) {
   CLI::App *command =
       app.add_subcommand("metrics", "Print the statistics of a controller for Prometheus");
   const auto options = std::make_shared<Options>();
-  const auto takeFiles = [=](const std::vector<std::string> &texts) {
-    for (const std::string &text : texts) {
-      TakeOnce(&options->files, SplitFile(text), &File::stream, "STREAM=FILE", text);
-    }
-  };
-  const auto takeLabels = [=](const std::vector<std::string> &texts) {
-    for (const std::string &text : texts) {
-      TakeOnce(&options->labels, SplitLabel(text), &Label::key, "--label", text);
-    }
-  };
   command
-      ->add_option_function<std::vector<std::string>>("STREAM=FILE", takeFiles,
-                                                      "Of dumps instead, such as kvr=FILE")
+      ->add_option_function<std::vector<std::string>>(
+          "STREAM=FILE", TakeOnce(&options->files, &File::stream, SplitFile, "STREAM=FILE"),
+          "Of dumps instead, such as kvr=FILE")
       ->type_name("{kvr,ftl,msp}");
   AddNames(command, &options->names);
   command
-      ->add_option_function<std::vector<std::string>>("--label", takeLabels,
-                                                      "A label for all lines")
+      ->add_option_function<std::vector<std::string>>(
+          "--label", TakeOnce(&options->labels, &Label::key, SplitLabel, "--label"),
+          "A label for all lines")
       ->type_name("KEY=VALUE")
       ->allow_extra_args(false);  // one for each --label
   AddWrite(command, &options->output, "Write to a file, whole or not at all, mode 0644");
