@@ -16,31 +16,20 @@ struct Options {
   Format format = Format::kNormal;
 };
 
-Status PrintJson(Output &output, const Options &options) {
-  Json json(output, "capacity");
-  json.Key("capacities");
-  json.BeginArray();
-  for (const uint32_t megabytes : options.megabytes) {
-    json.BeginObject();
-    json.Member("megabytes", megabytes);
-    json.Member("gigabytes", GetUserCapacityInGB(megabytes));
-    json.EndObject();
-  }
-  json.EndArray();
-  return json.Finish(kGood);
-}
-
 Status PrintCapacities(const Options &options) {
   Output output;
-  Status status = kGood;
   if (options.format == Format::kJson) {
-    status = PrintJson(output, options);
-  } else {
-    for (const uint32_t megabytes : options.megabytes) {
-      output.Write(std::to_string(GetUserCapacityInGB(megabytes)) + "\n");
-    }
+    Json json(output, "capacity");
+    json.Objects("capacities", options.megabytes, [&](uint32_t megabytes) {
+      json.Member("megabytes", megabytes);
+      json.Member("gigabytes", GetUserCapacityInGB(megabytes));
+    });
+    return output.Finish(json.Finish(kGood));
   }
-  return output.Finish(status);
+  for (const uint32_t megabytes : options.megabytes) {
+    output.Write(std::to_string(GetUserCapacityInGB(megabytes)) + "\n");
+  }
+  return output.Finish(kGood);
 }
 
 }  // namespace

@@ -99,10 +99,7 @@ std::vector<std::string> TableOf(const std::vector<Change> &changes,
 void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<double> seconds) {
   json.Key("seconds");
   seconds ? json.Fraction(*seconds) : json.Null();
-  json.Key("changes");
-  json.BeginArray();
-  for (const Change &change : changes) {
-    json.BeginObject();
+  json.Objects("changes", changes, [&](const Change &change) {
     json.Key("name");
     json.PlainText(change.name());
     PrintEntry(json, "old", change.old);
@@ -115,9 +112,7 @@ void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<
       json.Fraction(*rate);
     }
     if (!change.Remark().empty()) json.Member("remark", change.Remark());
-    json.EndObject();
-  }
-  json.EndArray();
+  });
 }
 
 }  // namespace tools

@@ -41,10 +41,7 @@ void PrintNormal(Output &output, const std::vector<Finding> &findings) {
 
 Status PrintJson(Output &output, const std::vector<Finding> &findings, Status status) {
   Json json(output, "find");
-  json.Key("controllers");
-  json.BeginArray();
-  for (const Finding &finding : findings) {
-    json.BeginObject();
+  json.Objects("controllers", findings, [&](const Finding &finding) {
     json.Member("class", finding.row->className);
     json.Member("state", finding.State());
     if (finding.presence.present) {
@@ -56,9 +53,7 @@ Status PrintJson(Output &output, const std::vector<Finding> &findings, Status st
       if (finding.row->*kind.selectors != nullptr) json.PlainText(kind.name);
     }
     json.EndArray();
-    json.EndObject();
-  }
-  json.EndArray();
+  });
   return json.Finish(status);
 }
 

@@ -59,6 +59,19 @@ class Json {
     Number(number);
   }
 
+  // A member with an array of objects, one for each element; `print` prints an object's members.
+  template <typename Elements, typename Print>
+  void Objects(std::string_view key, const Elements &elements, Print print) {
+    Key(key);
+    BeginArray();
+    for (const auto &element : elements) {
+      BeginObject();
+      print(element);
+      EndObject();
+    }
+    EndArray();
+  }
+
   // A member with one number or an array of them. When one is too large for a double, a second
   // member (KEY_s) has them as texts. `each` calls the function that it gets with each value and
   // its digits.
