@@ -78,18 +78,6 @@ struct Target {
   std::optional<int> descriptor;  // write to this descriptor instead
 };
 
-// Follows one link: sets the target's place to where the link leads.
-int FollowLink(int link, Target *target) {
-  std::array<char, PATH_MAX> text;
-  const ssize_t length = readlinkat(link, "", text.data(), text.size());
-  if (length < 0) return errno;
-  const path leadsTo = std::string_view(text.data(), static_cast<size_t>(length));
-  Place next;
-  if (const int error = FindPlace(target->place.folder.number(), leadsTo, &next)) return error;
-  target->place = std::move(next);
-  return 0;
-}
-
 // Follows all links of a path to the place to write to.
 int FindTarget(const std::string &file, Target *target) {
   if (const int error = FindPlace(AT_FDCWD, file, &target->place)) return error;
@@ -109,7 +97,11 @@ int FindTarget(const std::string &file, Target *target) {
     if (target->descriptor) return 0;
     if (links == kMostLinks) return ELOOP;
     if (!MayFollow(folder, status)) return EACCES;
-    if (const int error = FollowLink(entry.number(), target)) return error;
+    std::array<char, PATH_MAX> text;
+    const ssize_t length = readlinkat(entry.number(), "", text.data(), text.size());
+    if (length < 0) return errno;
+    const path leadsTo = std::string_view(text.data(), static_cast<size_t>(length));
+    if (const int error = FindPlace(place.folder.number(), leadsTo, &target->place)) return error;
   }
 }
 
