@@ -99,8 +99,7 @@ class Table::OrderedBatches {
         if (!maker) maker.emplace(options_);
         if (!Take(batch.get(), &number)) return;
       } catch (const std::bad_alloc &) {
-        Fail();
-        return;
+        return Stop(true);
       }
       maker->Make(batch.get());
       const std::lock_guard lock(mutex_);
@@ -120,10 +119,12 @@ class Table::OrderedBatches {
     return Got::kBatch;
   }
 
-  // Makes the threads end.
-  void Stop() {
+  // Makes the threads end, after a failure the caller of Next too.
+  void Stop(bool failed) {
     const std::lock_guard lock(mutex_);
     stopped_ = true;
+    failed_ = failed_ || failed;
+    isMade_.notify_one();
     isWanted_.notify_all();
   }
 
@@ -132,13 +133,6 @@ class Table::OrderedBatches {
 
  private:
   bool AtEnd() const { return failed_ || (listEnded_ && handedOut_ == taken_); }
-
-  void Fail() {
-    const std::lock_guard lock(mutex_);
-    failed_ = stopped_ = true;
-    isMade_.notify_one();
-    isWanted_.notify_all();
-  }
 
   // Takes the next files. False when there are none, or the threads must end.
   bool Take(Batch *batch, uint64_t *number) {
@@ -187,7 +181,7 @@ Table::Table(const TableOptions &options, FileList list) {
 }
 
 Table::~Table() {
-  batches_->Stop();
+  batches_->Stop(false);
   for (std::thread &thread : threads_) ended_ ? thread.join() : thread.detach();
 }
 
