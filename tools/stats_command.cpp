@@ -124,32 +124,17 @@ void PrintJsonEntries(Json &json, const Statistics &statistics) {
 }
 
 Status PrintJson(Output &output, const Options &options, const Dump &dump,
-                 const Statistics *statistics) {
+                 const std::optional<Statistics> &statistics) {
   Json json(output, "stats", {dump.source});
   json.Member("stream", fleet::NameOf(options.stream));
   Status status = dump.status;
-  if (statistics != nullptr) {
+  if (statistics) {
     json.Member("result", statistics->result());
     if (options.stream == kMorwickKVR) PrintJsonSummary(json, *statistics);
     PrintJsonEntries(json, *statistics);
     status = statistics->Check(dump);
   }
   return json.Finish(status);
-}
-
-Status PrintText(Output &output, const Options &options, const Dump &dump,
-                 const Statistics &statistics) {
-  if (options.format == Format::kCsv) {
-    PrintCsv(output, statistics);
-  } else if (options.summary) {
-    PrintSummary(output, statistics);
-  } else if (options.inFull) {
-    PrintEntries(output, statistics);
-  } else {
-    PrintGroups(output, statistics);
-  }
-  output.Flush();
-  return statistics.Check(dump);
 }
 
 Status Print(const Options &options) {
@@ -159,13 +144,21 @@ Status Print(const Options &options) {
   std::optional<Statistics> statistics;
   if (dump.bytes) statistics.emplace(dump, options.stream, options.filter);
   Output output;
-  Status status = dump.status;
   if (options.format == Format::kJson) {
-    status = PrintJson(output, options, dump, statistics ? &*statistics : nullptr);
-  } else if (statistics) {
-    status = PrintText(output, options, dump, *statistics);
+    return output.Finish(PrintJson(output, options, dump, statistics));
   }
-  return output.Finish(status);
+  if (!statistics) return output.Finish(dump.status);
+  if (options.format == Format::kCsv) {
+    PrintCsv(output, *statistics);
+  } else if (options.summary) {
+    PrintSummary(output, *statistics);
+  } else if (options.inFull) {
+    PrintEntries(output, *statistics);
+  } else {
+    PrintGroups(output, *statistics);
+  }
+  output.Flush();
+  return output.Finish(statistics->Check(dump));
 }
 
 }  // namespace
