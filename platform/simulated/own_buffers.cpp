@@ -14,6 +14,7 @@
 #include <limits>
 #include <numbers>
 #include <numeric>
+#include <span>
 #include <string_view>
 
 #include "platform/simulated/scenario.h"
@@ -169,22 +170,16 @@ uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
   return (counter.start + grown) >> element;
 }
 
-void AppendStatistics(uint64_t time, Reply *reply) {
-  for (const Counter &counter : kStatistics) {
-    reply->Append(counter.id);
-    reply->Append(counter.elementCount);
-    for (uint32_t i = 0; i < counter.elementCount; ++i) reply->Append(ElementAt(counter, i, time));
-  }
-}
-
-// Counters of 32 bits stop at their largest value.
-void AppendMspStatistics(uint64_t time, Reply *reply) {
-  for (const Counter &counter : kMspStatistics) {
-    reply->Append(static_cast<uint16_t>(counter.id));
-    reply->Append(static_cast<uint16_t>(counter.elementCount * sizeof(uint32_t)));
+// Appends a record for each counter: id and length as `Half` of a header each, the length in units
+// of so many bytes. Counters stop at the largest `Value`.
+template <typename Half, typename Value, size_t kLengthUnit>
+void AppendCounters(std::span<const Counter> counters, uint64_t time, Reply *reply) {
+  for (const Counter &counter : counters) {
+    reply->Append(static_cast<Half>(counter.id));
+    reply->Append(static_cast<Half>(counter.elementCount * sizeof(Value) / kLengthUnit));
     for (uint32_t i = 0; i < counter.elementCount; ++i) {
-      const uint64_t largest = std::numeric_limits<uint32_t>::max();
-      reply->Append(static_cast<uint32_t>(std::min(ElementAt(counter, i, time), largest)));
+      constexpr uint64_t kLargest = std::numeric_limits<Value>::max();
+      reply->Append(static_cast<Value>(std::min(ElementAt(counter, i, time), kLargest)));
     }
   }
 }
@@ -286,8 +281,10 @@ uint64_t Now() {
 std::optional<size_t> MakeOwnBuffer(uint32_t command, void *reply, size_t room) {
   Reply bounded(reply, room);
   switch (command) {
-    case kReadStatistics: AppendStatistics(Now(), &bounded); break;
-    case kReadMsp: AppendMspStatistics(Now(), &bounded); break;
+    case kReadStatistics:
+      AppendCounters<uint32_t, uint64_t, 8>(kStatistics, Now(), &bounded);
+      break;
+    case kReadMsp: AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, Now(), &bounded); break;
     case kReadSnapshot: AppendSnapshot(Now(), &bounded); break;
     case kReadSnapshotHeader: AppendSnapshotHeader(&bounded); break;
     default: return std::nullopt;
