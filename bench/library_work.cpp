@@ -45,15 +45,7 @@ void Make(const std::string &folder) {
 void MakeFleet(const std::string &folder, int count) {
   std::mt19937_64 random(1);
   for (int i = 0; i < count; ++i) {
-    std::string dump;
-    for (uint32_t index = 0; index < MorwickKeyCount(kMorwickKVR); ++index) {
-      const MorwickKey &key = *MorwickKeyAt(kMorwickKVR, index);
-      bench::Append(&dump, key.id);
-      bench::Append(&dump, key.valueCount);
-      for (uint32_t value = 0; value < key.valueCount; ++value) {
-        bench::Append(&dump, bench::MixedMagnitude(random, 31));
-      }
-    }
+    const auto dump = bench::MakeStream<uint32_t, uint64_t>(kMorwickKVR, 1, 1, random, 31).buffer;
     const std::string machine = folder + "/" + std::to_string(i / 100);
     std::filesystem::create_directories(machine);
     std::ofstream(machine + "/" + std::to_string(i % 100) + ".bin", std::ios::binary) << dump;

@@ -30,10 +30,10 @@ struct Stream {
 };
 
 // Every key of a stream, so many times over. A header is two of `HeaderPart`: the key, and the
-// number of its values times `lengthUnit`.
+// number of its values times `lengthUnit`. Values have up to so many bits.
 template <typename HeaderPart, typename Value>
-Stream MakeStream(MorwickStream kind, uint32_t lengthUnit, int copies) {
-  std::mt19937_64 random(1);
+Stream MakeStream(MorwickStream kind, uint32_t lengthUnit, int copies, std::mt19937_64 &random,
+                  int bits = 8 * sizeof(Value)) {
   Stream stream;
   for (int copy = 0; copy < copies; ++copy) {
     for (uint32_t index = 0; index < MorwickKeyCount(kind); ++index) {
@@ -41,7 +41,7 @@ Stream MakeStream(MorwickStream kind, uint32_t lengthUnit, int copies) {
       Append(&stream.buffer, static_cast<HeaderPart>(key.id));
       Append(&stream.buffer, static_cast<HeaderPart>(key.valueCount * lengthUnit));
       for (uint32_t i = 0; i < key.valueCount; ++i) {
-        Append(&stream.buffer, static_cast<Value>(MixedMagnitude(random, 8 * sizeof(Value))));
+        Append(&stream.buffer, static_cast<Value>(MixedMagnitude(random, bits)));
       }
       stream.entries += key.valueCount;
     }
@@ -50,11 +50,13 @@ Stream MakeStream(MorwickStream kind, uint32_t lengthUnit, int copies) {
 }
 
 inline Stream StatsStream(int copies) {
-  return MakeStream<uint32_t, uint64_t>(kMorwickKVR, 1, copies);
+  std::mt19937_64 random(1);
+  return MakeStream<uint32_t, uint64_t>(kMorwickKVR, 1, copies, random);
 }
 
 inline Stream MSPStream(int copies) {
-  return MakeStream<uint16_t, uint32_t>(kMorwickMSP, sizeof(uint32_t), copies);
+  std::mt19937_64 random(1);
+  return MakeStream<uint16_t, uint32_t>(kMorwickMSP, sizeof(uint32_t), copies, random);
 }
 
 }  // namespace bench
