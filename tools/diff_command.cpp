@@ -13,14 +13,9 @@
 namespace tools {
 namespace {
 
-struct Options {
-  MorwickStream stream = kMorwickKVR;
-  std::vector<std::string> names;
-  Filter filter;
+struct Options : StreamOptions {
   std::string oldFile;
   std::string newFile;
-  std::string className;
-  Format format = Format::kNormal;
   std::optional<double> seconds;
   bool all = false;
 };

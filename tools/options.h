@@ -15,6 +15,17 @@ namespace tools {
 
 enum class Format { kNormal, kJson, kCsv };
 
+using Filter = std::shared_ptr<const fleet::Selection>;
+
+// The options that commands share which read one stream of statistics.
+struct StreamOptions {
+  MorwickStream stream = kMorwickKVR;
+  std::vector<std::string> names;
+  Filter filter;  // of the names
+  std::string className;
+  Format format = Format::kNormal;
+};
+
 // -o, --output-format: one of the choices. The first one is the default.
 void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &choices);
 
@@ -26,7 +37,6 @@ void AddNames(CLI::App *command, std::vector<std::string> *names);
 
 // The statistics with these names; all of them when there are no names. A name that no stream has
 // is wrong usage.
-using Filter = std::shared_ptr<const fleet::Selection>;
 Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
 
 // As Select, but null without names.

@@ -15,14 +15,9 @@
 namespace tools {
 namespace {
 
-struct Options {
+struct Options : StreamOptions {
   std::string file;
   bool live = true;
-  MorwickStream stream = kMorwickKVR;
-  std::vector<std::string> names;
-  Filter filter;
-  std::string className;
-  Format format = Format::kNormal;
   bool summary = false;
   bool inFull = false;
 };

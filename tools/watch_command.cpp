@@ -22,12 +22,7 @@ namespace {
 using std::chrono::steady_clock;
 using std::chrono::system_clock;
 
-struct Options {
-  MorwickStream stream = kMorwickKVR;
-  std::vector<std::string> names;
-  Filter filter;
-  std::string className;
-  Format format = Format::kNormal;
+struct Options : StreamOptions {
   double every = 5;
   uint64_t count = UINT64_MAX;  // of readings after the first
   bool all = false;
