@@ -66,20 +66,15 @@ class Scheduler {
     bool stop;
     do {
       stop = WaitToStop();
-      Yield(stop);
+      const std::lock_guard lock(mutex_);
+      yieldWanted_ = true;  // between two runs nothing yields, and Enter forgets the wish
+      stopping_ = stopping_ || stop;
+      wakeUp_.notify_all();
     } while (!stop);
     worker.join();
   }
 
  private:
-  // Between two runs there is no activity to yield, and Enter forgets the wish.
-  void Yield(bool stop) {
-    const std::lock_guard lock(mutex_);
-    yieldWanted_ = true;
-    stopping_ = stopping_ || stop;
-    wakeUp_.notify_all();
-  }
-
   void RunSchedule(const Schedule &schedule) {
     if (activity_.handler == nullptr) return;
     Enter(kActivityStateCheckIn);
