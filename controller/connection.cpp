@@ -73,15 +73,14 @@ int openKVRConnection(KVRConnection *record) {
   record->service = findNandExporter(&record->exporter);
   if (record->service == 0) {
     std::fputs("Can't get KVR Connection, no matching service!\n", stderr);
-    closeKVRConnection(record);
-    return 0;
+  } else {
+    // TolkConnect searches again: the driver may have gone, or another one may now come first.
+    record->connection = TolkConnect(&record->exporter);
+    if (record->exporter->getStatsSelectors == KVRGetStatsSelectors && record->connection != 0) {
+      return 1;
+    }
+    std::fputs("Can't get KVR Connection!\n", stderr);
   }
-  // TolkConnect searches again: the driver may have gone, or another one may now come first.
-  record->connection = TolkConnect(&record->exporter);
-  if (record->exporter->getStatsSelectors == KVRGetStatsSelectors && record->connection != 0) {
-    return 1;
-  }
-  std::fputs("Can't get KVR Connection!\n", stderr);
   closeKVRConnection(record);
   return 0;
 }
