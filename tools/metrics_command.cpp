@@ -73,7 +73,7 @@ double FileTime(const std::string &file) {
 std::vector<Sample> SamplesOf(const Statistics &statistics) {
   std::vector<Sample> samples = {};
   std::map<std::pair<std::string, std::string>, size_t> places;
-  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+  for (EntryIterator next = statistics.begin(); const auto group = TakeGroup(&next);) {
     group->ForEach([&](const Entry &entry, size_t i) {
       const std::string name(group->base);
       const std::string index = group->IsArray() ? std::to_string(i) : "";

@@ -115,15 +115,16 @@ Status Statistics::Check(const Dump &dump) const {
   return verdict.faults.empty() ? kGood : kBadData;
 }
 
-std::optional<EntryGroup> EntryGroups::Take() {
-  if (next_ == std::default_sentinel) return std::nullopt;
-  EntryGroup group = {next_, 1, next_->name()};
-  ++next_;
+std::optional<EntryGroup> TakeGroup(EntryIterator *next) {
+  EntryIterator &entry = *next;
+  if (entry == std::default_sentinel) return std::nullopt;
+  EntryGroup group = {entry, 1, entry->name()};
+  ++entry;
   if (!group.base.ends_with('0')) return group;
   const std::string_view base = group.base.substr(0, group.base.size() - 1);
-  while (next_ != std::default_sentinel && IsElement(next_->name(), base, group.count)) {
+  while (entry != std::default_sentinel && IsElement(entry->name(), base, group.count)) {
     ++group.count;
-    ++next_;
+    ++entry;
   }
   if (group.IsArray()) group.base = base;
   return group;
@@ -132,8 +133,9 @@ std::optional<EntryGroup> EntryGroups::Take() {
 std::vector<fleet::Figure> SummaryOf(const Statistics &statistics) {
   // A field is also 0 when the dump lacks it, so look for its entry.
   std::unordered_set<std::string_view> names;
-  EntryGroups groups(statistics);
-  while (const auto group = groups.Take()) names.insert(group->base);
+  for (EntryIterator next = statistics.begin(); const auto group = TakeGroup(&next);) {
+    names.insert(group->base);
+  }
   return fleet::Summarise(statistics.summary(),
                           [&](std::string_view name) { return names.contains(name); });
 }

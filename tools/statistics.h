@@ -133,17 +133,8 @@ struct EntryGroup {
   }
 };
 
-// Returns the entries of statistics in their order, in groups.
-class EntryGroups {
- public:
-  explicit EntryGroups(const Statistics &statistics) : next_(statistics.begin()) {}
-
-  // The next group; nothing after the last.
-  std::optional<EntryGroup> Take();
-
- private:
-  EntryIterator next_;
-};
+// Takes the next group of entries, and goes on to what follows it; nothing after the last one.
+std::optional<EntryGroup> TakeGroup(EntryIterator *next);
 
 // The summary fields that the dump has, in the order of KVRStatsCxt, then the write amplification.
 std::vector<fleet::Figure> SummaryOf(const Statistics &statistics);

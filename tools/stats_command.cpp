@@ -40,10 +40,10 @@ void PrintLabel(Output &output, std::string_view label, size_t width) {
 // Prints each group, so each array, in one line.
 void PrintGroups(Output &output, const Statistics &statistics) {
   size_t width = 0;
-  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+  for (EntryIterator next = statistics.begin(); const auto group = TakeGroup(&next);) {
     width = std::max(width, LabelLength(*group));
   }
-  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+  for (EntryIterator next = statistics.begin(); const auto group = TakeGroup(&next);) {
     if (group->IsArray()) {
       PrintLabel(output, fmt::format("{}[0..{}]", group->base, group->count - 1), width);
     } else {
@@ -106,7 +106,7 @@ void PrintJsonSummary(Json &json, const Statistics &statistics) {
 void PrintJsonEntries(Json &json, const Statistics &statistics) {
   json.Key("entries");
   json.BeginArray();
-  for (EntryGroups groups(statistics); const auto group = groups.Take();) {
+  for (EntryIterator next = statistics.begin(); const auto group = TakeGroup(&next);) {
     json.BeginObject();
     json.Key("name");
     json.PlainText(group->base);
