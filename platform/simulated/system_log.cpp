@@ -162,8 +162,6 @@ bool StandardErrorIsTheJournal() {
 class Log {
  public:
   explicit Log(bool enabled) : enabled_(enabled) {}
-  Log(const Log &) = delete;
-  Log &operator=(const Log &) = delete;
 
   // Lines that still wait have a second.
   ~Log() {
