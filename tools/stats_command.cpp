@@ -24,9 +24,8 @@ struct Options : StreamOptions {
 
 // The length of the label of a group: "name", or "name[0..9]" for an array.
 size_t LabelLength(const EntryGroup &group) {
-  if (!group.IsArray()) return group.base.size();
-  return group.base.size() + std::string_view("[0..]").size() +
-         std::to_string(group.count - 1).size();
+  return group.base.size() +
+         (group.IsArray() ? fmt::formatted_size("[0..{}]", group.count - 1) : 0);
 }
 
 // Each label stands left in the width of the longest one.
