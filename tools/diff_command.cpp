@@ -81,15 +81,14 @@ Status Diff(const Options &options) {
 void AddDiff(CLI::App &app, Action *action) {
   CLI::App *command = app.add_subcommand("diff", "Print what changed between two dumps");
   const auto options = std::make_shared<Options>();
-  const auto seconds = std::make_shared<double>(0);
   AddStream(command, &options->stream);
   AddNames(command, &options->names);
   command->add_option("OLD", options->oldFile, "The earlier dump")->required()->type_name("");
   command->add_option("NEW", options->newFile, "The later dump; one may be - for standard input")
       ->required()
       ->type_name("");
-  CLI::Option *time = AddSeconds(command, "--seconds", seconds.get(), 0,
-                                 "The time between them, for rates; else by their calendarTime");
+  AddSeconds(command, "--seconds", &options->seconds, 0,
+             "The time between them, for rates; else by their calendarTime");
   command->add_flag("--all", options->all, "List also what did not change");
   AddController(command, &options->className, "Where the dumps are from");
   AddFormat(command, &options->format, {Format::kNormal, Format::kJson, Format::kCsv});
@@ -98,10 +97,7 @@ void AddDiff(CLI::App &app, Action *action) {
     if (options->oldFile == "-" && options->newFile == "-") {
       throw CLI::ValidationError("OLD, NEW", "standard input can be read only once");
     }
-    if (time->count() > 0) {
-      if (*seconds == 0) throw CLI::ValidationError("--seconds", "no time has passed");
-      options->seconds = *seconds;
-    }
+    if (options->seconds == 0) throw CLI::ValidationError("--seconds", "no time has passed");
     *action = [=] { return Diff(*options); };
   });
 }

@@ -80,17 +80,16 @@ void AddWrite(CLI::App *command, std::string *file, const std::string &descripti
   command->add_option_function<std::string>("-w,--write", take, description)->type_name("FILE");
 }
 
-CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds, double least,
-                        const std::string &description) {
+void AddSeconds(CLI::App *command, const std::string &name, std::optional<double> *seconds,
+                double least, const std::string &description) {
   const auto take = [=](const std::string &text) {
-    const std::optional<double> value = ParseSeconds(text);
-    if (!value || *value < least) {
+    *seconds = ParseSeconds(text);
+    if (!*seconds || **seconds < least) {
       throw CLI::ValidationError(
           name, fmt::format("{} is not a number of seconds from {} to 1000000000", text, least));
     }
-    *seconds = *value;
   };
-  return command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
+  command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
 }
 
 void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,

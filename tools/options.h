@@ -49,8 +49,8 @@ void AddController(CLI::App *command, std::string *className, const std::string 
 void AddWrite(CLI::App *command, std::string *file, const std::string &description);
 
 // A number of seconds, at least `least`, with or without a fraction.
-CLI::Option *AddSeconds(CLI::App *command, const std::string &name, double *seconds, double least,
-                        const std::string &description);
+void AddSeconds(CLI::App *command, const std::string &name, std::optional<double> *seconds,
+                double least, const std::string &description);
 
 // A whole number from `least` to `most`.
 void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,

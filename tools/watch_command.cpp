@@ -23,7 +23,7 @@ using std::chrono::steady_clock;
 using std::chrono::system_clock;
 
 struct Options : StreamOptions {
-  double every = 5;
+  std::optional<double> every = 5;
   uint64_t count = UINT64_MAX;  // of readings after the first
   bool all = false;
   bool redraw = true;
@@ -166,7 +166,7 @@ class Watcher {
 Status Watch(const Options &options) {
   Watcher watcher(options);
   const auto every = std::chrono::duration_cast<steady_clock::duration>(
-      std::chrono::duration<double>(options.every));
+      std::chrono::duration<double>(*options.every));
   auto next = steady_clock::now();
   for (uint64_t count = 0; watcher.Read() && count < options.count; ++count) {
     next = std::max(next + every, steady_clock::now());
