@@ -33,10 +33,7 @@ class DumpReader {
  private:
   void Grow();
 
-  struct Free {
-    void operator()(char *bytes) const { std::free(bytes); }
-  };
-  std::unique_ptr<char, Free> buffer_;
+  std::unique_ptr<char, void (*)(void *)> buffer_{nullptr, std::free};
   size_t capacity_ = 0;
 };
 

@@ -46,7 +46,7 @@ int ListFolder(const std::string &path, std::vector<std::string> *names) {
 }  // namespace
 
 FileList::FileList(std::vector<std::string> names, std::FILE *list, char end)
-    : names_(std::move(names)), list_(list), end_(end) {}
+    : names_(std::move(names)), list_(list, std::fclose), end_(end) {}
 
 bool FileList::Next(ListedFile *file) {
   *file = {};

@@ -41,9 +41,6 @@ class FileList {
     uint64_t device = 0;
     uint64_t inode = 0;
   };
-  struct CloseFile {
-    void operator()(std::FILE *file) const { std::fclose(file); }
-  };
 
   bool NextName(std::string *name);
   bool Enter(const std::string &path, ListedFile *file);
@@ -51,7 +48,7 @@ class FileList {
 
   std::vector<std::string> names_;
   size_t next_ = 0;
-  std::unique_ptr<std::FILE, CloseFile> list_;
+  std::unique_ptr<std::FILE, int (*)(std::FILE *)> list_;
   char end_;
   std::string listFault_;
   std::vector<Folder> folders_;
