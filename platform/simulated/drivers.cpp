@@ -56,17 +56,9 @@ struct Handle {
   HandleKind kind;
   Device *device;
 };
-using Handles = std::map<uint32_t, Handle>;
 
 const char *NameOf(HandleKind kind) {
   return kind == HandleKind::kService ? "service" : "connection";
-}
-
-// Memory for one handle.
-Handles::node_type MakeRoom() {
-  Handles one;
-  one[0] = {};
-  return one.extract(0);
 }
 
 // The library has such a function too, but a platform may include only the contract.
@@ -100,12 +92,12 @@ class Drivers {
     }
   }
 
-  uint32_t Find(const std::string &className, Handles::node_type room) {
+  uint32_t Find(const std::string &className) {
     const std::lock_guard lock(mutex_);
     for (Device &device : devices_) {
       if (device.controller->className != className) continue;
       if (device.controller->vanish.Hits(++device.lookups)) return 0;
-      return Issue(std::move(room), {HandleKind::kService, &device});
+      return Issue({HandleKind::kService, &device});
     }
     return 0;
   }
@@ -117,7 +109,7 @@ class Drivers {
     if (device == nullptr) return kBadHandle;
     if (device->controller->refuseOpen.Hits(++device->opens)) return kRefused;
     if (type != 0) return kBadArgument;
-    *connection = Issue(MakeRoom(), {HandleKind::kConnection, device});
+    *connection = Issue({HandleKind::kConnection, device});
     return kSuccess;
   }
 
@@ -211,11 +203,9 @@ class Drivers {
   }
 
   // Numbers are never used twice, so that a late use of a handle cannot hit another one.
-  uint32_t Issue(Handles::node_type room, Handle handle) {
-    room.key() = ++lastHandle_;
-    room.mapped() = handle;
-    open_.insert(std::move(room));
-    return lastHandle_;
+  uint32_t Issue(Handle handle) {
+    open_.emplace(lastHandle_ + 1, handle);
+    return ++lastHandle_;
   }
 
   // Null for a handle that is not open, after a line on standard error. 0 means no handle and is
@@ -234,7 +224,7 @@ class Drivers {
 
   std::mutex mutex_;
   std::vector<Device> devices_;
-  Handles open_;
+  std::map<uint32_t, Handle> open_;
   uint32_t lastHandle_ = 0;
 };
 
@@ -254,23 +244,22 @@ Answer OrFailure(Answer failure, Function answer) {
 using simulated::Drivers;
 using simulated::OrFailure;
 
-// It holds the memory for the handle already: only making the request can fail for lack of memory.
 struct MatchingRequest {
   std::string className;
-  simulated::Handles::node_type room;
 };
 
 MatchingRequest *ServiceMatching(const char *className) {
   return OrFailure<MatchingRequest *>(nullptr, [=]() -> MatchingRequest * {
     if (className == nullptr) return nullptr;
     Drivers::Instance();
-    return new MatchingRequest{className, simulated::MakeRoom()};
+    return new MatchingRequest{className};
   });
 }
 
 uint32_t GetMatchingService(MatchingRequest *request) {
   const std::unique_ptr<MatchingRequest> owned(request);
-  return owned == nullptr ? 0 : Drivers::Instance().Find(owned->className, std::move(owned->room));
+  if (owned == nullptr) return 0;
+  return OrFailure<uint32_t>(0, [&] { return Drivers::Instance().Find(owned->className); });
 }
 
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
