@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 
 #include <algorithm>
+#include <cctype>
 #include <chrono>
 #include <map>
 #include <memory>
@@ -204,14 +205,11 @@ Label SplitLabel(const std::string &text) {
                                         "controller", "version", "platform"};
   const size_t split = text.find('=');
   const std::string key = text.substr(0, split);
-  const auto isLetter = [](char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
-  };
-  const bool good =
-      split != std::string::npos && !key.empty() && isLetter(key.front()) &&
-      !key.starts_with("__") &&
-      std::ranges::all_of(key, [&](char c) { return isLetter(c) || (c >= '0' && c <= '9'); });
-  if (!good) throw CLI::ValidationError("--label", text + " is not of the form KEY=VALUE");
+  const auto isWord = [](unsigned char c) { return c == '_' || std::isalnum(c) != 0; };
+  if (split == std::string::npos || key.empty() || key.starts_with("__") ||
+      !std::ranges::all_of(key, isWord) || std::isdigit(key.front()) != 0) {
+    throw CLI::ValidationError("--label", text + " is not of the form KEY=VALUE");
+  }
   if (std::ranges::find(kOurs, key) != std::end(kOurs)) {
     throw CLI::ValidationError("--label", key + " is a label already");
   }
