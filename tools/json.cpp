@@ -22,12 +22,8 @@ Json::Json(Output &output, std::string_view command, const std::vector<Source> &
   Key("source");
   BeginObject();
   for (const Source &source : sources) {
-    if (source.kind == "controller" && source.name.empty()) {
-      Key(source.kind);
-      Null();
-    } else {
-      Member(source.kind, source.name);
-    }
+    Key(source.kind);
+    source.kind == "controller" && source.name.empty() ? Null() : Text(source.name);
   }
   EndObject();
 }
