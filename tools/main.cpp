@@ -31,11 +31,6 @@ Status Print(const std::string &text) {
   return output.Finish(kGood);
 }
 
-Status RefuseUsage(const std::string &reason, const std::string &help = "--help") {
-  ComplainOfUsage(reason, help);
-  return kBadUsage;
-}
-
 const CLI::App *FindCommand(const CLI::App &app, const std::string &name) {
   const auto found =
       app.get_subcommands([&](const CLI::App *command) { return command->get_name() == name; });

@@ -53,8 +53,9 @@ void Note(const std::string &subject, const std::string &reason) {
   Print("note", subject + ": " + reason);
 }
 
-void ComplainOfUsage(const std::string &reason, const std::string &help) {
+Status RefuseUsage(const std::string &reason, const std::string &help) {
   Print("error", reason + " (see morwick " + help + ")");
+  return kBadUsage;
 }
 
 ProgressLine::ProgressLine(bool isShown, milliseconds delay)

@@ -23,9 +23,9 @@ enum Status {
 void Complain(const std::string &subject, const std::string &reason);
 void Note(const std::string &subject, const std::string &reason);
 
-// Complains of wrong arguments; `help` are the arguments with which morwick explains the right
-// ones.
-void ComplainOfUsage(const std::string &reason, const std::string &help);
+// Complains of wrong arguments, and returns the status for them; `help` are the arguments with
+// which morwick explains the right ones.
+Status RefuseUsage(const std::string &reason, const std::string &help = "--help");
 
 // Complaints of one kind. A hostile file causes millions of them, so the first few are printed and
 // the others are counted.
