@@ -2,8 +2,6 @@
 
 #include "fleet/judge.h"
 
-#include <algorithm>
-
 namespace fleet {
 namespace {
 

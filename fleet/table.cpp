@@ -10,7 +10,6 @@
 #include <mutex>
 #include <new>
 #include <optional>
-#include <system_error>
 #include <utility>
 
 #include "fleet/dump.h"

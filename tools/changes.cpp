@@ -2,7 +2,6 @@
 
 #include "tools/changes.h"
 
-#include <algorithm>
 #include <cmath>
 #include <new>
 #include <unordered_map>

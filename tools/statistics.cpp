@@ -4,7 +4,6 @@
 
 #include <fmt/format.h>
 
-#include <algorithm>
 #include <cerrno>
 #include <cstddef>
 #include <unordered_set>

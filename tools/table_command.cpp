@@ -14,7 +14,6 @@
 #include <cstring>
 #include <memory>
 #include <new>
-#include <optional>
 
 #include "fleet/table.h"
 #include "tools/commands.h"

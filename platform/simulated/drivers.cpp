@@ -145,8 +145,8 @@ class Drivers {
     const uint32_t command = LoadWord(request, 0);
     const uint32_t argument = LoadWord(request, 4);
     if (command == kTaskScheduler) return DoUnit(device, argument, reply, room, replySize);
-    if (std::any_of(kBuffers.begin(), kBuffers.end(),
-                    [&](const Buffer &buffer) { return buffer.command == command; })) {
+    if (std::ranges::any_of(kBuffers,
+                            [&](const Buffer &each) { return each.command == command; })) {
       return Read(device, command, argument, reply, room, replySize);
     }
     return kBadArgument;
