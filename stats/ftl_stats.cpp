@@ -11,17 +11,9 @@ namespace {
 
 using Rules = StreamRules<kMorwickFTL>;
 
-// Adds the value of a scalar. It is counted even when memory was refused for it.
-void AddScalar(GenericParserCxt *ctx, const KnownRecord &record) {
-  const MorwickKey &key = record.key;
-  const uint64_t value = LoadLittleEndian64(record.values);
-  if (AppendEntry(ctx, EntryName(NameOf(key)), value) != nullptr) return;
-  SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u) cannot add 1 element to context", key.name,
-                     key.id);
-}
-
-// Adds the elements of an array. False when memory was refused for one of them.
-bool AddArray(GenericParserCxt *ctx, const KnownRecord &record) {
+// Adds the values of a record. False when memory was refused for an element of an array. A scalar
+// is counted even then.
+bool AddRecord(GenericParserCxt *ctx, const KnownRecord &record) {
   const MorwickKey &key = record.key;
   if (Rules::LengthDiffers(key, record.length)) {
     SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u): (#%u) cfg elements != (%d) buffer elements",
@@ -30,6 +22,11 @@ bool AddArray(GenericParserCxt *ctx, const KnownRecord &record) {
   }
   const EntryName name(NameOf(key), Rules::Separator(key));
   if (AppendElements(ctx, name, record.values, Rules::kValueWidth, record.valueCount)) return true;
+  if (key.valueCount == 1) {
+    SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u) cannot add 1 element to context", key.name,
+                       key.id);
+    return true;
+  }
   SetAPIErrorMessage("KVRFTLParseBufferToCxt: %s(%u): Cannot add %u elements to context", key.name,
                      key.id, key.valueCount);
   return false;
@@ -42,11 +39,7 @@ uint32_t KVRFTLParseBufferToCxt(GenericParserCxt *ctx, const void *buffer, uint3
   if (buffer == nullptr) return 0;
   uint32_t count = 0;
   morwick::ForEachKnownRecord<kMorwickFTL>(buffer, size, [&](const morwick::KnownRecord &record) {
-    if (record.key.valueCount == 1) {
-      morwick::AddScalar(ctx, record);
-    } else if (!morwick::AddArray(ctx, record)) {
-      return false;
-    }
+    if (!morwick::AddRecord(ctx, record)) return false;
     count += record.valueCount;
     return true;
   });
