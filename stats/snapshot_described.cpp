@@ -21,30 +21,10 @@ static_assert(offsetof(SnapshotFieldDescriptor, format) == 12);
 namespace morwick {
 namespace {
 
-// The header's own numbers.
-struct HeaderNumbers {
-  uint32_t formatVersion;
-  uint32_t recordSize;
-  uint32_t recordCount;
-
-  explicit HeaderNumbers(const uint8_t *header)
-      : formatVersion(LoadLittleEndian32(header + offsetof(SnapshotHeader, formatVersion))),
-        recordSize(LoadLittleEndian32(header + offsetof(SnapshotHeader, recordSize))),
-        recordCount(LoadLittleEndian32(header + offsetof(SnapshotHeader, recordCount))) {}
-
-  // The index of the record that ends the rendering, the header's last or the first one that does
-  // not lie in the snapshot whole. It is not printed itself.
-  uint32_t LastRecord(uint64_t snapshotSize) const {
-    const uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
-    if (recordSize == 0) return last;
-    return static_cast<uint32_t>(std::min<uint64_t>(last, snapshotSize / recordSize));
-  }
-};
-
 // Of the header's text no more is looked at than the capacity holds.
-bool AppendBanner(BoundedWriter &writer, const HeaderNumbers &numbers, const char *text,
+bool AppendBanner(BoundedWriter &writer, uint32_t formatVersion, const char *text,
                   uint64_t capacity) {
-  if (numbers.formatVersion < kSnapshotFirstTextVersion) return writer.Append(kSnapshotLegend);
+  if (formatVersion < kSnapshotFirstTextVersion) return writer.Append(kSnapshotLegend);
   return writer.Append("- KVR Snapshot - \n") && writer.Append({text, strnlen(text, capacity)}) &&
          writer.Append("\n");
 }
@@ -121,21 +101,26 @@ struct Rendered {
 
 Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *header,
                 uint64_t capacity, BoundedWriter &writer, uint32_t *state) {
-  const HeaderNumbers numbers(header);
+  const auto number = [=](size_t offset) { return LoadLittleEndian32(header + offset); };
+  const uint32_t formatVersion = number(offsetof(SnapshotHeader, formatVersion));
+  const uint32_t recordSize = number(offsetof(SnapshotHeader, recordSize));
+  const uint32_t recordCount = number(offsetof(SnapshotHeader, recordCount));
   const auto *text = reinterpret_cast<const char *>(header) + sizeof(SnapshotHeader);
-  if (*state == 0 && !AppendBanner(writer, numbers, text, capacity)) return {0, false};
-  const uint32_t last = numbers.LastRecord(snapshotSize);
+  if (*state == 0 && !AppendBanner(writer, formatVersion, text, capacity)) return {0, false};
+  // The index of the record that ends the rendering, the header's last or the first one that does
+  // not lie in the snapshot whole. It is not printed itself.
+  uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
+  if (recordSize > 0)
+    last = static_cast<uint32_t>(std::min<uint64_t>(last, snapshotSize / recordSize));
   // Records too short for any number are empty, whatever the table says.
-  if (numbers.recordSize < kNumberSize) *state = std::max(*state, last);
+  if (recordSize < kNumberSize) *state = std::max(*state, last);
   if (*state >= last) return {0, true};
 
   // Only now: where no record is left the header needs no descriptor table.
   const DescriptorTable table(header);
   // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
   if (!table.TellsEmptyRecords()) *state = last;
-  const auto recordAt = [&](uint32_t index) {
-    return snapshot + uint64_t{numbers.recordSize} * index;
-  };
+  const auto recordAt = [&](uint32_t index) { return snapshot + uint64_t{recordSize} * index; };
   while (*state < last && table.IsEmpty(recordAt(*state))) ++*state;
   if (*state >= last) return {0, true};
 
