@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "morwick/morwick.h"
+#include "stats/snapshot_legend.h"
 #include "stats/snapshot_lines.h"
 
 namespace {
@@ -36,16 +37,6 @@ const std::vector<SnapshotRecord> &Records() {
     return made;
   }();
   return records;
-}
-
-const std::string &Legend() {
-  static const std::string legend = [] {
-    char text[2000];
-    uint64_t size = sizeof text;
-    KVRParseSnapshotBuffer(nullptr, 0, text, &size);
-    return std::string(text, size - 1);
-  }();
-  return legend;
 }
 
 // Writes pieces as the plain version does: each bounded, each one snprintf.
@@ -83,7 +74,7 @@ void PlainPriorities(PlainWriter &writer, const SnapshotOperations *operations,
 
 size_t PlainFixed(char *output, size_t capacity) {
   PlainWriter writer(output, capacity);
-  writer.Append("%s", Legend().c_str());
+  writer.Append("%s", morwick::kSnapshotLegend.data());
   for (uint32_t i = 0; i < kRecords; ++i) {
     const SnapshotRecord &r = Records()[i];
     writer.Append(kHead, r.timestamp, r.erasedBands, r.hostReads, r.hostWrites, r.nandReads,
@@ -108,7 +99,7 @@ size_t PlainFixed(char *output, size_t capacity) {
 
 // The columns one by one: compiled formats of many arguments take six times as long.
 size_t FmtFixed(char *output, size_t) {
-  char *end = fmt::format_to(output, FMT_COMPILE("{}"), Legend());
+  char *end = fmt::format_to(output, FMT_COMPILE("{}"), morwick::kSnapshotLegend);
 #define PRINT(format, value) end = fmt::format_to(end, FMT_COMPILE(format), value)
 #define PRINT_PRIORITIES(label, width, operations, value)       \
   PRINT(" " label "={:" width "}", record.operations[0].value); \
