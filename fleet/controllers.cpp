@@ -70,9 +70,7 @@ int32_t Open(uint32_t service, uint32_t *connection) {
 }
 
 Reply ReadBuffer(uint32_t connection, const NandExporter &row, const BufferKind &kind) {
-  if (row.*kind.selectors == nullptr) {
-    return {std::nullopt, "this controller does not offer it", std::nullopt};
-  }
+  if (row.*kind.selectors == nullptr) return {.fault = "this controller does not offer it"};
   MorwickBuffer buffer;
   const MorwickReadResult result =
       MorwickReadBuffer(connection, &row, (row.*kind.selectors)(), &buffer);
@@ -82,13 +80,13 @@ Reply ReadBuffer(uint32_t connection, const NandExporter &row, const BufferKind 
     case kMorwickRead: break;
     case kMorwickReadNoMemory: throw std::bad_alloc();
     case kMorwickReadFailed:
-      return {std::nullopt, "reading failed, result " + Hexadecimal(buffer.result), buffer.result};
+      return {.fault = "reading failed, result " + Hexadecimal(buffer.result),
+              .result = buffer.result};
     case kMorwickReadTooLarge:
-      return {std::nullopt,
-              "reading failed, the reply fills " + std::to_string(kMorwickLargestReply) + " bytes",
-              std::nullopt};
+      return {.fault = "reading failed, the reply fills " + std::to_string(kMorwickLargestReply) +
+                       " bytes"};
   }
-  return {std::string(static_cast<const char *>(buffer.bytes), buffer.size), "", std::nullopt};
+  return {.bytes = std::string(static_cast<const char *>(buffer.bytes), buffer.size)};
 }
 
 }  // namespace fleet

@@ -50,9 +50,9 @@ int32_t Open(uint32_t service, uint32_t *connection);
 
 // A buffer, or why it could not be read, with the driver's result if it is the driver that refused.
 struct Reply {
-  std::optional<std::string> bytes;
-  std::string fault;
-  std::optional<int32_t> result;
+  std::optional<std::string> bytes = {};
+  std::string fault = {};
+  std::optional<int32_t> result = {};
 };
 
 // Reads a buffer through a connection to the row's driver. Throws std::bad_alloc.

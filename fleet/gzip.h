@@ -24,8 +24,6 @@ class GzipReader {
  public:
   explicit GzipReader(ReadBytes read);
   ~GzipReader();
-  GzipReader(const GzipReader &) = delete;
-  GzipReader &operator=(const GzipReader &) = delete;
 
   // Bytes before a fault are returned by earlier calls.
   ReadResult Read(char *bytes, size_t room);
