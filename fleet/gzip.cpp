@@ -22,6 +22,7 @@ struct GzipReader::Inflation {
   std::array<unsigned char, kBlock> packed;
   z_stream stream = {};
   bool inMember = true;
+  bool damaged = false;
 
   Inflation() {
     if (inflateInit2(&stream, kGzipOnly) != Z_OK) throw std::bad_alloc();
@@ -65,6 +66,7 @@ ReadResult GzipReader::Inflate(char *bytes, size_t room) {
   stream.next_out = reinterpret_cast<unsigned char *>(bytes);
   stream.avail_out = static_cast<uInt>(room);
   while (stream.avail_out == room) {
+    if (inflation.damaged) return {0, "the gzip data is damaged"};
     if (stream.avail_in == 0) {
       ReadResult more = read_(reinterpret_cast<char *>(inflation.packed.data()), kBlock);
       if (!more.fault.empty()) return more;
@@ -89,10 +91,8 @@ ReadResult GzipReader::Inflate(char *bytes, size_t room) {
     const int result = inflate(&stream, Z_NO_FLUSH);
     if (result == Z_MEM_ERROR) throw std::bad_alloc();
     if (result == Z_STREAM_END) inflation.inMember = false;
-    // The bytes before the fault are returned first. The next call fails in the same way.
-    const bool failed = result != Z_OK && result != Z_STREAM_END;
-    if (failed && stream.avail_out == room) return {0, "the gzip data is damaged"};
-    if (failed) break;
+    // The bytes before the fault are returned first.
+    inflation.damaged = result != Z_OK && result != Z_STREAM_END;
   }
   return {room - stream.avail_out, ""};
 }

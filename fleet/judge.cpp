@@ -38,6 +38,7 @@ std::string_view FormatOf(std::string_view data) {
       {"\x28\xb5\x2f\xfd", "zstd"},
       {std::string_view("\xfd\x37\x7a\x58\x5a\0", 6), "xz"},
       {"BZh", "bzip2"},
+      {"\x1f\x8b", "gzip"},  // packed twice
       {"PK\x03\x04", "zip"}};
   for (const auto &[begin, name] : kFormats) {
     if (data.starts_with(begin)) return name;

@@ -142,9 +142,13 @@ class Table::OrderedBatches {
       isWanted_.wait(lock, [&] { return stopped_ || taken_ < handedOut_ + made_.size(); });
       if (stopped_ || listEnded_) return false;
     }
-    ListedFile file;
-    while (batch->files.size() < options_.batchSize && list_.Next(&file)) {
-      batch->files.push_back(std::move(file));
+    try {
+      for (ListedFile file; batch->files.size() < options_.batchSize && list_.Next(&file);) {
+        batch->files.push_back(std::move(file));
+      }
+    } catch (const std::bad_alloc &) {
+      Stop(true);  // while the list is locked: another thread would go on after the lost names
+      return false;
     }
     const std::lock_guard lock(mutex_);
     listEnded_ = batch->files.size() < options_.batchSize;

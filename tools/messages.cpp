@@ -37,8 +37,8 @@ void Keep(std::string_view severity, std::string_view text) {
 }
 
 void Print(std::string_view severity, const std::string &text) {
-  ++linesPrinted;
   const bool terminal = isatty(STDERR_FILENO) != 0;
+  if (terminal) ++linesPrinted;
   std::fprintf(stderr, "morwick: %s\n", terminal ? PrintableLine(text).c_str() : text.c_str());
   Keep(severity, text);
 }

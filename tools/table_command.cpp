@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
 #include <charconv>
 #include <chrono>
@@ -14,6 +15,7 @@
 #include <cstring>
 #include <memory>
 #include <new>
+#include <thread>
 
 #include "fleet/table.h"
 #include "tools/commands.h"
@@ -82,15 +84,22 @@ fleet::FileList FilesOf(const Options &options, std::FILE *list) {
   return fleet::FileList(options.files, list, options.endedByNul ? '\0' : '\n');
 }
 
-// Counts the files by going through all names, so that none is kept in memory. Returns " of 7", or
-// nothing when the names can be read only once.
-std::string OfTotal(const Options &options) {
+// Counts the files by going through all names, so that none is kept in memory. That takes time, so
+// a thread does it beside the others. `total` stays 0 when the names can be read only once.
+std::jthread CountFiles(const Options &options, std::atomic<uint64_t> *total) {
   std::FILE *list = nullptr;
-  if (options.list == "-" || !OpenList(options, &list)) return "";
-  fleet::FileList files = FilesOf(options, list);
-  uint64_t count = 0;
-  for (fleet::ListedFile file; files.Next(&file);) ++count;
-  return fmt::format(" of {}", count);
+  if (options.list == "-" || !OpenList(options, &list)) return {};
+  return std::jthread([files = FilesOf(options, list), total](const std::stop_token &stop) mutable {
+    uint64_t count = 0;
+    try {
+      for (fleet::ListedFile file; files.Next(&file); ++count) {
+        if (stop.stop_requested()) return;
+      }
+    } catch (const std::bad_alloc &) {  // those who read will say so
+      return;
+    }
+    *total = count;
+  });
 }
 
 void PrintHeading(Output &output, const fleet::Selection &selection) {
@@ -127,10 +136,12 @@ bool WriteRows(Output &output, const fleet::Batch &batch) {
 
 // Prints the rows when they are ready, until a signal or a reader that has gone away ends the
 // output early. Complains when the list of names ended early.
-Status PrintRows(const Options &options, std::FILE *list, const std::string &ofTotal,
-                 bool showProgress, Output &output) {
+Status PrintRows(const Options &options, std::FILE *list, bool showProgress, Output &output) {
   using Got = fleet::Table::Got;
   fleet::Table table(options.table, FilesOf(options, list));
+  std::atomic<uint64_t> total = 0;
+  const std::jthread counting =
+      showProgress && options.table.batchSize > 1 ? CountFiles(options, &total) : std::jthread();
   ProgressLine progress(showProgress, milliseconds(300));
   uint64_t dumps = 0;
   uint64_t faults = 0;
@@ -139,6 +150,7 @@ Status PrintRows(const Options &options, std::FILE *list, const std::string &ofT
     std::unique_ptr<fleet::Batch> batch;
     got = table.Next(&batch, milliseconds(0));
     if (progress.IsDue()) {
+      const std::string ofTotal = total == 0 ? "" : fmt::format(" of {}", total.load());
       fmt::print(stderr, "\r\033[Kmorwick: dumps read: {}{}, with a fault: {}", dumps, ofTotal,
                  faults);
     }
@@ -162,16 +174,20 @@ Status PrintRows(const Options &options, std::FILE *list, const std::string &ofT
 Status PrintTable(Options options) {
   std::FILE *list = nullptr;
   if (!OpenList(options, &list)) return kBadUsage;
-  const bool isPipe = IsPipe(list);
-  if (isPipe) options.table.batchSize = 1;
+  if (IsPipe(list)) options.table.batchSize = 1;
   const bool showProgress = isatty(STDERR_FILENO) != 0 && !OutputIsTerminal();
-  const std::string ofTotal = showProgress && !isPipe ? OfTotal(options) : "";
   StopSignals signals;
   Output output;
   PrintHeading(output, *options.table.selection);
   output.Flush();
   KeepThreadsSmall();
-  const Status status = PrintRows(options, list, ofTotal, showProgress, output);
+  Status status = kBadData;
+  try {
+    status = PrintRows(options, list, showProgress, output);
+  } catch (const std::bad_alloc &) {
+    output.Flush();  // the last row would be cut
+    throw;
+  }
   if (StopSignals::Stopped() != 0) {
     output.Flush();
     StopSignals::EndProcess();
