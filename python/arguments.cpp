@@ -2,8 +2,12 @@
 
 #include "python/arguments.h"
 
+#include <pybind11/numpy.h>
+
+#include <algorithm>
 #include <string>
 
+#include "fleet/dump.h"
 #include "fleet/streams.h"
 
 namespace python {
@@ -11,10 +15,23 @@ namespace {
 
 std::string TypeOf(py::handle object) { return Py_TYPE(object.ptr())->tp_name; }
 
-void RequireBuffer(py::handle object, const char *name) {
-  if (PyObject_CheckBuffer(object.ptr()) != 0) return;
-  throw py::type_error(std::string(name) + " must be an object with a buffer, not " +
-                       TypeOf(object));
+// Whether items of that format are numbers or bytes, or records of them, in the words of Python's
+// module struct. The names of a record's fields stand between colons.
+bool IsPlain(std::string_view format) {
+  constexpr std::string_view kPlain = "?cbBhHiIlLqQnNefdgspxT{}:()0123456789, @=<>!^";
+  bool isName = false;
+  return std::all_of(format.begin(), format.end(), [&](char c) {
+    if (c == ':') isName = !isName;
+    return isName || kPlain.find(c) != std::string_view::npos;
+  });
+}
+
+// NumPy has no format for records whose fields overlap or are not in order, as a header may have
+// them; but it knows whether there are pointers in them.
+bool IsPlainRecords(py::handle object) {
+  if (!py::isinstance<py::array>(object)) return false;
+  const py::dtype type = py::reinterpret_borrow<py::array>(object).dtype();
+  return type.kind() == 'V' && !type.attr("hasobject").cast<bool>();
 }
 
 }  // namespace
@@ -23,10 +40,10 @@ std::string AsString(py::handle object, const char *name) {
   if (!py::isinstance<py::str>(object)) {
     throw py::type_error(std::string(name) + " must be a str, not " + TypeOf(object));
   }
-  Py_ssize_t size = 0;
-  const char *text = PyUnicode_AsUTF8AndSize(object.ptr(), &size);
-  if (text == nullptr) throw py::error_already_set();
-  return {text, static_cast<size_t>(size)};
+  const auto text = py::reinterpret_steal<py::bytes>(
+      PyUnicode_AsEncodedString(object.ptr(), "utf-8", "backslashreplace"));
+  if (!text) throw py::error_already_set();
+  return std::string(ViewOf(text));
 }
 
 MorwickStream AsStream(py::handle stream) {
@@ -36,21 +53,39 @@ MorwickStream AsStream(py::handle stream) {
   return *found;
 }
 
-py::bytes AsBytes(py::handle object, const char *name) {
+py::bytes AsBytes(py::handle object, const char *name, size_t most) {
+  Buffer buffer(object, name, PyBUF_INDIRECT);
+  if (buffer.size() > most) {
+    throw py::value_error(std::string(name) + " is " + fleet::TooLarge(most));
+  }
   if (PyBytes_CheckExact(object.ptr())) return py::reinterpret_borrow<py::bytes>(object);
-  RequireBuffer(object, name);
-  auto copy = py::reinterpret_steal<py::bytes>(PyBytes_FromObject(object.ptr()));
-  if (!copy) throw py::error_already_set();
-  return copy;
+  return buffer.Copy();
 }
 
-Buffer::Buffer(py::handle object, const char *name) {
-  RequireBuffer(object, name);
-  if (PyObject_GetBuffer(object.ptr(), &view_, PyBUF_SIMPLE) == 0) return;
-  if (PyErr_ExceptionMatches(PyExc_MemoryError) != 0) throw py::error_already_set();
-  // The cause stays attached, such as a view that was released.
-  py::raise_from(PyExc_BufferError, (std::string(name) + " gives no contiguous buffer").c_str());
-  throw py::error_already_set();
+Buffer::Buffer(py::handle object, const char *name, int flags) {
+  const std::string named = name;
+  if (PyObject_CheckBuffer(object.ptr()) == 0) {
+    throw py::type_error(named + " must be an object with a buffer, not " + TypeOf(object));
+  }
+  if (!IsPlainRecords(object)) flags |= PyBUF_FORMAT;
+  if (PyObject_GetBuffer(object.ptr(), &view_, flags) != 0) {
+    if (PyErr_ExceptionMatches(PyExc_MemoryError) != 0) throw py::error_already_set();
+    py::error_already_set cause;  // such as a view that was released
+    const std::string why = named + ": " + std::string(py::str(cause.value()));
+    py::raise_from(cause, PyExc_BufferError, why.c_str());
+    throw py::error_already_set();
+  }
+  if (view_.format == nullptr || IsPlain(view_.format)) return;
+  throw py::type_error(named + " must hold numbers or bytes, not items of the format " +
+                       view_.format);
+}
+
+py::bytes Buffer::Copy() {
+  auto copy = py::reinterpret_steal<py::bytes>(PyBytes_FromStringAndSize(nullptr, view_.len));
+  if (!copy || PyBuffer_ToContiguous(PyBytes_AS_STRING(copy.ptr()), &view_, view_.len, 'C') != 0) {
+    throw py::error_already_set();
+  }
+  return copy;
 }
 
 std::string_view ViewOf(const py::bytes &bytes) {

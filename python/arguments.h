@@ -13,29 +13,35 @@ namespace python {
 
 namespace py = pybind11;
 
-// A str, as UTF-8.
+// A str, as UTF-8; what cannot be said in it is escaped, so that no name is equal to it.
 std::string AsString(py::handle object, const char *name);
 
 // "kvr", "ftl" or "msp".
 MorwickStream AsStream(py::handle stream);
 
-// An object's bytes, copied where they may change.
-py::bytes AsBytes(py::handle object, const char *name);
+// An object's bytes, copied where they may change. More than `most` are refused before that.
+py::bytes AsBytes(py::handle object, const char *name, size_t most);
 
-// The bytes that an object shows, for as long as this lives: meanwhile it cannot be resized.
+// The bytes that an object shows, for as long as this lives: meanwhile it cannot be resized. What
+// holds pointers, such as an array of objects, is refused.
 class Buffer {
  public:
-  Buffer(py::handle object, const char *name);
-  ~Buffer() { PyBuffer_Release(&view_); }
-  Buffer(const Buffer &) = delete;
-  Buffer &operator=(const Buffer &) = delete;
+  // `flags` are those of Python that say how the bytes may lie.
+  Buffer(py::handle object, const char *name, int flags = PyBUF_ND);
 
-  std::string_view bytes() const {
-    return {static_cast<const char *>(view_.buf), static_cast<size_t>(view_.len)};
-  }
+  size_t size() const { return static_cast<size_t>(view_.len); }
+  // Only where they lie one after the other.
+  std::string_view bytes() const { return {static_cast<const char *>(view_.buf), size()}; }
+  py::bytes Copy();
 
  private:
-  Py_buffer view_;
+  struct View : Py_buffer {
+    View() : Py_buffer() {}
+    ~View() { PyBuffer_Release(this); }
+    View(const View &) = delete;
+    View &operator=(const View &) = delete;
+  };
+  View view_;
 };
 
 std::string_view ViewOf(const py::bytes &bytes);

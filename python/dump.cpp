@@ -57,11 +57,10 @@ const MorwickKey *KeyNames::Find(py::handle name) const {
 }
 
 Dump::Dump(py::handle data, py::handle stream)
-    : bytes_(AsBytes(data, "data")),
+    : bytes_(AsBytes(data, "data", UINT32_MAX)),
       stream_(AsStream(stream)),
       names_(KeyNames::Of(stream_)),
       found_(names_.placeCount()) {
-  if (ViewOf(bytes_).size() > UINT32_MAX) throw py::value_error("data is larger than 4 GiB");
   std::optional<py::gil_scoped_release> release;
   if (ViewOf(bytes_).size() >= kWorthUnlocking) release.emplace();
   Walk();

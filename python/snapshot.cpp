@@ -7,7 +7,6 @@
 #include <algorithm>
 #include <string>
 
-#include "fleet/dump.h"
 #include "fleet/snapshot_header.h"
 #include "fleet/snapshot_text.h"
 #include "morwick/snapshot.h"
@@ -36,10 +35,7 @@ struct Layout {
 
 Layout::Layout(py::handle object) : isFixed(object.is_none()) {
   if (isFixed) return;
-  header = ViewOf(AsBytes(object, "header"));
-  if (header.size() > kLargestHeader) {
-    throw py::value_error("header: " + fleet::TooLarge(kLargestHeader));
-  }
+  header = ViewOf(AsBytes(object, "header", kLargestHeader));
   const std::string wrong = fleet::CheckSnapshotHeader(header);
   if (!wrong.empty()) throw py::value_error("header: " + wrong);
   const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);

@@ -30,8 +30,8 @@ And what is in this machine answers for itself:
     ...     c.statistics("kvr")["powerOnHours"]
 
 Dumps, snapshots and headers come from devices and files, and are not trusted: whatever is
-in them, nothing beyond their bytes is read. All functions may be called from several
-threads at once.
+in them, nothing beyond their bytes is read. An argument of a wrong type is a TypeError that
+names it. All functions may be called from several threads at once.
 
 __version__ is the library's version, `platform` the platform that it was built for.
 """
@@ -62,13 +62,12 @@ Path = Union[str, bytes, "os.PathLike[str]", "os.PathLike[bytes]"]
 
 
 class Key(NamedTuple):
-    """A statistic that the library knows."""
+    """A statistic that the library knows. `id` is its number in the dump, `size` how many values
+    it has: 1, or more for an array."""
 
     id: int
-    """Its number in the dump."""
     name: str
     size: int
-    """How many values it has: 1, or more for an array."""
 
 
 def keys(stream: str) -> list[Key]:
@@ -131,8 +130,8 @@ class Statistics(Mapping[str, Any]):
     @property
     def summary(self) -> dict[str, Any]:
         """The main figures of a kvr dump: those of its fields that have a place of their own in
-        the library, and writeAmplification, a float: sectors written to NAND for each one that
-        the host wrote. Empty for the other streams."""
+        the library, as int or array of uint64, and writeAmplification, a float: sectors written
+        to NAND for each one that the host wrote. Empty for the other streams."""
         return _native.summary(self._dump)
 
     @property
@@ -162,8 +161,8 @@ def parse(data: Any, stream: str = "kvr") -> Statistics:
     `fault` tells the rest. Data that gzip has compressed is not unpacked; use gzip.decompress,
     or `table`, which unpacks files.
 
-    TypeError: `data` has no buffer. ValueError: there is no such stream, or `data` has 4 GiB or
-    more.
+    TypeError: `data` has no buffer, or holds other things than numbers and bytes. BufferError:
+    its buffer cannot be had now. ValueError: there is no such stream, or `data` has 4 GiB or more.
     """
     return Statistics(data, stream)
 
@@ -184,8 +183,9 @@ def snapshot(data: Any, header: Any = None) -> npt.NDArray[np.void]:
     As in the text, the last record that the header promises is left out. Records that were
     not filled, whose first field is 0, have no line in the text, and are there.
 
-    TypeError: an argument has no buffer. BufferError: `data` is not contiguous. ValueError:
-    the header is not whole, and says what is wrong.
+    TypeError: an argument has no buffer, or holds other things than numbers and bytes, such as
+    an array of objects. BufferError: `data` is not contiguous, or a buffer cannot be had now.
+    ValueError: the header is not whole, and says what is wrong.
     """
     return _native.snapshot(data, header)
 
@@ -276,9 +276,12 @@ def _paths(files: Path | Iterable[Path]) -> list[bytes]:
     one = isinstance(files, (str, bytes, os.PathLike))
     paths = []
     for file in [files] if one else _items(files, "files", "a path or an iterable of paths"):
-        if not isinstance(file, (str, bytes, os.PathLike)):
-            raise TypeError(f"files must hold paths, not {type(file).__name__}")
-        paths.append(os.fsencode(file))
+        try:
+            paths.append(os.fsencode(file))
+        except TypeError as error:
+            raise TypeError(f"files: {error}") from error
+        except UnicodeEncodeError as error:
+            raise ValueError(f"files: {error}") from error
         if b"\0" in paths[-1]:
             raise ValueError("files: a path has a null byte in it")
     return paths
@@ -293,7 +296,7 @@ def _names(names: str | Iterable[str] | None) -> list[bytes]:
             raise TypeError(f"names must hold str, not {type(name).__name__}")
     if not listed:
         raise ValueError("names is empty; leave it out for all statistics")
-    return [name.encode("utf-8", "surrogateescape") for name in listed]
+    return [name.encode("utf-8", "backslashreplace") for name in listed]
 
 
 def _jobs(jobs: int | None) -> int:
@@ -321,20 +324,22 @@ class ControllerError(Exception):
 
 
 class ControllerClass(NamedTuple):
-    """A class of controllers that the library knows, and what there is of it in this machine."""
+    """A class of controllers that the library knows, and what there is of it in this machine.
+
+    `opened` tells whether a connection could be opened, which is closed again, and `result` is
+    the driver's result code of that, 0 for success. `offers` are what Controller.read can read.
+    """
 
     name: str
     present: bool
     opened: bool
-    """Whether a connection could be opened; it is closed again."""
     result: int
-    """The driver's result code of opening it; 0 for success."""
     offers: tuple[str, ...]
-    """What Controller.read can read."""
 
 
 def controllers() -> list[ControllerClass]:
-    """All known classes of controllers, in the order in which Controller() looks for them."""
+    """All known classes of controllers, in the order in which Controller() looks for them. One
+    that is absent, or refuses, is no exception."""
     return [ControllerClass(*each) for each in _native.controllers()]
 
 
@@ -366,12 +371,13 @@ class Controller:
         return _native.read(self._connection, what)
 
     def statistics(self, stream: str = "kvr") -> Statistics:
-        """Reads and parses the statistics of a stream."""
+        """Reads and parses the statistics of a stream. Errors are those of read() and parse()."""
         _native.keys(stream)  # raises when there is none
         return parse(self.read(stream), stream)
 
     def snapshot(self) -> npt.NDArray[np.void]:
-        """Reads the snapshot, in the layout of the controller's own header if it offers one."""
+        """Reads the snapshot, in the layout of the controller's own header if it offers one.
+        Errors are those of read() and snapshot()."""
         offered = _native.offers(self._connection, "snapshot_header")
         header = self.read("snapshot_header") if offered else None
         return snapshot(self.read("snapshot"), header)
