@@ -11,11 +11,14 @@ dump = next(fleet.rglob("*.bin")).read_bytes()
 
 
 def compare(what, first, second, factor=1, runs=9):
-    """Each is called in turn and returns seconds; medians, and the median of the ratios."""
+    """Each is called in turn and returns seconds; medians, and the medians of ratios and differences.
+    The first turn only warms the caches."""
+    first(), second()
     times = [(first(), second()) for _ in range(runs)]
     medians = [statistics.median(column) for column in zip(*times)]
     ratio = statistics.median(b / a for a, b in times)
-    print(f"{what}: {medians[0] * factor:.4g} {medians[1] * factor:.4g}, ratio {ratio:.2f}", flush=True)
+    more = statistics.median(b - a for a, b in times)
+    print(f"{what}: {medians[0] * factor:.4g} {medians[1] * factor:.4g}, ratio {ratio:.2f}, more {more * factor:.4g}", flush=True)
 
 
 def run(*words):
@@ -34,37 +37,42 @@ def call(function, number=2000):
     return lambda: timeit.timeit(function, number=number) / number
 
 
-def some():
-    parsed = morwick.parse(dump)
+def some(data):
+    parsed = morwick.parse(data)
     return [parsed[name] for name in names]
+
+
+def everything(data):
+    return morwick.parse(data).items()
 
 
 def table(**options):
     return lambda: timeit.timeit(lambda: morwick.table(fleet, **options), number=1)
 
 
-def parse_by(count, large, times=64):
+def by_threads(count, function, data, times):
+    """The same work, shared by so many threads."""
     def work():
-        for _ in range(times // count):
-            morwick.parse(large)
+        for _ in range(times // count): function(data)
 
-    def timed():
-        threads = [threading.Thread(target=work) for _ in range(count)]
-        start = time.perf_counter()
-        for thread in threads: thread.start()
-        for thread in threads: thread.join()
-        return time.perf_counter() - start
-
-    return timed
+    threads = [threading.Thread(target=work) for _ in range(count)]
+    start = time.perf_counter()
+    for thread in threads: thread.start()
+    for thread in threads: thread.join()
+    return time.perf_counter() - start
 
 
 python = [sys.executable, "-c"]
 path = f"import sys; sys.path.insert(0, {str(build / 'python')!r}); "
 compare("import numpy, import morwick, ms", lambda: run(*python, path + "import numpy"),
         lambda: run(*python, path + "import morwick"), 1e3)
-compare("walk, parse and three names, us", walk, call(some), 1e6)
-compare("walk, parse and all names, us", walk, call(lambda: morwick.parse(dump).items()), 1e6)
+compare("walk, parse and three names, us", walk, call(lambda: some(dump)), 1e6)
+compare("walk, parse and all names, us", walk, call(lambda: everything(dump)), 1e6)
 command = [build / "tools/morwick", "table", "-s", "kvr"]
 compare("morwick table and morwick.table, three names, s", lambda: run(*command, "-n", ",".join(names), fleet), table(names=names))
 compare("morwick table and morwick.table, all columns, s", lambda: run(*command, fleet), table())
-compare("parse of a dump of 15 MB 64 times, by two threads and by one, s", parse_by(2, dump * 700), parse_by(1, dump * 700))
+for copies, times in (1, 20000), (8, 5000), (700, 64):
+    for what, function in ("parse", morwick.parse), ("three names", some), ("all names", everything):
+        work = function, dump * copies, times
+        compare(f"{what} of {len(dump) * copies} bytes {times} times, by two threads and by one, s",
+                lambda: by_threads(2, *work), lambda: by_threads(1, *work))
