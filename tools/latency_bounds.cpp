@@ -28,15 +28,17 @@ uint64_t MostAtMost(const SnapshotOperations &group, uint32_t latency) {
 }
 
 // The first latency for which it holds, as it then does for all above; `last` if for none below.
+// The search starts at the guess, and is quick where that is near.
 template <typename Holds>
-uint32_t First(uint32_t last, Holds holds) {
+uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
   uint32_t first = 0;
-  while (first < last) {
-    const uint32_t middle = first + (last - first) / 2;
-    if (holds(middle)) {
-      last = middle;
+  for (int64_t step = 1; first < last; step = std::min<int64_t>(step * 4, UINT32_MAX)) {
+    const int64_t middle = first + (last - first) / 2;
+    const auto tried = static_cast<uint32_t>(std::clamp(middle, guess - step, guess + step));
+    if (holds(tried)) {
+      last = tried;
     } else {
-      first = middle + 1;
+      first = tried + 1;
     }
   }
   return first;
@@ -46,24 +48,33 @@ uint32_t First(uint32_t last, Holds holds) {
 
 void LatencyBounds::Add(const SnapshotOperations &group) {
   if (group.count == 0) return;
+  if (groups_.size() % 61 == 0) sample_.push_back(group);
   groups_.push_back(group);
-  count_ += group.count;
   maximum_ = std::max(maximum_, group.maxLatency);
 }
 
-std::optional<LatencyBounds::Bounds> LatencyBounds::Percentile(unsigned percent) const {
-  if (count_ == 0) return std::nullopt;
-  // Counted from 1, rounded up; the count times a hundred may not fit.
-  const uint64_t rank = count_ / 100 * percent + (count_ % 100 * percent + 99) / 100;
-  const auto sum = [&](auto most, uint32_t latency) {
+LatencyBounds::Bounds LatencyBounds::Search(const Groups &groups, unsigned percent,
+                                            Bounds guess) const {
+  const auto sum = [&](auto number) {
     uint64_t total = 0;
-    for (const SnapshotOperations &group : groups_) total += most(group, latency);
+    for (const SnapshotOperations &group : groups) total += number(group);
     return total;
   };
-  return Bounds{First(maximum_, [&](uint32_t latency) { return sum(MostAtMost, latency) >= rank; }),
-                First(maximum_, [&](uint32_t latency) {
-                  return sum(MostAtLeast, latency + 1) <= count_ - rank;
-                })};
+  const uint64_t count = sum([](const SnapshotOperations &group) { return group.count; });
+  // Counted from 1, rounded up; the count times a hundred may not fit.
+  const uint64_t rank = count / 100 * percent + (count % 100 * percent + 99) / 100;
+  const auto isReached = [&](uint32_t latency) {
+    return sum([=](const auto &group) { return MostAtMost(group, latency); }) >= rank;
+  };
+  const auto isPassed = [&](uint32_t latency) {
+    return sum([=](const auto &group) { return MostAtLeast(group, latency + 1); }) <= count - rank;
+  };
+  return {First(guess.least, maximum_, isReached), First(guess.most, maximum_, isPassed)};
+}
+
+std::optional<LatencyBounds::Bounds> LatencyBounds::Percentile(unsigned percent) const {
+  if (groups_.empty()) return std::nullopt;
+  return Search(groups_, percent, Search(sample_, percent, {}));
 }
 
 }  // namespace tools

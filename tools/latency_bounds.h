@@ -19,13 +19,17 @@ class LatencyBounds {
   // make the same groups and have it. Nothing without operations. Of groups that cannot be, such as
   // one whose maximum is above its total, it is some latency up to the largest maximum.
   struct Bounds {
-    uint32_t least, most;
+    uint32_t least = 0, most = 0;
   };
   std::optional<Bounds> Percentile(unsigned percent) const;
 
  private:
-  std::deque<SnapshotOperations> groups_;  // not a vector, whose growth takes three times the room
-  uint64_t count_ = 0;
+  using Groups = std::deque<SnapshotOperations>;  // whose growth takes no room three times
+
+  Bounds Search(const Groups &groups, unsigned percent, Bounds guess) const;
+
+  Groups groups_;
+  Groups sample_;  // a few of them, of any priority: the percentiles of all are near theirs
   uint32_t maximum_ = 0;
 };
 
