@@ -19,8 +19,9 @@ number(text) = text[strlen(name) + 1:*]
 element(text) = text[1:strlen(name)] eq name && number(text) eq sprintf("%d", int(number(text) . "")) \
     ? int(number(text)) : NaN
 
-if (system("grep -scE '^" . name . "[0-9]+,' '" . csv . "'") eq "0") {
-    printerr csv . ": there is no array " . name
+found = system("grep -cE '^" . name . "[0-9]+,' '" . csv . "'")
+if (GPVAL_SYSTEM_ERRNO != 0) {
+    if (found eq "0") { printerr csv . ": there is no array " . name }
     exit status 1
 }
 plot csv using (element(stringcolumn(1))):2 skip 1 with boxes
