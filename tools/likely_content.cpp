@@ -2,24 +2,28 @@
 
 #include "tools/likely_content.h"
 
-#include <algorithm>
-
 #include "fleet/streams.h"
 #include "morwick/snapshot.h"
-#include "tools/text.h"
 
 namespace tools {
 namespace {
 
-// A record of a snapshot has many zeros: the upper bytes of its numbers.
+// Text in UTF-8, Latin-1 or UTF-16. A record of a snapshot has control characters, or pairs of
+// bytes that are all zeros, the upper halves of its numbers, or all ones, which is erased flash.
 bool LooksLikeText(std::string_view beginning) {
   beginning = beginning.substr(0, sizeof(SnapshotRecord));
-  beginning.remove_suffix(IncompleteEnd(beginning));
-  const auto isControl = [](unsigned char c) { return c < ' ' && (c < '\t' || c > '\r'); };
-  return IsValidText(beginning) && std::ranges::none_of(beginning, isControl);
+  for (size_t i = 0; i < beginning.size(); ++i) {
+    const auto byte = static_cast<unsigned char>(beginning[i]);
+    const bool isHalf = i % 2 == 1 && beginning[i] == beginning[i - 1];
+    if (isHalf && (byte == 0 || byte == 0xff)) return false;
+    if (byte > 0 && byte < '\t') return false;
+    if (byte > '\r' && byte < ' ' && byte != '\x1b') return false;
+  }
+  return true;
 }
 
-// Of records with a known key and its number of values a snapshot has hardly one, and never most.
+// Of records with a known key and its number of values a snapshot has hardly two. A newer firmware
+// has others, too.
 bool LooksLikeStatistics(MorwickStream stream, std::string_view beginning) {
   uint64_t known = 0;
   uint64_t others = 0;
@@ -31,7 +35,7 @@ bool LooksLikeStatistics(MorwickStream stream, std::string_view beginning) {
                       record.length == uint64_t{record.key->valueCount} * record.valueWidth;
     ++(fits ? known : others);
   }
-  return known > 1 && known > others;
+  return known > 2 && known * 3 > others;
 }
 
 }  // namespace
