@@ -6,12 +6,14 @@
 #include <cstddef>
 
 #include "morwick/little_endian.h"
+#include "morwick/snapshot_fields.h"
 #include "morwick/snapshot_header.h"
 
 namespace fleet {
 namespace {
 
 constexpr uint32_t kLargestRecord = 1 << 20;
+constexpr uint32_t kMostFields = 1024;  // their names take time by their number squared
 
 }  // namespace
 
@@ -21,9 +23,21 @@ std::string CheckSnapshotHeader(std::string_view file) {
     return text.data();
   }
   const uint32_t recordSize = LoadSnapshotHeader(file).recordSize;
-  if (recordSize <= kLargestRecord) return "";
-  return "record size " + std::to_string(recordSize) + " is above " +
-         std::to_string(kLargestRecord);
+  if (recordSize > kLargestRecord) {
+    return "record size " + std::to_string(recordSize) + " is above " +
+           std::to_string(kLargestRecord);
+  }
+  MorwickSnapshotField first;
+  if (MorwickSnapshotFieldAt(file.data(), 0, &first) == 0) return "describes no field";
+  if (uint64_t{first.offset} + sizeof(uint32_t) <= recordSize) return "";
+  return "the first field, which tells empty records, has offset " + std::to_string(first.offset) +
+         ", outside the record of " + std::to_string(recordSize) + " bytes";
+}
+
+std::string CheckFieldCount(const char *header) {
+  MorwickSnapshotField field;
+  if (MorwickSnapshotFieldAt(header, kMostFields, &field) == 0) return "";
+  return "describes more than " + std::to_string(kMostFields) + " fields";
 }
 
 SnapshotHeader LoadSnapshotHeader(std::string_view file) {

@@ -10,8 +10,10 @@
 #include <string>
 #include <vector>
 
+#include "fleet/snapshot_header.h"
 #include "morwick/morwick.h"
 #include "tools/snapshot_columns.h"
+#include "tools/text.h"
 
 namespace {
 
@@ -110,11 +112,13 @@ void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn
 
 // Each record alone, in place of the second of two: no banner is before its line.
 void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t capacity) {
+  if (!fleet::CheckSnapshotHeader({header.data(), header.size()}).empty()) return;
   const tools::SnapshotColumns columns(header.data());
   std::set<std::string> names;
-  for (const SnapshotColumn &column : columns.all()) assert(names.insert(column.name).second);
+  for (const SnapshotColumn &column : columns.all()) {
+    assert(tools::IsValidText(column.name) && names.insert(column.name).second);
+  }
   const uint32_t recordSize = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)]);
-  if (recordSize == 0) return;
   const uint32_t count = 3;
   std::memcpy(&header[offsetof(SnapshotHeader, recordCount)], &count, sizeof count);
   for (; snapshot.size() >= recordSize; snapshot.remove_prefix(recordSize)) {

@@ -15,9 +15,6 @@
 namespace python {
 namespace {
 
-constexpr uint32_t kMostFields = 1024;  // their names take time by their number squared
-constexpr size_t kLargestHeader = 1 << 20;
-
 // What a header says, or the fixed layout without one.
 struct Layout {
   explicit Layout(py::handle object);
@@ -35,7 +32,7 @@ struct Layout {
 
 Layout::Layout(py::handle object) : isFixed(object.is_none()) {
   if (isFixed) return;
-  header = ViewOf(AsBytes(object, "header", kLargestHeader));
+  header = ViewOf(AsBytes(object, "header", fleet::kLargestHeader));
   const std::string wrong = fleet::CheckSnapshotHeader(header);
   if (!wrong.empty()) throw py::value_error("header: " + wrong);
   const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
@@ -43,9 +40,9 @@ Layout::Layout(py::handle object) : isFixed(object.is_none()) {
   recordCount = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
 }
 
-// The fixed layout, with the numbers that have a name. Made once, and never freed: NumPy ends the
-// process where memory is refused to newbyteorder, and objects of the interpreter must not be given
-// back after its end.
+// The fixed layout, with the numbers that have a name, which is that of SnapshotRecord: the public
+// fields know only labels. Made once, and never freed: NumPy ends the process where memory is
+// refused to newbyteorder, and objects of the interpreter must not be given back after its end.
 struct FixedTypes {
   static const FixedTypes &Get() {
     static const FixedTypes *const types = new FixedTypes;
@@ -78,10 +75,9 @@ py::object DescribedType(const Layout &layout) {
   py::list names;
   py::list types;
   py::list offsets;
+  const std::string wrong = fleet::CheckFieldCount(layout.header.data());
+  if (!wrong.empty()) throw py::value_error("header: " + wrong);
   MorwickSnapshotField field;
-  if (MorwickSnapshotFieldAt(layout.header.data(), kMostFields, &field) != 0) {
-    throw py::value_error("header: describes more than " + std::to_string(kMostFields) + " fields");
-  }
   for (uint32_t i = 0; MorwickSnapshotFieldAt(layout.header.data(), i, &field) != 0; ++i) {
     if (field.kind == kMorwickFieldWithoutNumber) continue;
     names.append(AsText(field.names[0].label));

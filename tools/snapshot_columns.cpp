@@ -3,30 +3,22 @@
 #include "tools/snapshot_columns.h"
 
 #include <algorithm>
-#include <cstddef>
 #include <set>
 
+#include "fleet/snapshot_header.h"
 #include "morwick/little_endian.h"
+#include "tools/text.h"
 
 namespace tools {
 namespace {
 
-// Above what any controller would have. The fields' names take time by their number squared.
-constexpr uint32_t kMostFields = 1024;
 constexpr uint64_t kMostColumns = 16384;
-
-uint32_t FieldCount(const char *header) {
-  return LoadLittleEndian32(
-      header + LoadLittleEndian32(header + offsetof(SnapshotHeader, descriptorTableOffset)));
-}
 
 }  // namespace
 
-SnapshotColumns::SnapshotColumns(const char *header) : fixed_(header == nullptr) {
-  if (header != nullptr && FieldCount(header) > kMostFields) {
-    fault_ = "describes more than " + std::to_string(kMostFields) + " fields";
-    return;
-  }
+SnapshotColumns::SnapshotColumns(const char *header)
+    : fault_(fleet::CheckFieldCount(header)), fixed_(header == nullptr) {
+  if (!fault_.empty()) return;
   std::set<std::string> names;
   MorwickSnapshotField field;
   for (uint32_t i = 0; MorwickSnapshotFieldAt(header, i, &field) != 0; ++i) {
@@ -41,7 +33,7 @@ SnapshotColumns::SnapshotColumns(const char *header) : fixed_(header == nullptr)
     for (uint32_t part = 0; part < (isTriple ? 3 : 1); ++part) {
       const auto &[label, column] = field.names[part];
       for (uint32_t k = 0; k < std::max(field.priorities, 1U); ++k) {
-        std::string name = column;
+        std::string name = ValidText(column);  // JSON would make names equal that differ
         if (isTriple) name.append("_").append(std::to_string(k));
         // Labels differ, but one may be RO_0 and another the RO of priorities.
         while (!names.insert(name).second) name += "_2";
@@ -65,9 +57,7 @@ std::vector<uint32_t> SnapshotColumns::OffsetsOf(std::string_view label) const {
 }
 
 bool SnapshotColumns::LeavesOut(std::string_view record) const {
-  if (fixed_) return false;
-  return uint64_t{emptyOffset_} + sizeof(uint32_t) > record.size() ||
-         LoadLittleEndian32(&record[emptyOffset_]) == 0;
+  return !fixed_ && LoadLittleEndian32(&record[emptyOffset_]) == 0;
 }
 
 }  // namespace tools

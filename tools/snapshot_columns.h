@@ -12,7 +12,7 @@
 namespace tools {
 
 struct SnapshotColumn {
-  std::string name;  // each one another
+  std::string name;  // each one another, in UTF-8
   std::string label;
   MorwickFieldKind kind;
   uint32_t offset;  // of its 32 bits in the record
@@ -21,7 +21,7 @@ struct SnapshotColumn {
 class SnapshotColumns {
  public:
   // One for each number, in the order of the text. Null stands for the fixed layout; any other
-  // header has passed its check.
+  // header has passed fleet::CheckSnapshotHeader.
   explicit SnapshotColumns(const char *header);
 
   // Why the records are no table; empty when they are.

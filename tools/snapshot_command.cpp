@@ -21,8 +21,6 @@
 namespace tools {
 namespace {
 
-constexpr uint64_t kLargestHeader = 1 << 20;
-
 struct Options {
   std::string file;
   bool live = true;
@@ -91,7 +89,7 @@ Snapshot Prepare(const Options &options) {
   }
   if (snapshot.status == kGood && options.described) {
     snapshot.headerName = DisplayName(options.header);
-    WholeInput header = ReadInput(options.header, kLargestHeader);
+    WholeInput header = ReadInput(options.header, fleet::kLargestHeader);
     snapshot.status = header.status;
     snapshot.header = std::move(header.bytes);
   }
