@@ -32,8 +32,9 @@ std::string FaultOf(const MorwickRecord &end) {
   return "";
 }
 
-// The format of data that is not a dump, by its first bytes; empty when they tell nothing.
-std::string_view FormatOf(std::string_view data) {
+}  // namespace
+
+std::string_view PackedFormat(std::string_view data) {
   constexpr std::pair<std::string_view, std::string_view> kFormats[] = {
       {"\x28\xb5\x2f\xfd", "zstd"},
       {std::string_view("\xfd\x37\x7a\x58\x5a\0", 6), "xz"},
@@ -45,8 +46,6 @@ std::string_view FormatOf(std::string_view data) {
   }
   return "";
 }
-
-}  // namespace
 
 std::string Bytes(uint64_t count) {
   return std::to_string(count) + (count == 1 ? " byte" : " bytes");
@@ -69,7 +68,7 @@ void Judge::Take(const MorwickRecord &record) {
 Verdict Judge::Finish(const MorwickRecord &end) {
   if (dump_.empty()) return {{"there is nothing in it"}, ""};
   const std::string fault = FaultOf(end);
-  if (const auto format = FormatOf(dump_); !format.empty() && (!fault.empty() || !hasValues_)) {
+  if (const auto format = PackedFormat(dump_); !format.empty() && (!fault.empty() || !hasValues_)) {
     return {{"this is " + std::string(format) + " data, and must be unpacked first"}, ""};
   }
   if (otherLengths_ > kMostNamed) {

@@ -11,6 +11,9 @@
 
 namespace fleet {
 
+// The format of packed data, by its first bytes; empty when they tell nothing.
+std::string_view PackedFormat(std::string_view data);
+
 // "1 byte", "2 bytes".
 std::string Bytes(uint64_t count);
 

@@ -2,6 +2,7 @@
 
 #include "tools/likely_content.h"
 
+#include "fleet/judge.h"
 #include "fleet/streams.h"
 #include "morwick/snapshot.h"
 
@@ -40,7 +41,10 @@ bool LooksLikeStatistics(MorwickStream stream, std::string_view beginning) {
 
 }  // namespace
 
-std::string_view OtherThanSnapshot(std::string_view beginning) {
+std::string OtherThanSnapshot(std::string_view beginning) {
+  if (const auto format = fleet::PackedFormat(beginning); !format.empty()) {
+    return std::string(format) + " data";
+  }
   if (LooksLikeText(beginning)) return "text";
   for (const MorwickStream stream : fleet::kStreams) {
     if (LooksLikeStatistics(stream, beginning)) return "statistics";

@@ -2,13 +2,14 @@
 #ifndef TOOLS_LIKELY_CONTENT_H
 #define TOOLS_LIKELY_CONTENT_H
 
+#include <string>
 #include <string_view>
 
 namespace tools {
 
-// What the beginning of something that is no snapshot looks like: text, or statistics. Empty when
-// it may be a snapshot.
-std::string_view OtherThanSnapshot(std::string_view beginning);
+// What the beginning of something that is no snapshot looks like: text, statistics, packed data.
+// Empty when it may be a snapshot.
+std::string OtherThanSnapshot(std::string_view beginning);
 
 }  // namespace tools
 

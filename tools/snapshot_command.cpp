@@ -225,9 +225,9 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     Complain(snapshot.name, "there is nothing in it");
     return kBadData;
   }
-  const std::string_view other = OtherThanSnapshot(records.loaded());
+  const std::string other = OtherThanSnapshot(records.loaded());
   if (!snapshot.header && !other.empty()) {
-    Note(snapshot.name, "looks like " + std::string(other) + ", not like a snapshot");
+    Note(snapshot.name, "looks like " + other + ", not like a snapshot");
   }
   Status status = kGood;
   bool good = true;
