@@ -1,11 +1,6 @@
 #!/usr/bin/env python3
-"""Holds a snapshot's summary, JSON on standard input, against one computed plainly from the file."""
-
-import bisect
-import json
-import math
-import struct
-import sys
+"""Holds the summaries of snapshots, JSON on standard input, against those computed plainly from the files."""
+import bisect, itertools, json, math, random, struct, sys
 
 
 def span(groups, percent):
@@ -27,26 +22,46 @@ def span(groups, percent):
     return [bisect.bisect_left(latencies, True, key=key) for key in (enough, too_much)]
 
 
-with open(sys.argv[1], "rb") as file:
-    records = [struct.unpack("<63I", record) for record in iter(lambda: file.read(252), b"")]
-summary = json.load(sys.stdin)["summary"]
-assert summary["intervals"] == len(records)
-for name, base, host, nand in ("reads", 14, 27, 29), ("writes", 2, 28, 30):
-    counts = [sum(record[base:base + 12:3]) for record in records]
-    totals = [sum(record[base + 1:base + 12:3]) for record in records]
-    means = sorted((total / count, -i)
-                   for i, (total, count) in enumerate(zip(totals, counts)) if count)
-    groups = [record[at:at + 3] for record in records for at in range(base, base + 12, 3)]
-    bounds = [bound for percent in (50, 95, 99) for bound in span(groups, percent)]
-    most, place = max((max(record[base + 2:base + 12:3]), -i) for i, record in enumerate(records))
-    sectors = [sum(record[word] for record in records) for word in (host, nand)]
-    expected = [sum(counts), sum(totals) / sum(counts), *bounds, most, records[-place][0], *sectors,
-                sectors[1] / sectors[0]]
-    expected += [figure for mean, i in means[:-6:-1] for figure in (records[-i][0], mean)]
-    seen = [value for key, value in summary[name].items() if key != "slowest"]
-    seen = [one for value in seen for one in (value.values() if isinstance(value, dict) else [value])]
-    seen += [figure for interval in summary[name]["slowest"] for figure in interval.values()]
-    assert len(seen) == len(expected)
-    for one, other in zip(seen, expected):
-        assert math.isclose(one, other, rel_tol=1e-12), (name, one, other)
-print("agree")
+def tried_span(groups, percent):
+    """The same from all operations that make such groups."""
+    possible = [[latencies for latencies in itertools.product(range(longest + 1), repeat=count)
+                 if sum(latencies) == total and max(latencies) == longest] for count, total, longest in groups]
+    rank = math.ceil(sum(group[0] for group in groups) * percent / 100)
+    seen = {sorted(itertools.chain(*choice))[rank - 1] for choice in itertools.product(*possible)}
+    return [min(seen), max(seen)]
+
+
+def check(name, line):
+    with open(name, "rb") as file:
+        records = [struct.unpack("<63I", record) for record in iter(lambda: file.read(252), b"")]
+    summary = json.loads(line)["summary"]
+    assert summary["intervals"] == len(records)
+    for kind, base, host, nand in ("reads", 14, 27, 29), ("writes", 2, 28, 30):
+        counts = [sum(record[base:base + 12:3]) for record in records]
+        totals = [sum(record[base + 1:base + 12:3]) for record in records]
+        means = sorted((total / count, -i)
+                       for i, (total, count) in enumerate(zip(totals, counts)) if count)
+        groups = [record[at:at + 3] for record in records for at in range(base, base + 12, 3)]
+        bounds = [bound for percent in (50, 95, 99) for bound in span(groups, percent)]
+        most, place = max((max(record[base + 2:base + 12:3]), -i) for i, record in enumerate(records))
+        sectors = [sum(record[word] for record in records) for word in (host, nand)]
+        expected = [sum(counts), sum(totals) / sum(counts), *bounds, most, records[-place][0], *sectors,
+                    sectors[1] / sectors[0]]
+        expected += [figure for mean, i in means[:-6:-1] for figure in (records[-i][0], mean)]
+        seen = [value for key, value in summary[kind].items() if key != "slowest"]
+        seen = [one for value in seen for one in (value.values() if isinstance(value, dict) else [value])]
+        seen += [figure for interval in summary[kind]["slowest"] for figure in interval.values()]
+        assert len(seen) == len(expected)
+        for one, other in zip(seen, expected):
+            assert math.isclose(one, other, rel_tol=1e-12), (name, kind, one, other)
+
+
+random.seed(1)
+for _ in range(300):
+    operations = [random.choices(range(6), k=random.randint(1, 4)) for _ in range(2)]
+    groups = [(len(group), sum(group), max(group)) for group in operations]
+    percent = random.choice((20, 50, 95))
+    assert span(groups, percent) == tried_span(groups, percent), (groups, percent)
+for name, line in zip(sys.argv[1:], sys.stdin, strict=True):
+    check(name, line)
+print(len(sys.argv) - 1, "agree")
