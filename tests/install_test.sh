@@ -9,28 +9,43 @@ flags=${*:4}
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
-expect() {
-  [ "$1" = "$2" ] || { printf 'expected "%s"\nbut got  "%s"\n' "$2" "$1"; exit 1; }
-}
+# Usage: expect TEXT EXPECTED_TEXT
+expect() { diff --label expected --label got -u <(echo "$2") <(echo "$1"); }
 
-rows="VeltoQRN3NVMeController: -1 9 9 Controller Characteristics: 13/13 221/221 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7 passWithTmodeHard=6
-VeltoEmbeddedNVMeController: -1 9 9 Controller Characteristics: 13/13 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7
-KVRStorage: 5 8 8 PropertyMatch: 13/13 15/15 17/17 39/39 22/22 145/145 11/11 pagesPerVirtualBlock=7 pagesPerVirtualBlock=7"
-reading="Morwick: findNandExporter: Controller found: VeltoQRN3NVMeController
+# What tests/consumer.c prints: the table, and what the command says of the same files. On another platform
+# the controllers are those that the machine has. Usage: expected LANGUAGE
+expected() {
+  local morwick=$prefix/bin/morwick
+  cat <<'END_OF_TABLE'
+VeltoQRN3NVMeController -1 9 9 Controller Characteristics
+VeltoEmbeddedNVMeController -1 9 9 Controller Characteristics
+KVRStorage 5 8 8 PropertyMatch
+END_OF_TABLE
+  "$morwick" stats -s kvr --long kvr.bin | sed 's/ *: / = /'
+  "$morwick" snapshot -o csv snapshot.bin |
+    awk -F , 'NR == 1 { split($0, names) } NR == 2 { for (i = 1; i <= 25; ++i) print names[i], $i }'
+  [ "$1" = CXX ] || "$morwick" snapshot --header snapshot_header.bin snapshot.bin
+  [ "$platform" != simulated ] || cat <<'END_OF_READING'
 Morwick: findNandExporter: Controller found: VeltoQRN3NVMeController
-VeltoQRN3NVMeController: result 1, version 7, host reads 918273645, band erases 40961"
-
-# On another platform the controllers are those that the machine has.
-consume() {
-  local version
-  version=$(pkg-config --modversion morwick)
-  if [ "$platform" = simulated ]; then
-    expect "$(GRELLON_SCENARIO=$scenarios/statistics.toml "$1" 2>&1; echo "status $?")" \
-      "morwick $version $version"$'\n'"$rows"$'\n'"$reading"$'\n'"status 0"
-  else
-    expect "$("$1" 2>/dev/null | head -n $((1 + $(wc -l <<<"$rows"))))" "morwick $version $version"$'\n'"$rows"
-  fi
+Morwick: findNandExporter: Controller found: VeltoQRN3NVMeController
+VeltoQRN3NVMeController: version 7, host reads 918273645, band erases 40961
+END_OF_READING
 }
+
+# Usage: consume LANGUAGE PROGRAM
+consume() {
+  cd "$source/examples"
+  expect "$(cat snapshot_header.bin snapshot.bin kvr.bin |
+    GRELLON_SCENARIO=$scenarios/statistics.toml "$2" 2>/dev/null)" "$(expected "$1")"
+}
+
+# The examples in the headers, with so little room that each way of their loops is taken.
+for header in $(cd "$source/include/morwick" && grep -l '^ \*     .*;$' ./*.h); do
+  sed -n '/^ \*     .*;$/,/^ \*$/s/^ \*     //p' "$source/include/morwick/$header" |
+    sed 's/room = 4096/room = 16/' >"$work/${header%.h}.example"
+  grep -q "\"$(basename "$header" .h).example\"" "$source/tests/consumer.c" ||
+    { echo "tests/consumer.c does not have the example of $header"; exit 1; }
+done
 
 # Programs against the tree $1, which is called $2.
 build_and_consume() {
@@ -41,6 +56,7 @@ project(consumer LANGUAGES ${language})
 find_package(morwick 1 REQUIRED)
 add_executable(consumer ${source}/tests/consumer.c)
 set_source_files_properties(${source}/tests/consumer.c PROPERTIES LANGUAGE ${language})
+target_include_directories(consumer PRIVATE ${CMAKE_SOURCE_DIR})
 target_link_libraries(consumer PRIVATE morwick::morwick)
 END_OF_PROJECT
   PKG_CONFIG_PATH=$(dirname "$(find "$tree" -name morwick.pc)")
@@ -48,13 +64,13 @@ END_OF_PROJECT
   for language in C CXX; do
     [ $language = C ] && compile="cc -std=c11" || compile="c++ -std=c++20 -x c++"
     # shellcheck disable=SC2046,SC2086  # lists of flags
-    $compile $flags "$source/tests/consumer.c" -x none -o "$work/consumer" \
+    $compile -I "$work" $flags "$source/tests/consumer.c" -x none -o "$work/consumer" \
       $(pkg-config --cflags --libs morwick)
-    LD_LIBRARY_PATH=$(pkg-config --variable=libdir morwick) consume "$work/consumer"
+    LD_LIBRARY_PATH=$(pkg-config --variable=libdir morwick) consume $language "$work/consumer"
     cmake -G Ninja -S "$work" -B "$work/$name-$language" -Dlanguage=$language -Dsource="$source" \
       -DCMAKE_PREFIX_PATH="$tree" -DCMAKE_${language}_FLAGS="$flags" >/dev/null
     cmake --build "$work/$name-$language" >/dev/null
-    consume "$work/$name-$language/consumer"
+    consume $language "$work/$name-$language/consumer"
   done
 }
 
@@ -91,8 +107,7 @@ fi
   morwick/examples/latency.gp morwick/examples/fleet.py morwick/examples/fleet.png) >/dev/null
 build_and_consume "$prefix" given
 
-# The program that the README shows, built as it says, and the loop that the header of snapshots shows,
-# with so little room that each of its ways is taken.
+# The example that is installed, and the program that the README shows, built as it says.
 (
   cd "$work"
   # shellcheck disable=SC2046,SC2086  # lists of flags
@@ -112,17 +127,6 @@ build_and_consume "$prefix" given
   sed -n '/^```c$/,/^```$/{/^```/d;p}' "$source/README.md" >example.c
   eval "$build $flags"
   expect "$(./a.out "$prefix/share/morwick/examples/kvr.bin")" "123456789 sectors written"
-  {
-    printf '#include <%s>\n' morwick/morwick.h stdio.h stdlib.h
-    echo 'static char header[816], snapshot[1 << 20]; int main(void) { fread(header, 1, sizeof header, stdin);'
-    echo 'const uint64_t snapshotSize = fread(snapshot, 1, sizeof snapshot, stdin);'
-    sed -n '/^ \*     uint64_t room/,/^ \*     free/{s/^ \*//; s/4096/16/; p}' "$prefix/include/morwick/snapshot.h"
-    echo '}'
-  } >example.c
-  eval "$build $flags"
-  cd "$prefix/share/morwick/examples"
-  expect "$(cat snapshot_header.bin snapshot.bin | "$work/a.out")" \
-    "$("$prefix/bin/morwick" snapshot --header snapshot_header.bin snapshot.bin)"
 )
 
 cmake -G Ninja -S "$source" -B "$work/static" -DBUILD_SHARED_LIBS=OFF -DMORWICK_PLATFORM="$platform" \
