@@ -13,20 +13,19 @@ void Handle() { TaskSchedulerActivityHandler(nullptr); }
 
 TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
   const NandExporter whole = nand_exporters[0];
-  PlayCases("activity_handler.txt", {"without task scheduler", "other numbers", "again"},
-            [&](Script &script) {
-              if (script.contains("without task scheduler")) {
-                nand_exporters[0].getTaskSchedulerSelectors = nullptr;
-              }
-              if (script.contains("other numbers")) {
-                nand_exporters[0].methodSelector = 7;
-                taskSchedulerSelectors = {50, 51};
-              }
-              Handle();
-              if (script.contains("again")) Handle();
-              nand_exporters[0] = whole;
-              taskSchedulerSelectors = {39, 39};
-            });
+  PlayCases("activity_handler.txt", [&](Script &script) {
+    if (script.contains("without task scheduler")) {
+      nand_exporters[0].getTaskSchedulerSelectors = nullptr;
+    }
+    if (script.contains("other numbers")) {
+      nand_exporters[0].methodSelector = 7;
+      taskSchedulerSelectors = {50, 51};
+    }
+    Handle();
+    if (script.contains("again")) Handle();
+    nand_exporters[0] = whole;
+    taskSchedulerSelectors = {39, 39};
+  });
 }
 
 TEST(ActivityHandlerTest, EndsEveryRunWhateverFails) {

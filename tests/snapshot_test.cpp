@@ -6,14 +6,10 @@
 #include <algorithm>
 #include <cstring>
 #include <iomanip>
-#include <numeric>
 #include <random>
 #include <sstream>
-#include <thread>
 
 #include "morwick/morwick.h"
-#include "stats/decimal.h"
-#include "stats/snapshot_lines.h"
 #include "tests/case_file.h"
 #include "tests/heap.h"
 
@@ -59,20 +55,6 @@ std::string Bytes(const std::vector<uint32_t> &words) {
   return {reinterpret_cast<const char *>(words.data()), words.size() * 4};
 }
 
-// Word n of the record is n, from 1 on; hysteresis time, word 40, prints in hundredths.
-TEST(FixedSnapshotTest, PrintsEachColumnFromItsPlace) {
-  std::vector<uint32_t> record(63);
-  std::iota(record.begin(), record.end(), 1);
-  record[39] = 123456;
-  const std::string text = Render(Bytes(record), 5000).text;
-  EXPECT_EQ(text.substr(text.find("T=")),
-            "T=0001 E=27 HR=  28 HW=  29 NR=  30 NW=  31 TH=     123.45 GC=  32 W=34 BI= 37 BU= 38"
-            " V=   46 BF=48/49 P= 2 H=42/41 X=51/52 L= 44/ 45 C=54/55 S=  43 U=      53"
-            " RO=  15/  18/  21/  24 RL=     16/     19/     22/     25 RM=   17/   20/   23/   26"
-            " WO=   3/   6/   9/  12 WL=      4/      7/     10/     13 WM=    5/    8/   11/   14"
-            "\n\n");
-}
-
 TEST(FixedSnapshotTest, CutsTheTextAtAnyCapacity) {
   const std::string snapshot = Bytes(std::vector<uint32_t>(126, 123456)) + "part of a record";
   const std::string whole = Render(snapshot, 10000).text;
@@ -92,97 +74,6 @@ TEST(FixedSnapshotTest, PrintsAnyNumberOfRecords) {
   uint64_t size = text.size();
   EXPECT_EQ(kFixed(snapshot.data(), snapshot.size(), text.data(), &size), 1U);
   EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 27 + static_cast<ptrdiff_t>(kCount) + 1);
-}
-
-using Words = std::array<uint32_t, 63>;
-
-std::string_view Line(morwick::LineWriter *write, char *room, const uint8_t *record) {
-  return {room, write(room, record)};
-}
-
-// Each kernel against the plain code, record and line at the two ends of a page without neighbours.
-class LineKernelTest : public testing::TestWithParam<size_t> {
- protected:
-  void SetUp() override {
-    if (!kernel_.runs()) GTEST_SKIP() << "this processor has no " << kernel_.name;
-    void *pages = mmap(nullptr, 3 * kPage, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-    page_ = static_cast<uint8_t *>(pages) + kPage;
-    ASSERT_EQ(mprotect(page_, kPage, PROT_READ | PROT_WRITE), 0);
-  }
-
-  // The record now at one end, now at the other.
-  void Check(const Words &words) {
-    recordFirst_ = !recordFirst_;
-    uint8_t *record = recordFirst_ ? page_ : page_ + kPage - sizeof words;
-    uint8_t *room = recordFirst_ ? page_ + kPage - morwick::kLineRoom : page_;
-    std::memset(room, 'x', morwick::kLineRoom);
-    std::memcpy(record, words.data(), sizeof words);
-    char expected[morwick::kLineRoom];
-    ASSERT_EQ(Line(kernel_.write, reinterpret_cast<char *>(room), record),
-              Line(morwick::WriteLine, expected, record));
-  }
-
-  // Of all lengths.
-  uint32_t RandomWord() {
-    const uint64_t random = random_();
-    return static_cast<uint32_t>(random >> 32 >> random % 32);
-  }
-
-  static constexpr size_t kPage = 4096;
-  const morwick::LineKernel kernel_ = morwick::LineKernels()[GetParam()];
-  uint8_t *page_ = nullptr;
-  bool recordFirst_ = false;
-  std::mt19937_64 random_{1};
-};
-
-GTEST_ALLOW_UNINSTANTIATED_PARAMETERIZED_TEST(LineKernelTest);  // other processors have none
-INSTANTIATE_TEST_SUITE_P(Each, LineKernelTest,
-                         testing::Range<size_t>(0, morwick::LineKernels().size() - 1));
-
-TEST_P(LineKernelTest, WritesNumbersOfEachLengthInEachColumn) {
-  Words words;
-  std::ranges::generate(words, [&] { return RandomWord(); });
-  for (uint32_t &word : words) {
-    for (uint64_t power = 1; power <= 10000000000; power *= 10) {
-      for (const uint64_t value : {power - 1, power, power + 1}) {
-        word = static_cast<uint32_t>(std::min<uint64_t>(value, UINT32_MAX));
-        Check(words);
-      }
-    }
-    word = RandomWord();
-  }
-}
-
-TEST_P(LineKernelTest, WritesRandomLines) {
-#ifdef NDEBUG
-  constexpr int kRounds = 10000000;
-#else
-  constexpr int kRounds = 20000;
-#endif
-  Words words;
-  for (int round = 0; round < kRounds && !HasFailure(); ++round) {
-    std::ranges::generate(words, [&] { return RandomWord(); });
-    Check(words);
-  }
-}
-
-// By scripts/every-value. The first column, whose number the plain code writes by itself.
-TEST_P(LineKernelTest, DISABLED_WritesEveryValue) {
-  const auto check = [this](uint64_t value, uint32_t step) {
-    char line[morwick::kLineRoom];
-    char expected[morwick::kLineRoom] = "T=";
-    const std::string rest(Line(morwick::WriteLine, line, page_).substr(sizeof "T=0000" - 1));
-    for (Words words = {}; value <= UINT32_MAX; value += step) {
-      words[0] = static_cast<uint32_t>(value);
-      char *end = morwick::WritePadded(expected + 2, words[0], 4, '0');
-      end += rest.copy(end, rest.size());
-      const auto *record = reinterpret_cast<const uint8_t *>(words.data());
-      ASSERT_EQ(Line(kernel_.write, line, record), std::string_view(expected, end));
-    }
-  };
-  std::vector<std::jthread> threads;
-  const uint32_t count = std::max(std::thread::hardware_concurrency(), 1U);
-  for (uint32_t first = 0; first < count; ++first) threads.emplace_back(check, first, count);
 }
 
 using Fields = std::vector<SnapshotFieldDescriptor>;
@@ -210,30 +101,26 @@ std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fiel
   return text.substr(kBanner.size());
 }
 
+// A descriptor as cases write it; what stands after the arrow is left.
+SnapshotFieldDescriptor ReadDescriptor(std::istringstream &columns) {
+  SnapshotFieldDescriptor field = {};
+  std::string format, arrow;
+  columns.unsetf(std::ios::dec);  // hexadecimal numbers too
+  columns >> field.kind >> field.fieldOffset >> field.fieldSize >> std::quoted(format) >> arrow;
+  EXPECT_TRUE(columns && arrow == "->");
+  format.copy(field.format, sizeof field.format);
+  return field;
+}
+
 TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
   CaseFile cases("descriptors.txt");
-  Fields fields;
-  std::vector<std::pair<std::string, std::string>> expected;  // texts, by where they stand
-  for (std::string line; cases.Next(&line);) {
-    SnapshotFieldDescriptor field = {};
-    std::string format, arrow, text;
+  for (std::string line, text; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where());
     std::istringstream columns(line);
-    columns.unsetf(std::ios::dec);  // hexadecimal numbers too
-    columns >> field.kind >> field.fieldOffset >> field.fieldSize >> std::quoted(format) >> arrow >>
-        std::quoted(text);
-    EXPECT_TRUE(columns) << cases.where();
-    format.copy(field.format, sizeof field.format);
-    fields.push_back(field);
-    expected.emplace_back(cases.where(), text);
+    const SnapshotFieldDescriptor field = ReadDescriptor(columns);
+    EXPECT_TRUE(columns >> std::quoted(text));
+    EXPECT_EQ(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, {field}), text + "\n\n");
   }
-  std::istringstream printed(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, fields));
-  std::string line;
-  for (const auto &[where, text] : expected) {
-    EXPECT_TRUE(std::getline(printed, line)) << where;
-    EXPECT_EQ(line, text) << where;
-  }
-  EXPECT_TRUE(std::getline(printed, line) && line.empty() && printed.peek() == EOF);
-  EXPECT_GT(fields.size(), 30U);
 }
 
 // Every conversion that passes the check prints what the C library prints.
@@ -360,6 +247,51 @@ TEST(DescribedSnapshotTest, ReadsNoDescriptorThatIsNotNeeded) {
   // Where there is no record to print none is read but the first.
   bare[52] = 9;
   EXPECT_EQ(Render(std::string(8, '\0'), 500, bare, 1), (Rendered{1, 1, "", 2}));
+}
+
+// Each field: kind, offset, priorities, and its names, with the column where it differs.
+std::string FieldsOf(const std::string &header) {
+  const std::vector<char> unaligned = Unaligned(header);
+  std::ostringstream text;
+  for (uint32_t i = 0;; ++i) {
+    MorwickSnapshotField field;
+    RefuseAllocation(0);
+    const int isThere = MorwickSnapshotFieldAt(unaligned.data() + 1, i, &field);
+    EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+    if (isThere == 0) return text.str();
+    text << field.kind << ' ' << field.offset << ' ' << field.priorities;
+    for (const auto &[label, column] : field.names) {
+      if (*label != '\0') text << ' ' << label;
+      if (std::strcmp(label, column) != 0) text << '=' << column;
+    }
+    text << '\n';
+  }
+}
+
+TEST(SnapshotFieldsTest, ReadsDescriptorsAndGivesNamesThatDiffer) {
+  CaseFile cases("fields.txt");
+  for (std::string line, field; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where());
+    const auto recordSize = static_cast<uint32_t>(Number(line.substr(line.rfind(' ') + 1)));
+    Fields fields;
+    std::string expected;
+    while (cases.Peek() != '=' && cases.NextRaw(&line)) {
+      std::istringstream columns(line);
+      fields.push_back(ReadDescriptor(columns));
+      std::getline(columns >> std::ws, field);
+      expected += field + "\n";
+    }
+    EXPECT_EQ(FieldsOf(Header(6, recordSize, 9, fields)), expected);
+  }
+}
+
+TEST(SnapshotFieldsTest, TakesNullPointersAndAnyIndex) {
+  MorwickSnapshotField field = {};
+  field.offset = 7;
+  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 27, &field), 0);
+  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 0xffffffff, &field), 0);
+  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 0, nullptr), 0);
+  EXPECT_EQ(field.offset, 7U);
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
-// The simulated platform as tests reach it: a scenario, a controller, a reading. Each test runs in
-// a process of its own, with a scenario of its own.
+// The simulated platform as tests reach it: a scenario, a controller, a reading. The platform has
+// one scenario a process, so run the tests by ctest, which gives each a process of its own.
 #ifndef TESTS_SIMULATED_PLATFORM_H
 #define TESTS_SIMULATED_PLATFORM_H
 
@@ -7,7 +7,6 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
-#include <cstdio>
 #include <cstdlib>
 #include <string>
 
@@ -25,21 +24,6 @@ inline std::string File(const std::string &text) {
   EXPECT_EQ(write(file, text.data(), text.size()), static_cast<ssize_t>(text.size()));
   return std::to_string(file);
 }
-
-// The platform has one scenario a process, so that tests one after the other would disturb each
-// other: ctest runs each in a process of its own.
-class OneTestAProcess : public testing::EmptyTestEventListener {
-  void OnTestProgramStart(const testing::UnitTest &all) override {
-    if (all.test_to_run_count() <= 1) return;
-    std::fputs("These tests need a process each: run ctest, or one of them with --gtest_filter.\n",
-               stderr);
-    std::exit(1);
-  }
-};
-inline const bool kOneTestAProcess = [] {
-  testing::UnitTest::GetInstance()->listeners().Append(new OneTestAProcess);
-  return true;
-}();
 
 inline void Play(const std::string &scenario) {
   setenv("GRELLON_SCENARIO", ("/proc/self/fd/" + File(scenario)).c_str(), 1);
