@@ -4,20 +4,15 @@
 
 #include <gtest/gtest.h>
 
-#include <cctype>
-#include <cerrno>
 #include <cstdint>
-#include <cstdlib>
 #include <fstream>
 #include <string>
 
 // The number that a case writes, in C's notation. The test fails when it is none.
 inline uint64_t Number(const std::string &text) {
-  char *end = nullptr;
-  errno = 0;
-  const uint64_t number = std::strtoull(text.c_str(), &end, 0);
-  EXPECT_TRUE(std::isdigit(text[0]) != 0 && *end == '\0' && errno == 0)
-      << "no number: '" << text << "'";
+  size_t end = 0;
+  const uint64_t number = std::stoull(text, &end, 0);  // throws where no number begins
+  EXPECT_EQ(end, text.size()) << text;
   return number;
 }
 

@@ -3,17 +3,16 @@
 #define TESTS_STREAM_NOTATION_H
 
 #include <algorithm>
-#include <optional>
 #include <sstream>
 #include <string>
 
 #include "tests/case_file.h"
 #include "tests/parsing.h"
 
-inline std::optional<Kind> KindOf(const std::string &name) {
+inline Kind KindOf(const std::string &name) {
   constexpr std::string_view kKinds[] = {"KVR", "FTL", "MSP", "Array"};
   const auto *found = std::ranges::find(kKinds, name);
-  if (found == std::end(kKinds)) return std::nullopt;
+  EXPECT_NE(found, std::end(kKinds)) << "no such kind: " << name;
   return static_cast<Kind>(found - kKinds);
 }
 
