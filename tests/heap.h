@@ -1,5 +1,5 @@
-// The heap as tests need it: allocations are counted and can be refused, and buffers end where their
-// allocation ends, so that AddressSanitizer sees one byte too many. It sees every leak, too.
+// The heap as tests need it: allocations are counted and can be refused, and buffers end where
+// their allocation ends, so that AddressSanitizer sees one byte too many. It sees every leak, too.
 #ifndef TESTS_HEAP_H
 #define TESTS_HEAP_H
 
