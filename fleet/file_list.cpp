@@ -31,12 +31,14 @@ std::string FaultOf(int error) {
 int ListFolder(const std::string &path, std::vector<std::string> *names) {
   const std::unique_ptr<DIR, int (*)(DIR *)> folder(opendir(path.c_str()), closedir);
   if (folder == nullptr) return errno;
-  for (errno = 0; const dirent *entry = readdir(folder.get()); errno = 0) {
+  errno = 0;
+  while (const dirent *entry = readdir(folder.get())) {
     std::string name = entry->d_name;
     if (name == "." || name == "..") continue;
     const bool isUnclear = entry->d_type == DT_LNK || entry->d_type == DT_UNKNOWN;
     if (isUnclear ? IsFolder(path + name) : entry->d_type == DT_DIR) name += '/';
     names->push_back(std::move(name));
+    errno = 0;
   }
   const int error = errno;
   std::ranges::sort(*names);

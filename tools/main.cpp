@@ -9,7 +9,6 @@
 #include <exception>
 #include <memory>
 #include <new>
-#include <ranges>
 
 #include "tools/commands.h"
 #include "tools/memory.h"
@@ -38,7 +37,8 @@ const CLI::App *FindCommand(const CLI::App &app, const std::string &name) {
 }
 
 std::string KnownCommands(const CLI::App &app) {
-  const auto names = app.get_subcommands({}) | std::views::transform(&CLI::App::get_name);
+  std::vector<std::string> names;
+  for (const CLI::App *command : app.get_subcommands({})) names.push_back(command->get_name());
   return fmt::format("{}", fmt::join(names, ", "));
 }
 
