@@ -144,4 +144,23 @@ TEST(SimulatedDriversTest, LeavesSignalsToATool) {
   }
 }
 
+TEST(SimulatedDriversTest, GivesBuffersToTheCaller) {
+  Play("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nsnapshot = '" + File("") + "'\n");
+  const NandExporter *row = nand_exporters;
+  const uint32_t connection = Connect(row->className);
+  MorwickBuffer buffer;
+  EXPECT_EQ(MorwickReadBuffer(connection, row, row->getSnapshotSelectors(), nullptr),
+            kMorwickReadFailed);
+  EXPECT_EQ(MorwickReadBuffer(connection, nullptr, row->getSnapshotSelectors(), &buffer),
+            kMorwickReadFailed);
+  EXPECT_EQ(MorwickReadBuffer(connection, row, nullptr, &buffer), kMorwickReadFailed);
+  EXPECT_EQ(buffer.bytes, nullptr);
+  EXPECT_EQ(MorwickReadBuffer(connection, row, row->getSnapshotSelectors(), &buffer), kMorwickRead);
+  EXPECT_TRUE(buffer.bytes != nullptr && buffer.size == 0);
+  for (int time = 0; time < 2; ++time) MorwickFreeBuffer(&buffer);
+  MorwickFreeBuffer(nullptr);
+  EXPECT_EQ(MorwickFindService(nullptr), 0U);
+  EXPECT_EQ(CloseService(connection), 0);
+}
+
 }  // namespace
