@@ -58,7 +58,8 @@ struct KeyTable {
 // Makes a table of the rows; their number must be that of the table.
 template <typename Table, size_t kRowCount>
 consteval Table MakeKeyTable(const std::array<KeyRow, kRowCount> &rows) {
-  static_assert(std::tuple_size_v<decltype(Table::rows)> == kRowCount);
+  static_assert(std::tuple_size_v<decltype(Table::rows)> == kRowCount,
+                "write the number of rows into the table's type, below");
   Table table = {};
   for (size_t place = 0; place < kRowCount; ++place) {
     const auto &[id, name, valueCount] = rows[place];

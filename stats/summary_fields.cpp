@@ -61,12 +61,15 @@ constexpr size_t kPadding = 4;  // before hostReads
 constexpr size_t kOthers = offsetof(KVRStatsCxt, exportVersion) + sizeof(KVRStatsCxt::parseMarker) +
                            sizeof(KVRStatsCxt::reserved1) + sizeof(KVRStatsCxt::reserved2) +
                            sizeof(KVRStatsCxt::reserved3) + kPadding;
-static_assert(sizeof(void *) != 8 || [] {
-  size_t size = kOthers;
-  for (const MorwickSummaryField &field : kFields)
-    size += size_t{field.valueWidth} * field.valueCount;
-  return size == sizeof(KVRStatsCxt);
-}());
+static_assert(
+    sizeof(void *) != 8 ||
+        [] {
+          size_t size = kOthers;
+          for (const MorwickSummaryField &field : kFields)
+            size += size_t{field.valueWidth} * field.valueCount;
+          return size == sizeof(KVRStatsCxt);
+        }(),
+    "a member of KVRStatsCxt has no row");
 static_assert(std::ranges::is_sorted(kFields, {}, &MorwickSummaryField::offset));
 
 }  // namespace

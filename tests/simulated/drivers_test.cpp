@@ -86,6 +86,7 @@ TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
   }
   Play(scenario);
   for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+    SCOPED_TRACE(row->className);
     const uint32_t connection = Connect(row->className);
     EXPECT_EQ(Read(connection, row->methodSelector, row->getBandStatsSelectors()->second),
               row->className);
