@@ -62,7 +62,8 @@ TEST(SimulatedSystemLogTest, CountsAgainWhatALostCountSaid) {
     systemLogError = error;
     SystemLog("error %d", error);
   }
-  // Lost are the first two, with their count the third, the fourth, and none of those that wait.
+  // The first four lines are lost: the third waits, with the count of the first two, until the
+  // fourth finds no log. The fifth waits for the sixth and is not lost.
   std::istringstream lines(systemLog);
   for (const std::string text : {"4 lines of the log were dropped", "error 11", "error 0"}) {
     std::string line;
@@ -72,12 +73,13 @@ TEST(SimulatedSystemLogTest, CountsAgainWhatALostCountSaid) {
   EXPECT_EQ(lines.peek(), EOF);
 }
 
-// In the log 29 characters with the NUL: of the 16 KiB for lines that wait, 564 of them leave one
-// too few for another.
+// A line takes 29 characters in the log, with its NUL. The room for lines that wait is 16 KiB;
+// after 564 lines it is one character too small for another.
 constexpr char kLine[] = "line %013u";
 constexpr unsigned long kWaiting = 564;
 
-// All lines in their order but for one gap, which is told of, and not before so many lines.
+// The log has all lines in order, except for one gap. A line says how many are missing; at least
+// `least` lines stand before it.
 void CheckOneGap(const std::string &log, unsigned long lines, unsigned long least) {
   std::istringstream stream(log);
   std::string line;
@@ -102,8 +104,8 @@ void CheckOneGap(const std::string &log, unsigned long lines, unsigned long leas
   EXPECT_EQ(gaps, 1);
 }
 
-// Nobody reads standard error or the system's log; then the one is read piece by piece, and the
-// other is started anew.
+// Nobody reads standard error or the system's log. Then standard error is read piece by piece, and
+// the system's log goes away and comes back.
 void CheckFullLog(int reader, int writer) {
   Play("");
   fcntl(reader, F_SETFL, O_NONBLOCK);
