@@ -7,6 +7,7 @@
 
 #include <cstdio>
 #include <cstring>
+#include <functional>
 #include <random>
 #include <string>
 #include <vector>
@@ -227,35 +228,24 @@ std::vector<char> &Buffer() {
   return buffer;
 }
 
-void CountLines(benchmark::State &state) {
+void Measure(benchmark::State &state, const std::function<size_t(char *, size_t)> &render) {
+  for (auto _ : state) benchmark::DoNotOptimize(render(Buffer().data(), Buffer().size()));
   state.counters["ns/line"] = benchmark::Counter(
       kRecords * 1e-9, benchmark::Counter::kIsIterationInvariantRate | benchmark::Counter::kInvert);
 }
 
-template <size_t (*Render)(char *, size_t)>
-void Measure(benchmark::State &state) {
-  for (auto _ : state) benchmark::DoNotOptimize(Render(Buffer().data(), Buffer().size()));
-  CountLines(state);
-}
-
-template <unsigned kBits, uint32_t kSmallest>
-void MeasureLines(benchmark::State &state, const morwick::LineKernel &kernel) {
-  if (!kernel.runs()) return state.SkipWithError("this processor has none");
-  for (auto _ : state) {
-    char *end = Buffer().data();
+template <unsigned kBits, uint32_t kSmallest = 0>
+void AddLines(const morwick::LineKernel &kernel, const char *numbers) {
+  const auto write = [&kernel](char *output, size_t) {
+    char *end = output;
     for (uint32_t i = 0; i < kRecords; ++i) {
       end = kernel.write(end, reinterpret_cast<const uint8_t *>(&Records<kBits, kSmallest>()[i]));
     }
-    benchmark::DoNotOptimize(end);
-  }
-  CountLines(state);
+    return static_cast<size_t>(end - output);
+  };
+  const std::string name = std::string("line/") + kernel.name + numbers;
+  benchmark::RegisterBenchmark(name.c_str(), Measure, write);
 }
-
-BENCHMARK(Measure<Fixed>)->Name("fixed/formatter");
-BENCHMARK(Measure<PlainFixed>)->Name("fixed/plain");
-BENCHMARK(Measure<FmtFixed>)->Name("fixed/libfmt");
-BENCHMARK(Measure<Described>)->Name("described/formatter");
-BENCHMARK(Measure<PlainDescribed>)->Name("described/plain");
 
 std::string Text(size_t (*render)(char *, size_t)) {
   return {Buffer().data(), render(Buffer().data(), Buffer().size())};
@@ -271,16 +261,20 @@ int main(int argc, char **argv) {
     std::fputs("the versions differ in their text\n", stderr);
     return 1;
   }
+  benchmark::RegisterBenchmark("fixed/formatter", Measure, Fixed);
+  benchmark::RegisterBenchmark("fixed/plain", Measure, PlainFixed);
+  benchmark::RegisterBenchmark("fixed/libfmt", Measure, FmtFixed);
+  benchmark::RegisterBenchmark("described/formatter", Measure, Described);
+  benchmark::RegisterBenchmark("described/plain", Measure, PlainDescribed);
   for (const morwick::LineKernel &kernel : morwick::LineKernels()) {
-    const std::string name = std::string("line/") + kernel.name;
-    const auto add = [&](const char *numbers,
-                         void (*measure)(benchmark::State &, const morwick::LineKernel &)) {
-      benchmark::RegisterBenchmark((name + numbers).c_str(), measure, kernel);
-    };
-    add("/mixed", MeasureLines<32, 0>);
-    add("/1 digit", MeasureLines<3, 0>);
-    add("/up to 8 digits", MeasureLines<26, 0>);
-    add("/10 digits", MeasureLines<30, 1U << 31>);
+    if (!kernel.runs()) {
+      std::fprintf(stderr, "this processor has no %s\n", kernel.name);
+      continue;
+    }
+    AddLines<32>(kernel, "/mixed");
+    AddLines<3>(kernel, "/1 digit");
+    AddLines<26>(kernel, "/up to 8 digits");
+    AddLines<30, 1U << 31>(kernel, "/10 digits");
   }
   benchmark::Initialize(&argc, argv);
   benchmark::RunSpecifiedBenchmarks();

@@ -66,6 +66,7 @@ struct alignas(64) Values {
 // Numbers become fours of digits, then twos, then digits, in lanes of half the size each time: a
 // number plus its quotient times (the range of half a lane - divisor) is the remainder in the lower
 // half of its lane and the quotient in the upper. So the last digits come first, until turned.
+constexpr __m128i kTurned = {0x08090a0b0c0d0e0f, 0x0001020304050607};
 
 AVX2 inline __m256i Times(__m256i numbers, int64_t factor, int shift = 0) {
   return _mm256_srli_epi64(_mm256_mul_epu32(numbers, _mm256_set1_epi64x(factor)), shift);
@@ -82,12 +83,9 @@ AVX2 inline char *PutSlot(char *end, __m128i digits, uint32_t nonZero, size_t sl
 }
 
 AVX2 inline char *PutTwo(char *end, __m256i twos, size_t slot) {
-  __m256i factor = _mm256_set1_epi16((1 << 8) - 10);
-  asm("" : "+x"(factor));  // or GCC would make five instructions of a multiplication
   const __m256i tens = _mm256_mulhi_epu16(twos, _mm256_set1_epi16(6554));
-  __m256i digits = twos + _mm256_mullo_epi16(tens, factor);
-  digits = _mm256_shuffle_epi8(
-      digits, _mm256_broadcastsi128_si256(_mm_set_epi64x(0x0001020304050607, 0x08090a0b0c0d0e0f)));
+  __m256i digits = twos + _mm256_mullo_epi16(tens, _mm256_set1_epi16((1 << 8) - 10));
+  digits = _mm256_shuffle_epi8(digits, _mm256_broadcastsi128_si256(kTurned));
   const __m256i zeros = _mm256_cmpeq_epi8(digits, _mm256_setzero_si256());
   const auto nonZero = ~static_cast<uint32_t>(_mm256_movemask_epi8(zeros));
   digits |= _mm256_set1_epi8('0' - ' ');  // over padding, be it blanks or zeros
@@ -116,8 +114,7 @@ AVX2 char *WriteAvx2(char *end, const uint8_t *record) {
 AVX512 inline char *PutFour(char *end, __m512i twos, size_t slot) {
   const __m512i tens = _mm512_mulhi_epu16(twos, _mm512_set1_epi16(6554));
   __m512i digits = twos + _mm512_mullo_epi16(tens, _mm512_set1_epi16((1 << 8) - 10));
-  digits = _mm512_shuffle_epi8(
-      digits, _mm512_broadcast_i32x4(_mm_set_epi64x(0x0001020304050607, 0x08090a0b0c0d0e0f)));
+  digits = _mm512_shuffle_epi8(digits, _mm512_broadcast_i32x4(kTurned));
   const uint64_t nonZero = _mm512_test_epi8_mask(digits, digits) | 0x8000'8000'8000'8000;
   // In each slot the bits from the lowest one on.
   const uint64_t digitsFrom = ~((nonZero - 0x0001'0001'0001'0001) & ~nonZero);
@@ -176,12 +173,10 @@ std::span<const LineKernel> LineKernels() { return kKernels; }
 // Threads that choose at the same time choose the same.
 LineWriter *FastestLineWriter() {
   static std::atomic<LineWriter *> chosen;
-  LineWriter *write = chosen.load(std::memory_order_relaxed);
-  if (write == nullptr) {
-    write = std::ranges::find_if(kKernels, [](const auto &one) { return one.runs(); })->write;
-    chosen.store(write, std::memory_order_relaxed);
+  if (chosen == nullptr) {
+    chosen = std::ranges::find_if(kKernels, [](const auto &one) { return one.runs(); })->write;
   }
-  return write;
+  return chosen;
 }
 
 }  // namespace morwick
