@@ -31,7 +31,8 @@ TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
   const wchar_t noCharacter[] = {0xd800, 0};
   SetAPIErrorMessage("what came before %ls is there", noCharacter);
   EXPECT_EQ(TakeMessage(), "what came before ");
-  SetAPIErrorMessage("%s", "");
+  const char *empty = "";
+  SetAPIErrorMessage(empty, 7);
   SetAPIErrorMessage("an empty message is one, too");
   EXPECT_EQ(TakeMessage(), "");
   for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
