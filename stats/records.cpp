@@ -70,11 +70,6 @@ int NextRecord(MorwickRecordReader &reader, MorwickRecord &record) {
   return 1;
 }
 
-std::string_view SeparatorOf(MorwickStream stream, const MorwickKey &key) {
-  if (stream != kMorwickFTL) return "";
-  return StreamRules<kMorwickFTL>::Separator(key);
-}
-
 }  // namespace
 }  // namespace morwick
 
@@ -110,7 +105,9 @@ uint32_t MorwickValueName(MorwickStream stream, const MorwickKey *key, uint32_t 
   if (name == nullptr) return 0;
   name[0] = '\0';
   if (key == nullptr) return 0;
-  const morwick::EntryName prefix(morwick::NameOf(*key), morwick::SeparatorOf(stream, *key));
+  const std::string_view separator =
+      stream == kMorwickFTL ? morwick::StreamRules<kMorwickFTL>::Separator(*key) : "";
+  const morwick::EntryName prefix(morwick::NameOf(*key), separator);
   ContextNode node = prefix.node();
   if (valueCount > 1) prefix.AppendIndex(&node, index);
   static_assert(sizeof node.text <= kMorwickNameRoom);
