@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
-#include <span>
 
 #include "morwick/little_endian.h"
 #include "morwick/snapshot.h"
@@ -28,22 +27,6 @@ bool AppendBanner(BoundedWriter &writer, uint32_t formatVersion, const char *tex
   return writer.Append("- KVR Snapshot - \n") && writer.Append({text, strnlen(text, capacity)}) &&
          writer.Append("\n");
 }
-
-// The first fields of a line, which are read once a call instead of once a record: half the time.
-class ReadyFields {
- public:
-  explicit ReadyFields(const DescriptorTable &table) : count_(std::min(table.count(), kMost)) {
-    for (uint32_t i = 0; i < count_; ++i) fields_[i] = table.Read(i);
-  }
-
-  std::span<const Field> fields() const { return {fields_, count_}; }
-
- private:
-  static constexpr uint32_t kMost = 32;
-
-  uint32_t count_;
-  Field fields_[kMost];
-};
 
 // One value of each priority's triple, after its label.
 bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *label,
@@ -81,16 +64,33 @@ bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *lab
   return true;
 }
 
-bool AppendLine(BoundedWriter &writer, std::span<const Field> ready, const DescriptorTable &table,
-                const uint8_t *record) {
-  for (const Field &field : ready) {
-    if (!AppendField(writer, field, record)) return false;
+// The line of a record. Its first fields are read once a call instead of once a record: half the
+// time.
+class Line {
+ public:
+  explicit Line(const DescriptorTable &table)
+      : table_(table), readyCount_(std::min(table.count(), kMostReady)) {
+    for (uint32_t i = 0; i < readyCount_; ++i) ready_[i] = table.Read(i);
   }
-  for (auto i = static_cast<uint32_t>(ready.size()); i < table.count(); ++i) {
-    if (!AppendField(writer, table.Read(i), record)) return false;
+
+  // False when the buffer is full.
+  bool Append(BoundedWriter &writer, const uint8_t *record) const {
+    for (uint32_t i = 0; i < readyCount_; ++i) {
+      if (!AppendField(writer, ready_[i], record)) return false;
+    }
+    for (uint32_t i = readyCount_; i < table_.count(); ++i) {
+      if (!AppendField(writer, table_.Read(i), record)) return false;
+    }
+    return writer.Append("\n");
   }
-  return writer.Append("\n");
-}
+
+ private:
+  static constexpr uint32_t kMostReady = 32;
+
+  const DescriptorTable &table_;
+  uint32_t readyCount_;
+  Field ready_[kMostReady];
+};
 
 // What a call comes to: the length of the lines that were completed, and whether the last record
 // has been dealt with.
@@ -124,12 +124,12 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   while (*state < last && table.IsEmpty(recordAt(*state))) ++*state;
   if (*state >= last) return {0, true};
 
-  const ReadyFields ready(table);
+  const Line line(table);
   uint64_t completed = 0;
   while (*state < last) {
     const uint8_t *record = recordAt((*state)++);
     if (table.IsEmpty(record)) continue;
-    if (!AppendLine(writer, ready.fields(), table, record)) return {completed, false};
+    if (!line.Append(writer, record)) return {completed, false};
     completed = writer.length();
   }
   return {completed, true};

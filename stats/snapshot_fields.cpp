@@ -43,17 +43,11 @@ struct Name {
 };
 
 MorwickFieldKind KindOf(const Field &field) {
-  switch (field.kind) {
-    case Field::kNumber:
-      return field.format.conversionCount > 0 ? kMorwickFieldNumber : kMorwickFieldWithoutNumber;
-    case Field::kThousandths:
-      return field.format.conversionCount > 0 ? kMorwickFieldThousandths
-                                              : kMorwickFieldWithoutNumber;
-    case Field::kPriorities:
-      return field.priorities > 0 ? kMorwickFieldPriorities : kMorwickFieldWithoutNumber;
-    case Field::kNothing: break;
-  }
-  return kMorwickFieldWithoutNumber;
+  const bool isTriple = field.kind == Field::kPriorities;
+  const bool hasNumber = isTriple ? field.priorities > 0 : field.format.conversionCount > 0;
+  if (!hasNumber || field.kind == Field::kNothing) return kMorwickFieldWithoutNumber;
+  if (isTriple) return kMorwickFieldPriorities;
+  return field.kind == Field::kNumber ? kMorwickFieldNumber : kMorwickFieldThousandths;
 }
 
 size_t NameCount(MorwickFieldKind kind) {

@@ -64,15 +64,10 @@ constexpr Field ReadField(const SnapshotFieldDescriptor &descriptor, uint32_t re
       field.kind == Field::kPriorities ? uint64_t{field.priorities} * kTripleSize : kNumberSize;
   const std::string_view room(descriptor.format, kFormatRoom);
   const std::string_view format = room.substr(0, room.find('\0'));
-  std::optional<PrintFormat> read;
-  if (field.offset + size <= recordSize && format.size() < kFormatRoom) {
-    read = ReadPrintFormat(format, ArgumentsOf(field.kind));
-  }
-  if (read) {
-    field.format = *read;
-  } else {
-    field.kind = Field::kNothing;
-  }
+  if (field.offset + size > recordSize || format.size() == kFormatRoom) return {};
+  const std::optional<PrintFormat> read = ReadPrintFormat(format, ArgumentsOf(field.kind));
+  if (!read) return {};
+  field.format = *read;
   return field;
 }
 

@@ -3,6 +3,7 @@
 #include "morwick/snapshot_header.h"
 
 #include <cinttypes>
+#include <cstdarg>
 #include <cstddef>
 #include <cstdio>
 #include <cstring>
@@ -11,52 +12,48 @@
 
 namespace {
 
-struct Finding {
-  MorwickHeaderFault fault = kMorwickHeaderIsWhole;
-  const char *field = "";
-  uint64_t value = 0;
-};
+// Writes in words what is wrong, where there is room for them. Returns the fault.
+[[gnu::format(printf, 3, 4)]] MorwickHeaderFault Explain(MorwickHeaderFault fault, char *text,
+                                                         const char *format, ...) {
+  va_list arguments;
+  va_start(arguments, format);
+  if (text != nullptr) std::vsnprintf(text, kMorwickHeaderTextRoom, format, arguments);
+  va_end(arguments);
+  return fault;
+}
 
-Finding Check(const char *header, uint64_t size) {
-  if (header == nullptr || size < sizeof(SnapshotHeader)) return {kMorwickHeaderTooShort};
+MorwickHeaderFault Check(const char *header, uint64_t size, char *text) {
+  if (header == nullptr || size < sizeof(SnapshotHeader)) {
+    return Explain(kMorwickHeaderTooShort, text,
+                   "a header of %" PRIu64 " bytes is shorter than %zu", size,
+                   sizeof(SnapshotHeader));
+  }
   const auto number = [=](uint64_t offset) { return LoadLittleEndian32(header + offset); };
-  if (number(offsetof(SnapshotHeader, recordSize)) == 0) return {kMorwickHeaderNoRecordSize};
+  if (number(offsetof(SnapshotHeader, recordSize)) == 0) {
+    return Explain(kMorwickHeaderNoRecordSize, text, "the record size is 0");
+  }
   if (number(offsetof(SnapshotHeader, formatVersion)) >= kSnapshotFirstTextVersion &&
       std::memchr(header + sizeof(SnapshotHeader), '\0', size - sizeof(SnapshotHeader)) ==
           nullptr) {
-    return {kMorwickHeaderNoTextEnd};
+    return Explain(kMorwickHeaderNoTextEnd, text, "the text at offset %zu has no end",
+                   sizeof(SnapshotHeader));
   }
   const uint64_t table = number(offsetof(SnapshotHeader, descriptorTableOffset));
   const uint64_t descriptors = table + sizeof(SnapshotDescriptorTable);
-  if (descriptors > size) return {kMorwickHeaderNoTable, "descriptor table offset", table};
+  constexpr char kOutside[] = "%s %" PRIu64 " points outside the header of %" PRIu64 " bytes";
+  if (descriptors > size) {
+    return Explain(kMorwickHeaderNoTable, text, kOutside, "descriptor table offset", table, size);
+  }
   const uint64_t count = number(table);
   if (descriptors + count * sizeof(SnapshotFieldDescriptor) > size) {
-    return {kMorwickHeaderNoDescriptors, "descriptor count", count};
+    return Explain(kMorwickHeaderNoDescriptors, text, kOutside, "descriptor count", count, size);
   }
-  return {};
+  return kMorwickHeaderIsWhole;
 }
 
 }  // namespace
 
 MorwickHeaderFault MorwickCheckSnapshotHeader(const void *header, uint64_t size, char *text) {
-  const Finding finding = Check(static_cast<const char *>(header), size);
-  if (text == nullptr) return finding.fault;
-  constexpr size_t kRoom = kMorwickHeaderTextRoom;
-  switch (finding.fault) {
-    case kMorwickHeaderIsWhole: text[0] = '\0'; break;
-    case kMorwickHeaderTooShort:
-      std::snprintf(text, kRoom, "a header of %" PRIu64 " bytes is shorter than %zu", size,
-                    sizeof(SnapshotHeader));
-      break;
-    case kMorwickHeaderNoRecordSize: std::snprintf(text, kRoom, "the record size is 0"); break;
-    case kMorwickHeaderNoTextEnd:
-      std::snprintf(text, kRoom, "the text at offset %zu has no end", sizeof(SnapshotHeader));
-      break;
-    case kMorwickHeaderNoTable:
-    case kMorwickHeaderNoDescriptors:
-      std::snprintf(text, kRoom, "%s %" PRIu64 " points outside the header of %" PRIu64 " bytes",
-                    finding.field, finding.value, size);
-      break;
-  }
-  return finding.fault;
+  if (text != nullptr) text[0] = '\0';
+  return Check(static_cast<const char *>(header), size, text);
 }
