@@ -26,55 +26,77 @@ void PrintEntry(Json &json, const char *key, const std::optional<Entry> &entry) 
   if (entry) PrintNumber(json, key, entry->value(), entry->digits());
 }
 
-uint64_t Magnitude(const Change &change) {
-  const uint64_t old = change.old->value();
-  const uint64_t now = change.now->value();
-  return now < old ? old - now : now - old;
+std::string_view NameOf(const Change &change) {
+  return change.now ? change.now->name() : change.old->name();
 }
 
-std::vector<Change> Compare(const Statistics &old, const Statistics &now, bool all) {
-  std::unordered_map<std::string_view, Occurrences> before;
-  for (const Entry &entry : old) before[entry.name()].entries.push_back(entry);
-  std::vector<Change> changes;
-  for (const Entry &entry : now) {
-    Change change = {std::nullopt, entry};
-    const auto found = before.find(entry.name());
-    if (found != before.end() && found->second.met < found->second.entries.size()) {
-      change.old = found->second.entries[found->second.met++];
-    }
-    if (all || !change.old || change.old->value() != entry.value()) changes.push_back(change);
-  }
-  std::unordered_map<std::string_view, size_t> passed;
-  for (const Entry &entry : old) {
-    if (passed[entry.name()]++ >= before[entry.name()].met) changes.push_back({entry, {}});
-  }
-  return changes;
+bool IsBackwards(const Change &change) {
+  return change.old && change.now && change.now->value() < change.old->value();
+}
+
+std::string_view RemarkOf(const Change &change) {
+  if (!change.old) return "appeared";
+  if (!change.now) return "vanished";
+  return IsBackwards(change) ? "backwards" : "";
+}
+
+// The difference without its sign. Nothing when one of the two is missing.
+std::optional<uint64_t> MagnitudeOf(const Change &change) {
+  if (!change.old || !change.now) return std::nullopt;
+  const uint64_t difference = change.now->value() - change.old->value();
+  return IsBackwards(change) ? -difference : difference;
+}
+
+// In decimal; negative with a sign.
+std::string DifferenceOf(const Change &change) {
+  const std::optional<uint64_t> magnitude = MagnitudeOf(change);
+  return magnitude ? (IsBackwards(change) ? "-" : "") + std::to_string(*magnitude) : "";
+}
+
+// The difference per second. Nothing when it or the time is missing.
+std::optional<double> RateOf(const Change &change, std::optional<double> seconds) {
+  const std::optional<uint64_t> magnitude = MagnitudeOf(change);
+  if (!magnitude || !seconds) return std::nullopt;
+  const double rate = static_cast<double>(*magnitude) / *seconds;
+  if (!std::isfinite(rate)) return std::nullopt;
+  return IsBackwards(change) ? -rate : rate;
 }
 
 }  // namespace
 
-std::string_view Change::Remark() const {
-  if (!old) return "appeared";
-  if (!now) return "vanished";
-  return now->value() < old->value() ? "backwards" : "";
-}
-
-std::string Change::Difference() const {
-  if (!old || !now) return "";
-  return (now->value() < old->value() ? "-" : "") + std::to_string(Magnitude(*this));
-}
-
-std::optional<double> Change::Rate(std::optional<double> seconds) const {
-  if (!old || !now || !seconds) return std::nullopt;
-  const auto difference = static_cast<double>(Magnitude(*this));
-  const double rate = (now->value() < old->value() ? -difference : difference) / *seconds;
-  return std::isfinite(rate) ? std::optional(rate) : std::nullopt;
+std::vector<std::string> Change::Cells(std::optional<double> seconds) const {
+  const std::optional<double> rate = RateOf(*this, seconds);
+  return {std::string(NameOf(*this)),
+          std::string(old ? old->digits() : ""),
+          std::string(now ? now->digits() : ""),
+          DifferenceOf(*this),
+          rate ? ThreeDecimals(*rate) : "",
+          std::string(RemarkOf(*this))};
 }
 
 std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Statistics &now,
                                                bool all, const std::string &subject) {
   try {
-    return Compare(old, now, all);
+    std::unordered_map<std::string_view, Occurrences> before;
+    for (const Entry &entry : old) before[entry.name()].entries.push_back(entry);
+    std::vector<Change> changes;
+    for (const Entry &entry : now) {
+      Change change = {std::nullopt, entry};
+      const auto found = before.find(entry.name());
+      if (found != before.end() && found->second.met < found->second.entries.size()) {
+        change.old = found->second.entries[found->second.met++];
+      }
+      if (all || !change.old || change.old->value() != entry.value()) changes.push_back(change);
+    }
+    for (const Entry &entry : old) {
+      size_t &met = before[entry.name()].met;
+      if (met > 0) {
+        --met;
+      } else {
+        changes.push_back({entry, {}});
+      }
+    }
+    return changes;
   } catch (const std::bad_alloc &) {
     Complain(subject, "out of memory when compared");
     return std::nullopt;
@@ -86,31 +108,22 @@ std::vector<std::string> TableOf(const std::vector<Change> &changes,
   if (changes.empty()) return {};
   AlignedTable table(5);
   table.Add({"name", "old", "new", "difference", seconds ? "per second" : ""});
-  for (const Change &change : changes) {
-    const std::optional<double> rate = change.Rate(seconds);
-    table.Add({std::string(change.name()), std::string(change.old ? change.old->digits() : ""),
-               std::string(change.now ? change.now->digits() : ""), change.Difference(),
-               rate ? ThreeDecimals(*rate) : "", std::string(change.Remark())});
-  }
+  for (const Change &change : changes) table.Add(change.Cells(seconds));
   return table.Lines();
 }
 
 void PrintChanges(Json &json, const std::vector<Change> &changes, std::optional<double> seconds) {
-  json.Key("seconds");
-  seconds ? json.Fraction(*seconds) : json.Null();
+  json.Member("seconds", seconds);
   json.Objects("changes", changes, [&](const Change &change) {
     json.Key("name");
-    json.PlainText(change.name());
+    json.PlainText(NameOf(change));
     PrintEntry(json, "old", change.old);
     PrintEntry(json, "new", change.now);
-    if (const std::string difference = change.Difference(); !difference.empty()) {
-      PrintNumber(json, "difference", Magnitude(change), difference);
+    if (const std::optional<uint64_t> magnitude = MagnitudeOf(change)) {
+      PrintNumber(json, "difference", *magnitude, DifferenceOf(change));
     }
-    if (const std::optional<double> rate = change.Rate(seconds)) {
-      json.Key("rate");
-      json.Fraction(*rate);
-    }
-    if (!change.Remark().empty()) json.Member("remark", change.Remark());
+    if (const std::optional<double> rate = RateOf(change, seconds)) json.Member("rate", rate);
+    if (!RemarkOf(change).empty()) json.Member("remark", RemarkOf(change));
   });
 }
 

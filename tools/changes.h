@@ -16,13 +16,9 @@ struct Change {
   std::optional<Entry> old;
   std::optional<Entry> now;
 
-  std::string_view name() const { return now ? now->name() : old->name(); }
-  // "backwards", "appeared", "vanished", or empty.
-  std::string_view Remark() const;
-  // now - old in decimal; negative with a sign. Empty when one of them is missing.
-  std::string Difference() const;
-  // The difference per second. Nothing when one of them or the time is missing.
-  std::optional<double> Rate(std::optional<double> seconds) const;
+  // As texts, empty where there is none: name, old, new, difference, rate by the seconds between
+  // the readings, and remark: "backwards", "appeared" or "vanished".
+  std::vector<std::string> Cells(std::optional<double> seconds) const;
 };
 
 // The changes in the order of the later reading, then the entries that vanished. The n-th entry of

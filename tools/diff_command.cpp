@@ -23,11 +23,7 @@ struct Options : StreamOptions {
 void PrintCsv(Output &output, const std::vector<Change> &changes, std::optional<double> seconds) {
   output.Write("name,old,new,difference,rate,remark\n");
   for (const Change &change : changes) {
-    const std::optional<double> rate = change.Rate(seconds);
-    output.Write(fmt::format("{},{},{},{},{},{}\n", change.name(),
-                             change.old ? change.old->digits() : "",
-                             change.now ? change.now->digits() : "", change.Difference(),
-                             rate ? ThreeDecimals(*rate) : "", change.Remark()));
+    output.Write(fmt::format("{}\n", fmt::join(change.Cells(seconds), ",")));
   }
 }
 

@@ -16,6 +16,7 @@ namespace {
 struct Finding {
   const NandExporter *row;
   fleet::Presence presence;
+  std::vector<std::string_view> offers;  // the names of its buffers
 
   std::string_view State() const {
     return !presence.present ? "absent" : presence.opened ? "present" : "refusing";
@@ -31,9 +32,7 @@ void PrintNormal(Output &output, const std::vector<Finding> &findings) {
       line += ", result " + fleet::Hexadecimal(finding.presence.result);
     }
     line += ", offers";
-    for (const fleet::BufferKind &kind : fleet::BufferKinds()) {
-      if (finding.row->*kind.selectors != nullptr) line += fmt::format(" {}", kind.name);
-    }
+    for (const std::string_view name : finding.offers) line += fmt::format(" {}", name);
     table.Add({finding.row->className, line});
   }
   table.Print(output);
@@ -47,12 +46,7 @@ Status PrintJson(Output &output, const std::vector<Finding> &findings, Status st
     if (finding.presence.present) {
       json.Member("result", static_cast<uint32_t>(finding.presence.result));
     }
-    json.Key("offers");
-    json.BeginArray();
-    for (const fleet::BufferKind &kind : fleet::BufferKinds()) {
-      if (finding.row->*kind.selectors != nullptr) json.PlainText(kind.name);
-    }
-    json.EndArray();
+    json.Array("offers", finding.offers, [&](std::string_view name) { json.PlainText(name); });
   });
   return json.Finish(status);
 }
@@ -61,8 +55,12 @@ Status Find(Format format) {
   std::vector<Finding> findings;
   Status status = kBadData;
   for (const NandExporter &row : fleet::KnownControllers()) {
-    findings.push_back({&row, fleet::Probe(row)});
-    if (findings.back().presence.opened) status = kGood;
+    Finding finding = {&row, fleet::Probe(row), {}};
+    if (finding.presence.opened) status = kGood;
+    for (const fleet::BufferKind &kind : fleet::BufferKinds()) {
+      if (row.*kind.selectors != nullptr) finding.offers.push_back(kind.name);
+    }
+    findings.push_back(std::move(finding));
   }
   Output output;
   if (format == Format::kJson) {

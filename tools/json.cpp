@@ -2,6 +2,8 @@
 
 #include "tools/json.h"
 
+#include <array>
+
 #include "tools/text.h"
 
 namespace tools {
@@ -10,22 +12,17 @@ Json::Json(Output &output, std::string_view command, const std::vector<Source> &
     : stream_{output} {
   if (!reserve_.IsHeld()) RefuseMemory();
   BeginObject();
-  Key("format_version");
-  BeginArray();
-  Number(1U);
-  Number(0U);
-  EndArray();
+  Array("format_version", std::array{1U, 0U}, [&](uint32_t part) { Number(part); });
   Member("morwick", MORWICK_VERSION);
   Member("platform", MORWICK_PLATFORM_NAME);
   Member("command", command);
   if (sources.empty()) return;
-  Key("source");
-  BeginObject();
-  for (const Source &source : sources) {
-    Key(source.kind);
-    source.kind == "controller" && source.name.empty() ? Null() : Text(source.name);
-  }
-  EndObject();
+  Object("source", [&] {
+    for (const Source &source : sources) {
+      Key(source.kind);
+      source.kind == "controller" && source.name.empty() ? Null() : Text(source.name);
+    }
+  });
 }
 
 // Valid text is not copied, so that an object can be ended when memory is refused.
@@ -33,26 +30,15 @@ void Json::Text(std::string_view text) {
   IsValidText(text) ? PlainText(text) : PlainText(ValidText(text));
 }
 
-void Json::PrintMessage(std::string_view severity, std::string_view text) {
-  BeginObject();
-  Member("severity", severity);
-  Member("text", text);
-  EndObject();
-}
-
 Status Json::Finish(Status status) {
   if (TakeMemoryRefusal()) {
     ComplainOfMemory();
     status = kBadData;
   }
-  Key("messages");
-  BeginArray();
-  for (const Message &message : KeptMessages()) PrintMessage(message.severity, message.text);
-  if (LeftOutMessages() > 0) {
-    PrintMessage("note", std::to_string(LeftOutMessages()) + " more messages are left out here");
-  }
-  EndArray();
-  ForgetMessages();
+  Objects("messages", TakeMessages(), [&](const Message &message) {
+    Member("severity", message.severity);
+    Member("text", message.text);
+  });
   Member("status", static_cast<uint32_t>(status));
   EndObject();
   stream_.output.Put('\n');

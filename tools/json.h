@@ -7,6 +7,7 @@
 
 #include <concepts>
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -39,7 +40,6 @@ class Json {
   // For text that is certainly UTF-8, such as the name of a statistic.
   void PlainText(std::string_view text) { writer_.String(text.data(), Length(text)); }
   void Number(std::unsigned_integral auto number) { writer_.Uint64(number); }
-  void Fraction(double number) { writer_.Double(number); }
   // A number that is already in decimal.
   void Digits(std::string_view digits) {
     writer_.RawValue(digits.data(), digits.size(), rapidjson::kNumberType);
@@ -58,18 +58,37 @@ class Json {
     Key(key);
     Number(number);
   }
+  void Member(std::string_view key, std::optional<double> number) {
+    Key(key);
+    number ? writer_.Double(*number) : writer_.Null();
+  }
+
+  // A member with an object, whose members `print` prints.
+  template <typename Print>
+  void Object(std::string_view key, Print print) {
+    Key(key);
+    BeginObject();
+    print();
+    EndObject();
+  }
+
+  // A member with an array; `print` prints each element.
+  template <typename Elements, typename Print>
+  void Array(std::string_view key, const Elements &elements, Print print) {
+    Key(key);
+    BeginArray();
+    for (const auto &element : elements) print(element);
+    EndArray();
+  }
 
   // A member with an array of objects, one for each element; `print` prints an object's members.
   template <typename Elements, typename Print>
   void Objects(std::string_view key, const Elements &elements, Print print) {
-    Key(key);
-    BeginArray();
-    for (const auto &element : elements) {
+    Array(key, elements, [&](const auto &element) {
       BeginObject();
       print(element);
       EndObject();
-    }
-    EndArray();
+    });
   }
 
   // A member with one number or an array of them. When one is too large for a double, a second
@@ -110,8 +129,6 @@ class Json {
   static rapidjson::SizeType Length(std::string_view text) {
     return static_cast<rapidjson::SizeType>(text.size());
   }
-
-  void PrintMessage(std::string_view severity, std::string_view text);
 
   MemoryReserve reserve_{2 << 20};
   Stream stream_;

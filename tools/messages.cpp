@@ -84,13 +84,11 @@ uint64_t LinesPrinted() { return linesPrinted; }
 
 void KeepMessages() { keeping = true; }
 
-const std::vector<Message> &KeptMessages() { return kept; }
-
-uint64_t LeftOutMessages() { return leftOut; }
-
-void ForgetMessages() {
-  kept.clear();
-  leftOut = 0;
+std::vector<Message> TakeMessages() {
+  if (const uint64_t more = std::exchange(leftOut, 0)) {
+    kept.push_back({"note", std::to_string(more) + " more messages are left out here"});
+  }
+  return std::exchange(kept, {});
 }
 
 }  // namespace tools

@@ -27,34 +27,6 @@ void Note(const std::string &subject, const std::string &reason);
 // which morwick explains the right ones.
 Status RefuseUsage(const std::string &reason, const std::string &help = "--help");
 
-// Complaints of one kind. A hostile file causes millions of them, so the first few are printed and
-// the others are counted.
-class RepeatedComplaint {
- public:
-  explicit RepeatedComplaint(std::string subject) : subject_(std::move(subject)) {}
-
-  // Calls `makeReason` only for a complaint that is printed.
-  template <typename MakeReason>
-  void Add(MakeReason makeReason) {
-    if (++count_ <= kMostPrinted) Complain(subject_, makeReason());
-  }
-
-  // Prints how many were only counted: "7 more records do not fit", where `whatTheyDo` is "records
-  // do not fit". True when there was any complaint.
-  bool Finish(const std::string &whatTheyDo) const {
-    if (count_ > kMostPrinted) {
-      Complain(subject_, std::to_string(count_ - kMostPrinted) + " more " + whatTheyDo);
-    }
-    return count_ > 0;
-  }
-
- private:
-  static constexpr uint64_t kMostPrinted = 3;
-
-  std::string subject_;
-  uint64_t count_ = 0;
-};
-
 // A line on the terminal that tells how far the work is. It is written again and again in the same
 // place.
 class ProgressLine {
@@ -81,19 +53,17 @@ void ComplainOfMemory();
 // From then on messages are kept, a thousand at most, until an object of JSON prints them.
 void KeepMessages();
 
-// How many lines were printed so far.
-uint64_t LinesPrinted();
-
 struct Message {
   std::string_view severity;  // error, note
   std::string text;
 };
-const std::vector<Message> &KeptMessages();
 
-// How many messages were not kept, because there were too many or memory was refused.
-uint64_t LeftOutMessages();
+// Hands over the messages that were kept. When there were too many, or memory was refused, the last
+// one tells how many more there were.
+std::vector<Message> TakeMessages();
 
-void ForgetMessages();
+// How many lines were printed so far.
+uint64_t LinesPrinted();
 
 }  // namespace tools
 

@@ -1,12 +1,14 @@
 // morwick snapshot: prints a snapshot as the library's text, as CSV or JSON, or what it says as a
 // whole.
 
+#include <fmt/format.h>
+
 #include <algorithm>
-#include <charconv>
 #include <memory>
 #include <new>
 
 #include "fleet/snapshot_header.h"
+#include "fleet/snapshot_text.h"
 #include "tools/commands.h"
 #include "tools/controller.h"
 #include "tools/input.h"
@@ -15,7 +17,6 @@
 #include "tools/snapshot_columns.h"
 #include "tools/snapshot_records.h"
 #include "tools/snapshot_summary.h"
-#include "tools/snapshot_text.h"
 #include "tools/text.h"
 
 namespace tools {
@@ -24,8 +25,7 @@ namespace {
 struct Options {
   std::string file;
   bool live = true;
-  std::string header;
-  bool described = false;  // by the file `header`
+  std::optional<std::string> header;  // a file
   bool fixed = false;
   std::string className;
   Format format = Format::kNormal;
@@ -38,7 +38,7 @@ struct Snapshot {
   std::string name;                   // in complaints
   std::optional<std::string> header;  // none: the fixed layout
   std::string headerName;
-  std::string bytes;                       // of a controller
+  std::optional<std::string> bytes;        // of a controller
   std::optional<SnapshotColumns> columns;  // where they are needed
   Status status = kGood;
 };
@@ -48,20 +48,17 @@ void ReadLive(const Options &options, Snapshot *snapshot) {
   const BufferKind &snapshotKind = *FindBufferKind("snapshot");
   const BufferKind &headerKind = *FindBufferKind("snapshot_header");
   Controller controller(options.className, std::string(snapshotKind.name));
-  snapshot->source.kind = "controller";
-  snapshot->source.name = controller.name();
+  snapshot->source = {"controller", controller.name()};
   snapshot->name = controller.name() + ": " + std::string(snapshotKind.name);
   snapshot->headerName = controller.name() + ": " + std::string(headerKind.name);
   snapshot->status = kBadData;
   if (!controller.connected()) return;
-  if (!options.described && !options.fixed && controller.Offers(headerKind)) {
+  if (!options.header && !options.fixed && controller.Offers(headerKind)) {
     snapshot->header = controller.Read(headerKind);
     if (!snapshot->header) return;
   }
-  std::optional<std::string> bytes = controller.Read(snapshotKind);
-  if (!bytes) return;
-  snapshot->bytes = std::move(*bytes);
-  snapshot->status = kGood;
+  snapshot->bytes = controller.Read(snapshotKind);
+  if (snapshot->bytes) snapshot->status = kGood;
 }
 
 // Checks the header, if there is one, and reads the columns from it where they are needed. What is
@@ -87,9 +84,9 @@ Snapshot Prepare(const Options &options) {
     NoteUnreadInput();
     ReadLive(options, &snapshot);
   }
-  if (snapshot.status == kGood && options.described) {
-    snapshot.headerName = DisplayName(options.header);
-    WholeInput header = ReadInput(options.header, fleet::kLargestHeader);
+  if (snapshot.status == kGood && options.header) {
+    snapshot.headerName = DisplayName(*options.header);
+    WholeInput header = ReadInput(*options.header, fleet::kLargestHeader);
     snapshot.status = header.status;
     snapshot.header = std::move(header.bytes);
   }
@@ -102,28 +99,55 @@ Snapshot Prepare(const Options &options) {
   return snapshot;
 }
 
-// Calls `take` with each record that the text has too, and `goesOn` after each block that came,
-// until that returns false. False when reading has failed.
-template <typename TakeRecord, typename GoesOn>
-bool ForEachRecord(SnapshotRecords &records, const SnapshotColumns &columns, TakeRecord take,
-                   GoesOn goesOn) {
-  do {
-    const auto block = records.Next();
-    if (!block) return false;
-    if (block->empty()) return true;
-    for (size_t at = 0; at < block->size(); at += records.recordSize()) {
-      const std::string_view record = block->substr(at, records.recordSize());
-      if (!columns.LeavesOut(record)) take(record);
-    }
-  } while (goesOn());
-  return true;
+// Each of the functions that print returns false when reading has failed.
+
+// The library's text: legend, lines, an empty line.
+bool PrintFixedText(Output &output, SnapshotRecords &records) {
+  fleet::FixedText text([&](std::string_view piece) { return output.Write(piece); });
+  text.Begin();
+  const bool good = records.ForEachBlock(
+      [&](std::string_view block) { return text.Print(block) && output.Flush(); });
+  if (good) text.End();
+  return good;
 }
 
-// Prints each record when it has come.
-template <typename PrintRecord>
-bool PrintEachRecord(Output &output, SnapshotRecords &records, const SnapshotColumns &columns,
-                     PrintRecord print) {
-  return ForEachRecord(records, columns, print, [&] { return output.Flush(); });
+// The library's text in the layout of the header. The status is bad when records are too long. A
+// hostile file has millions of them, so the first few are named and the others are counted.
+bool PrintDescribedText(Output &output, SnapshotRecords &records, const Snapshot &snapshot,
+                        Status *status) {
+  constexpr uint64_t kMostNamed = 3;
+  fleet::DescribedText text([&](std::string_view piece) { return output.Write(piece); },
+                            *snapshot.header);
+  const std::string tooLong =
+      fmt::format("not fit a text of {} bytes", fleet::DescribedText::kMostText);
+  uint64_t passedOver = 0;
+  const bool good = records.ForEachBlock([&](std::string_view block) {
+    const uint64_t first = records.count() - block.size() / records.recordSize();
+    const auto passOver = [&](uint32_t index) {
+      if (++passedOver > kMostNamed) return;
+      Complain(snapshot.name, fmt::format("record {} does {}", first + index, tooLong));
+    };
+    return text.Print(block, passOver) && output.Flush();
+  });
+  if (passedOver > kMostNamed) {
+    Complain(snapshot.name, fmt::format("{} more records do {}", passedOver - kMostNamed, tooLong));
+  }
+  if (passedOver > 0) *status = kBadData;
+  return good;
+}
+
+// Calls `take` with each record that the text has too. The output, if `take` writes to one, is
+// flushed after each block that came.
+template <typename TakeRecord>
+bool ForEachRecord(SnapshotRecords &records, const SnapshotColumns &columns, Output *output,
+                   TakeRecord take) {
+  return records.ForEachBlock([&](std::string_view block) {
+    for (; !block.empty(); block.remove_prefix(records.recordSize())) {
+      const std::string_view record = block.substr(0, records.recordSize());
+      if (!columns.LeavesOut(record)) take(record);
+    }
+    return output == nullptr || output->Flush();
+  });
 }
 
 bool PrintCsv(Output &output, SnapshotRecords &records, const SnapshotColumns &columns) {
@@ -133,14 +157,12 @@ bool PrintCsv(Output &output, SnapshotRecords &records, const SnapshotColumns &c
     AppendCsvField(&row, column.name);
   }
   output.Write(row += '\n');
-  return PrintEachRecord(output, records, columns, [&](std::string_view record) {
+  return ForEachRecord(records, columns, &output, [&](std::string_view record) {
     row.clear();
     for (const SnapshotColumn &column : columns.all()) {
       if (!row.empty()) row += ',';
-      char digits[16];
-      row.append(
-          digits,
-          std::to_chars(digits, std::end(digits), LoadLittleEndian32(&record[column.offset])).ptr);
+      const fmt::format_int number(LoadLittleEndian32(&record[column.offset]));
+      row.append(number.data(), number.size());
     }
     output.Write(row += '\n');
   });
@@ -148,13 +170,11 @@ bool PrintCsv(Output &output, SnapshotRecords &records, const SnapshotColumns &c
 
 bool PrintRows(Output &output, Json &json, SnapshotRecords &records,
                const SnapshotColumns &columns) {
-  json.Key("columns");
-  json.BeginArray();
-  for (const SnapshotColumn &column : columns.all()) json.Text(column.name);
-  json.EndArray();
+  json.Array("columns", columns.all(),
+             [&](const SnapshotColumn &column) { json.Text(column.name); });
   json.Key("rows");
   json.BeginArray();
-  const bool good = PrintEachRecord(output, records, columns, [&](std::string_view record) {
+  const bool good = ForEachRecord(records, columns, &output, [&](std::string_view record) {
     json.BeginArray();
     for (const SnapshotColumn &column : columns.all()) {
       json.Number(LoadLittleEndian32(&record[column.offset]));
@@ -169,8 +189,8 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records,
 bool PrintSummary(Output &output, Json *json, SnapshotRecords &records,
                   const SnapshotColumns &columns) {
   SnapshotSummary summary(columns);
-  const bool good = ForEachRecord(
-      records, columns, [&](std::string_view record) { summary.Add(record); }, [] { return true; });
+  const bool good = ForEachRecord(records, columns, nullptr,
+                                  [&](std::string_view record) { summary.Add(record); });
   if (json == nullptr) {
     summary.Print(output);
   } else {
@@ -211,11 +231,11 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     promised = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
   }
   std::optional<Input> input;
-  if (!options.live) input.emplace(options.file, !OutputIsTerminal());
+  if (!snapshot.bytes) input.emplace(options.file, !OutputIsTerminal());
   size_t taken = 0;
   const auto read = [&](char *bytes, size_t room) -> std::optional<size_t> {
     if (input) return input->Read(bytes, room);
-    const size_t count = snapshot.bytes.copy(bytes, room, taken);
+    const size_t count = snapshot.bytes->copy(bytes, room, taken);
     taken += count;
     return count;
   };
@@ -238,11 +258,11 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   } else if (options.format == Format::kCsv) {
     good = PrintCsv(output, records, *snapshot.columns);
   } else if (snapshot.header) {
-    status = PrintDescribedText(output, records, *snapshot.header, snapshot.name);
+    good = PrintDescribedText(output, records, snapshot, &status);
   } else {
     good = PrintFixedText(output, records);
   }
-  if (!good || status == kBadUsage) return kBadUsage;  // reading has failed
+  if (!good) return kBadUsage;
   if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
   return std::max(status, JudgeEnd(snapshot, records, promised));
 }
@@ -276,7 +296,6 @@ void AddSnapshot(CLI::App &app, Action *action) {
   AddFormat(command, &options->format, {Format::kNormal, Format::kJson, Format::kCsv});
   command->callback([=] {
     options->live = file->count() == 0;
-    options->described = header->count() > 0;
     if (!options->live && !options->className.empty()) {
       throw CLI::ValidationError("--controller", "is not asked for what is read from a file");
     }

@@ -35,12 +35,14 @@ bool SnapshotRecords::Load(size_t size) {
   return true;
 }
 
-std::optional<std::string_view> SnapshotRecords::Next() {
-  if (!Load(recordSize_ + (count_ == most_ ? 1 : 0))) return std::nullopt;
-  const uint64_t count = std::min<uint64_t>(filled_ / recordSize_, most_ - count_);
-  count_ += count;
-  used_ = count * recordSize_;
-  return std::string_view(buffer_).substr(recordSize_, used_);
+bool SnapshotRecords::ForEachBlock(const TakeBlock &take) {
+  for (;;) {
+    if (!Load(recordSize_ + (count_ == most_ ? 1 : 0))) return false;
+    const uint64_t count = std::min<uint64_t>(filled_ / recordSize_, most_ - count_);
+    count_ += count;
+    used_ = count * recordSize_;
+    if (count == 0 || !take(std::string_view(buffer_).substr(recordSize_, used_))) return true;
+  }
 }
 
 }  // namespace tools

@@ -14,6 +14,9 @@ class SnapshotRecords {
  public:
   // Reads at most `room` bytes, none at the end. Without a value, reading has failed.
   using ReadBytes = std::function<std::optional<size_t>(char *bytes, size_t room)>;
+  // Takes a block of whole records, in front of which lies room of one record that may be read.
+  // False ends the reading.
+  using TakeBlock = std::function<bool(std::string_view block)>;
 
   // Hands out no more than `most` records.
   SnapshotRecords(ReadBytes read, size_t recordSize, uint64_t most);
@@ -21,9 +24,8 @@ class SnapshotRecords {
   // Reads until there is a whole record, or the end. False when reading has failed.
   bool Load();
 
-  // The next block of whole records, empty at the end. In front of it lies room of one record,
-  // which may be read. Without a value, reading has failed.
-  std::optional<std::string_view> Next();
+  // Hands out the blocks as they come. False when reading has failed.
+  bool ForEachBlock(const TakeBlock &take);
 
   // What was read, and not handed out yet.
   std::string_view loaded() const {

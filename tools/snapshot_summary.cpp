@@ -2,10 +2,10 @@
 
 #include "tools/snapshot_summary.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
-#include <array>
 #include <cstddef>
-#include <cstdio>
 
 #include "morwick/little_endian.h"
 
@@ -22,34 +22,13 @@ by nearest rank, lie between the two bounds that are given. An interval's latenc
 
 )";
 
-std::string Decimal(std::optional<double> number, const char *format) {
-  if (!number) return "-";
-  std::array<char, 64> text;
-  std::snprintf(text.data(), text.size(), format, *number);
-  return text.data();
+std::string Decimal(std::optional<double> number, int decimals) {
+  return number ? fmt::format("{:.{}f}", *number, decimals) : "-";
 }
 
-std::string OneDecimal(std::optional<double> number) { return Decimal(number, "%.1f"); }
-
-// Right-aligned in that width; a blank stands in front of what is wider, too.
-std::string Column(const std::string &text, size_t width) {
-  return std::string(width - std::min(width - 1, text.size()), ' ') + text;
-}
-
-void Member(Json &json, std::string_view key, std::optional<double> number) {
-  json.Key(key);
-  number ? json.Fraction(*number) : json.Null();
-}
-
-void PrintBounds(Json &json, std::optional<LatencyBounds::Bounds> bounds) {
-  if (!bounds) {
-    json.Null();
-    return;
-  }
-  json.BeginObject();
-  json.Member("least", bounds->least);
-  json.Member("most", bounds->most);
-  json.EndObject();
+std::optional<double> Ratio(uint64_t number, uint64_t divisor) {
+  if (divisor == 0) return std::nullopt;
+  return static_cast<double>(number) / static_cast<double>(divisor);
 }
 
 }  // namespace
@@ -99,8 +78,7 @@ void SnapshotSummary::Operations::Add(uint32_t timestamp, std::string_view recor
   count += operationsHere;
   totalLatency += latencyHere;
   if (operationsHere == 0) return;
-  const Interval interval = {
-      timestamp, static_cast<double>(latencyHere) / static_cast<double>(operationsHere)};
+  const Interval interval = {timestamp, *Ratio(latencyHere, operationsHere)};
   // Of two that are equally slow the earlier one stays in front.
   slowest.insert(std::ranges::upper_bound(slowest, interval.latency, std::ranges::greater(),
                                           &Interval::latency),
@@ -109,13 +87,11 @@ void SnapshotSummary::Operations::Add(uint32_t timestamp, std::string_view recor
 }
 
 std::optional<double> SnapshotSummary::Operations::Mean() const {
-  if (count == 0) return std::nullopt;
-  return static_cast<double>(totalLatency) / static_cast<double>(count);
+  return Ratio(totalLatency, count);
 }
 
 std::optional<double> SnapshotSummary::Operations::NandPerHost() const {
-  if (hostSectors == 0) return std::nullopt;
-  return static_cast<double>(nandSectors) / static_cast<double>(hostSectors);
+  return Ratio(nandSectors, hostSectors);
 }
 
 SnapshotSummary::SnapshotSummary(const SnapshotColumns &columns)
@@ -131,77 +107,72 @@ void SnapshotSummary::Add(std::string_view record) {
 }
 
 void SnapshotSummary::Print(Output &output) const {
-  output.Write("Intervals: " + std::to_string(intervals_) + kExplanation);
+  output.Write(fmt::format("Intervals: {}{}", intervals_, kExplanation));
   output.Write(
       "        operations       mean          median             p95             p99    maximum\n");
   for (const Operations *each : {&reads_, &writes_}) {
-    std::string line(each->name);
-    line.resize(6, ' ');
-    line += Column(std::to_string(each->count), 12) + Column(OneDecimal(each->Mean()), 11);
+    std::string line =
+        fmt::format("{:<6} {:>11} {:>10}", each->name, each->count, Decimal(each->Mean(), 1));
     for (const auto &[percent, key] : kPercentiles) {
       const auto bounds = each->bounds.Percentile(percent);
-      line += Column(
-          bounds ? std::to_string(bounds->least) + " to " + std::to_string(bounds->most) : "-", 16);
+      line += fmt::format(" {:>15}",
+                          bounds ? fmt::format("{} to {}", bounds->least, bounds->most) : "-");
     }
-    if (each->maximum) {
-      line += Column(Decimal(each->maximum->latency, "%.0f"), 11) +
-              " at T=" + std::to_string(each->maximum->timestamp);
-    } else {
-      line += Column("-", 11);
-    }
+    line += each->maximum ? fmt::format(" {:>10.0f} at T={}", each->maximum->latency,
+                                        each->maximum->timestamp)
+                          : fmt::format(" {:>10}", "-");
     output.Write(line + "\n");
   }
   output.Write("\n4k sectors      host          NAND   NAND/host\n");
   for (const Operations *each : {&reads_, &writes_}) {
-    std::string line(each->name);
-    line.resize(6, ' ');
-    output.Write(line + Column(std::to_string(each->hostSectors), 14) +
-                 Column(std::to_string(each->nandSectors), 14) +
-                 Column(Decimal(each->NandPerHost(), "%.3f"), 12) + "\n");
+    output.Write(fmt::format("{:<6} {:>13} {:>13} {:>11}\n", each->name, each->hostSectors,
+                             each->nandSectors, Decimal(each->NandPerHost(), 3)));
   }
   output.Write("\nSlowest intervals\n");
   for (const Operations *each : {&reads_, &writes_}) {
-    std::string line(each->name);
-    line.resize(6, ' ');
+    std::string line = fmt::format("{:<6}", each->name);
     for (const Interval &interval : each->slowest) {
-      line += "  T=" + std::to_string(interval.timestamp) + " " + OneDecimal(interval.latency);
+      line += fmt::format("  T={} {:.1f}", interval.timestamp, interval.latency);
     }
     output.Write(line + "\n");
   }
 }
 
 void SnapshotSummary::Print(Json &json) const {
-  json.Key("summary");
-  json.BeginObject();
-  json.Member("intervals", intervals_);
-  for (const Operations *each : {&reads_, &writes_}) {
-    json.Key(each->name);
-    json.BeginObject();
-    json.Member("operations", each->count);
-    Member(json, "mean_latency_us", each->Mean());
+  json.Object("summary", [&] {
+    json.Member("intervals", intervals_);
+    reads_.Print(json);
+    writes_.Print(json);
+  });
+}
+
+void SnapshotSummary::Operations::Print(Json &json) const {
+  json.Object(name, [&] {
+    json.Member("operations", count);
+    json.Member("mean_latency_us", Mean());
     for (const auto &[percent, key] : kPercentiles) {
-      json.Key(key);
-      PrintBounds(json, each->bounds.Percentile(percent));
+      const auto limits = bounds.Percentile(percent);
+      if (!limits) {
+        json.Member(key, std::nullopt);
+        continue;
+      }
+      json.Object(key, [&] {
+        json.Member("least", limits->least);
+        json.Member("most", limits->most);
+      });
     }
-    if (each->maximum) {
-      Member(json, "maximum_latency_us", each->maximum->latency);
-      json.Member("maximum_at", each->maximum->timestamp);
+    if (maximum) {
+      json.Member("maximum_latency_us", maximum->latency);
+      json.Member("maximum_at", maximum->timestamp);
     }
-    json.Member("host_sectors", each->hostSectors);
-    json.Member("nand_sectors", each->nandSectors);
-    Member(json, "nand_per_host", each->NandPerHost());
-    json.Key("slowest");
-    json.BeginArray();
-    for (const Interval &interval : each->slowest) {
-      json.BeginObject();
+    json.Member("host_sectors", hostSectors);
+    json.Member("nand_sectors", nandSectors);
+    json.Member("nand_per_host", NandPerHost());
+    json.Objects("slowest", slowest, [&](const Interval &interval) {
       json.Member("timestamp", interval.timestamp);
-      Member(json, "mean_latency_us", interval.latency);
-      json.EndObject();
-    }
-    json.EndArray();
-    json.EndObject();
-  }
-  json.EndObject();
+      json.Member("mean_latency_us", interval.latency);
+    });
+  });
 }
 
 }  // namespace tools

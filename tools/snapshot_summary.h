@@ -44,6 +44,7 @@ class SnapshotSummary {
     void Add(uint32_t timestamp, std::string_view record);
     std::optional<double> Mean() const;
     std::optional<double> NandPerHost() const;
+    void Print(Json &json) const;
 
     std::string_view name;
     // Where the numbers are, those of operations by priority.

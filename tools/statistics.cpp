@@ -90,8 +90,7 @@ Statistics::~Statistics() {
 
 std::optional<uint64_t> Statistics::Find(std::string_view name) const {
   std::optional<uint64_t> value;
-  const Entry first = {context_.generic.namesHead, context_.generic.valuesHead};
-  for (EntryIterator entry(first, nullptr); entry != std::default_sentinel; ++entry) {
+  for (EntryIterator entry = First(); entry != std::default_sentinel; ++entry) {
     if (entry->name() == name) value = entry->value();
   }
   return value;
@@ -100,9 +99,7 @@ std::optional<uint64_t> Statistics::Find(std::string_view name) const {
 Status Statistics::Check(const Dump &dump) const {
   if (outOfMemory_) {
     size_t count = 0;
-    for (const ContextNode *name = context_.generic.namesHead; name != nullptr; name = name->next) {
-      ++count;
-    }
+    for (EntryIterator entry = First(); entry != std::default_sentinel; ++entry) ++count;
     Complain(dump.subject, fmt::format("out of memory after {} entries", count));
     return kBadData;
   }

@@ -105,6 +105,11 @@ class Statistics {
   Status Check(const Dump &dump) const;
 
  private:
+  // The first of all entries, also of those that the filter does not match.
+  EntryIterator First() const {
+    return {{context_.generic.namesHead, context_.generic.valuesHead}, nullptr};
+  }
+
   const NandExporter *row_;
   MorwickStream stream_;
   std::shared_ptr<const fleet::Selection> filter_;

@@ -87,19 +87,18 @@ void PrintCsv(Output &output, const Statistics &statistics) {
 }
 
 void PrintJsonSummary(Json &json, const Statistics &statistics) {
-  json.Key("summary");
-  json.BeginObject();
-  for (const fleet::Figure &figure : SummaryOf(statistics)) {
-    if (figure.ratio) {
-      json.Key(figure.name);
-      json.Digits(ThreeDecimals(*figure.ratio));
-      continue;
+  json.Object("summary", [&] {
+    for (const fleet::Figure &figure : SummaryOf(statistics)) {
+      if (figure.ratio) {
+        json.Key(figure.name);
+        json.Digits(ThreeDecimals(*figure.ratio));
+        continue;
+      }
+      json.Numbers(figure.name, figure.values.size() > 1, [&](auto print) {
+        for (const uint64_t value : figure.values) print(value, std::to_string(value));
+      });
     }
-    json.Numbers(figure.name, figure.values.size() > 1, [&](auto print) {
-      for (const uint64_t value : figure.values) print(value, std::to_string(value));
-    });
-  }
-  json.EndObject();
+  });
 }
 
 void PrintJsonEntries(Json &json, const Statistics &statistics) {

@@ -12,7 +12,6 @@
 #include "tools/changes.h"
 #include "tools/commands.h"
 #include "tools/options.h"
-#include "tools/redrawn_block.h"
 #include "tools/stop_signals.h"
 #include "tools/text.h"
 
@@ -65,12 +64,56 @@ void PrintCsv(Output &output, const Reading &now, const std::vector<Change> &cha
               double seconds) {
   const std::string time = Seconds(now.time);
   for (const Change &change : changes) {
-    const std::optional<double> rate = change.Rate(seconds);
-    output.Write(fmt::format("{},{},{},{},{}\n", time, change.name(),
-                             change.now ? change.now->digits() : "", change.Difference(),
-                             rate ? ThreeDecimals(*rate) : ""));
+    const std::vector<std::string> cells = change.Cells(seconds);
+    output.Write(fmt::format("{},{},{},{},{}\n", time, cells[0], cells[2], cells[3], cells[4]));
   }
 }
+
+// Lines on a terminal that are drawn again and again in the same place. No mode of the terminal
+// changes, so nothing must be restored when the process ends.
+class RedrawnBlock {
+ public:
+  explicit RedrawnBlock(Output &output) : output_(output) {}
+
+  // Draws the lines over the last ones, cut to the size of the window. When a message was printed
+  // in between, it stays, and the lines begin below it.
+  void Draw(std::vector<std::string> lines) {
+    lines_ = std::move(lines);
+    DrawAgain();
+  }
+
+  // Draws the last lines again, because the size of the window has changed.
+  void DrawAgain() {
+    const auto [rows, columns] = Output::Window();
+    // After a resize, a line that is wider than the window takes several of its rows.
+    size_t up = 0;
+    for (const size_t length : drawn_) up += length == 0 ? 1 : (length + columns - 1) / columns;
+    if (printed_ == LinesPrinted() && up > 0) {
+      output_.Control(fmt::format("\r\033[{}A\033[J", std::min(up, rows - 1)));
+    }
+    printed_ = LinesPrinted();
+    drawn_.clear();
+    const size_t most = rows - 1;  // the cursor needs the last row
+    for (size_t i = 0; i < std::min(lines_.size(), most); ++i) {
+      const bool cut = i + 1 == most && lines_.size() > most;
+      const std::string line =
+          cut ? fmt::format("... and {} lines more", lines_.size() - i) : lines_[i];
+      drawn_.push_back(std::min(line.size(), columns));
+      output_.Write(line.substr(0, columns));
+      output_.Write("\n");
+    }
+    output_.Flush();
+  }
+
+  // The next lines go below what is on the screen: another program has written there.
+  void Forget() { drawn_.clear(); }
+
+ private:
+  Output &output_;
+  std::vector<std::string> lines_;
+  std::vector<size_t> drawn_;  // the length of each line on the screen
+  uint64_t printed_ = 0;
+};
 
 // Reads again and again, and prints what changed since the last good reading.
 class Watcher {
@@ -88,7 +131,6 @@ class Watcher {
     if (reading->statistics) options_.className = reading->dump.source.name;
     const Status status = reading->Check();
     worst_ = std::max(worst_, Print(*reading, status));
-    ForgetMessages();  // they would fill the memory of a long watch
     if (reading->statistics) last_ = std::move(reading);
     return output_.Flush();
   }
