@@ -40,10 +40,10 @@ void AddCapacity(CLI::App &app, Action *action) {
   const auto options = std::make_shared<Options>();
   const auto take = [=](const std::vector<std::string> &texts) {
     for (const std::string &text : texts) {
-      const std::optional<uint64_t> number = ParseNumber(text, UINT32_MAX);
+      const auto number = ParseNumber<uint32_t>(text, 0, UINT32_MAX);
       if (!number)
         throw CLI::ValidationError("MB", text + " is not a whole number up to 4294967295");
-      options->megabytes.push_back(static_cast<uint32_t>(*number));
+      options->megabytes.push_back(*number);
     }
   };
   command->add_option_function<std::vector<std::string>>("MB", take, "Capacities in megabytes")

@@ -83,8 +83,8 @@ void AddDiff(CLI::App &app, Action *action) {
   command->add_option("NEW", options->newFile, "The later dump; one may be - for standard input")
       ->required()
       ->type_name("");
-  AddSeconds(command, "--seconds", &options->seconds, 0,
-             "The time between them, for rates; else by their calendarTime");
+  AddNumber(command, "--seconds", &options->seconds, 0.0, kMostSeconds,
+            "The time between them, for rates; else by their calendarTime");
   command->add_flag("--all", options->all, "List also what did not change");
   AddController(command, &options->className, "Where the dumps are from");
   AddFormat(command, &options->format, {Format::kNormal, Format::kJson, Format::kCsv});

@@ -12,6 +12,7 @@
 
 #include "tools/commands.h"
 #include "tools/memory.h"
+#include "tools/write_file.h"
 
 namespace tools {
 namespace {
@@ -22,12 +23,6 @@ namespace {
     std::fputs("morwick: out of memory\n", stderr);
     std::_Exit(kBadData);
   });
-}
-
-Status Print(const std::string &text) {
-  Output output;
-  output.Write(text);
-  return output.Finish(kGood);
 }
 
 const CLI::App *FindCommand(const CLI::App &app, const std::string &name) {
@@ -54,14 +49,12 @@ void AddHelp(CLI::App &app, Action *action) {
     const std::string path = name->empty() ? "morwick" : "morwick " + *name;
     *action = [=, &app] {
       // app.help() would explain the sub-command in use, which is this one.
-      return Print(app.get_formatter()->make_help(subject, path, CLI::AppFormatMode::Normal));
+      return WriteWhole(app.get_formatter()->make_help(subject, path, CLI::AppFormatMode::Normal));
     };
   });
 }
 
-void RefuseMissingValue(const std::string &option) {
-  throw CLI::ValidationError(option, "a value is missing");
-}
+constexpr char kMissing[] = "a value is missing";
 
 // Refuses an option with an empty value, such as --write=. The argument parser would take the next
 // word as its value.
@@ -70,7 +63,7 @@ void RefuseEmptyValues(int argc, char **argv) {
     const std::string_view word = argv[i];
     if (word == "--") break;
     if (word.starts_with("--") && word.find('=') == word.size() - 1) {
-      RefuseMissingValue(std::string(word.substr(0, word.size() - 1)));
+      throw CLI::ValidationError(std::string(word.substr(0, word.size() - 1)), kMissing);
     }
   }
 }
@@ -79,7 +72,7 @@ void RefuseEmptyValues(int argc, char **argv) {
 void RefuseEmptyWords(const CLI::App &command) {
   for (const CLI::Option *option : command.get_options()) {
     if (option->nonpositional() && std::ranges::count(option->results(), "") > 0) {
-      RefuseMissingValue(option->get_name());
+      throw CLI::ValidationError(option->get_name(), kMissing);
     }
   }
 }
@@ -108,9 +101,9 @@ Status Run(int argc, char **argv) {
     app.parse(argc, argv);
     RefuseEmptyWords(*app.get_subcommands().front());
   } catch (const CLI::CallForHelp &) {
-    return Print(app.help());
+    return WriteWhole(app.help());
   } catch (const CLI::CallForVersion &version) {
-    return Print(version.what() + std::string("\n"));
+    return WriteWhole(version.what() + std::string("\n"));
   } catch (const CLI::Error &error) {
     return RefuseUsage(error.what(), "help " + first);
   }

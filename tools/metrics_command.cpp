@@ -191,12 +191,7 @@ Status Print(const Options &options) {
   if (options.files.empty()) NoteUnreadInput();
   const std::string text = Compose(options, className, readings);
   const Status status = std::ranges::all_of(readings, &Reading::good) ? kGood : kBadData;
-  if (!options.output.empty()) {
-    return WriteFile(options.output, text, kCollectorsMode) ? status : kBadData;
-  }
-  Output output;
-  output.Write(text);
-  return output.Finish(status);
+  return WriteWhole(text, options.output, status, kCollectorsMode);
 }
 
 // Splits KEY=VALUE. The key must be valid for Prometheus, and none of our own.

@@ -2,13 +2,10 @@
 
 #include "tools/options.h"
 
-#include <fmt/format.h>
-
 #include <algorithm>
 
 #include "fleet/controllers.h"
 #include "tools/messages.h"
-#include "tools/text.h"
 
 namespace tools {
 namespace {
@@ -78,32 +75,6 @@ void AddWrite(CLI::App *command, std::string *file, const std::string &descripti
     *file = name;
   };
   command->add_option_function<std::string>("-w,--write", take, description)->type_name("FILE");
-}
-
-void AddSeconds(CLI::App *command, const std::string &name, std::optional<double> *seconds,
-                double least, const std::string &description) {
-  const auto take = [=](const std::string &text) {
-    *seconds = ParseSeconds(text);
-    if (!*seconds || **seconds < least) {
-      throw CLI::ValidationError(
-          name, fmt::format("{} is not a number of seconds from {} to 1000000000", text, least));
-    }
-  };
-  command->add_option_function<std::string>(name, take, description)->type_name("SECONDS");
-}
-
-void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,
-               uint64_t most, const std::string &description) {
-  const std::string longName = name.substr(name.find("--"));
-  const auto take = [=](const std::string &text) {
-    const std::optional<uint64_t> value = ParseNumber(text, most);
-    if (!value || *value < least) {
-      throw CLI::ValidationError(
-          longName, fmt::format("{} is not a whole number from {} to {}", text, least, most));
-    }
-    *number = *value;
-  };
-  command->add_option_function<std::string>(name, take, description)->type_name("NUMBER");
 }
 
 }  // namespace tools

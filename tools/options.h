@@ -2,6 +2,8 @@
 #ifndef TOOLS_OPTIONS_H
 #define TOOLS_OPTIONS_H
 
+#include <fmt/format.h>
+
 #include <CLI/CLI.hpp>
 #include <memory>
 #include <optional>
@@ -10,6 +12,7 @@
 
 #include "fleet/columns.h"
 #include "fleet/streams.h"
+#include "tools/text.h"
 
 namespace tools {
 
@@ -48,13 +51,26 @@ void AddController(CLI::App *command, std::string *className, const std::string 
 // -w, --write: the name of a file, instead of standard output.
 void AddWrite(CLI::App *command, std::string *file, const std::string &description);
 
-// A number of seconds, at least `least`, with or without a fraction.
-void AddSeconds(CLI::App *command, const std::string &name, std::optional<double> *seconds,
-                double least, const std::string &description);
+constexpr double kMostSeconds = 1e9;
 
-// A whole number from `least` to `most`.
-void AddNumber(CLI::App *command, const std::string &name, uint64_t *number, uint64_t least,
-               uint64_t most, const std::string &description);
+// A number from `least` to `most`: a whole one, or seconds with or without a fraction.
+template <typename Number, typename Value>
+void AddNumber(CLI::App *command, const std::string &name, Value *value, Number least, Number most,
+               const std::string &description) {
+  constexpr bool kIsWhole = std::is_integral_v<Number>;
+  const auto take = [=](const std::string &text) {
+    const std::optional<Number> number = ParseNumber(text, least, most);
+    if (!number) {
+      throw CLI::ValidationError(
+          name.substr(name.find("--")),
+          fmt::format("{} is not a {} from {} to {}", text,
+                      kIsWhole ? "whole number" : "number of seconds", least, most));
+    }
+    *value = *number;
+  };
+  command->add_option_function<std::string>(name, take, description)
+      ->type_name(kIsWhole ? "NUMBER" : "SECONDS");
+}
 
 }  // namespace tools
 

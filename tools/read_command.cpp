@@ -26,11 +26,7 @@ Status Read(const Options &options) {
     Controller controller(options.className, options.kind);  // close it before writing
     if (controller.connected()) bytes = controller.Read(*FindBufferKind(options.kind));
   }
-  if (!bytes) return kBadData;
-  if (!options.file.empty()) return WriteFile(options.file, *bytes) ? kGood : kBadData;
-  Output output;
-  output.Write(*bytes);
-  return output.Finish(kGood);
+  return bytes ? WriteWhole(*bytes, options.file) : kBadData;
 }
 
 }  // namespace

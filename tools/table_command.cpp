@@ -210,7 +210,7 @@ void AddTable(CLI::App &app, Action *action) {
                        "Read names of dumps from this file, a line each; - for standard input")
           ->type_name("FILE");
   command->add_flag("-0", options->endedByNul, "Names in the list end with a NUL")->needs(list);
-  AddNumber(command, "-j,--jobs", &options->table.jobs, 1, UINT32_MAX,
+  AddNumber(command, "-j,--jobs", &options->table.jobs, 1U, UINT32_MAX,
             "Threads; without it as many as there are cores");
   command->callback([=] {
     if (options->files.empty() && options->list.empty()) {

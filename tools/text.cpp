@@ -6,8 +6,6 @@
 #include <utf8cpp/utf8.h>
 
 #include <algorithm>
-#include <charconv>
-#include <cmath>
 
 namespace tools {
 namespace {
@@ -67,25 +65,6 @@ void AppendCsvField(std::string *row, std::string_view field) {
   *row += '"';
   for (const char c : field) row->append(c == '"' ? 2 : 1, c);
   *row += '"';
-}
-
-std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most) {
-  uint64_t number = 0;
-  const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-  if (error != std::errc() || end != text.data() + text.size() || number > most) {
-    return std::nullopt;
-  }
-  return number;
-}
-
-std::optional<double> ParseSeconds(std::string_view text) {
-  constexpr double kMost = 1e9;
-  double seconds = 0;
-  const auto [end, error] =
-      std::from_chars(text.data(), text.data() + text.size(), seconds, std::chars_format::fixed);
-  const bool whole = error == std::errc() && end == text.data() + text.size();
-  if (!whole || !(seconds >= 0 && seconds <= kMost) || std::signbit(seconds)) return std::nullopt;
-  return seconds;
 }
 
 std::string ThreeDecimals(double number) { return fmt::format("{:.3f}", number); }

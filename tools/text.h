@@ -2,10 +2,12 @@
 #ifndef TOOLS_TEXT_H
 #define TOOLS_TEXT_H
 
+#include <charconv>
 #include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <type_traits>
 
 namespace tools {
 
@@ -24,11 +26,23 @@ std::string ValidText(std::string_view text);
 // Appends a field of CSV (RFC 4180), in quotes where it needs them.
 void AppendCsvField(std::string *row, std::string_view field);
 
-// A whole number of decimal digits and nothing else, at most `most`.
-std::optional<uint64_t> ParseNumber(std::string_view text, uint64_t most);
-
-// A number of seconds such as 2 or 0.25, at most 10^9.
-std::optional<double> ParseSeconds(std::string_view text);
+// A number from `least` to `most`: decimal digits and nothing else, such as 2, or 0.25 for a
+// double.
+template <typename Number>
+std::optional<Number> ParseNumber(std::string_view text, Number least, Number most) {
+  Number number = 0;
+  std::from_chars_result result;
+  if constexpr (std::is_integral_v<Number>) {
+    result = std::from_chars(text.begin(), text.end(), number);
+  } else {
+    result = std::from_chars(text.begin(), text.end(), number, std::chars_format::fixed);
+  }
+  if (result.ec != std::errc() || result.ptr != text.end() || text.starts_with('-') ||
+      !(number >= least && number <= most)) {
+    return std::nullopt;
+  }
+  return number;
+}
 
 // For tables and series: 12.345.
 std::string ThreeDecimals(double number);

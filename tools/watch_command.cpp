@@ -22,7 +22,7 @@ using std::chrono::steady_clock;
 using std::chrono::system_clock;
 
 struct Options : StreamOptions {
-  std::optional<double> every = 5;
+  double every = 5;             // seconds
   uint64_t count = UINT64_MAX;  // of readings after the first
   bool all = false;
   bool redraw = true;
@@ -208,7 +208,7 @@ class Watcher {
 Status Watch(const Options &options) {
   Watcher watcher(options);
   const auto every = std::chrono::duration_cast<steady_clock::duration>(
-      std::chrono::duration<double>(*options.every));
+      std::chrono::duration<double>(options.every));
   auto next = steady_clock::now();
   for (uint64_t count = 0; watcher.Read() && count < options.count; ++count) {
     next = std::max(next + every, steady_clock::now());
@@ -226,9 +226,9 @@ void AddWatch(CLI::App &app, Action *action) {
   const auto options = std::make_shared<Options>();
   AddStream(command, &options->stream);
   AddNames(command, &options->names);
-  AddSeconds(command, "--every", &options->every, kLeastSeconds,
-             "From one reading to the next (5)");
-  AddNumber(command, "--count", &options->count, 0, UINT32_MAX,
+  AddNumber(command, "--every", &options->every, kLeastSeconds, kMostSeconds,
+            "From one reading to the next (5)");
+  AddNumber(command, "--count", &options->count, 0U, UINT32_MAX,
             "Readings after the first; without it, until Ctrl-C");
   command->add_flag("--all", options->all, "List also what did not change");
   command->add_flag("!--no-redraw", options->redraw,

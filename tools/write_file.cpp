@@ -64,9 +64,8 @@ std::optional<int> OwnDescriptor(const struct stat &folder, const std::string &n
         descriptors.st_ino != folder.st_ino) {
       continue;
     }
-    const std::optional<uint64_t> number = ParseNumber(name, INT_MAX);
-    if (!number) return std::nullopt;
-    return OriginalDescriptor(static_cast<int>(*number));
+    const std::optional<int> number = ParseNumber(name, 0, INT_MAX);
+    return number ? std::optional(OriginalDescriptor(*number)) : std::nullopt;
   }
   return std::nullopt;
 }
@@ -123,14 +122,13 @@ int Replace(const Place &place, const std::string &beside, std::string_view byte
   if (!file.open()) return errno;
   const mode_t mask = umask(0);
   umask(mask);
-  int error = WriteAll(file.number(), bytes);
-  if (error == 0 && fchmod(file.number(), mode.value_or(0666 & ~mask)) != 0) error = errno;
-  if (error == 0 && fsync(file.number()) != 0) error = errno;
-  if (file.Close() != 0 && error == 0) error = errno;
-  if (error == 0 && renameat(folder, beside.c_str(), folder, place.name.c_str()) != 0) {
-    error = errno;
-  }
-  if (error != 0) unlinkat(folder, beside.c_str(), 0);
+  const bool replaced = WriteAll(file.number(), bytes) == 0 &&
+                        fchmod(file.number(), mode.value_or(0666 & ~mask)) == 0 &&
+                        fsync(file.number()) == 0 && file.Close() == 0 &&
+                        renameat(folder, beside.c_str(), folder, place.name.c_str()) == 0;
+  if (replaced) return 0;
+  const int error = errno;
+  unlinkat(folder, beside.c_str(), 0);
   return error;
 }
 
@@ -163,10 +161,17 @@ int WriteTarget(const std::string &file, std::string_view bytes, std::optional<m
 
 }  // namespace
 
-bool WriteFile(const std::string &file, std::string_view bytes, std::optional<mode_t> mode) {
+Status WriteWhole(std::string_view bytes, const std::string &file, Status status,
+                  std::optional<mode_t> mode) {
+  if (file.empty()) {
+    Output output;
+    output.Write(bytes);
+    return output.Finish(status);
+  }
   const int error = WriteTarget(file, bytes, mode);
-  if (error != 0) Complain(file, std::strerror(error));
-  return error == 0;
+  if (error == 0) return status;
+  Complain(file, std::strerror(error));
+  return kBadData;
 }
 
 }  // namespace tools

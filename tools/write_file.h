@@ -8,15 +8,17 @@
 #include <string>
 #include <string_view>
 
+#include "tools/messages.h"
+
 namespace tools {
 
-// Writes a file whole or not at all: it writes a temporary file in the same folder and renames it.
-// The file gets `mode`, or the mode that the umask allows. A link stays a link, and its target is
-// written; but a link that another user planted in a shared folder such as /tmp is refused.
-// Devices, pipes and open descriptors (/dev/stdout, /dev/fd/3) are written directly. Returns false
-// after a complaint.
-bool WriteFile(const std::string &file, std::string_view bytes,
-               std::optional<mode_t> mode = std::nullopt);
+// Writes to a file, or to standard output without the name of one. Returns `status`, or kBadData
+// after a complaint. A file is written whole or not at all: under a temporary name in the same
+// folder, and then renamed. It gets `mode`, or the mode that the umask allows. A link stays a link,
+// and its target is written; but a link that another user planted in a shared folder such as /tmp
+// is refused. Devices, pipes and open descriptors (/dev/stdout, /dev/fd/3) are written directly.
+Status WriteWhole(std::string_view bytes, const std::string &file = "", Status status = kGood,
+                  std::optional<mode_t> mode = std::nullopt);
 
 }  // namespace tools
 
