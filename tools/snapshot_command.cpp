@@ -161,8 +161,10 @@ bool PrintCsv(Output &output, SnapshotRecords &records, const SnapshotColumns &c
     row.clear();
     for (const SnapshotColumn &column : columns.all()) {
       if (!row.empty()) row += ',';
-      const fmt::format_int number(LoadLittleEndian32(&record[column.offset]));
-      row.append(number.data(), number.size());
+      char digits[16];
+      row.append(
+          digits,
+          std::to_chars(digits, std::end(digits), LoadLittleEndian32(&record[column.offset])).ptr);
     }
     output.Write(row += '\n');
   });
