@@ -228,14 +228,11 @@ std::optional<Scenario> LoadScenario() {
   if (file == nullptr || *file == '\0') {
     file = "built-in";
   } else {
-    text.resize(kLargestFile + 1);
-    size_t size = 0;
-    if (const int number = ReadFile(file, text.data(), text.size(), &size); number != 0) {
+    if (const int number = ReadFile(file, kLargestFile + 1, &text); number != 0) {
       error = Printable(file) + ": " + std::strerror(number);
-    } else if (size > kLargestFile) {
+    } else if (text.size() > kLargestFile) {
       error = Printable(file) + ": larger than " + std::to_string(kLargestFile >> 10) + " KiB";
     }
-    text.resize(size);
   }
   std::optional<Scenario> scenario;
   if (error.empty()) scenario = ParseScenario(text, file, &error);
@@ -245,9 +242,7 @@ std::optional<Scenario> LoadScenario() {
 
 }  // namespace
 
-bool Fault::Hits(uint32_t call) const {
-  return always || std::find(calls.begin(), calls.end(), call) != calls.end();
-}
+bool Fault::Hits() { return std::ranges::count(calls, ++count) > 0 || always; }
 
 uint32_t RequestMethod(std::string_view className) {
   if (className == "VeltoQRN3NVMeController") return 9;

@@ -45,8 +45,10 @@ inline constexpr std::array<Buffer, 7> kBuffers = {{
 struct Fault {
   bool always = false;
   std::vector<uint32_t> calls;
+  uint32_t count = 0;  // of calls so far
 
-  bool Hits(uint32_t call) const;
+  // Counts a call. True when it fails.
+  bool Hits();
 };
 
 struct Controller {
