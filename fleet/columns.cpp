@@ -9,6 +9,8 @@
 #include <numeric>
 #include <utility>
 
+#include "fleet/streams.h"
+
 namespace fleet {
 namespace {
 
@@ -126,31 +128,22 @@ ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
   }
 }
 
-// The columns of the key's values, in their order; null when none has a column.
-const uint32_t *ColumnFiller::ColumnsOf(const MorwickKey &key) const {
-  const uint32_t first = firstOfId_[key.id - firstId_];
-  return first == kNoColumn ? nullptr : &columns_[first];
-}
-
 Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
                            std::span<uint8_t> present) const {
   Judge judge(dump);
-  MorwickRecordReader reader;
-  MorwickRecord record;
-  MorwickStartRecords(&reader, stream_, dump.data(), dump.size());
-  while (MorwickNextRecord(&reader, &record) != 0) {
+  return judge.Finish(WalkRecords(stream_, dump, [&](const MorwickRecord &record) {
     judge.Take(record);
-    const uint32_t *columns = record.valueCount == 0 ? nullptr : ColumnsOf(*record.key);
-    if (columns == nullptr) continue;
+    if (record.valueCount == 0) return;
+    const uint32_t first = firstOfId_[record.key->id - firstId_];
     // An array with one value gives an entry with the name of the array, which has no column.
-    if (record.valueCount == 1 && record.key->valueCount > 1) continue;
+    if (first == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
-      if (columns[i] == kNoColumn) continue;
-      values[columns[i]] = MorwickValue(&record, i);
-      present[columns[i]] = 1;
+      const uint32_t column = columns_[first + i];
+      if (column == kNoColumn) continue;
+      values[column] = MorwickValue(&record, i);
+      present[column] = 1;
     }
-  }
-  return judge.Finish(record);
+  }));
 }
 
 }  // namespace fleet
