@@ -1,7 +1,5 @@
 // Snapshots as NumPy records, and as the library's text.
 
-#include "python/snapshot.h"
-
 #include <pybind11/numpy.h>
 
 #include <algorithm>
@@ -11,6 +9,8 @@
 #include "fleet/snapshot_text.h"
 #include "morwick/snapshot.h"
 #include "morwick/snapshot_fields.h"
+#include "python/arguments.h"
+#include "python/bindings.h"
 
 namespace python {
 namespace {
@@ -91,10 +91,8 @@ py::object DescribedType(const Layout &layout) {
   return py::dtype(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
 }
 
-}  // namespace
-
-void PrepareLayouts() { FixedTypes::Get(); }
-
+// The records of a snapshot in the layout of a header, or the fixed one with None, over the buffer
+// itself.
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
   size_t count = 0;
@@ -127,6 +125,14 @@ py::str Render(py::handle data, py::handle header) {
     }
   }
   return AsText(text);
+}
+
+}  // namespace
+
+void BindSnapshots(py::module_ &module) {
+  FixedTypes::Get();
+  module.def("snapshot", &Snapshot);
+  module.def("render", &Render);
 }
 
 }  // namespace python

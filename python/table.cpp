@@ -1,14 +1,15 @@
 // Many dumps as columns.
 
-#include "python/table.h"
-
 #include <pybind11/numpy.h>
+#include <pybind11/stl.h>
 
 #include <cstring>
 #include <memory>
 #include <new>
 
 #include "fleet/table.h"
+#include "python/arguments.h"
+#include "python/bindings.h"
 
 namespace python {
 namespace {
@@ -69,8 +70,8 @@ void Spread(Batches batches, size_t width, size_t count, uint64_t *values, bool 
   }
 }
 
-}  // namespace
-
+// The files, their faults, the names of the columns, the values of each column, and where they are
+// missing.
 py::tuple Table(const std::vector<std::string> &files, py::handle stream,
                 const std::vector<std::string> &names, uint64_t jobs, const py::object &progress) {
   fleet::TableOptions options;
@@ -101,5 +102,9 @@ py::tuple Table(const std::vector<std::string> &files, py::handle stream,
   Spread(std::move(batches), width, count, values.mutable_data(), missing.mutable_data());
   return py::make_tuple(listed, faults, columns, values, missing);
 }
+
+}  // namespace
+
+void BindTable(py::module_ &module) { module.def("table", &Table); }
 
 }  // namespace python
