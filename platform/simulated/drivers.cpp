@@ -33,6 +33,7 @@ enum Result : int32_t {
 };
 
 // The driver has its own copies of these numbers, so that tests notice a wrong one in the library.
+constexpr uint32_t kTaskScheduler = 39;
 constexpr uint32_t kTaskSchedulerArgument = 1025;
 constexpr uint32_t kReadArgument = 0;
 using Request = std::array<uint32_t, 6>;  // command, argument, zeros
@@ -149,14 +150,14 @@ class Drivers {
   // Answers with a buffer, cut to the room: the next file in turn, or what the controller makes.
   static int32_t Read(Controller *controller, uint32_t command, uint32_t argument, size_t room,
                       std::string *answer) {
-    const auto found = controller->files.find(command);
-    if (found == controller->files.end()) return kBadArgument;
+    const auto *buffer = std::ranges::find(kBuffers, command, &Buffer::command);
+    if (buffer == kBuffers.end()) return kBadArgument;
     const bool isShort = controller->shortRead.Hits();
     if (controller->failRead.Hits()) return kDeviceError;
     if (argument != kReadArgument) return kBadArgument;
-    std::vector<std::string> &files = found->second;
+    std::vector<std::string> &files = controller->files[buffer->key];
     if (files.empty()) {
-      *answer = MakeOwnBuffer(command);
+      *answer = MakeOwnBuffer(buffer->key);
       if (answer->empty()) return kNotOffered;
       answer->resize(std::min(answer->size(), room));
     } else if (const int error = ReadFile(files[0], room, answer); error != 0) {

@@ -9,13 +9,12 @@
 #include <array>
 #include <chrono>
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <numbers>
 #include <numeric>
 #include <span>
 #include <string_view>
-
-#include "platform/simulated/scenario.h"
 
 namespace simulated {
 namespace {
@@ -139,8 +138,8 @@ constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};
 constexpr size_t kFormatSize = 16;
 
 template <typename Number>
-void Append(Number number, std::string *reply) {
-  for (size_t i = 0; i < sizeof number; ++i) reply->push_back(static_cast<char>(number >> 8 * i));
+void Append(Number number, std::string *buffer) {
+  for (size_t i = 0; i < sizeof number; ++i) buffer->push_back(static_cast<char>(number >> 8 * i));
 }
 
 // The place of a time (in milliseconds) within the load's minute, as an angle.
@@ -170,13 +169,13 @@ uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
 // Appends a record for each counter: id and length as `Half` of a header each, the length in units
 // of so many bytes. Counters stop at the largest `Value`.
 template <typename Half, typename Value, size_t kLengthUnit>
-void AppendCounters(std::span<const Counter> counters, uint64_t time, std::string *reply) {
+void AppendCounters(std::span<const Counter> counters, uint64_t time, std::string *buffer) {
   for (const Counter &counter : counters) {
-    Append(static_cast<Half>(counter.id), reply);
-    Append(static_cast<Half>(counter.elementCount * sizeof(Value) / kLengthUnit), reply);
+    Append(static_cast<Half>(counter.id), buffer);
+    Append(static_cast<Half>(counter.elementCount * sizeof(Value) / kLengthUnit), buffer);
     for (uint32_t i = 0; i < counter.elementCount; ++i) {
       constexpr uint64_t kLargest = std::numeric_limits<Value>::max();
-      Append(static_cast<Value>(std::min(ElementAt(counter, i, time), kLargest)), reply);
+      Append(static_cast<Value>(std::min(ElementAt(counter, i, time), kLargest)), buffer);
     }
   }
 }
@@ -184,7 +183,7 @@ void AppendCounters(std::span<const Counter> counters, uint64_t time, std::strin
 constexpr uint32_t kNotShown = 4'200'000'000;
 
 // The interval that ended in the second with that number.
-void AppendInterval(uint32_t number, std::string *reply) {
+void AppendInterval(uint32_t number, std::string *buffer) {
   const uint32_t noise = number * 2654435761U >> 28;
   const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{number} * 1000)) + noise;
   const Second second = {number, noise, load, number % 120 < 8 ? 10U : 1U};
@@ -203,31 +202,31 @@ void AppendInterval(uint32_t number, std::string *reply) {
     setOperations(kWritesOffset + place, 3 * load >> priority, (90 + noise) * second.slowness);
     setOperations(kReadsOffset + place, 7 * load >> priority, 60 + noise + 5 * second.slowness);
   }
-  for (const uint32_t word : interval) Append(word, reply);
+  for (const uint32_t word : interval) Append(word, buffer);
 }
 
-void AppendSnapshot(uint64_t time, std::string *reply) {
+void AppendSnapshot(uint64_t time, std::string *buffer) {
   const auto last = static_cast<uint32_t>(time / 1000);
-  for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, reply);
+  for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, buffer);
 }
 
 // Describes the snapshot. The last record that a header counts is never printed, so the header
 // counts one record more than there are.
-void AppendSnapshotHeader(std::string *reply) {
+void AppendSnapshotHeader(std::string *buffer) {
   constexpr uint32_t kVersion = 6;
   constexpr uint32_t kTextOffset = 36;
   constexpr uint32_t kColumnsOffset = kTextOffset + kHeaderText.size();
   for (const uint32_t word :
        {0U, kVersion, kIntervalSize, kIntervalCount + 1, 0U, 0U, kColumnsOffset, 0U, 0U}) {
-    Append(word, reply);
+    Append(word, buffer);
   }
-  reply->append(kHeaderText);
-  Append(uint64_t{std::size(kColumns)}, reply);
+  buffer->append(kHeaderText);
+  Append(uint64_t{std::size(kColumns)}, buffer);
   for (const Column &column : kColumns) {
-    Append(uint32_t{column.kind}, reply);
-    Append(column.offset, reply);
-    Append(column.kind == kPriorities ? kPriorityCount * kOperationsSize : 4, reply);
-    reply->append(column.format).append(kFormatSize - column.format.size(), '\0');
+    Append(uint32_t{column.kind}, buffer);
+    Append(column.offset, buffer);
+    Append(column.kind == kPriorities ? kPriorityCount * kOperationsSize : 4, buffer);
+    buffer->append(column.format).append(kFormatSize - column.format.size(), '\0');
   }
 }
 
@@ -245,16 +244,13 @@ uint64_t Now() {
 
 }  // namespace
 
-std::string MakeOwnBuffer(uint32_t command) {
-  std::string reply;
-  switch (command) {
-    case kReadStatistics: AppendCounters<uint32_t, uint64_t, 8>(kStatistics, Now(), &reply); break;
-    case kReadMsp: AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, Now(), &reply); break;
-    case kReadSnapshot: AppendSnapshot(Now(), &reply); break;
-    case kReadSnapshotHeader: AppendSnapshotHeader(&reply); break;
-    default: break;
-  }
-  return reply;
+std::string MakeOwnBuffer(std::string_view key) {
+  std::string buffer;
+  if (key == "statistics") AppendCounters<uint32_t, uint64_t, 8>(kStatistics, Now(), &buffer);
+  if (key == "msp") AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, Now(), &buffer);
+  if (key == "snapshot") AppendSnapshot(Now(), &buffer);
+  if (key == "snapshot_header") AppendSnapshotHeader(&buffer);
+  return buffer;
 }
 
 }  // namespace simulated

@@ -2,14 +2,14 @@
 #ifndef PLATFORM_SIMULATED_OWN_BUFFERS_H
 #define PLATFORM_SIMULATED_OWN_BUFFERS_H
 
-#include <cstdint>
 #include <string>
+#include <string_view>
 
 namespace simulated {
 
-// The buffer that the command reads, as of now by the wall clock; empty when the made-up controller
-// has no such buffer.
-std::string MakeOwnBuffer(uint32_t command);
+// The buffer with that key in a scenario, as of now by the wall clock; empty when the made-up
+// controller has no such buffer.
+std::string MakeOwnBuffer(std::string_view key);
 
 }  // namespace simulated
 

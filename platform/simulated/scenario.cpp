@@ -171,8 +171,8 @@ void ReadController(const toml::table &table, std::string_view folder, Controlle
   reader.Read("fail_read", &controller->failRead);
   reader.Read("short_read", &controller->shortRead);
   reader.Read("fail_close", &controller->failClose);
-  for (const auto &[key, command] : kBuffers) {
-    reader.Read(key, &controller->files[command], folder);
+  for (const Buffer &buffer : kBuffers) {
+    reader.Read(buffer.key, &controller->files[buffer.key], folder);
   }
   reader.RefuseOtherKeys();
 }
@@ -193,14 +193,6 @@ void ReadControllers(const toml::node &node, std::string_view folder,
   }
 }
 
-void ReadSchedule(TableReader &reader, Schedule *schedule) {
-  reader.Read("runs", &schedule->runs);
-  reader.Read("first_run_after", &schedule->firstRunAfter);
-  reader.Read("interval", &schedule->interval);
-  reader.Read("resume_after", &schedule->resumeAfter);
-  reader.Read("defer_at_check", &schedule->deferAtCheck);
-}
-
 Scenario ReadScenario(const toml::table &table, std::string_view folder) {
   Scenario scenario;
   TableReader reader(table);
@@ -213,7 +205,13 @@ Scenario ReadScenario(const toml::table &table, std::string_view folder) {
     subreader.RefuseOtherKeys();
   };
   subtable("log", [&](TableReader &log) { log.Read("enabled", &scenario.logEnabled); });
-  subtable("schedule", [&](TableReader &schedule) { ReadSchedule(schedule, &scenario.schedule); });
+  subtable("schedule", [&](TableReader &schedule) {
+    schedule.Read("runs", &scenario.schedule.runs);
+    schedule.Read("first_run_after", &scenario.schedule.firstRunAfter);
+    schedule.Read("interval", &scenario.schedule.interval);
+    schedule.Read("resume_after", &scenario.schedule.resumeAfter);
+    schedule.Read("defer_at_check", &scenario.schedule.deferAtCheck);
+  });
   if (const toml::node *controllers = reader.Find("controller")) {
     ReadControllers(*controllers, folder, &scenario.controllers);
   }
