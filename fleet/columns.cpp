@@ -14,12 +14,6 @@
 namespace fleet {
 namespace {
 
-std::vector<const MorwickKey *> KeysOf(MorwickStream stream) {
-  std::vector<const MorwickKey *> keys(MorwickKeyCount(stream));
-  for (uint32_t i = 0; i < keys.size(); ++i) keys[i] = MorwickKeyAt(stream, i);
-  return keys;
-}
-
 std::string ValueName(MorwickStream stream, const MorwickKey &key, uint32_t count, uint32_t index) {
   std::array<char, kMorwickNameRoom> name;
   const uint32_t length = MorwickValueName(stream, &key, count, index, name.data());
@@ -53,9 +47,10 @@ std::string ClosestName(std::span<const MorwickStream> streams, const std::strin
   const std::string text = Lower(name).substr(0, kMorwickNameRoom);
   std::vector<std::string> known;
   for (const MorwickStream stream : streams) {
-    for (const MorwickKey *key : KeysOf(stream)) {
-      known.emplace_back(key->name);
-      if (key->valueCount > 1) known.push_back(ValueName(stream, *key, key->valueCount, 0));
+    for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
+      const MorwickKey &key = *MorwickKeyAt(stream, i);
+      known.emplace_back(key.name);
+      if (key.valueCount > 1) known.push_back(ValueName(stream, key, key.valueCount, 0));
     }
   }
   return *std::ranges::min_element(known, {}, [&](const std::string &each) {
@@ -100,13 +95,14 @@ bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPat
     return isPattern ? fnmatch(name.c_str(), known.c_str(), 0) == 0 : name == known;
   };
   bool any = false;
-  for (const MorwickKey *key : KeysOf(stream)) {
-    if (!isPattern && !name.starts_with(key->name)) continue;
-    const bool isLabel = !isPattern && key->valueCount > 1 && name == LabelOf(stream, *key);
-    const bool all = isLabel || matches(key->name);
-    for (uint32_t i = 0; i < key->valueCount; ++i) {
-      if (!all && !matches(ValueName(stream, *key, key->valueCount, i))) continue;
-      Add(stream, *key, i);
+  for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
+    const MorwickKey &key = *MorwickKeyAt(stream, i);
+    if (!isPattern && !name.starts_with(key.name)) continue;
+    const bool isLabel = !isPattern && key.valueCount > 1 && name == LabelOf(stream, key);
+    const bool all = isLabel || matches(key.name);
+    for (uint32_t k = 0; k < key.valueCount; ++k) {
+      if (!all && !matches(ValueName(stream, key, key.valueCount, k))) continue;
+      Add(stream, key, k);
       any = true;
     }
   }
