@@ -9,11 +9,12 @@ namespace fleet {
 std::vector<Figure> Summarise(const KVRStatsCxt &summary,
                               const std::function<bool(std::string_view name)> &isPresent) {
   std::vector<Figure> figures;
-  for (uint32_t i = 0; const MorwickSummaryField *field = MorwickSummaryFieldAt(i); ++i) {
-    if (!isPresent(field->name)) continue;
-    Figure &figure = figures.emplace_back(Figure{field->name, {}, std::nullopt});
-    for (uint32_t k = 0; k < field->valueCount; ++k) {
-      figure.values.push_back(MorwickSummaryValue(&summary, field, k));
+  for (uint32_t i = 0; i < MorwickSummaryFieldCount(); ++i) {
+    const MorwickSummaryField &field = *MorwickSummaryFieldAt(i);
+    if (!isPresent(field.name)) continue;
+    Figure &figure = figures.emplace_back(Figure{field.name, {}, std::nullopt});
+    for (uint32_t k = 0; k < field.valueCount; ++k) {
+      figure.values.push_back(MorwickSummaryValue(&summary, &field, k));
     }
   }
   if (isPresent("hostWrites") && isPresent("nandWrites") && summary.hostWrites > 0) {

@@ -4,6 +4,7 @@
 #include <mutex>
 #include <new>
 #include <optional>
+#include <span>
 #include <utility>
 
 #include "fleet/controllers.h"
@@ -47,32 +48,30 @@ class Connection {
   // Opens it to the class, or with None to the first controller that is present. From finding a
   // service to storing the connection nothing may throw: the handle would leak.
   explicit Connection(py::handle className) {
-    const std::string name = className.is_none() ? "" : AsString(className, "name");
-    if (!className.is_none() && fleet::FindRow(name) == nullptr) {
-      throw py::value_error("name: there is no controller class '" + name + "'");
+    std::string absent = "no controller is present";
+    std::span<NandExporter> rows = fleet::KnownControllers();
+    if (!className.is_none()) {
+      const std::string name = AsString(className, "name");
+      NandExporter *row = fleet::FindRow(name);
+      if (row == nullptr) {
+        throw py::value_error("name: there is no controller class '" + name + "'");
+      }
+      rows = {row, 1};
+      absent = name + ": the controller is not present";
     }
     int32_t result = 0;
-    bool outOfMemory = false;
     {
       const py::gil_scoped_release release;
-      for (const NandExporter &row : fleet::KnownControllers()) {
-        if (!className.is_none() && name != row.className) continue;
+      for (auto row = rows.begin(); row != rows.end() && row_ == nullptr; ++row) {
         errno = 0;
-        const uint32_t service = MorwickFindService(&row);
-        outOfMemory = service == 0 && errno == ENOMEM;
-        if (outOfMemory) break;
-        if (service == 0) continue;
-        row_ = &row;
-        result = fleet::Open(service, &connection_);
-        outOfMemory = connection_ == 0 && errno == ENOMEM;
-        break;
+        if (const uint32_t service = MorwickFindService(&*row); service != 0) {
+          row_ = &*row;
+          result = fleet::Open(service, &connection_);
+        }
+        if (connection_ == 0 && errno == ENOMEM) throw std::bad_alloc();
       }
     }
-    if (outOfMemory) throw std::bad_alloc();
-    if (row_ == nullptr) {
-      Fail(name.empty() ? "no controller is present" : name + ": the controller is not present",
-           {});
-    }
+    if (row_ == nullptr) Fail(absent, {});
     if (connection_ == 0) {
       Fail(std::string(row_->className) + ": the connection was refused, result " +
                fleet::Hexadecimal(result),

@@ -17,7 +17,15 @@ namespace {
 
 // What a header says, or the fixed layout without one.
 struct Layout {
-  explicit Layout(py::handle object);
+  explicit Layout(py::handle object) : isFixed(object.is_none()) {
+    if (isFixed) return;
+    header = ViewOf(AsBytes(object, "header", fleet::kLargestHeader));
+    const std::string wrong = fleet::CheckSnapshotHeader(header);
+    if (!wrong.empty()) throw py::value_error("header: " + wrong);
+    const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
+    recordSize = numbers.recordSize;
+    recordCount = std::max(numbers.recordCount, 1U) - 1;  // the last is not printed
+  }
 
   // The bytes of the records that there are.
   std::string_view RecordsOf(std::string_view data) const {
@@ -29,16 +37,6 @@ struct Layout {
   uint64_t recordSize = sizeof(SnapshotRecord);
   uint64_t recordCount = UINT64_MAX;
 };
-
-Layout::Layout(py::handle object) : isFixed(object.is_none()) {
-  if (isFixed) return;
-  header = ViewOf(AsBytes(object, "header", fleet::kLargestHeader));
-  const std::string wrong = fleet::CheckSnapshotHeader(header);
-  if (!wrong.empty()) throw py::value_error("header: " + wrong);
-  const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
-  recordSize = numbers.recordSize;
-  recordCount = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
-}
 
 // The fixed layout, with the numbers that have a name, which is that of SnapshotRecord: the public
 // fields know only labels. Made once, and never freed: NumPy ends the process where memory is
