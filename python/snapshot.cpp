@@ -93,11 +93,7 @@ py::object DescribedType(const Layout &layout) {
 // itself.
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
-  size_t count = 0;
-  {
-    const Buffer buffer(data, "data");
-    count = layout.RecordsOf(buffer.bytes()).size() / layout.recordSize;
-  }
+  const size_t count = layout.RecordsOf(Buffer(data, "data").bytes()).size() / layout.recordSize;
   const py::object type = layout.isFixed ? FixedTypes::Get().record : DescribedType(layout);
   return py::module_::import("numpy").attr("frombuffer")(data, type, count);
 }
