@@ -28,26 +28,19 @@ SelectorPair *KVRGetSnapshotHeaderSelectors() { return &snapshotHeaderSelectors;
 
 namespace {
 
-// The parts of a row that differ between classes.
-struct Traits {
-  const char *className;
-  const char *matchKey;
-  int32_t exporterParamA;
-  uint32_t methodSelector;
-  bool hasMSPStatistics = false;
-};
-
-constexpr NandExporter Row(const Traits &traits) {
+// A row, of what differs between classes.
+constexpr NandExporter Row(const char *className, const char *matchKey, int32_t exporterParamA,
+                           uint32_t methodSelector, bool hasMSPStatistics = false) {
   return {
-      .className = traits.className,
-      .matchKey = traits.matchKey,
+      .className = className,
+      .matchKey = matchKey,
       .connection = 0,
       .service = 0,
-      .exporterParamA = traits.exporterParamA,
-      .methodSelector = traits.methodSelector,
-      .exporterParamB = traits.methodSelector,  // equal in every class so far
+      .exporterParamA = exporterParamA,
+      .methodSelector = methodSelector,
+      .exporterParamB = methodSelector,  // equal in every class so far
       .getStatsSelectors = KVRGetStatsSelectors,
-      .getMSPStatsSelectors = traits.hasMSPStatistics ? KVRMSPGetStatsSelectors : nullptr,
+      .getMSPStatsSelectors = hasMSPStatistics ? KVRMSPGetStatsSelectors : nullptr,
       .getDefectsListSelectors = KVRGetDefectsListSelectors,
       .getTelemetryListSelectors = KVRGetTelemetryListSelectors,
       .getTaskSchedulerSelectors = KVRGetTaskSchedulerSelectors,
@@ -56,7 +49,7 @@ constexpr NandExporter Row(const Traits &traits) {
       .getBandStatsSelectors = KVRGetBandStatsSelectors,
       .parseBufferToCxt = KVRParseBufferToCxt,
       .releaseContext = KVRReleaseContext,
-      .mspParseBufferToCxt = traits.hasMSPStatistics ? KVRMSPParseBufferToCxt : nullptr,
+      .mspParseBufferToCxt = hasMSPStatistics ? KVRMSPParseBufferToCxt : nullptr,
       .ftlParseBufferToCxt = KVRFTLParseBufferToCxt,
       .releaseGenericParserCxt = ReleaseGenericParserCxt,
   };
@@ -74,18 +67,8 @@ static_assert(offsetof(NandExporter, releaseGenericParserCxt) + sizeof(void *) =
 
 // In search order. constinit: the table must be whole before any code runs.
 constinit NandExporter nand_exporters[] = {
-    Row({.className = "VeltoQRN3NVMeController",
-         .matchKey = kNVMeMatchKey,
-         .exporterParamA = -1,
-         .methodSelector = 9,
-         .hasMSPStatistics = true}),
-    Row({.className = "VeltoEmbeddedNVMeController",
-         .matchKey = kNVMeMatchKey,
-         .exporterParamA = -1,
-         .methodSelector = 9}),
-    Row({.className = "KVRStorage",
-         .matchKey = PLATFORM_PROPERTY_MATCH_KEY,
-         .exporterParamA = 5,
-         .methodSelector = 8}),
+    Row("VeltoQRN3NVMeController", kNVMeMatchKey, -1, 9, /*hasMSPStatistics=*/true),
+    Row("VeltoEmbeddedNVMeController", kNVMeMatchKey, -1, 9),
+    Row("KVRStorage", PLATFORM_PROPERTY_MATCH_KEY, 5, 8),
     {},
 };

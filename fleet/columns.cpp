@@ -9,14 +9,10 @@
 #include <numeric>
 #include <utility>
 
+#include "fleet/streams.h"
+
 namespace fleet {
 namespace {
-
-std::vector<const MorwickKey *> KeysOf(MorwickStream stream) {
-  std::vector<const MorwickKey *> keys(MorwickKeyCount(stream));
-  for (uint32_t i = 0; i < keys.size(); ++i) keys[i] = MorwickKeyAt(stream, i);
-  return keys;
-}
 
 std::string ValueName(MorwickStream stream, const MorwickKey &key, uint32_t count, uint32_t index) {
   std::array<char, kMorwickNameRoom> name;
@@ -51,9 +47,10 @@ std::string ClosestName(std::span<const MorwickStream> streams, const std::strin
   const std::string text = Lower(name).substr(0, kMorwickNameRoom);
   std::vector<std::string> known;
   for (const MorwickStream stream : streams) {
-    for (const MorwickKey *key : KeysOf(stream)) {
-      known.emplace_back(key->name);
-      if (key->valueCount > 1) known.push_back(ValueName(stream, *key, key->valueCount, 0));
+    for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
+      const MorwickKey &key = *MorwickKeyAt(stream, i);
+      known.emplace_back(key.name);
+      if (key.valueCount > 1) known.push_back(ValueName(stream, key, key.valueCount, 0));
     }
   }
   return *std::ranges::min_element(known, {}, [&](const std::string &each) {
@@ -98,13 +95,14 @@ bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPat
     return isPattern ? fnmatch(name.c_str(), known.c_str(), 0) == 0 : name == known;
   };
   bool any = false;
-  for (const MorwickKey *key : KeysOf(stream)) {
-    if (!isPattern && !name.starts_with(key->name)) continue;
-    const bool isLabel = !isPattern && key->valueCount > 1 && name == LabelOf(stream, *key);
-    const bool all = isLabel || matches(key->name);
-    for (uint32_t i = 0; i < key->valueCount; ++i) {
-      if (!all && !matches(ValueName(stream, *key, key->valueCount, i))) continue;
-      Add(stream, *key, i);
+  for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
+    const MorwickKey &key = *MorwickKeyAt(stream, i);
+    if (!isPattern && !name.starts_with(key.name)) continue;
+    const bool isLabel = !isPattern && key.valueCount > 1 && name == LabelOf(stream, key);
+    const bool all = isLabel || matches(key.name);
+    for (uint32_t k = 0; k < key.valueCount; ++k) {
+      if (!all && !matches(ValueName(stream, key, key.valueCount, k))) continue;
+      Add(stream, key, k);
       any = true;
     }
   }
@@ -126,31 +124,22 @@ ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
   }
 }
 
-// The columns of the key's values, in their order; null when none has a column.
-const uint32_t *ColumnFiller::ColumnsOf(const MorwickKey &key) const {
-  const uint32_t first = firstOfId_[key.id - firstId_];
-  return first == kNoColumn ? nullptr : &columns_[first];
-}
-
 Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
                            std::span<uint8_t> present) const {
   Judge judge(dump);
-  MorwickRecordReader reader;
-  MorwickRecord record;
-  MorwickStartRecords(&reader, stream_, dump.data(), dump.size());
-  while (MorwickNextRecord(&reader, &record) != 0) {
+  return judge.Finish(WalkRecords(stream_, dump, [&](const MorwickRecord &record) {
     judge.Take(record);
-    const uint32_t *columns = record.valueCount == 0 ? nullptr : ColumnsOf(*record.key);
-    if (columns == nullptr) continue;
+    if (record.valueCount == 0) return;
+    const uint32_t first = firstOfId_[record.key->id - firstId_];
     // An array with one value gives an entry with the name of the array, which has no column.
-    if (record.valueCount == 1 && record.key->valueCount > 1) continue;
+    if (first == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
-      if (columns[i] == kNoColumn) continue;
-      values[columns[i]] = MorwickValue(&record, i);
-      present[columns[i]] = 1;
+      const uint32_t column = columns_[first + i];
+      if (column == kNoColumn) continue;
+      values[column] = MorwickValue(&record, i);
+      present[column] = 1;
     }
-  }
-  return judge.Finish(record);
+  }));
 }
 
 }  // namespace fleet

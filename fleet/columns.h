@@ -67,8 +67,6 @@ class ColumnFiller {
  private:
   static constexpr uint32_t kNoColumn = UINT32_MAX;
 
-  const uint32_t *ColumnsOf(const MorwickKey &key) const;
-
   MorwickStream stream_;
   std::vector<uint32_t> firstOfId_;  // place in columns_, by key id less the first
   uint32_t firstId_;

@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <functional>
 #include <new>
 #include <utility>
 
@@ -26,8 +27,8 @@ std::string FaultOf(int error) {
   return std::strerror(error);
 }
 
-// Lists the names in a folder, sorted by bytes. Names of folders end with a slash, so that they
-// sort like the paths of their files. Returns the error number as in errno.
+// Lists the names in a folder, sorted by bytes, the first one at the end. Names of folders end with
+// a slash, so that they sort like the paths of their files. Returns the error number as in errno.
 int ListFolder(const std::string &path, std::vector<std::string> *names) {
   const std::unique_ptr<DIR, int (*)(DIR *)> folder(opendir(path.c_str()), closedir);
   if (folder == nullptr) return errno;
@@ -41,7 +42,7 @@ int ListFolder(const std::string &path, std::vector<std::string> *names) {
     errno = 0;
   }
   const int error = errno;
-  std::ranges::sort(*names);
+  std::ranges::sort(*names, std::greater());
   return error;
 }
 
@@ -51,22 +52,23 @@ FileList::FileList(std::vector<std::string> names, std::FILE *list, char end)
     : names_(std::move(names)), list_(list, std::fclose), end_(end) {}
 
 bool FileList::Next(ListedFile *file) {
-  *file = {};
   for (;;) {
-    while (!folders_.empty()) {
-      if (folders_.back().next == folders_.back().names.size()) {
-        folders_.pop_back();
-      } else if (NextInFolder(file)) {
-        return true;
-      }
+    *file = {};
+    if (folders_.empty()) {
+      if (!NextName(&file->name)) return false;
+      if (!IsFolder(file->name)) return true;
+      if (!file->name.ends_with('/')) file->name += '/';
+    } else if (Folder &folder = folders_.back(); folder.names.empty()) {
+      folders_.pop_back();
+      continue;
+    } else {
+      file->name = folder.path + folder.names.back();
+      folder.names.pop_back();
     }
-    std::string name;
-    if (!NextName(&name)) return false;
-    if (!IsFolder(name)) {
-      file->name = std::move(name);
-      return true;
-    }
-    if (Enter(name.ends_with('/') ? name : name + '/', file)) return true;
+    file->inFolder = true;
+    if (!file->name.ends_with('/')) return true;
+    file->fault = Enter(file->name);
+    if (!file->fault.empty()) return true;
   }
 }
 
@@ -99,33 +101,18 @@ bool FileList::NextName(std::string *name) {
   return false;
 }
 
-// Starts to return the files of a folder. True when it cannot be read; `file` then tells why.
-bool FileList::Enter(const std::string &path, ListedFile *file) {
-  const auto refuse = [&](const std::string &fault) {
-    *file = {path, true, fault};
-    return true;
-  };
+// Starts to return the files of a folder. Returns why it cannot be read; empty when it can.
+std::string FileList::Enter(const std::string &path) {
   struct stat status = {};
-  if (stat(path.c_str(), &status) != 0) return refuse(FaultOf(errno));
+  if (stat(path.c_str(), &status) != 0) return FaultOf(errno);
   const bool isAbove = std::ranges::any_of(folders_, [&](const Folder &folder) {
     return folder.device == status.st_dev && folder.inode == status.st_ino;
   });
-  if (isAbove) return refuse("a link back to a folder that contains it");
-  Folder folder = {path, {}, 0, status.st_dev, status.st_ino};
-  const int error = ListFolder(path, &folder.names);
-  if (error != 0) return refuse(FaultOf(error));
+  if (isAbove) return "a link back to a folder that contains it";
+  Folder folder = {path, {}, status.st_dev, status.st_ino};
+  if (const int error = ListFolder(path, &folder.names); error != 0) return FaultOf(error);
   folders_.push_back(std::move(folder));
-  return false;
-}
-
-// Returns the next file of the innermost folder, or the fault of a folder in it. False when the
-// next entry was a folder, whose files come first.
-bool FileList::NextInFolder(ListedFile *file) {
-  Folder &folder = folders_.back();
-  const std::string path = folder.path + folder.names[folder.next++];
-  if (path.ends_with('/')) return Enter(path, file);
-  *file = {path, true, ""};
-  return true;
+  return "";
 }
 
 }  // namespace fleet

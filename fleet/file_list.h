@@ -35,16 +35,14 @@ class FileList {
  private:
   // A folder whose files are being returned.
   struct Folder {
-    std::string path;  // with a slash at its end
-    std::vector<std::string> names;
-    size_t next = 0;
+    std::string path;                // with a slash at its end
+    std::vector<std::string> names;  // that are left, the next one at the end
     uint64_t device = 0;
     uint64_t inode = 0;
   };
 
   bool NextName(std::string *name);
-  bool Enter(const std::string &path, ListedFile *file);
-  bool NextInFolder(ListedFile *file);
+  std::string Enter(const std::string &path);
 
   std::vector<std::string> names_;
   size_t next_ = 0;

@@ -2,6 +2,8 @@
 
 #include "fleet/judge.h"
 
+#include "fleet/streams.h"
+
 namespace fleet {
 namespace {
 
@@ -87,11 +89,8 @@ Verdict Judge::Finish(const MorwickRecord &end) {
 
 Verdict JudgeDump(MorwickStream stream, std::string_view dump) {
   Judge judge(dump);
-  MorwickRecordReader reader;
-  MorwickRecord record;
-  MorwickStartRecords(&reader, stream, dump.data(), dump.size());
-  while (MorwickNextRecord(&reader, &record) != 0) judge.Take(record);
-  return judge.Finish(record);
+  return judge.Finish(
+      WalkRecords(stream, dump, [&](const MorwickRecord &record) { judge.Take(record); }));
 }
 
 }  // namespace fleet

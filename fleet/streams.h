@@ -1,4 +1,5 @@
-// The streams of statistics, by the names that people use for them.
+// The streams of statistics, by the names that people use for them, and the walk over their
+// records.
 #ifndef FLEET_STREAMS_H
 #define FLEET_STREAMS_H
 
@@ -27,6 +28,16 @@ constexpr std::optional<MorwickStream> StreamNamed(std::string_view name) {
     if (name == NameOf(stream)) return stream;
   }
   return std::nullopt;
+}
+
+// Calls `take` with each record of a dump. Returns what ended the walk.
+template <typename Take>
+MorwickRecord WalkRecords(MorwickStream stream, std::string_view dump, Take take) {
+  MorwickRecordReader reader;
+  MorwickRecord record;
+  MorwickStartRecords(&reader, stream, dump.data(), dump.size());
+  while (MorwickNextRecord(&reader, &record) != 0) take(record);
+  return record;
 }
 
 }  // namespace fleet

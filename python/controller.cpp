@@ -1,11 +1,15 @@
 // Controllers and connections to them.
 
-#include "python/controller.h"
-
 #include <cerrno>
+#include <mutex>
 #include <new>
 #include <optional>
+#include <span>
 #include <utility>
+
+#include "fleet/controllers.h"
+#include "python/bindings.h"
+#include "python/boxed.h"
 
 namespace python {
 namespace {
@@ -38,73 +42,87 @@ const fleet::BufferKind &KindOf(py::handle kindName) {
   throw py::value_error("what must be one of " + known + ", not '" + name + "'");
 }
 
-}  // namespace
-
-// From finding a service to storing the connection nothing may throw: the handle would leak.
-Connection::Connection(py::handle className) {
-  const std::string name = className.is_none() ? "" : AsString(className, "name");
-  if (!className.is_none() && fleet::FindRow(name) == nullptr) {
-    throw py::value_error("name: there is no controller class '" + name + "'");
-  }
-  int32_t result = 0;
-  bool outOfMemory = false;
-  {
-    const py::gil_scoped_release release;
-    for (const NandExporter &row : fleet::KnownControllers()) {
-      if (!className.is_none() && name != row.className) continue;
-      errno = 0;
-      const uint32_t service = MorwickFindService(&row);
-      outOfMemory = service == 0 && errno == ENOMEM;
-      if (outOfMemory) break;
-      if (service == 0) continue;
-      row_ = &row;
-      result = fleet::Open(service, &connection_);
-      outOfMemory = connection_ == 0 && errno == ENOMEM;
-      break;
+// A connection to a controller. Several threads may use it: one at a time has it.
+class Connection {
+ public:
+  // Opens it to the class, or with None to the first controller that is present. From finding a
+  // service to storing the connection nothing may throw: the handle would leak.
+  explicit Connection(py::handle className) {
+    std::string absent = "no controller is present";
+    std::span<NandExporter> rows = fleet::KnownControllers();
+    if (!className.is_none()) {
+      const std::string name = AsString(className, "name");
+      NandExporter *row = fleet::FindRow(name);
+      if (row == nullptr) {
+        throw py::value_error("name: there is no controller class '" + name + "'");
+      }
+      rows = {row, 1};
+      absent = name + ": the controller is not present";
+    }
+    int32_t result = 0;
+    {
+      const py::gil_scoped_release release;
+      for (auto row = rows.begin(); row != rows.end() && row_ == nullptr; ++row) {
+        errno = 0;
+        if (const uint32_t service = MorwickFindService(&*row); service != 0) {
+          row_ = &*row;
+          result = fleet::Open(service, &connection_);
+        }
+        if (connection_ == 0 && errno == ENOMEM) throw std::bad_alloc();
+      }
+    }
+    if (row_ == nullptr) Fail(absent, {});
+    if (connection_ == 0) {
+      Fail(std::string(row_->className) + ": the connection was refused, result " +
+               fleet::Hexadecimal(result),
+           result);
     }
   }
-  if (outOfMemory) throw std::bad_alloc();
-  if (row_ == nullptr) {
-    Fail(name.empty() ? "no controller is present" : name + ": the controller is not present", {});
-  }
-  if (connection_ == 0) {
-    Fail(std::string(row_->className) + ": the connection was refused, result " +
-             fleet::Hexadecimal(result),
-         result);
-  }
-}
 
-bool Connection::Offers(py::handle kind) const { return row_->*KindOf(kind).selectors != nullptr; }
+  ~Connection() { CloseHandle(); }
+  Connection(const Connection &) = delete;
+  Connection &operator=(const Connection &) = delete;
 
-py::bytes Connection::Read(py::handle kind) {
-  const fleet::BufferKind &known = KindOf(kind);
-  std::optional<fleet::Reply> reply;
-  {
-    const py::gil_scoped_release release;
+  std::string name() const { return row_->className; }
+  bool Offers(py::handle kind) const { return row_->*KindOf(kind).selectors != nullptr; }
+
+  py::bytes Read(py::handle kind) {
+    const fleet::BufferKind &known = KindOf(kind);
+    std::optional<fleet::Reply> reply;
+    {
+      const py::gil_scoped_release release;
+      const std::lock_guard lock(mutex_);
+      if (connection_ != 0) reply = fleet::ReadBuffer(connection_, *row_, known);
+    }
+    if (!reply) throw py::value_error("the controller is closed");
+    if (reply->bytes) return *reply->bytes;
+    Fail(name() + ": " + std::string(known.name) + ": " + reply->fault, reply->result);
+  }
+
+  // Raises what the driver says; the handle is closed in any case, and only once.
+  void Close() {
+    int32_t result = 0;
+    {
+      const py::gil_scoped_release release;
+      result = CloseHandle();
+    }
+    if (result == 0) return;
+    Fail(name() + ": closing the connection failed, result " + fleet::Hexadecimal(result), result);
+  }
+
+ private:
+  int32_t CloseHandle() {
     const std::lock_guard lock(mutex_);
-    if (connection_ != 0) reply = fleet::ReadBuffer(connection_, *row_, known);
+    const uint32_t connection = std::exchange(connection_, 0);
+    return connection == 0 ? 0 : CloseService(connection);
   }
-  if (!reply) throw py::value_error("the controller is closed");
-  if (reply->bytes) return *reply->bytes;
-  Fail(name() + ": " + std::string(known.name) + ": " + reply->fault, reply->result);
-}
 
-int32_t Connection::CloseHandle() {
-  const std::lock_guard lock(mutex_);
-  const uint32_t connection = std::exchange(connection_, 0);
-  return connection == 0 ? 0 : CloseService(connection);
-}
+  const NandExporter *row_ = nullptr;
+  std::mutex mutex_;
+  uint32_t connection_ = 0;
+};
 
-void Connection::Close() {
-  int32_t result = 0;
-  {
-    const py::gil_scoped_release release;
-    result = CloseHandle();
-  }
-  if (result == 0) return;
-  Fail(name() + ": closing the connection failed, result " + fleet::Hexadecimal(result), result);
-}
-
+// Class, present, opened, result of opening and what it offers, of each class that is known.
 py::list Controllers() {
   py::list all;
   for (const NandExporter &row : fleet::KnownControllers()) {
@@ -117,6 +135,19 @@ py::list Controllers() {
                               static_cast<uint32_t>(presence.result), py::tuple(Offered(row))));
   }
   return all;
+}
+
+}  // namespace
+
+void BindControllers(py::module_ &module) {
+  module.def("connect", &MakeBoxed<Connection, py::handle>);
+  module.def("name", [](py::handle box) { return AsText(Unbox<Connection>(box).name()); });
+  module.def("offers",
+             [](py::handle box, py::handle kind) { return Unbox<Connection>(box).Offers(kind); });
+  module.def("read",
+             [](py::handle box, py::handle kind) { return Unbox<Connection>(box).Read(kind); });
+  module.def("close", [](py::handle box) { Unbox<Connection>(box).Close(); });
+  module.def("controllers", &Controllers);
 }
 
 }  // namespace python

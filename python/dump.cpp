@@ -1,6 +1,4 @@
-// A dump of statistics.
-
-#include "python/dump.h"
+// Dumps of statistics.
 
 #include <pybind11/numpy.h>
 
@@ -9,11 +7,15 @@
 #include <memory>
 #include <new>
 #include <optional>
+#include <vector>
 
 #include "fleet/judge.h"
+#include "fleet/streams.h"
 #include "fleet/summary.h"
 #include "morwick/kvr_stats.h"
 #include "morwick/little_endian.h"
+#include "python/bindings.h"
+#include "python/boxed.h"
 
 namespace python {
 namespace {
@@ -28,149 +30,170 @@ py::int_ Number(uint64_t value) {
   return number;
 }
 
-}  // namespace
-
-KeyNames::KeyNames(MorwickStream stream) : firstId_(MorwickKeyAt(stream, 0)->id) {
-  const uint32_t count = MorwickKeyCount(stream);
-  const uint32_t places = MorwickKeyAt(stream, count - 1)->id - firstId_ + 1;
-  keys_.resize(places);
-  names_.resize(places);
-  for (uint32_t i = 0; i < count; ++i) {
-    const MorwickKey &key = *MorwickKeyAt(stream, i);
-    const uint32_t place = PlaceOf(key);
-    keys_[place] = &key;
-    names_[place] = py::str(key.name);
-    places_[names_[place]] = place;
+// The keys of a stream as Python sees them. Made once, and never freed: objects of the interpreter
+// must not be given back after its end.
+class KeyNames {
+ public:
+  static const KeyNames &Of(MorwickStream stream) {
+    static const KeyNames *const stats = new KeyNames(kMorwickKVR);
+    static const KeyNames *const msp = new KeyNames(kMorwickMSP);
+    return stream == kMorwickMSP ? *msp : *stats;
   }
-}
 
-const KeyNames &KeyNames::Of(MorwickStream stream) {
-  static const KeyNames *const stats = new KeyNames(kMorwickKVR);
-  static const KeyNames *const msp = new KeyNames(kMorwickMSP);
-  return stream == kMorwickMSP ? *msp : *stats;
-}
+  // Keys have places by their ids.
+  uint32_t PlaceOf(const MorwickKey &key) const { return key.id - firstId_; }
+  size_t placeCount() const { return names_.size(); }
+  py::handle NameAt(uint32_t place) const { return names_[place]; }
 
-const MorwickKey *KeyNames::Find(py::handle name) const {
-  PyObject *place = PyDict_GetItemWithError(places_.ptr(), name.ptr());
-  if (place != nullptr) return keys_[PyLong_AsUnsignedLong(place)];
-  if (PyErr_Occurred() != nullptr) throw py::error_already_set();
-  return nullptr;
-}
-
-Dump::Dump(py::handle data, py::handle stream)
-    : bytes_(AsBytes(data, "data", UINT32_MAX)),
-      stream_(AsStream(stream)),
-      names_(KeyNames::Of(stream_)),
-      found_(names_.placeCount()) {
-  std::optional<py::gil_scoped_release> release;
-  if (ViewOf(bytes_).size() >= kWorthUnlocking) release.emplace();
-  Walk();
-}
-
-void Dump::Walk() {
-  const std::string_view dump = ViewOf(bytes_);
-  fleet::Judge judge(dump);
-  MorwickRecordReader reader;
-  MorwickRecord record;
-  order_.reserve(names_.placeCount());
-  MorwickStartRecords(&reader, stream_, dump.data(), dump.size());
-  while (MorwickNextRecord(&reader, &record) != 0) {
-    judge.Take(record);
-    if (record.valueCount == 0) continue;
-    const uint32_t place = names_.PlaceOf(*record.key);
-    if (found_[place].count == 0) order_.push_back(place);
-    found_[place] = {static_cast<const uint8_t *>(record.values), record.valueCount};
+  // Nothing, without an exception, for what is no key's name.
+  std::optional<uint32_t> Find(py::handle name) const {
+    PyObject *place = PyDict_GetItemWithError(places_.ptr(), name.ptr());
+    if (place != nullptr) return static_cast<uint32_t>(PyLong_AsUnsignedLong(place));
+    if (PyErr_Occurred() != nullptr) throw py::error_already_set();
+    return std::nullopt;
   }
-  fault_ = judge.Finish(record).Fault();
-  end_ = record.offset;
-}
 
-const Dump::Found *Dump::Find(py::handle name) const {
-  const MorwickKey *key = names_.Find(name);
-  if (key == nullptr) return nullptr;
-  const Found &found = found_[names_.PlaceOf(*key)];
-  return found.count == 0 ? nullptr : &found;
-}
-
-uint64_t Dump::Load(const Found &found, uint32_t index) const {
-  return stream_ == kMorwickMSP ? LoadLittleEndian32(found.values + size_t{4} * index)
-                                : LoadLittleEndian64(found.values + size_t{8} * index);
-}
-
-py::object Dump::ValueOf(const Found &found, const MorwickKey &key) const {
-  if (key.valueCount == 1) return Number(Load(found, 0));
-  py::array_t<uint64_t> array(found.count);
-  uint64_t *values = array.mutable_data();
-  for (uint32_t i = 0; i < found.count; ++i) values[i] = Load(found, i);
-  return array;
-}
-
-py::object Dump::Value(py::handle name) const {
-  const Found *found = Find(name);
-  if (found != nullptr) return ValueOf(*found, *names_.Find(name));
-  PyErr_SetObject(PyExc_KeyError, name.ptr());
-  throw py::error_already_set();
-}
-
-py::dict Dump::Values() const {
-  py::dict values;
-  for (const uint32_t place : order_) {
-    const py::object value = ValueOf(found_[place], names_.KeyAt(place));
-    if (PyDict_SetItem(values.ptr(), names_.NameAt(place).ptr(), value.ptr()) != 0) {
-      throw py::error_already_set();
+ private:
+  explicit KeyNames(MorwickStream stream) : firstId_(MorwickKeyAt(stream, 0)->id) {
+    for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
+      const MorwickKey &key = *MorwickKeyAt(stream, i);
+      names_.resize(PlaceOf(key) + 1);  // ids ascend
+      names_.back() = py::str(key.name);
+      places_[names_.back()] = PlaceOf(key);
     }
   }
-  return values;
-}
 
-py::list Dump::Entries() const {
-  const std::string_view dump = ViewOf(bytes_);
-  py::list entries;
-  MorwickRecordReader reader;
-  MorwickRecord record;
-  std::array<char, kMorwickNameRoom> name;
-  MorwickStartRecords(&reader, stream_, dump.data(), dump.size());
-  while (MorwickNextRecord(&reader, &record) != 0) {
-    for (uint32_t i = 0; i < record.valueCount; ++i) {
-      const uint32_t length =
-          MorwickValueName(stream_, record.key, record.valueCount, i, name.data());
-      entries.append(
-          py::make_tuple(AsText({name.data(), length}), Number(MorwickValue(&record, i))));
-    }
+  uint32_t firstId_;
+  std::vector<py::object> names_;
+  py::dict places_;
+};
+
+// Walked once; its values become Python's own when they are asked for.
+class Dump {
+ public:
+  Dump(py::handle data, py::handle stream)
+      : bytes_(AsBytes(data, "data", UINT32_MAX)),
+        stream_(AsStream(stream)),
+        names_(KeyNames::Of(stream_)),
+        found_(names_.placeCount()) {
+    std::optional<py::gil_scoped_release> release;
+    if (view().size() >= kWorthUnlocking) release.emplace();
+    fleet::Judge judge(view());
+    order_.reserve(names_.placeCount());
+    const MorwickRecord end = fleet::WalkRecords(stream_, view(), [&](const MorwickRecord &record) {
+      judge.Take(record);
+      if (record.valueCount == 0) return;
+      const uint32_t place = names_.PlaceOf(*record.key);
+      if (found_[place].count == 0) order_.push_back(place);
+      found_[place] = {static_cast<const uint8_t *>(record.values), record.valueCount,
+                       record.key->valueCount > 1};
+    });
+    fault_ = judge.Finish(end).Fault();
+    end_ = end.offset;
   }
-  return entries;
-}
 
-py::dict Dump::Summary() const {
-  py::dict summary;
-  if (stream_ != kMorwickKVR) return summary;
-  const std::string_view dump = ViewOf(bytes_);
-  KVRStatsCxt fields = {};
-  const std::unique_ptr<KVRStatsCxt, decltype(&KVRReleaseContext)> owned(&fields,
-                                                                         KVRReleaseContext);
-  errno = 0;
-  KVRParseBufferToCxt(&fields, dump.data(), static_cast<uint32_t>(dump.size()));
-  if (errno == ENOMEM) throw std::bad_alloc();
-  const auto isPresent = [&](std::string_view name) { return Has(AsText(name)); };
-  for (const fleet::Figure &figure : fleet::Summarise(fields, isPresent)) {
-    const py::str name = AsText(figure.name);
-    if (figure.ratio) {
-      summary[name] = *figure.ratio;
-    } else if (figure.values.size() == 1) {
-      summary[name] = Number(figure.values[0]);
-    } else {
-      summary[name] = py::array_t<uint64_t>(static_cast<py::ssize_t>(figure.values.size()),
-                                            figure.values.data());
-    }
+  // The last value of that name: a number, or of an array all numbers. Raises KeyError.
+  py::object Value(py::handle name) const {
+    if (const Found *found = Find(name)) return ValueOf(*found);
+    PyErr_SetObject(PyExc_KeyError, name.ptr());
+    throw py::error_already_set();
   }
-  return summary;
-}
 
-py::object Dump::Fault() const {
-  if (fault_.empty()) return py::none();
-  return AsText(fault_);
-}
+  bool Has(py::handle name) const { return Find(name) != nullptr; }
+  size_t size() const { return order_.size(); }
+  uint64_t end() const { return end_; }
+  py::bytes bytes() const { return bytes_; }
+  py::object Fault() const { return fault_.empty() ? py::object(py::none()) : AsText(fault_); }
 
+  // All of them by name, in the order in which the names came first.
+  py::dict Values() const {
+    py::dict values;
+    for (const uint32_t place : order_) {
+      const py::object value = ValueOf(found_[place]);
+      if (PyDict_SetItem(values.ptr(), names_.NameAt(place).ptr(), value.ptr()) != 0) {
+        throw py::error_already_set();
+      }
+    }
+    return values;
+  }
+
+  // Each value that the parser adds, with its name.
+  py::list Entries() const {
+    py::list entries;
+    fleet::WalkRecords(stream_, view(), [&](const MorwickRecord &record) {
+      std::array<char, kMorwickNameRoom> name;
+      for (uint32_t i = 0; i < record.valueCount; ++i) {
+        const uint32_t length =
+            MorwickValueName(stream_, record.key, record.valueCount, i, name.data());
+        entries.append(
+            py::make_tuple(AsText({name.data(), length}), Number(MorwickValue(&record, i))));
+      }
+    });
+    return entries;
+  }
+
+  py::dict Summary() const {
+    py::dict summary;
+    if (stream_ != kMorwickKVR) return summary;
+    KVRStatsCxt fields = {};
+    const std::unique_ptr<KVRStatsCxt, decltype(&KVRReleaseContext)> owned(&fields,
+                                                                           KVRReleaseContext);
+    errno = 0;
+    KVRParseBufferToCxt(&fields, view().data(), static_cast<uint32_t>(view().size()));
+    if (errno == ENOMEM) throw std::bad_alloc();
+    const auto isPresent = [&](std::string_view name) { return Has(AsText(name)); };
+    for (const fleet::Figure &figure : fleet::Summarise(fields, isPresent)) {
+      const py::str name = AsText(figure.name);
+      if (figure.ratio) {
+        summary[name] = *figure.ratio;
+      } else if (figure.values.size() == 1) {
+        summary[name] = Number(figure.values[0]);
+      } else {
+        summary[name] = py::array_t<uint64_t>(static_cast<py::ssize_t>(figure.values.size()),
+                                              figure.values.data());
+      }
+    }
+    return summary;
+  }
+
+ private:
+  // The last record of a key.
+  struct Found {
+    const uint8_t *values = nullptr;
+    uint32_t count = 0;
+    bool isArray = false;
+  };
+
+  std::string_view view() const { return ViewOf(bytes_); }
+
+  const Found *Find(py::handle name) const {
+    const auto place = names_.Find(name);
+    return place && found_[*place].count > 0 ? &found_[*place] : nullptr;
+  }
+
+  uint64_t Load(const Found &found, uint32_t index) const {
+    return stream_ == kMorwickMSP ? LoadLittleEndian32(found.values + size_t{4} * index)
+                                  : LoadLittleEndian64(found.values + size_t{8} * index);
+  }
+
+  py::object ValueOf(const Found &found) const {
+    if (!found.isArray) return Number(Load(found, 0));
+    py::array_t<uint64_t> array(found.count);
+    uint64_t *values = array.mutable_data();
+    for (uint32_t i = 0; i < found.count; ++i) values[i] = Load(found, i);
+    return array;
+  }
+
+  py::bytes bytes_;
+  MorwickStream stream_;
+  const KeyNames &names_;
+  std::vector<Found> found_;     // by place
+  std::vector<uint32_t> order_;  // places
+  std::string fault_;
+  uint64_t end_ = 0;
+};
+
+// id, name and number of values of each key.
 py::list Keys(py::handle stream) {
   const MorwickStream known = AsStream(stream);
   py::list keys;
@@ -179,6 +202,24 @@ py::list Keys(py::handle stream) {
     keys.append(py::make_tuple(key.id, key.name, key.valueCount));
   }
   return keys;
+}
+
+}  // namespace
+
+void BindStatistics(py::module_ &module) {
+  for (const MorwickStream stream : fleet::kStreams) KeyNames::Of(stream);
+  module.def("parse", &MakeBoxed<Dump, py::handle, py::handle>);
+  module.def("value",
+             [](py::handle dump, py::handle name) { return Unbox<Dump>(dump).Value(name); });
+  module.def("has", [](py::handle dump, py::handle name) { return Unbox<Dump>(dump).Has(name); });
+  module.def("values", [](py::handle dump) { return Unbox<Dump>(dump).Values(); });
+  module.def("entries", [](py::handle dump) { return Unbox<Dump>(dump).Entries(); });
+  module.def("summary", [](py::handle dump) { return Unbox<Dump>(dump).Summary(); });
+  module.def("size", [](py::handle dump) { return Unbox<Dump>(dump).size(); });
+  module.def("fault", [](py::handle dump) { return Unbox<Dump>(dump).Fault(); });
+  module.def("end", [](py::handle dump) { return Unbox<Dump>(dump).end(); });
+  module.def("data", [](py::handle dump) { return Unbox<Dump>(dump).bytes(); });
+  module.def("keys", &Keys);
 }
 
 }  // namespace python

@@ -1,7 +1,5 @@
 // Snapshots as NumPy records, and as the library's text.
 
-#include "python/snapshot.h"
-
 #include <pybind11/numpy.h>
 
 #include <algorithm>
@@ -11,13 +9,23 @@
 #include "fleet/snapshot_text.h"
 #include "morwick/snapshot.h"
 #include "morwick/snapshot_fields.h"
+#include "python/arguments.h"
+#include "python/bindings.h"
 
 namespace python {
 namespace {
 
 // What a header says, or the fixed layout without one.
 struct Layout {
-  explicit Layout(py::handle object);
+  explicit Layout(py::handle object) : isFixed(object.is_none()) {
+    if (isFixed) return;
+    header = ViewOf(AsBytes(object, "header", fleet::kLargestHeader));
+    const std::string wrong = fleet::CheckSnapshotHeader(header);
+    if (!wrong.empty()) throw py::value_error("header: " + wrong);
+    const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
+    recordSize = numbers.recordSize;
+    recordCount = std::max(numbers.recordCount, 1U) - 1;  // the last is not printed
+  }
 
   // The bytes of the records that there are.
   std::string_view RecordsOf(std::string_view data) const {
@@ -29,16 +37,6 @@ struct Layout {
   uint64_t recordSize = sizeof(SnapshotRecord);
   uint64_t recordCount = UINT64_MAX;
 };
-
-Layout::Layout(py::handle object) : isFixed(object.is_none()) {
-  if (isFixed) return;
-  header = ViewOf(AsBytes(object, "header", fleet::kLargestHeader));
-  const std::string wrong = fleet::CheckSnapshotHeader(header);
-  if (!wrong.empty()) throw py::value_error("header: " + wrong);
-  const SnapshotHeader numbers = fleet::LoadSnapshotHeader(header);
-  recordSize = numbers.recordSize;
-  recordCount = numbers.recordCount == 0 ? 0 : numbers.recordCount - 1;  // the last is not printed
-}
 
 // The fixed layout, with the numbers that have a name, which is that of SnapshotRecord: the public
 // fields know only labels. Made once, and never freed: NumPy ends the process where memory is
@@ -91,17 +89,11 @@ py::object DescribedType(const Layout &layout) {
   return py::dtype(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
 }
 
-}  // namespace
-
-void PrepareLayouts() { FixedTypes::Get(); }
-
+// The records of a snapshot in the layout of a header, or the fixed one with None, over the buffer
+// itself.
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
-  size_t count = 0;
-  {
-    const Buffer buffer(data, "data");
-    count = layout.RecordsOf(buffer.bytes()).size() / layout.recordSize;
-  }
+  const size_t count = layout.RecordsOf(Buffer(data, "data").bytes()).size() / layout.recordSize;
   const py::object type = layout.isFixed ? FixedTypes::Get().record : DescribedType(layout);
   return py::module_::import("numpy").attr("frombuffer")(data, type, count);
 }
@@ -127,6 +119,14 @@ py::str Render(py::handle data, py::handle header) {
     }
   }
   return AsText(text);
+}
+
+}  // namespace
+
+void BindSnapshots(py::module_ &module) {
+  FixedTypes::Get();
+  module.def("snapshot", &Snapshot);
+  module.def("render", &Render);
 }
 
 }  // namespace python

@@ -1,14 +1,15 @@
 // Many dumps as columns.
 
-#include "python/table.h"
-
 #include <pybind11/numpy.h>
+#include <pybind11/stl.h>
 
 #include <cstring>
 #include <memory>
 #include <new>
 
 #include "fleet/table.h"
+#include "python/arguments.h"
+#include "python/bindings.h"
 
 namespace python {
 namespace {
@@ -22,9 +23,11 @@ void AppendRow(const fleet::Row &row, std::string *rows) {
 }
 
 // Reads all dumps. Without the interpreter's lock but for what is asked of it.
-Batches ReadAll(fleet::Table &table, const py::object &progress) {
+Batches ReadAll(const fleet::TableOptions &options, const std::vector<std::string> &files,
+                const py::object &progress) {
   using Got = fleet::Table::Got;
   const py::gil_scoped_release release;
+  fleet::Table table(options, fleet::FileList(files));
   Batches batches;
   uint64_t dumps = 0;
   uint64_t faults = 0;
@@ -69,23 +72,16 @@ void Spread(Batches batches, size_t width, size_t count, uint64_t *values, bool 
   }
 }
 
-}  // namespace
-
+// The files, their faults, the names of the columns, the values of each column, and where they are
+// missing.
 py::tuple Table(const std::vector<std::string> &files, py::handle stream,
                 const std::vector<std::string> &names, uint64_t jobs, const py::object &progress) {
-  fleet::TableOptions options;
-  options.stream = AsStream(stream);
-  options.selection =
-      std::make_shared<const fleet::Selection>(std::span(&options.stream, 1), names);
-  options.jobs = jobs;
-  options.appendRow = AppendRow;
-  Batches batches;
-  {
-    fleet::Table table(options, fleet::FileList(files));
-    batches = ReadAll(table, progress);
-  }
+  const MorwickStream known = AsStream(stream);
+  const auto selection = std::make_shared<const fleet::Selection>(std::span(&known, 1), names);
+  const fleet::TableOptions options = {known, selection, jobs, AppendRow};
+  Batches batches = ReadAll(options, files, progress);
   py::list columns;
-  for (const auto &column : options.selection->columns()) columns.append(AsText(column.name));
+  for (const auto &column : selection->columns()) columns.append(AsText(column.name));
   const size_t width = columns.size();
   py::list listed;
   py::list faults;
@@ -101,5 +97,9 @@ py::tuple Table(const std::vector<std::string> &files, py::handle stream,
   Spread(std::move(batches), width, count, values.mutable_data(), missing.mutable_data());
   return py::make_tuple(listed, faults, columns, values, missing);
 }
+
+}  // namespace
+
+void BindTable(py::module_ &module) { module.def("table", &Table); }
 
 }  // namespace python

@@ -9,31 +9,6 @@
 
 #include <stdint.h>
 
-/* The value in the order of a controller; also back again. */
-static inline uint16_t LittleEndian16(uint16_t value) {
-#if __BYTE_ORDER__ == __ORDER_BIG_ENDIAN__
-  return __builtin_bswap16(value);
-#else
-  return value;
-#endif
-}
-
-static inline uint32_t LittleEndian32(uint32_t value) {
-#if __BYTE_ORDER__ == __ORDER_BIG_ENDIAN__
-  return __builtin_bswap32(value);
-#else
-  return value;
-#endif
-}
-
-static inline uint64_t LittleEndian64(uint64_t value) {
-#if __BYTE_ORDER__ == __ORDER_BIG_ENDIAN__
-  return __builtin_bswap64(value);
-#else
-  return value;
-#endif
-}
-
 /* Bytes at any address. The prover does not follow a cast. */
 #ifdef __FRAMAC__
 typedef uint8_t MorwickBytes;
@@ -72,5 +47,12 @@ static inline uint64_t LoadLittleEndian64(const MorwickBytes *bytes) {
          ((uint64_t)b[4] << 32) + ((uint64_t)b[5] << 40) + ((uint64_t)b[6] << 48) +
          ((uint64_t)b[7] << 56);
 }
+
+#ifndef __FRAMAC__ /* where these are not needed, and would be casts */
+/* The value in the order of a controller; also back again. */
+static inline uint16_t LittleEndian16(uint16_t value) { return LoadLittleEndian16(&value); }
+static inline uint32_t LittleEndian32(uint32_t value) { return LoadLittleEndian32(&value); }
+static inline uint64_t LittleEndian64(uint64_t value) { return LoadLittleEndian64(&value); }
+#endif
 
 #endif

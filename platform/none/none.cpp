@@ -15,10 +15,7 @@ constexpr int kActivityStateNone = 0;
 
 }  // namespace
 
-MatchingRequest *ServiceMatching(const char *className) {
-  static char request;  // callers see only that it is not null
-  return className == nullptr ? nullptr : reinterpret_cast<MatchingRequest *>(&request);
-}
+MatchingRequest *ServiceMatching(const char *) { return nullptr; }
 
 uint32_t GetMatchingService(MatchingRequest *) { return 0; }
 

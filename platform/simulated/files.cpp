@@ -11,17 +11,19 @@
 
 namespace simulated {
 
-int ReadFile(const char *path, void *bytes, size_t room, size_t *size) {
-  const int file = open(path, O_RDONLY | O_CLOEXEC);
+int ReadFile(const std::string &path, size_t most, std::string *bytes) {
+  bytes->resize(most);  // before there is a file to close: memory may be refused
+  const int file = open(path.c_str(), O_RDONLY | O_CLOEXEC);
   if (file < 0) return errno;
-  *size = 0;
+  size_t size = 0;
   ssize_t got = 0;
   do {
-    got = read(file, static_cast<char *>(bytes) + *size, room - *size);
-    if (got > 0) *size += static_cast<size_t>(got);
-  } while (got > 0 && *size < room);
+    got = read(file, bytes->data() + size, most - size);
+    if (got > 0) size += static_cast<size_t>(got);
+  } while (got > 0 && size < most);
   const int error = got < 0 ? errno : 0;  // a directory opens but cannot be read
   close(file);
+  bytes->resize(size);
   return error;
 }
 

@@ -8,9 +8,9 @@
 
 namespace simulated {
 
-// Reads at most the first `room` bytes of the file, so that devices and FIFOs work too. Returns 0,
+// Reads at most the first `most` bytes of the file, so that devices and FIFOs work too. Returns 0,
 // or the error number as in errno.
-int ReadFile(const char *path, void *bytes, size_t room, size_t *size);
+int ReadFile(const std::string &path, size_t most, std::string *bytes);
 
 // Text from outside. Bytes that could end a line or control a terminal are written as \x0a.
 std::string Printable(std::string_view text);

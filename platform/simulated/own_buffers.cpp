@@ -5,19 +5,16 @@
 
 #include "platform/simulated/own_buffers.h"
 
-#include <endian.h>
-
 #include <algorithm>
 #include <array>
 #include <chrono>
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <numbers>
 #include <numeric>
 #include <span>
 #include <string_view>
-
-#include "platform/simulated/scenario.h"
 
 namespace simulated {
 namespace {
@@ -79,44 +76,60 @@ constexpr Counter kMspStatistics[] = {
     {8214, 5, 0, 3'600},         // active time
 };
 
-// Where the columns of a snapshot's interval are, and how each is printed.
+// A second of the controller's life. Writes are slow in eight seconds of each two minutes.
+struct Second {
+  uint32_t number;
+  uint32_t noise;  // 0 to 15
+  uint32_t load;
+  uint32_t slowness;
+
+  uint32_t HostReads() const { return 26 * load; }
+  uint32_t HostWrites() const { return 11 * load; }
+  uint32_t Collected() const { return HostWrites() / 2; }
+};
+
+// Where the columns of a snapshot's interval are, how each is printed, and its value.
 enum Kind : uint16_t { kPlain = 1, kThousandths = 2, kPriorities = 3 };
 struct Column {
   Kind kind;
   uint32_t offset;
   std::string_view format;
+  uint32_t (*valueOf)(const Second &s) = nullptr;  // AppendInterval sets those by priority
 };
 constexpr uint32_t kIntervalSize = 252;
 constexpr uint32_t kPriorityCount = 4;
 constexpr uint32_t kOperationsSize = 12;  // count, total latency, maximum latency
+constexpr uint32_t kReadsOffset = 56;
+constexpr uint32_t kWritesOffset = 8;
 constexpr Column kColumns[] = {
-    {kPlain, 0, "T=%04u"},
-    {kPlain, 104, " E=%02u"},
-    {kPlain, 108, " HR=%4u"},
-    {kPlain, 112, " HW=%4u"},
-    {kPlain, 116, " NR=%4u"},
-    {kPlain, 120, " NW=%4u"},
-    {kThousandths, 156, " TH=%8u.%02u"},
-    {kPlain, 124, " GC=%4u"},
-    {kPlain, 132, " W=%2u"},
-    {kPlain, 144, " BI=%3u"},
-    {kPlain, 148, " BU=%3u"},
-    {kPlain, 180, " V=%5u"},
-    {kPlain, 188, " BF=%2u"},
-    {kPlain, 192, "/%2u"},
-    {kPlain, 4, " P=%2u"},
-    {kPlain, 164, " H=%2u"},
-    {kPlain, 160, "/%2u"},
-    {kPlain, 200, " X=%2u"},
-    {kPlain, 204, "/%2u"},
-    {kPlain, 172, " L=%3u"},
-    {kPlain, 176, "/%3u"},
-    {kPlain, 212, " C=%2u"},
-    {kPlain, 216, "/%2u"},
-    {kPlain, 168, " S=%4u"},
-    {kPlain, 208, " U=%8u"},
-    {kPriorities, 56, " R%s="},
-    {kPriorities, 8, " W%s="},
+    {kPlain, 0, "T=%04u", [](const Second &s) { return s.number; }},
+    {kPlain, 104, " E=%02u", [](const Second &s) { return s.number % 28 == 0 ? 1U : 0U; }},
+    {kPlain, 108, " HR=%4u", [](const Second &s) { return s.HostReads(); }},
+    {kPlain, 112, " HW=%4u", [](const Second &s) { return s.HostWrites(); }},
+    {kPlain, 116, " NR=%4u", [](const Second &s) { return s.HostReads() + s.Collected(); }},
+    {kPlain, 120, " NW=%4u", [](const Second &s) { return s.HostWrites() + s.Collected(); }},
+    {kThousandths, 156, " TH=%8u.%02u",
+     [](const Second &s) { return 1230 * s.slowness + 10 * s.noise; }},
+    {kPlain, 124, " GC=%4u", [](const Second &s) { return s.Collected(); }},
+    {kPlain, 132, " W=%2u", [](const Second &s) { return s.number % 60 == 0 ? 1U : 0U; }},
+    {kPlain, 144, " BI=%3u", [](const Second &s) { return 3 + s.noise % 4; }},
+    {kPlain, 148, " BU=%3u", [](const Second &s) { return 16 + s.noise % 3; }},
+    {kPlain, 180, " V=%5u", [](const Second &s) { return 5120 - s.load; }},
+    {kPlain, 188, " BF=%2u", [](const Second &s) { return 4 + s.noise % 5; }},
+    {kPlain, 192, "/%2u", [](const Second &) { return 12U; }},
+    {kPlain, 4, " P=%2u", [](const Second &s) { return 5 * s.slowness; }},
+    {kPlain, 164, " H=%2u", [](const Second &s) { return s.slowness - 1; }},
+    {kPlain, 160, "/%2u", [](const Second &s) { return s.slowness / 4; }},
+    {kPlain, 200, " X=%2u", [](const Second &s) { return s.noise; }},
+    {kPlain, 204, "/%2u", [](const Second &s) { return s.noise / 8; }},
+    {kPlain, 172, " L=%3u", [](const Second &s) { return 2 * s.slowness; }},
+    {kPlain, 176, "/%3u", [](const Second &) { return 10U; }},
+    {kPlain, 212, " C=%2u", [](const Second &s) { return 1 + s.noise % 4; }},
+    {kPlain, 216, "/%2u", [](const Second &s) { return 16 + s.noise; }},
+    {kPlain, 168, " S=%4u", [](const Second &s) { return 312 - s.noise; }},
+    {kPlain, 208, " U=%8u", [](const Second &s) { return s.number % 10 == 0 ? 256U : 0U; }},
+    {kPriorities, kReadsOffset, " R%s="},
+    {kPriorities, kWritesOffset, " W%s="},
 };
 // clang-format on
 
@@ -124,27 +137,10 @@ constexpr uint32_t kIntervalCount = 120;
 constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};
 constexpr size_t kFormatSize = 16;
 
-// A reply that is cut where its room ends.
-class Reply {
- public:
-  Reply(void *bytes, size_t room) : bytes_(static_cast<char *>(bytes)), room_(room) {}
-
-  size_t size() const { return size_; }
-  void Append(std::string_view bytes) { size_ += bytes.copy(bytes_ + size_, room_ - size_); }
-  void Append(uint16_t number) { AppendBytes(htole16(number)); }
-  void Append(uint32_t number) { AppendBytes(htole32(number)); }
-  void Append(uint64_t number) { AppendBytes(htole64(number)); }
-
- private:
-  template <typename Number>
-  void AppendBytes(Number number) {
-    Append({reinterpret_cast<const char *>(&number), sizeof number});
-  }
-
-  char *bytes_;
-  size_t room_;
-  size_t size_ = 0;
-};
+template <typename Number>
+void Append(Number number, std::string *buffer) {
+  for (size_t i = 0; i < sizeof number; ++i) buffer->push_back(static_cast<char>(number >> 8 * i));
+}
 
 // The place of a time (in milliseconds) within the load's minute, as an angle.
 double PhaseAt(uint64_t time) {
@@ -173,94 +169,64 @@ uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
 // Appends a record for each counter: id and length as `Half` of a header each, the length in units
 // of so many bytes. Counters stop at the largest `Value`.
 template <typename Half, typename Value, size_t kLengthUnit>
-void AppendCounters(std::span<const Counter> counters, uint64_t time, Reply *reply) {
+void AppendCounters(std::span<const Counter> counters, uint64_t time, std::string *buffer) {
   for (const Counter &counter : counters) {
-    reply->Append(static_cast<Half>(counter.id));
-    reply->Append(static_cast<Half>(counter.elementCount * sizeof(Value) / kLengthUnit));
+    Append(static_cast<Half>(counter.id), buffer);
+    Append(static_cast<Half>(counter.elementCount * sizeof(Value) / kLengthUnit), buffer);
     for (uint32_t i = 0; i < counter.elementCount; ++i) {
       constexpr uint64_t kLargest = std::numeric_limits<Value>::max();
-      reply->Append(static_cast<Value>(std::min(ElementAt(counter, i, time), kLargest)));
+      Append(static_cast<Value>(std::min(ElementAt(counter, i, time), kLargest)), buffer);
     }
   }
 }
 
 constexpr uint32_t kNotShown = 4'200'000'000;
 
-// The interval that ended in the given second. Writes are slow in eight seconds of each two
-// minutes.
-void AppendInterval(uint32_t second, Reply *reply) {
+// The interval that ended in the second with that number.
+void AppendInterval(uint32_t number, std::string *buffer) {
+  const uint32_t noise = number * 2654435761U >> 28;
+  const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{number} * 1000)) + noise;
+  const Second second = {number, noise, load, number % 120 < 8 ? 10U : 1U};
   // Words without a column get values that no column has, so that a wrong offset is seen.
   std::array<uint32_t, kIntervalSize / sizeof(uint32_t)> interval;
   std::iota(interval.begin(), interval.end(), kNotShown);
-  const auto set = [&](uint32_t offset, uint32_t value) { interval[offset / 4] = value; };
-  const uint32_t noise = second * 2654435761U >> 28;  // 0 to 15
-  const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{second} * 1000)) + noise;
-  const uint32_t slowness = second % 120 < 8 ? 10 : 1;
+  for (const Column &column : kColumns) {
+    if (column.valueOf != nullptr) interval[column.offset / 4] = column.valueOf(second);
+  }
   const auto setOperations = [&](uint32_t offset, uint32_t count, uint32_t latency) {
-    set(offset, count);
-    set(offset + 4, count * latency);
-    set(offset + 8, 9 * latency);
+    const uint32_t operations[] = {count, count * latency, 9 * latency};
+    std::ranges::copy(operations, &interval[offset / 4]);
   };
   for (uint32_t priority = 0; priority < kPriorityCount; ++priority) {
     const uint32_t place = priority * kOperationsSize;
-    setOperations(8 + place, 3 * load >> priority, (90 + noise) * slowness);
-    setOperations(56 + place, 7 * load >> priority, 60 + noise + 5 * slowness);
+    setOperations(kWritesOffset + place, 3 * load >> priority, (90 + noise) * second.slowness);
+    setOperations(kReadsOffset + place, 7 * load >> priority, 60 + noise + 5 * second.slowness);
   }
-  const uint32_t hostReads = 26 * load;
-  const uint32_t hostWrites = 11 * load;
-  const uint32_t collected = hostWrites / 2;
-  set(0, second);
-  set(4, 5 * slowness);
-  set(104, second % 28 == 0 ? 1 : 0);
-  set(108, hostReads);
-  set(112, hostWrites);
-  set(116, hostReads + collected);
-  set(120, hostWrites + collected);
-  set(124, collected);
-  set(132, second % 60 == 0 ? 1 : 0);
-  set(144, 3 + noise % 4);
-  set(148, 16 + noise % 3);
-  set(156, 1230 * slowness + 10 * noise);
-  set(160, slowness / 4);
-  set(164, slowness - 1);
-  set(168, 312 - noise);
-  set(172, 2 * slowness);
-  set(176, 10);
-  set(180, 5120 - load);
-  set(188, 4 + noise % 5);
-  set(192, 12);
-  set(200, noise);
-  set(204, noise / 8);
-  set(208, second % 10 == 0 ? 256 : 0);
-  set(212, 1 + noise % 4);
-  set(216, 16 + noise);
-  for (const uint32_t word : interval) reply->Append(word);
+  for (const uint32_t word : interval) Append(word, buffer);
 }
 
-void AppendSnapshot(uint64_t time, Reply *reply) {
+void AppendSnapshot(uint64_t time, std::string *buffer) {
   const auto last = static_cast<uint32_t>(time / 1000);
-  for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, reply);
+  for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, buffer);
 }
 
 // Describes the snapshot. The last record that a header counts is never printed, so the header
 // counts one record more than there are.
-void AppendSnapshotHeader(Reply *reply) {
+void AppendSnapshotHeader(std::string *buffer) {
   constexpr uint32_t kVersion = 6;
   constexpr uint32_t kTextOffset = 36;
   constexpr uint32_t kColumnsOffset = kTextOffset + kHeaderText.size();
   for (const uint32_t word :
        {0U, kVersion, kIntervalSize, kIntervalCount + 1, 0U, 0U, kColumnsOffset, 0U, 0U}) {
-    reply->Append(word);
+    Append(word, buffer);
   }
-  reply->Append(kHeaderText);
-  reply->Append(static_cast<uint64_t>(std::size(kColumns)));
-  for (const auto &[kind, offset, format] : kColumns) {
-    reply->Append(static_cast<uint32_t>(kind));
-    reply->Append(offset);
-    reply->Append(kind == kPriorities ? kPriorityCount * kOperationsSize : 4);
-    std::array<char, kFormatSize> padded = {};
-    format.copy(padded.data(), kFormatSize - 1);
-    reply->Append({padded.data(), padded.size()});
+  buffer->append(kHeaderText);
+  Append(uint64_t{std::size(kColumns)}, buffer);
+  for (const Column &column : kColumns) {
+    Append(uint32_t{column.kind}, buffer);
+    Append(column.offset, buffer);
+    Append(column.kind == kPriorities ? kPriorityCount * kOperationsSize : 4, buffer);
+    buffer->append(column.format).append(kFormatSize - column.format.size(), '\0');
   }
 }
 
@@ -278,18 +244,13 @@ uint64_t Now() {
 
 }  // namespace
 
-std::optional<size_t> MakeOwnBuffer(uint32_t command, void *reply, size_t room) {
-  Reply bounded(reply, room);
-  switch (command) {
-    case kReadStatistics:
-      AppendCounters<uint32_t, uint64_t, 8>(kStatistics, Now(), &bounded);
-      break;
-    case kReadMsp: AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, Now(), &bounded); break;
-    case kReadSnapshot: AppendSnapshot(Now(), &bounded); break;
-    case kReadSnapshotHeader: AppendSnapshotHeader(&bounded); break;
-    default: return std::nullopt;
-  }
-  return bounded.size();
+std::string MakeOwnBuffer(std::string_view key) {
+  std::string buffer;
+  if (key == "statistics") AppendCounters<uint32_t, uint64_t, 8>(kStatistics, Now(), &buffer);
+  if (key == "msp") AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, Now(), &buffer);
+  if (key == "snapshot") AppendSnapshot(Now(), &buffer);
+  if (key == "snapshot_header") AppendSnapshotHeader(&buffer);
+  return buffer;
 }
 
 }  // namespace simulated

@@ -2,15 +2,14 @@
 #ifndef PLATFORM_SIMULATED_OWN_BUFFERS_H
 #define PLATFORM_SIMULATED_OWN_BUFFERS_H
 
-#include <cstddef>
-#include <cstdint>
-#include <optional>
+#include <string>
+#include <string_view>
 
 namespace simulated {
 
-// Writes the buffer that the command reads, as of now by the wall clock, cut to the room. Returns
-// the number of bytes written, or nothing when the made-up controller has no such buffer.
-std::optional<size_t> MakeOwnBuffer(uint32_t command, void *reply, size_t room);
+// The buffer with that key in a scenario, as of now by the wall clock; empty when the made-up
+// controller has no such buffer.
+std::string MakeOwnBuffer(std::string_view key);
 
 }  // namespace simulated
 

@@ -171,8 +171,8 @@ void ReadController(const toml::table &table, std::string_view folder, Controlle
   reader.Read("fail_read", &controller->failRead);
   reader.Read("short_read", &controller->shortRead);
   reader.Read("fail_close", &controller->failClose);
-  for (const auto &[key, command] : kBuffers) {
-    reader.Read(key, &controller->files[command], folder);
+  for (const Buffer &buffer : kBuffers) {
+    reader.Read(buffer.key, &controller->files[buffer.key], folder);
   }
   reader.RefuseOtherKeys();
 }
@@ -193,14 +193,6 @@ void ReadControllers(const toml::node &node, std::string_view folder,
   }
 }
 
-void ReadSchedule(TableReader &reader, Schedule *schedule) {
-  reader.Read("runs", &schedule->runs);
-  reader.Read("first_run_after", &schedule->firstRunAfter);
-  reader.Read("interval", &schedule->interval);
-  reader.Read("resume_after", &schedule->resumeAfter);
-  reader.Read("defer_at_check", &schedule->deferAtCheck);
-}
-
 Scenario ReadScenario(const toml::table &table, std::string_view folder) {
   Scenario scenario;
   TableReader reader(table);
@@ -213,7 +205,13 @@ Scenario ReadScenario(const toml::table &table, std::string_view folder) {
     subreader.RefuseOtherKeys();
   };
   subtable("log", [&](TableReader &log) { log.Read("enabled", &scenario.logEnabled); });
-  subtable("schedule", [&](TableReader &schedule) { ReadSchedule(schedule, &scenario.schedule); });
+  subtable("schedule", [&](TableReader &schedule) {
+    schedule.Read("runs", &scenario.schedule.runs);
+    schedule.Read("first_run_after", &scenario.schedule.firstRunAfter);
+    schedule.Read("interval", &scenario.schedule.interval);
+    schedule.Read("resume_after", &scenario.schedule.resumeAfter);
+    schedule.Read("defer_at_check", &scenario.schedule.deferAtCheck);
+  });
   if (const toml::node *controllers = reader.Find("controller")) {
     ReadControllers(*controllers, folder, &scenario.controllers);
   }
@@ -228,14 +226,11 @@ std::optional<Scenario> LoadScenario() {
   if (file == nullptr || *file == '\0') {
     file = "built-in";
   } else {
-    text.resize(kLargestFile + 1);
-    size_t size = 0;
-    if (const int number = ReadFile(file, text.data(), text.size(), &size); number != 0) {
+    if (const int number = ReadFile(file, kLargestFile + 1, &text); number != 0) {
       error = Printable(file) + ": " + std::strerror(number);
-    } else if (size > kLargestFile) {
+    } else if (text.size() > kLargestFile) {
       error = Printable(file) + ": larger than " + std::to_string(kLargestFile >> 10) + " KiB";
     }
-    text.resize(size);
   }
   std::optional<Scenario> scenario;
   if (error.empty()) scenario = ParseScenario(text, file, &error);
@@ -245,9 +240,7 @@ std::optional<Scenario> LoadScenario() {
 
 }  // namespace
 
-bool Fault::Hits(uint32_t call) const {
-  return always || std::find(calls.begin(), calls.end(), call) != calls.end();
-}
+bool Fault::Hits() { return std::ranges::count(calls, ++count) > 0 || always; }
 
 uint32_t RequestMethod(std::string_view className) {
   if (className == "VeltoQRN3NVMeController") return 9;

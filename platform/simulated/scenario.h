@@ -13,40 +13,31 @@
 
 namespace simulated {
 
-// The first number of a request. The simulated drivers have their own copies of these numbers, and
-// of the classes and methods, so that tests notice a wrong one in the library.
-enum Command : uint32_t {
-  kReadBand = 11,
-  kReadStatistics = 13,
-  kReadDefects = 15,
-  kReadTelemetry = 17,
-  kReadSnapshot = 22,
-  kTaskScheduler = 39,
-  kReadSnapshotHeader = 145,
-  kReadMsp = 221,
-};
-
-// The buffers of a controller, and their keys in a scenario.
+// The buffers of a controller: their keys in a scenario, and the first number of a request for
+// each. The simulated drivers have their own copies of these numbers, and of the classes and
+// methods, so that tests notice a wrong one in the library.
 struct Buffer {
   std::string_view key;
-  Command command;
+  uint32_t command;
 };
 inline constexpr std::array<Buffer, 7> kBuffers = {{
-    {"statistics", kReadStatistics},
-    {"msp", kReadMsp},
-    {"snapshot", kReadSnapshot},
-    {"snapshot_header", kReadSnapshotHeader},
-    {"band", kReadBand},
-    {"defects", kReadDefects},
-    {"telemetry", kReadTelemetry},
+    {"statistics", 13},
+    {"msp", 221},
+    {"snapshot", 22},
+    {"snapshot_header", 145},
+    {"band", 11},
+    {"defects", 15},
+    {"telemetry", 17},
 }};
 
 // Which calls of one kind fail: all of them, or those with the listed numbers, counted from 1.
 struct Fault {
   bool always = false;
   std::vector<uint32_t> calls;
+  uint32_t count = 0;  // of calls so far
 
-  bool Hits(uint32_t call) const;
+  // Counts a call. True when it fails.
+  bool Hits();
 };
 
 struct Controller {
@@ -58,8 +49,8 @@ struct Controller {
   Fault failRead;
   Fault shortRead;
   Fault failClose;
-  // By command: the files that its reads return, one after the other.
-  std::map<uint32_t, std::vector<std::string>> files;
+  // By key of a buffer: the files that its reads return, one after the other.
+  std::map<std::string_view, std::vector<std::string>> files;
 };
 
 struct Schedule {

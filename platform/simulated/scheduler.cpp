@@ -10,9 +10,17 @@
 #include "morwick/platform.h"
 #include "platform/simulated/process.h"
 
+// There is one. The handler is called on the worker thread, and what it asks for is asked there.
 struct Activity {
   ActivityHandler handler = nullptr;
   int state = 0;
+  uint32_t checksToYield = 0;  // after so many checks the run is asked to yield; 0 for never
+  bool inTransaction = false;
+
+  std::mutex mutex;  // guards all members below, which the main thread sets too
+  std::condition_variable wakeUp;
+  bool yieldWanted = false;
+  bool stopping = false;
 };
 
 namespace simulated {
@@ -22,131 +30,95 @@ constexpr int kActivityStateCheckIn = 0;
 constexpr int kActivityStateWait = 1;
 constexpr int kActivityStateDone = 5;
 
-class Scheduler {
- public:
-  static Scheduler &Instance() {
-    static Scheduler scheduler;
-    return scheduler;
+Activity theActivity;
+
+// In that state of the activity.
+void CallHandler(int state, uint32_t checksToYield) {
+  theActivity.state = state;
+  theActivity.checksToYield = checksToYield;
+  theActivity.inTransaction = state == kActivityStateRun;
+  {
+    const std::lock_guard lock(theActivity.mutex);
+    theActivity.yieldWanted = theActivity.stopping;
   }
+  theActivity.handler(&theActivity);
+}
 
-  void Register(ActivityHandler handler) { activity_.handler = handler; }
+// True when the activity was deferred and is to be resumed.
+bool RunActivity(uint32_t checksToYield) {
+  CallHandler(kActivityStateRun, checksToYield);
+  if (theActivity.inTransaction) std::fputs("the run did not end its transaction\n", stderr);
+  const bool deferred = theActivity.state == kActivityStateDefer;
+  theActivity.state = deferred ? kActivityStateWait : kActivityStateDone;
+  return deferred;
+}
 
-  int State(const Activity &activity) {
-    const std::lock_guard lock(mutex_);
-    return activity.state;
-  }
+// False when the process is to stop instead.
+bool WaitFor(std::chrono::milliseconds delay) {
+  std::unique_lock lock(theActivity.mutex);
+  return !theActivity.wakeUp.wait_for(lock, delay, [] { return theActivity.stopping; });
+}
 
-  bool SetState(Activity &activity, int state) {
-    const std::lock_guard lock(mutex_);
-    if (state != kActivityStateDefer || activity.state != kActivityStateRun) return false;
-    activity.state = state;
-    return true;
-  }
-
-  // Once true, the answer stays true until the run ends.
-  bool ShouldDefer() {
-    const std::lock_guard lock(mutex_);
-    ++questions_;
-    if (deferAtCheck_ != 0 && questions_ >= deferAtCheck_) yieldWanted_ = true;
-    return yieldWanted_;
-  }
-
-  void EndTransaction() {
-    const std::lock_guard lock(mutex_);
-    inTransaction_ = false;
-  }
-
-  // Runs the activity until the schedule ends or a signal asks to stop.
-  void Run(const Schedule &schedule) {
-    stopping_ = StopCameEarly();
-    std::thread worker([&] {
-      RunSchedule(schedule);
-      Stop();  // at the end of the schedule the main queue ends as by SIGTERM
-    });
-    bool stop;
-    do {
-      stop = WaitToStop();
-      const std::lock_guard lock(mutex_);
-      yieldWanted_ = true;  // between two runs nothing yields, and Enter forgets the wish
-      stopping_ = stopping_ || stop;
-      wakeUp_.notify_all();
-    } while (!stop);
-    worker.join();
-  }
-
- private:
-  void RunSchedule(const Schedule &schedule) {
-    if (activity_.handler == nullptr) return;
-    Enter(kActivityStateCheckIn);
-    activity_.handler(&activity_);
-    auto delay = schedule.firstRunAfter;
-    size_t run = 0;
-    for (uint32_t left = schedule.runs; left > 0 && WaitFor(delay); ++run) {
-      const auto &deferAt = schedule.deferAtCheck;
-      if (RunActivity(run < deferAt.size() ? deferAt[run] : 0)) {
-        delay = schedule.resumeAfter;
-      } else {
-        delay = schedule.interval;
-        --left;
-      }
+// Runs the activity until the schedule ends or a signal asks to stop.
+void RunSchedule(const Schedule &schedule) {
+  if (theActivity.handler == nullptr) return;
+  CallHandler(kActivityStateCheckIn, 0);
+  auto delay = schedule.firstRunAfter;
+  size_t run = 0;
+  for (uint32_t left = schedule.runs; left > 0 && WaitFor(delay); ++run) {
+    const auto &deferAt = schedule.deferAtCheck;
+    if (RunActivity(run < deferAt.size() ? deferAt[run] : 0)) {
+      delay = schedule.resumeAfter;
+    } else {
+      delay = schedule.interval;
+      --left;
     }
   }
+}
 
-  // True when the activity was deferred and is to be resumed.
-  bool RunActivity(uint32_t deferAtCheck) {
-    Enter(kActivityStateRun, deferAtCheck);
-    activity_.handler(&activity_);
-    const std::lock_guard lock(mutex_);
-    if (inTransaction_) std::fputs("the run did not end its transaction\n", stderr);
-    const bool deferred = activity_.state == kActivityStateDefer;
-    activity_.state = deferred ? kActivityStateWait : kActivityStateDone;
-    return deferred;
+// Waits for signals while a thread runs the schedule.
+void Run(const Schedule &schedule) {
+  theActivity.stopping = StopCameEarly();
+  const std::jthread worker([&] {
+    RunSchedule(schedule);
+    Stop();  // at the end of the schedule the main queue ends as by SIGTERM
+  });
+  for (bool stop = false; !stop;) {
+    stop = WaitToStop();
+    const std::lock_guard lock(theActivity.mutex);
+    // Between two runs nothing yields, and CallHandler forgets the wish.
+    theActivity.yieldWanted = true;
+    theActivity.stopping = theActivity.stopping || stop;
+    theActivity.wakeUp.notify_all();
   }
-
-  void Enter(int state, uint32_t deferAtCheck = 0) {
-    const std::lock_guard lock(mutex_);
-    activity_.state = state;
-    deferAtCheck_ = deferAtCheck;
-    questions_ = 0;
-    inTransaction_ = state == kActivityStateRun;
-    yieldWanted_ = stopping_;
-  }
-
-  // False when the process is to stop instead.
-  bool WaitFor(std::chrono::milliseconds delay) {
-    std::unique_lock lock(mutex_);
-    return !wakeUp_.wait_for(lock, delay, [this] { return stopping_; });
-  }
-
-  std::mutex mutex_;
-  std::condition_variable wakeUp_;
-  Activity activity_;
-  uint32_t deferAtCheck_ = 0;
-  uint32_t questions_ = 0;
-  bool inTransaction_ = false;
-  bool yieldWanted_ = false;
-  bool stopping_ = false;
-};
+}
 
 }  // namespace
 }  // namespace simulated
 
-using simulated::Scheduler;
+using simulated::theActivity;
 
 void RegisterActivity(const char *, ActivityCriteria criteria, ActivityHandler handler) {
   simulated::TakeProcess();
-  if (criteria == kActivityCheckIn) Scheduler::Instance().Register(handler);
+  if (criteria == kActivityCheckIn) theActivity.handler = handler;
 }
 
-int GetActivityState(Activity *activity) { return Scheduler::Instance().State(*activity); }
+int GetActivityState(Activity *activity) { return activity->state; }
 
-bool ActivityShouldDefer(Activity *) { return Scheduler::Instance().ShouldDefer(); }
+// Once true, the answer stays true until the run ends.
+bool ActivityShouldDefer(Activity *activity) {
+  const std::lock_guard lock(activity->mutex);
+  if (activity->checksToYield > 0 && --activity->checksToYield == 0) activity->yieldWanted = true;
+  return activity->yieldWanted;
+}
 
 bool SetActivityState(Activity *activity, int state) {
-  return Scheduler::Instance().SetState(*activity, state);
+  if (state != kActivityStateDefer || activity->state != kActivityStateRun) return false;
+  activity->state = state;
+  return true;
 }
 
-void ExitTransactionClean() { Scheduler::Instance().EndTransaction(); }
+void ExitTransactionClean() { theActivity.inTransaction = false; }
 
 void RunMainQueue() {
   const simulated::Schedule &schedule = simulated::TakeProcess().schedule;
@@ -154,7 +126,7 @@ void RunMainQueue() {
   // them.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
   try {
-    Scheduler::Instance().Run(schedule);
+    simulated::Run(schedule);
   } catch (...) {
     simulated::EndWithoutMemory();  // the worker thread was refused
   }

@@ -32,6 +32,14 @@ using Line = std::array<char, kLongestMessage + 64>;
 // fit there, and lines whose write fails, are dropped and counted.
 class Output {
  public:
+  // Makes a line of a message; returns its length.
+  using Format = int(const char *message, Line *line);
+  // Returns how much was written, 0 when there is no room now, or -1 when there will be none.
+  using Write = ssize_t(int descriptor, const char *text, size_t length);
+
+  Output(int descriptor, Format *format, Write *write)
+      : descriptor_(descriptor), format_(format), write_(write) {}
+
   void Add(const char *message) {
     Flush();
     if (dropped_ > 0 || !Put(message)) ++dropped_;
@@ -41,7 +49,7 @@ class Output {
   bool Flush() {
     while (waitingSize_ > 0) {
       const size_t length = std::strlen(waiting_.data());
-      const ssize_t written = Write(waiting_.data(), length);
+      const ssize_t written = write_(descriptor_, waiting_.data(), length);
       if (written == 0) return false;
       // One line is lost, or all lines that a lost count stands for.
       if (written < 0) dropped_ += std::max(countWaits_, 1ULL);
@@ -63,21 +71,12 @@ class Output {
     return waitingSize_ == 0;
   }
 
- protected:
-  ~Output() = default;
-
  private:
-  // Makes a line of a message; returns its length.
-  virtual int Format(const char *message, Line *line) = 0;
-
-  // Returns how much was written, 0 when there is no room now, or -1 when there will be none.
-  virtual ssize_t Write(const char *text, size_t length) = 0;
-
   // False when the line is lost.
   bool Put(const char *message) {
     Line line;
-    const auto length = static_cast<size_t>(Format(message, &line));
-    const ssize_t written = waitingSize_ > 0 ? 0 : Write(line.data(), length);
+    const auto length = static_cast<size_t>(format_(message, &line));
+    const ssize_t written = waitingSize_ > 0 ? 0 : write_(descriptor_, line.data(), length);
     if (written < 0) return false;
     const size_t left = length - static_cast<size_t>(written);
     if (left == 0) return true;
@@ -87,64 +86,59 @@ class Output {
     return true;
   }
 
+  const int descriptor_;
+  Format *const format_;
+  Write *const write_;
   std::array<char, 16 << 10> waiting_ = {};  // lines, each with its NUL
   size_t waitingSize_ = 0;
   unsigned long long dropped_ = 0;
   unsigned long long countWaits_ = 0;  // dropped lines that the first waiting line counts
 };
 
-class SystemSocket : public Output {
-  int Format(const char *message, Line *line) override {
-    const time_t now = std::time(nullptr);
-    tm local = {};
-    localtime_r(&now, &local);
-    std::array<char, 32> stamp;
-    std::strftime(stamp.data(), stamp.size(), "%b %e %T", &local);
-    return std::snprintf(line->data(), line->size(), "<%d>%s grellon[%d]: %s",
-                         LOG_DAEMON | LOG_NOTICE, stamp.data(), getpid(), message);
+int FormatForTheSystem(const char *message, Line *line) {
+  const time_t now = std::time(nullptr);
+  tm local = {};
+  localtime_r(&now, &local);
+  std::array<char, 32> stamp;
+  std::strftime(stamp.data(), stamp.size(), "%b %e %T", &local);
+  return std::snprintf(line->data(), line->size(), "<%d>%s grellon[%d]: %s",
+                       LOG_DAEMON | LOG_NOTICE, stamp.data(), getpid(), message);
+}
+
+// The socket is not connected, so that it reaches a log that was restarted.
+ssize_t SendToTheSystem(int socket, const char *text, size_t length) {
+  static constexpr sockaddr_un kReader = {.sun_family = AF_UNIX, .sun_path = "/dev/log"};
+  const ssize_t written = sendto(socket, text, length, MSG_DONTWAIT | MSG_NOSIGNAL,
+                                 reinterpret_cast<const sockaddr *>(&kReader), sizeof kReader);
+  return written < 0 && errno == EAGAIN ? 0 : written;
+}
+
+int FormatForAPerson(const char *message, Line *line) {
+  return std::snprintf(line->data(), line->size(), "grellon: %s\n", message);
+}
+
+ssize_t WriteToAPerson(int descriptor, const char *text, size_t length) {
+  ssize_t written = send(descriptor, text, length, MSG_DONTWAIT | MSG_NOSIGNAL);
+  if (written < 0 && errno == ENOTSOCK) {
+    pollfd room = {.fd = descriptor, .events = POLLOUT, .revents = 0};
+    if (poll(&room, 1, 0) == 0) return 0;
+    written = write(descriptor, text, length);
   }
+  return written < 0 && errno == EAGAIN ? 0 : written;
+}
 
-  // The socket is not connected, so that it reaches a log that was restarted.
-  ssize_t Write(const char *text, size_t length) override {
-    static constexpr sockaddr_un kReader = {.sun_family = AF_UNIX, .sun_path = "/dev/log"};
-    const ssize_t written = sendto(socket_, text, length, MSG_DONTWAIT | MSG_NOSIGNAL,
-                                   reinterpret_cast<const sockaddr *>(&kReader), sizeof kReader);
-    return written < 0 && errno == EAGAIN ? 0 : written;
+// A pipe or a terminal that others write to can be full again between poll and write. So it is
+// opened a second time, with O_NONBLOCK. The flag may not be set on the shared descriptor, because
+// the others may want to wait.
+int OpenStandardError() {
+  struct stat stream = {};
+  if (fstat(STDERR_FILENO, &stream) == 0 &&
+      (S_ISFIFO(stream.st_mode) || isatty(STDERR_FILENO) != 0)) {
+    const int own = open("/proc/self/fd/2", O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+    if (own >= 0) return own;
   }
-
-  const int socket_ = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-};
-
-class StandardError : public Output {
-  int Format(const char *message, Line *line) override {
-    return std::snprintf(line->data(), line->size(), "grellon: %s\n", message);
-  }
-
-  ssize_t Write(const char *text, size_t length) override {
-    ssize_t written = send(descriptor_, text, length, MSG_DONTWAIT | MSG_NOSIGNAL);
-    if (written < 0 && errno == ENOTSOCK) {
-      pollfd room = {.fd = descriptor_, .events = POLLOUT, .revents = 0};
-      if (poll(&room, 1, 0) == 0) return 0;
-      written = write(descriptor_, text, length);
-    }
-    return written < 0 && errno == EAGAIN ? 0 : written;
-  }
-
-  // A pipe or a terminal that others write to can be full again between poll and write. So it is
-  // opened a second time, with O_NONBLOCK. The flag may not be set on the shared descriptor,
-  // because the others may want to wait.
-  static int Open() {
-    struct stat stream = {};
-    if (fstat(STDERR_FILENO, &stream) == 0 &&
-        (S_ISFIFO(stream.st_mode) || isatty(STDERR_FILENO) != 0)) {
-      const int own = open("/proc/self/fd/2", O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
-      if (own >= 0) return own;
-    }
-    return STDERR_FILENO;
-  }
-
-  const int descriptor_ = Open();
-};
+  return STDERR_FILENO;
+}
 
 // The journal names the stream that it reads from a service. A line written there would be logged
 // twice.
@@ -172,21 +166,22 @@ class Log {
 
   void Add(const char *message) {
     const std::lock_guard lock(mutex_);
-    socket_.Add(message);
-    if (foreground_) error_.Add(message);
+    system_.Add(message);
+    if (foreground_) person_.Add(message);
   }
 
  private:
   bool Flush() {
-    const bool socketDone = socket_.Flush();
-    return error_.Flush() && socketDone;
+    const bool systemDone = system_.Flush();
+    return person_.Flush() && systemDone;
   }
 
   const bool enabled_;
   const bool foreground_ = !StandardErrorIsTheJournal();
   std::mutex mutex_;
-  SystemSocket socket_;
-  StandardError error_;
+  Output system_{socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0), FormatForTheSystem,
+                 SendToTheSystem};
+  Output person_{OpenStandardError(), FormatForAPerson, WriteToAPerson};
 };
 
 }  // namespace
