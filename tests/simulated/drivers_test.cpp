@@ -41,8 +41,8 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
       "[[controller]]\nclass = 'KVRStorage'\nvanish = [2]\npending = 3\nfail_request = [3]\n"
       "fail_read = [5]\nshort_read = [8, 19]\nmsp = '" +
       File("msp") + "'\nstatistics = ['" + File("first") + "', '/proc/self/fd/" + File("2nd") +
-      "', '" + File("third") + "']\nsnapshot = '" + File("") +
-      "'\nsnapshot_header = '/'\n"
+      "', '" + File("third") + "']\nsnapshot = ['" + File("") +
+      "', '/']\n"
       "defects = [\"/no ~\\n\\u007f\", '" +
       File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
   close(STDIN_FILENO);  // a file that is read may well be descriptor 0
