@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <random>
-#include <sstream>
 
 #include "tests/case_file.h"
 #include "tests/heap.h"
@@ -56,17 +55,14 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
 }
 
 TEST(ParsersTest, ReadGoodAndBadStreams) {
-  CaseFile cases("streams.txt");
-  for (std::string line; cases.Next(&line);) {
-    SCOPED_TRACE(cases.where());
-    std::istringstream columns(line);
+  ForEachCase("streams.txt", [](std::istringstream &columns) {
     std::string how = TakeColumn(columns);
     const std::string stream = TakeColumn(columns);
     const std::string seen = "validLbas=1 " + TakeColumn(columns);
     const size_t mark = how.find('!');
     if (mark == std::string::npos) {
       EXPECT_EQ(Parse(how, stream, 0), seen);
-      continue;
+      return;
     }
     // A message takes one allocation. An entry takes two, for its value and for its name; each is
     // refused once.
@@ -76,7 +72,7 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
     if (entry > 0) {
       EXPECT_EQ(Parse(how, stream, 2 * entry), seen);
     }
-  }
+  });
 }
 
 TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
