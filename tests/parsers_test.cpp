@@ -30,8 +30,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   RefuseAllocation(refused);
   const uint64_t result = ParseInto(null == "-context" ? nullptr : &contexts, kind,
                                     null == "-data" ? nullptr : buffer.data() + 1, bytes.size());
-  EXPECT_GE(AllocationCount(), refused) << "so many there were not";
-  RefuseAllocation(0);
+  EXPECT_GE(RefuseAllocation(0), refused) << "so many there were not";
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
   if (refused == 0 && null.empty() && kind != kArray) {

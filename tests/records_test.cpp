@@ -24,7 +24,7 @@ std::string Walk(Kind kind, const std::string &bytes) {
   const auto next = [&] {
     RefuseAllocation(0);
     const bool isRecord = MorwickNextRecord(&reader, &record) != 0;
-    EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+    EXPECT_EQ(RefuseAllocation(0), 0U) << "heap was used";
     EXPECT_EQ(isRecord, record.step == kMorwickRecord);
     return isRecord;
   };

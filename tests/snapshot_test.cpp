@@ -47,7 +47,7 @@ Rendered Render(const std::string &snapshot, uint64_t capacity, const std::strin
                               ? kFixed(records.data() + 1, snapshot.size(), output, &size)
                               : kDescribed(records.data() + 1, snapshot.size(), output, &size,
                                            layout.data() + 1, &state);
-  EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+  EXPECT_EQ(RefuseAllocation(0), 0U) << "heap was used";
   return {result, size, capacity == 0 ? "" : output, state};
 }
 
@@ -254,7 +254,7 @@ std::string FieldsOf(const std::string &header) {
     MorwickSnapshotField field;
     RefuseAllocation(0);
     const int isThere = MorwickSnapshotFieldAt(unaligned.data() + 1, i, &field);
-    EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+    EXPECT_EQ(RefuseAllocation(0), 0U) << "heap was used";
     if (isThere == 0) return text.str();
     text << field.kind << ' ' << field.offset << ' ' << field.priorities;
     for (const auto &[label, column] : field.names) {
