@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cstdarg>
 #include <cstdio>
-#include <cstring>
 #include <memory>
 #include <sstream>
 
@@ -172,14 +171,12 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
                          size_t inputSize, void *reply, size_t *replySize) {
   EXPECT_EQ(platform.openHandles[connection], "connection");
   const auto *bytes = static_cast<const unsigned char *>(input);
-  uint32_t words[2];
-  std::memcpy(words, bytes, sizeof words);
+  const auto *words = static_cast<const uint32_t *>(input);
   Write("call ", NameOf(connection), " method ", selector, ": ", inputSize, " bytes, ", words[0],
         " ", words[1], " and ", std::count(bytes + 8, bytes + inputSize, 0), " zeros");
-  const uint32_t cleared = 0;
-  EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
-  const auto pending = static_cast<uint32_t>(Number(Take("replies", "0")));
-  std::memcpy(reply, &pending, sizeof pending);
+  auto *pending = static_cast<uint32_t *>(reply);
+  EXPECT_TRUE(*replySize == 4 && *pending == 0);
+  *pending = static_cast<uint32_t>(Number(Take("replies", "0")));
   *replySize = 1;  // not looked at, and not what the next call may begin with
   // The pair is a writable global: a request takes what stands in it then.
   const std::string second = std::to_string(taskSchedulerSelectors.second);

@@ -7,7 +7,6 @@
 
 #include "tests/case_file.h"
 #include "tests/heap.h"
-#include "tests/message.h"
 #include "tests/parsing.h"
 #include "tests/stream_notation.h"
 
