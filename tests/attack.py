@@ -4,6 +4,7 @@ import gzip, itertools, json, os, random, re, resource, select, shlex, shutil, s
 import sys, tempfile, threading, time
 from concurrent.futures import ThreadPoolExecutor
 from functools import partial
+from pathlib import Path
 from types import SimpleNamespace
 
 SECONDS = float(sys.argv[1]) if len(sys.argv) > 1 else 0  # 0: in full
@@ -27,8 +28,7 @@ FILES = (b"statistics = ['kvr.bin', 'ftl.bin']\nmsp = 'msp.bin'\nsnapshot = 'sna
 GOOD = {"live.toml": NVME + FILES, "works.toml": QUICK % 1 + NVME, "bad.toml": b"a = \n"}
 GOOD |= {f"faults-{runs}.toml": QUICK % runs + NVME + FAULTS for runs in (5, 50, 100000)}
 for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_header.bin"):
-    with open("examples/" + example, "rb") as file:
-        GOOD[example] = file.read() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
+    GOOD[example] = Path("examples", example).read_bytes() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
 # Two thousand entries, too large for a double, whose JSON is larger than the command's buffer; the one
 # with the odd name is cut. Five hundred records and a part of one.
 many = [b"".join(struct.pack("<IIQ", 4, 1, start << 54 | n) for n in range(2000)) for start in (1, 2)]
@@ -37,13 +37,12 @@ GOOD |= {name + ".gz": gzip.compress(GOOD[name + ".bin"], mtime=0) for name in (
 GOOD["long.bin"] = (GOOD["snapshot.bin"] * 2)[:252 * 500 + 9]
 
 PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
-with open("tests/cases/attack.txt") as file:
-    for kind, words in (line.strip().split(": ", 1) for line in file if line[0] != "#"):
-        words = words.replace("\\xff", "\udcff")  # a byte that is not UTF-8
-        if kind == "plain":
-            PROGRAMS.append(([MORWICK, *words.split()], "live"))
-        else:
-            PROGRAMS += [([MORWICK, *words.split(), "-o", form], "live") for form in kind.split()]
+calls = Path("tests/cases/attack.txt").read_text().replace("\\xff", "\udcff")  # a byte that is not UTF-8
+for kind, words in re.findall("^([^#\n]*?): (.*)$", calls, re.M):
+    if kind == "plain":
+        PROGRAMS.append(([MORWICK, *words.split()], "live"))
+    else:
+        PROGRAMS += [([MORWICK, *words.split(), "-o", form], "live") for form in kind.split()]
 
 most_memory = 1 << 20  # KiB that no process has exceeded: 1 GiB at first
 thread = threading.local()
@@ -59,8 +58,7 @@ def folder():
 
 def fill(files):
     for name, content in files.items():
-        with open(f"{folder()}/{name}", "wb") as target:
-            target.write(content)
+        Path(folder(), name).write_bytes(content)
 
 
 def take(name):

@@ -4,19 +4,16 @@
 
 #include <gtest/gtest.h>
 
-#include <sstream>
-
 #include "tests/case_file.h"
 
 namespace {
 
 TEST(CapacityTest, RoundsToSignificantDigits) {
-  CaseFile cases("rounding.txt");
-  for (std::string line; cases.Next(&line);) {
+  ForEachCase("rounding.txt", [](std::istringstream &columns) {
     uint64_t value, digits, rounded;
-    EXPECT_TRUE(std::istringstream(line) >> value >> digits >> rounded) << cases.where();
-    EXPECT_EQ(roundSig(value, digits), rounded) << cases.where();
-  }
+    EXPECT_TRUE(columns >> value >> digits >> rounded);
+    EXPECT_EQ(roundSig(value, digits), rounded);
+  });
 }
 
 }  // namespace

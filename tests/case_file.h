@@ -6,6 +6,7 @@
 
 #include <cstdint>
 #include <fstream>
+#include <sstream>
 #include <string>
 
 // The number that a case writes, in C's notation. The test fails when it is none.
@@ -47,5 +48,18 @@ class CaseFile {
   std::ifstream file_;
   int number_ = 0;
 };
+
+// Calls the body with the columns of each line that is neither empty nor a comment; numbers in them
+// may be hexadecimal.
+template <typename Body>
+void ForEachCase(const std::string &file, Body body) {
+  CaseFile cases(file);
+  for (std::string line; cases.Next(&line);) {
+    SCOPED_TRACE(cases.where());
+    std::istringstream columns(line);
+    columns.unsetf(std::ios::dec);
+    body(columns);
+  }
+}
 
 #endif

@@ -70,7 +70,8 @@ TEST(ConnectionTest, SearchesAnewEachTime) {
     ReleaseIOInterfaces(kept);
     kept->connection = kept->service = 0;
   });
-  EXPECT_TRUE(outcome.ends_with("find KVRStorage = 3\nrelease 3\nclose 2\nrelease 1\n")) << outcome;
+  EXPECT_TRUE(outcome.ends_with("search\nfind KVRStorage = 3\nrelease 3\nclose 2\nrelease 1\n"))
+      << outcome;
 }
 
 TEST(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {

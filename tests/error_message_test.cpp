@@ -10,7 +10,6 @@
 #include <vector>
 
 #include "tests/heap.h"
-#include "tests/message.h"
 #include "tests/stream_notation.h"
 
 namespace {

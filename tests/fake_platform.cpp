@@ -5,10 +5,8 @@
 #include <algorithm>
 #include <cstdarg>
 #include <cstdio>
-#include <cstring>
 #include <memory>
 #include <sstream>
-#include <utility>
 
 #include "morwick/exporter.h"
 #include "morwick/platform.h"
@@ -22,23 +20,18 @@ namespace {
 
 struct FakePlatform {
   Script script;
-  std::string journal;
+  std::ostringstream journal;
   size_t calls = 0;  // of those that can fail
   std::map<std::string, size_t> callsByName;
   std::map<uint32_t, std::string> openHandles;
   uint32_t lastHandle = 0;
-  const NandExporter *row = nand_exporters;  // that was searched for last
-  bool missed = false;                       // and was not there: the search goes on
 };
 
 FakePlatform platform;
 
 template <typename... Parts>
 void Write(const Parts &...parts) {
-  std::ostringstream line;
-  if (std::exchange(platform.missed, false)) line << "search broken off\n";
-  (line << ... << parts) << "\n";
-  platform.journal += line.str();
+  (platform.journal << ... << parts) << "\n";
 }
 
 bool Lists(const std::string &key, const std::string &word) {
@@ -86,12 +79,6 @@ std::string NameOf(uint32_t handle) {
                                                        : "no handle, " + std::to_string(handle);
 }
 
-// Searches are journalled by what they find, however many rows there are.
-void Miss() {
-  platform.missed = platform.row[1].className != nullptr;
-  if (!platform.missed) Write("find nothing");
-}
-
 void Return(uint32_t handle, const std::string &what) {
   EXPECT_EQ(platform.openHandles[handle], what) << NameOf(handle) << " is not open";
   platform.openHandles.erase(handle);
@@ -110,7 +97,7 @@ std::string Play(const Script &script, const std::function<void()> &body) {
   for (const auto &[handle, what] : platform.openHandles) {
     ADD_FAILURE() << what << " " << NameOf(handle) << " was left open";
   }
-  return printed.empty() ? platform.journal : printed + "\n" + platform.journal;
+  return (printed.empty() ? "" : printed + "\n") + platform.journal.str();
 }
 
 void PlayCases(const std::string &file, const std::function<void(Script &)> &body) {
@@ -143,32 +130,15 @@ std::vector<std::string> PlayEveryFailure(Script script, const std::function<voi
   return outcomes;
 }
 
+// Searches are journalled by their begin and by what they find, however many rows there are.
 MatchingRequest *ServiceMatching(const char *className) {
-  const bool begins = className == std::string_view(nand_exporters[0].className);
-  if (begins && platform.missed) Write("search again");
-  if (begins) {
-    platform.row = nand_exporters;
-  } else if (platform.row->className != nullptr) {
-    ++platform.row;
-  }
-  const char *due = platform.row->className;
-  if (due == nullptr) {
-    ADD_FAILURE() << "a search goes on after the last row";
-    return nullptr;
-  }
-  EXPECT_STREQ(className, due) << "a search goes row by row";
-  if (!Fails("match")) return new MatchingRequest{className};
-  Miss();
-  return nullptr;
+  if (className == std::string_view(nand_exporters[0].className)) Write("search");
+  return Fails("match") ? nullptr : new MatchingRequest{className};
 }
 
 uint32_t GetMatchingService(MatchingRequest *request) {
   const std::unique_ptr<MatchingRequest> owned(request);
-  if (!Lists("present", request->className) || Fails("lookup")) {
-    Miss();
-    return 0;
-  }
-  platform.missed = false;
+  if (!Lists("present", request->className) || Fails("lookup")) return 0;
   const uint32_t service = Issue("service");
   Write("find ", request->className, " = ", NameOf(service));
   return service;
@@ -201,14 +171,12 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
                          size_t inputSize, void *reply, size_t *replySize) {
   EXPECT_EQ(platform.openHandles[connection], "connection");
   const auto *bytes = static_cast<const unsigned char *>(input);
-  uint32_t words[2];
-  std::memcpy(words, bytes, sizeof words);
+  const auto *words = static_cast<const uint32_t *>(input);
   Write("call ", NameOf(connection), " method ", selector, ": ", inputSize, " bytes, ", words[0],
         " ", words[1], " and ", std::count(bytes + 8, bytes + inputSize, 0), " zeros");
-  const uint32_t cleared = 0;
-  EXPECT_TRUE(*replySize == 4 && std::memcmp(reply, &cleared, 4) == 0);
-  const auto pending = static_cast<uint32_t>(Number(Take("replies", "0")));
-  std::memcpy(reply, &pending, sizeof pending);
+  auto *pending = static_cast<uint32_t *>(reply);
+  EXPECT_TRUE(*replySize == 4 && *pending == 0);
+  *pending = static_cast<uint32_t>(Number(Take("replies", "0")));
   *replySize = 1;  // not looked at, and not what the next call may begin with
   // The pair is a writable global: a request takes what stands in it then.
   const std::string second = std::to_string(taskSchedulerSelectors.second);

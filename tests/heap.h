@@ -6,11 +6,9 @@
 #include <string>
 #include <vector>
 
-// Refuses the n-th allocation from now, counted from 1, with malloc or calloc; 0 refuses none.
-void RefuseAllocation(size_t number);
-
-// Allocations since the last RefuseAllocation, those with new included.
-size_t AllocationCount();
+// Refuses the n-th allocation from now, counted from 1; 0 refuses none. Returns how many there were
+// since the last call, those with new included.
+extern "C" unsigned long RefuseAllocation(unsigned long number);
 
 // A copy of the bytes from index 1 on, which is never aligned, to the very end of the allocation.
 std::vector<char> Unaligned(const std::string &bytes);

@@ -4,11 +4,9 @@
 
 #include <algorithm>
 #include <random>
-#include <sstream>
 
 #include "tests/case_file.h"
 #include "tests/heap.h"
-#include "tests/message.h"
 #include "tests/parsing.h"
 #include "tests/stream_notation.h"
 
@@ -31,8 +29,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   RefuseAllocation(refused);
   const uint64_t result = ParseInto(null == "-context" ? nullptr : &contexts, kind,
                                     null == "-data" ? nullptr : buffer.data() + 1, bytes.size());
-  EXPECT_GE(AllocationCount(), refused) << "so many there were not";
-  RefuseAllocation(0);
+  EXPECT_GE(RefuseAllocation(0), refused) << "so many there were not";
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
   if (refused == 0 && null.empty() && kind != kArray) {
@@ -56,17 +53,14 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
 }
 
 TEST(ParsersTest, ReadGoodAndBadStreams) {
-  CaseFile cases("streams.txt");
-  for (std::string line; cases.Next(&line);) {
-    SCOPED_TRACE(cases.where());
-    std::istringstream columns(line);
+  ForEachCase("streams.txt", [](std::istringstream &columns) {
     std::string how = TakeColumn(columns);
     const std::string stream = TakeColumn(columns);
     const std::string seen = "validLbas=1 " + TakeColumn(columns);
     const size_t mark = how.find('!');
     if (mark == std::string::npos) {
       EXPECT_EQ(Parse(how, stream, 0), seen);
-      continue;
+      return;
     }
     // A message takes one allocation. An entry takes two, for its value and for its name; each is
     // refused once.
@@ -76,7 +70,7 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
     if (entry > 0) {
       EXPECT_EQ(Parse(how, stream, 2 * entry), seen);
     }
-  }
+  });
 }
 
 TEST(ParsersTest, TakeNullPointersAndHugeSizes) {

@@ -1,7 +1,8 @@
-// The parsers side by side, for tests and fuzz targets alike.
+// The parsers side by side, and the message that they leave, for tests and fuzz targets alike.
 #ifndef TESTS_PARSING_H
 #define TESTS_PARSING_H
 
+#include <cstdlib>
 #include <cstring>
 #include <string>
 
@@ -75,6 +76,14 @@ inline std::string WalkedEntries(Kind kind, const void *data, size_t size, Morwi
 
 inline Entries EntriesOf(const Contexts &contexts, Kind kind) {
   return kind == kKVR ? Entries(contexts.kvr) : Entries(contexts.generic);
+}
+
+// Looks at the message and forgets it.
+inline std::string TakeMessage() {
+  std::string message = GetAPIErrorMessage();
+  std::free(GlobalAPIErrorMessage);
+  GlobalAPIErrorMessage = nullptr;
+  return message;
 }
 
 #endif

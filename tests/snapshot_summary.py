@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
 """Holds the summaries of snapshots, JSON on standard input, against those computed plainly from the files."""
 import bisect, itertools, json, math, random, struct, sys
+from pathlib import Path
 
 
 def span(groups, percent):
@@ -32,8 +33,7 @@ def tried_span(groups, percent):
 
 
 def check(name, line):
-    with open(name, "rb") as file:
-        records = [struct.unpack("<63I", record) for record in iter(lambda: file.read(252), b"")]
+    records = list(struct.iter_unpack("<63I", Path(name).read_bytes()))
     summary = json.loads(line)["summary"]
     assert summary["intervals"] == len(records)
     for kind, base, host, nand in ("reads", 14, 27, 29), ("writes", 2, 28, 30):

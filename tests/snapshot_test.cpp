@@ -47,7 +47,7 @@ Rendered Render(const std::string &snapshot, uint64_t capacity, const std::strin
                               ? kFixed(records.data() + 1, snapshot.size(), output, &size)
                               : kDescribed(records.data() + 1, snapshot.size(), output, &size,
                                            layout.data() + 1, &state);
-  EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+  EXPECT_EQ(RefuseAllocation(0), 0U) << "heap was used";
   return {result, size, capacity == 0 ? "" : output, state};
 }
 
@@ -105,7 +105,6 @@ std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fiel
 SnapshotFieldDescriptor ReadDescriptor(std::istringstream &columns) {
   SnapshotFieldDescriptor field = {};
   std::string format, arrow;
-  columns.unsetf(std::ios::dec);  // hexadecimal numbers too
   columns >> field.kind >> field.fieldOffset >> field.fieldSize >> std::quoted(format) >> arrow;
   EXPECT_TRUE(columns && arrow == "->");
   format.copy(field.format, sizeof field.format);
@@ -113,14 +112,12 @@ SnapshotFieldDescriptor ReadDescriptor(std::istringstream &columns) {
 }
 
 TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
-  CaseFile cases("descriptors.txt");
-  for (std::string line, text; cases.Next(&line);) {
-    SCOPED_TRACE(cases.where());
-    std::istringstream columns(line);
+  ForEachCase("descriptors.txt", [](std::istringstream &columns) {
+    std::string text;
     const SnapshotFieldDescriptor field = ReadDescriptor(columns);
     EXPECT_TRUE(columns >> std::quoted(text));
     EXPECT_EQ(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, {field}), text + "\n\n");
-  }
+  });
 }
 
 // Every conversion that passes the check prints what the C library prints.
@@ -257,7 +254,7 @@ std::string FieldsOf(const std::string &header) {
     MorwickSnapshotField field;
     RefuseAllocation(0);
     const int isThere = MorwickSnapshotFieldAt(unaligned.data() + 1, i, &field);
-    EXPECT_EQ(AllocationCount(), 0U) << "heap was used";
+    EXPECT_EQ(RefuseAllocation(0), 0U) << "heap was used";
     if (isThere == 0) return text.str();
     text << field.kind << ' ' << field.offset << ' ' << field.priorities;
     for (const auto &[label, column] : field.names) {
@@ -277,6 +274,7 @@ TEST(SnapshotFieldsTest, ReadsDescriptorsAndGivesNamesThatDiffer) {
     std::string expected;
     while (cases.Peek() != '=' && cases.NextRaw(&line)) {
       std::istringstream columns(line);
+      columns.unsetf(std::ios::dec);  // hexadecimal numbers too
       fields.push_back(ReadDescriptor(columns));
       std::getline(columns >> std::ws, field);
       expected += field + "\n";

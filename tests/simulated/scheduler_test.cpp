@@ -59,18 +59,16 @@ TEST(SimulatedSchedulerDeathTest, EndsForABadScenarioOnlyWhereItMay) {
 TEST(SimulatedSchedulerDeathTest, RunsAndResumesOnSchedule) {
   GTEST_FLAG_SET(death_test_style, "threadsafe");
   const std::string checkIn = "^state 0 nnnn not deferred, ";
-  CaseFile cases("schedules.txt");
-  for (std::string line; cases.Next(&line);) {
-    std::istringstream columns(line);
+  ForEachCase("schedules.txt", [&](std::istringstream &columns) {
     const double least = std::stod(TakeColumn(columns));
     const std::string journal = checkIn + TakeColumn(columns) + " ?$";
     std::string schedule = TakeColumn(columns);
     std::ranges::replace(schedule, ';', '\n');
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), journal) << cases.where();
+    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), journal);
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
-    EXPECT_TRUE(least <= elapsed.count() && elapsed.count() < least + 1) << cases.where();
-  }
+    EXPECT_TRUE(least <= elapsed.count() && elapsed.count() < least + 1);
+  });
   EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), testing::ExitedWithCode(0),
               "^$")
       << "no activity";
