@@ -4,6 +4,7 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <charconv>
 #include <memory>
 #include <new>
 
