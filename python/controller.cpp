@@ -42,7 +42,7 @@ const fleet::BufferKind &KindOf(py::handle kindName) {
   throw py::value_error("what must be one of " + known + ", not '" + name + "'");
 }
 
-// A connection to a controller. Several threads may use it: one at a time has it.
+// A connection to a controller. Several threads may share it: a lock lets one call run at a time.
 class Connection {
  public:
   // Opens it to the class, or with None to the first controller that is present. From finding a
@@ -99,7 +99,7 @@ class Connection {
     Fail(name() + ": " + std::string(known.name) + ": " + reply->fault, reply->result);
   }
 
-  // Raises what the driver says; the handle is closed in any case, and only once.
+  // Closes the handle once, whatever the driver says. Raises an error when the driver refuses.
   void Close() {
     int32_t result = 0;
     {

@@ -45,7 +45,7 @@ class KeyNames {
   size_t placeCount() const { return names_.size(); }
   py::handle NameAt(uint32_t place) const { return names_[place]; }
 
-  // Nothing, without an exception, for what is no key's name.
+  // Returns nothing, and raises nothing, when no key has that name.
   std::optional<uint32_t> Find(py::handle name) const {
     PyObject *place = PyDict_GetItemWithError(places_.ptr(), name.ptr());
     if (place != nullptr) return static_cast<uint32_t>(PyLong_AsUnsignedLong(place));

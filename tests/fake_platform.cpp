@@ -130,7 +130,7 @@ std::vector<std::string> PlayEveryFailure(Script script, const std::function<voi
   return outcomes;
 }
 
-// Searches are journalled by their begin and by what they find, however many rows there are.
+// The journal has the start of a search and what it finds, however many rows there are.
 MatchingRequest *ServiceMatching(const char *className) {
   if (className == std::string_view(nand_exporters[0].className)) Write("search");
   return Fails("match") ? nullptr : new MatchingRequest{className};

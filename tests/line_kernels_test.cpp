@@ -68,7 +68,7 @@ TEST_P(LineKernelTest, WritesRandomLines) {
   }
 }
 
-// By scripts/every-value, in the first column.
+// scripts/every-value runs this test.
 TEST_P(LineKernelTest, DISABLED_WritesEveryValue) {
   Words words = {};
   do Check(words);

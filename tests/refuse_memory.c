@@ -26,7 +26,7 @@ static int Refuses(void) {
 void *malloc(size_t size) { return Refuses() ? NULL : __libc_malloc(size); }
 
 void *calloc(size_t number, size_t size) {
-  sched_yield();  // for other threads to come as far: who meets here is in a race
+  sched_yield();  // lets other threads reach this point, so that a race shows
   return Refuses() ? NULL : __libc_calloc(number, size);
 }
 

@@ -20,7 +20,7 @@ export LD_PRELOAD=
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
 # A watch, with pauses and seconds a thousand times shorter.
 fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" watch "$@"; }
-# At a time of day, in milliseconds since 1970.
+# Runs morwick at a time of day, in milliseconds since 1970.
 at() { NOW=$1 LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" "${@:2}" 2>/dev/null; }
 # What it prints as JSON is kept, and checked at the end, as is what it says about open handles.
 morwick() {

@@ -47,7 +47,7 @@ std::optional<uint64_t> MagnitudeOf(const Change &change) {
   return IsBackwards(change) ? -difference : difference;
 }
 
-// In decimal; negative with a sign.
+// now - old, with its sign; empty when one of them is missing.
 std::string DifferenceOf(const Change &change) {
   const std::optional<uint64_t> magnitude = MagnitudeOf(change);
   return magnitude ? (IsBackwards(change) ? "-" : "") + std::to_string(*magnitude) : "";

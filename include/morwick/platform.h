@@ -5,7 +5,7 @@
  *
  * PORTING. A platform is a folder under platform/ whose CMakeLists.txt makes the library target
  * `morwick-platform`, which defines every function below with C linkage. Configure with
- * -DMORWICK_PLATFORM=FOLDER; nothing else of the tree names a platform. Of the tree a platform
+ * -DMORWICK_PLATFORM=FOLDER; no other code of the tree names a platform. Of the tree a platform
  * includes this header and its own files. A folder's CMakeLists.txt that calls morwick_plain_cxx
  * builds it without exceptions and without run-time type information; in any case no exception may
  * leave a function. Tests hold for any platform but where tests/CMakeLists.txt asks for

@@ -32,7 +32,6 @@ enum Result : int32_t {
   kNoMemory = 0x106,
 };
 
-// The driver has its own copies of these numbers, so that tests notice a wrong one in the library.
 constexpr uint32_t kTaskScheduler = 39;
 constexpr uint32_t kTaskSchedulerArgument = 1025;
 constexpr uint32_t kReadArgument = 0;
@@ -192,7 +191,7 @@ class Drivers {
   }
 
   std::mutex mutex_;
-  std::vector<Controller> controllers_;  // with the work that is left, and the files of next reads
+  std::vector<Controller> controllers_;  // with the work that is left and the files not read yet
   std::map<uint32_t, Handle> open_;
   uint32_t lastHandle_ = 0;
 };

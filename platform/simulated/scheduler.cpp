@@ -10,7 +10,7 @@
 #include "morwick/platform.h"
 #include "platform/simulated/process.h"
 
-// There is one. The handler is called on the worker thread, and what it asks for is asked there.
+// The process has one. Its handler runs on the worker thread and calls the platform from there.
 struct Activity {
   ActivityHandler handler = nullptr;
   int state = 0;
@@ -32,7 +32,7 @@ constexpr int kActivityStateDone = 5;
 
 Activity theActivity;
 
-// In that state of the activity.
+// Calls the handler with the activity in that state.
 void CallHandler(int state, uint32_t checksToYield) {
   theActivity.state = state;
   theActivity.checksToYield = checksToYield;

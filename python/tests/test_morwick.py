@@ -346,6 +346,9 @@ def test_types_hold():
 
 
 def test_everything_public_is_described_and_nothing_else_exported():
-    assert all(name == "platform" or getattr(morwick, name).__doc__ for name in morwick.__all__)
+    own = {name: value for name, value in vars(morwick).items()
+           if getattr(value, "__module__", "").startswith("morwick")}
+    assert {name for name in own if name[0] != "_"} == {*morwick.__all__} - {"platform"}
+    assert all(own[name].__doc__ for name in morwick.__all__ if name != "platform")
     library = run("nm", "-D", "--defined-only", morwick._native.__file__)
     assert [line.split()[-1] for line in library.stdout.splitlines()] == ["PyInit__native"]
