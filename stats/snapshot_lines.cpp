@@ -1,5 +1,6 @@
-// Lines of the fixed snapshot layout, several numbers at a time on x86-64: those of all lengths
-// take the same time.
+// Lines of the fixed snapshot layout, several numbers at a time on x86-64. Writing a number takes
+// the same time whatever its length. The writers store 16 or 64 bytes at a time, whatever is
+// printed, so that the line needs room after its end.
 
 #include "stats/snapshot_lines.h"
 
@@ -29,8 +30,8 @@ static_assert(kLabelRoom + kNumberRoom <= kSlotSize);
 struct Slots {
   alignas(64) uint8_t digits[kSlotSize][2 * kSlotSize] = {};  // indices of the digits, by `first`
   alignas(64) char text[kSlots][kSlotSize] = {};              // the label, then padding
-  uint64_t printed[kSlots / 4] = {};       // what is, whatever the number: a bit a byte
-  uint8_t length[kSlots][kSlotSize] = {};  // of what is printed, by `first`
+  uint64_t printed[kSlots / 4] = {};       // a bit for each byte: printed for every number
+  uint8_t length[kSlots][kSlotSize] = {};  // of label and number, by `first`
 
   consteval Slots() {
     for (size_t first = 0; first < kSlotSize; ++first) {
@@ -116,7 +117,7 @@ AVX512 inline char *PutFour(char *end, __m512i twos, size_t slot) {
   __m512i digits = twos + _mm512_mullo_epi16(tens, _mm512_set1_epi16((1 << 8) - 10));
   digits = _mm512_shuffle_epi8(digits, _mm512_broadcast_i32x4(kTurned));
   const uint64_t nonZero = _mm512_test_epi8_mask(digits, digits) | 0x8000'8000'8000'8000;
-  // In each slot the bits from the lowest one on.
+  // In each slot, the lowest bit that is set and all bits above it.
   const uint64_t digitsFrom = ~((nonZero - 0x0001'0001'0001'0001) & ~nonZero);
   const uint64_t printed = kColumnSlots.printed[slot / 4] | digitsFrom;
   const __m512i text =

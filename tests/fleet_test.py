@@ -5,10 +5,11 @@ import bisect, contextlib, csv, io, os, pathlib, re, subprocess, sys, tempfile, 
 from concurrent.futures import ThreadPoolExecutor
 
 morwick, source = sys.argv[1:]
-sys.path.append(source + "/examples")  # where no worker looks
+sys.path.append(source + "/examples")  # workers do not look there: they must be sent the code
 import fleet, pandas
 from dask.distributed import Client
 
+# Of the keys 4 counts writes of the host, 18 those of the flash, 47 the grown bad blocks.
 word = lambda key, value: bytes([key, 0, 0, 0, 1, 0, 0, 0]) + value.to_bytes(8, "little")
 spoilt = {  # each would stand out if a fault, or what is missing, were taken for a value
     101: b"", 303: b"PK\3\4xxxxyyyyzzzz", 505: word(4, 1) + word(18, 900) + word(47, 900) + b"cut",
@@ -21,7 +22,7 @@ def as_rows(table):
 
 
 def ten_of(rows):
-    """Those that stand out, by other means."""
+    """The ten drives that stand out most, without pandas. A folder is a drive, its last readable dump counts."""
     drives = {os.path.dirname(row[0]): row for row in rows if not row[1]}.values()
     figures = [(file, int(nand) / int(host) if nand and host.strip("0") else None, int(bad) if bad else None)
                for file, _, host, nand, bad in drives]
@@ -73,7 +74,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
             scheduler = client.scheduler.address
 
             screen = subprocess.run(
-                [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # that long at most
+                [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # ends after 60 s at the latest
                  sys.executable, source + "/examples/fleet.py", work + "/fleet", "--scheduler", scheduler],
                 capture_output=True, text=True).stdout.splitlines()
             assert screen[0].startswith("reading: 100%|█") and "10/10" in screen[0], screen

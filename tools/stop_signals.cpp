@@ -35,15 +35,15 @@ StopSignals::StopSignals() {
 StopSignals::End StopSignals::WaitUntil(steady_clock::time_point moment, Output &output) {
   sigset_t before;
   sigprocmask(SIG_BLOCK, &signals_, &before);  // none is lost between the check and the wait
-  bool reader = true;
+  bool hasReader = true;
   redraw_ = 0;
   int64_t left = 1;  // nanoseconds; the loop runs once even when the moment has passed
-  while (stopped_ == 0 && redraw_ == 0 && reader && left > 0) {
+  while (stopped_ == 0 && redraw_ == 0 && hasReader && left > 0) {
     left = std::max(nanoseconds(moment - steady_clock::now()).count(), int64_t{0});
-    reader = output.WaitWithReader({left / 1000000000, left % 1000000000}, before);
+    hasReader = output.WaitWithReader({left / 1000000000, left % 1000000000}, before);
   }
   sigprocmask(SIG_SETMASK, &before, nullptr);
-  if (stopped_ != 0 || !reader) return End::kStopped;
+  if (stopped_ != 0 || !hasReader) return End::kStopped;
   if (redraw_ == SIGCONT) return End::kContinued;
   return redraw_ != 0 ? End::kResized : End::kTime;
 }
@@ -51,7 +51,7 @@ StopSignals::End StopSignals::WaitUntil(steady_clock::time_point moment, Output 
 void StopSignals::EndProcess() {
   std::signal(stopped_, SIG_DFL);
   std::raise(stopped_);
-  std::abort();  // not reached
+  std::abort();  // reached only when no signal has arrived
 }
 
 }  // namespace tools

@@ -27,7 +27,7 @@ class StopSignals {
   // away.
   End WaitUntil(std::chrono::steady_clock::time_point moment, Output &output);
 
-  // Ends the process by the signal that arrived.
+  // Ends the process by the signal that arrived; one must have arrived.
   [[noreturn]] static void EndProcess();
 
  private:

@@ -25,20 +25,20 @@ def prose(comment):
             page += literal(re.sub("(?m)^    ", "", paragraph), " -offset indent")
         else:
             sentences = re.sub(r"(?<=[.?!:]) (?=[A-Z])", "\n", " ".join(paragraph.split()))
-            # Names stay whole at the end of a line.
+            # No hyphen within a name such as bytesPerPage at the end of a line.
             whole = re.sub(r"\b(?=\w*[a-z][A-Z])", r"\\%", escaped(sentences))
             page += ".Pp\n" + re.sub("`(.*?)`", r"\\fI\1\\fP", whole) + "\n"
     return page
 
 
 def declaration(code):
-    """As a tool meets it: without the mark of what is exported, and without a body."""
+    """What a user of the library sees: no export mark, no body. Lines stood under the mark, 15 characters to the right."""
     code = re.sub(r"(?ms)^static inline (.*?) \{\n.*?^\}$", r"\1;", code)
     return re.sub(r"(?m)^MORWICK_EXPORT ", "", re.sub(r"\n {15}(?= )", "\n", code))
 
 
 def page(header, date, pages):
-    source = re.sub(r"(?s)/\*@.*?\*/\n+", "", header.read_text(encoding="utf-8"))  # the prover's
+    source = re.sub(r"(?s)/\*@.*?\*/\n+", "", header.read_text(encoding="utf-8"))  # annotations for the prover
     chunks = [re.fullmatch(r"(?s)(/\*.*?\*/|)\s*(.*)", chunk).groups()
               for chunk in re.split(r"\n{2,}(?=\S)", source.strip())]
     about = chunks[0][0]

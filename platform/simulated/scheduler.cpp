@@ -14,7 +14,7 @@
 struct Activity {
   ActivityHandler handler = nullptr;
   int state = 0;
-  uint32_t checksToYield = 0;  // after so many checks the run is asked to yield; 0 for never
+  uint32_t checksToYield = 0;  // checks left until the run is asked to yield; 0 for never
   bool inTransaction = false;
 
   std::mutex mutex;  // guards all members below, which the main thread sets too
@@ -86,7 +86,7 @@ void Run(const Schedule &schedule) {
   for (bool stop = false; !stop;) {
     stop = WaitToStop();
     const std::lock_guard lock(theActivity.mutex);
-    // Between two runs nothing yields, and CallHandler forgets the wish.
+    // Between two runs a wish to yield has no effect: CallHandler clears it.
     theActivity.yieldWanted = true;
     theActivity.stopping = theActivity.stopping || stop;
     theActivity.wakeUp.notify_all();
@@ -128,7 +128,7 @@ void RunMainQueue() {
   try {
     simulated::Run(schedule);
   } catch (...) {
-    simulated::EndWithoutMemory();  // the worker thread was refused
+    simulated::EndWithoutMemory();  // the worker thread could not be made
   }
   std::exit(EXIT_SUCCESS);
 }
