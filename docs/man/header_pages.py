@@ -32,7 +32,7 @@ def prose(comment):
 
 
 def declaration(code):
-    """What a user of the library sees: no export mark, no body. Lines stood under the mark, 15 characters to the right."""
+    """What a user of the library sees: no export mark, no body. The mark has 15 characters."""
     code = re.sub(r"(?ms)^static inline (.*?) \{\n.*?^\}$", r"\1;", code)
     return re.sub(r"(?m)^MORWICK_EXPORT ", "", re.sub(r"\n {15}(?= )", "\n", code))
 
