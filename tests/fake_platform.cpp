@@ -130,7 +130,7 @@ std::vector<std::string> PlayEveryFailure(Script script, const std::function<voi
   return outcomes;
 }
 
-// The journal has the start of a search and what it finds, however many rows there are.
+// A search writes one line when it begins, at the first row, and one for each controller it finds.
 MatchingRequest *ServiceMatching(const char *className) {
   if (className == std::string_view(nand_exporters[0].className)) Write("search");
   return Fails("match") ? nullptr : new MatchingRequest{className};
