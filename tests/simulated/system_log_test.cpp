@@ -54,25 +54,31 @@ TEST(SimulatedSystemLogTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
   Play("");
   testing::internal::CaptureStderr();
   for (const char *text : {"100%", "line\n", ""}) SystemLog("%s", text);
-  EXPECT_EQ(testing::internal::GetCapturedStderr(), "grellon: 100%\ngrellon: line\ngrellon: \n");
-  EXPECT_EQ(Texts(systemLog), (std::vector<std::string>{"100%", "line", ""}));
+  SystemLog("%01100d", 7);
+  const std::string cut(1023, '0');
+  EXPECT_EQ(testing::internal::GetCapturedStderr(),
+            "grellon: 100%\ngrellon: line\ngrellon: \ngrellon: " + cut + "\n");
+  EXPECT_EQ(Texts(systemLog), (std::vector<std::string>{"100%", "line", "", cut}));
   // Facility daemon, level notice.
   const std::string begin = "<29>[A-Z][a-z]{2} [ 1-3][0-9] [0-2][0-9]:[0-5][0-9]:[0-6][0-9] ";
   const std::string each = begin + "grellon\\[" + std::to_string(getpid()) + "\\]: .*\n";
-  EXPECT_TRUE(std::regex_match(systemLog, std::regex(each + each + each))) << systemLog;
+  EXPECT_TRUE(std::regex_match(systemLog, std::regex(each + each + each + each))) << systemLog;
 }
 
 // The system's log goes away again while the line waits that says how many were dropped before.
+// Each line is shorter than the one before, whose place it may take.
 TEST(SimulatedSystemLogTest, CountsAgainWhatALostCountSaid) {
   Play("");
-  for (const int error : {ECONNREFUSED, ECONNREFUSED, EAGAIN, ECONNREFUSED, EAGAIN, 0}) {
+  int width = 8;
+  for (const int error : {ECONNREFUSED, ECONNREFUSED, EAGAIN, ECONNREFUSED, EAGAIN, 0, EAGAIN, 0}) {
     systemLogError = error;
-    SystemLog("error %d", error);
+    SystemLog("error %0*d", width--, error);
   }
   // The first four lines are lost: the third waits, with the count of the first two, until the
-  // fourth finds no log. The fifth waits for the sixth and is not lost.
+  // fourth finds no log. The fifth and the seventh wait for the next and are not lost.
   EXPECT_EQ(Texts(systemLog),
-            (std::vector<std::string>{"4 lines of the log were dropped", "error 11", "error 0"}));
+            (std::vector<std::string>{"4 lines of the log were dropped", "error 0011", "error 000",
+                                      "error 11", "error 0"}));
 }
 
 // A line takes 29 characters in the log, with its NUL. The room for lines that wait is 16 KiB;
@@ -105,7 +111,7 @@ void CheckOneGap(const std::string &log, unsigned long lines, unsigned long leas
 // Nobody reads standard error or the system's log. Then standard error is read piece by piece, and
 // the system's log goes away and comes back.
 void CheckFullLog(int reader, int writer) {
-  Play("");
+  Play("[[controller]]\nclass = 'KVRStorage'\nstatistics = '/none'\n");
   fcntl(reader, F_SETFL, O_NONBLOCK);
   const int standardError = dup(STDERR_FILENO);
   dup2(writer, STDERR_FILENO);
@@ -114,6 +120,12 @@ void CheckFullLog(int reader, int writer) {
   alarm(20);  // in case it waits
   unsigned line = 0;
   while (line < 20'000) SystemLog(kLine, ++line);
+  // A complaint is given up, too.
+  const uint32_t request[6] = {13};
+  char reply[4];
+  size_t replySize = sizeof reply;
+  EXPECT_EQ(CallStructMethod(Connect(), 8, request, sizeof request, reply, &replySize),
+            kDeviceError);
   const unsigned lineSize =
       isatty(STDERR_FILENO) != 0 ? 29 : 28;  // a terminal's line end is longer
   int unread = 0;
@@ -155,13 +167,15 @@ TEST(SimulatedSystemLogTest, NeverWaitsForATerminal) {
   CheckFullLog(terminal, open(ptsname(terminal), O_RDWR | O_NOCTTY));
 }
 
-// The system's log takes lines again a quarter of a second after the end.
+// One line is lost when there is no log. The log is full when the line waits that says so, and
+// takes lines again a quarter of a second after the end.
 [[noreturn]] void EndWhileTheLogIsFull() {
   Play("");
   std::atexit([] { std::fputs(systemLog.c_str(), stderr); });  // after the log's own end
   std::signal(SIGALRM, [](int) { systemLogError = 0; });
-  systemLogError = EAGAIN;
+  systemLogError = ECONNREFUSED;
   SystemLog("last line");
+  systemLogError = EAGAIN;
   ualarm(250'000, 0);
   std::exit(0);
 }
@@ -169,7 +183,7 @@ TEST(SimulatedSystemLogTest, NeverWaitsForATerminal) {
 TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsForTheLogSomeTimeAtTheEnd) {
   GTEST_FLAG_SET(death_test_style, "threadsafe");
   EXPECT_EXIT(EndWhileTheLogIsFull(), testing::ExitedWithCode(0),
-              "^grellon: last line\n<29>.*: last line\n$");
+              "^grellon: last line\n<29>.*: 1 lines of the log were dropped\n$");
 }
 
 }  // namespace
