@@ -153,7 +153,10 @@ TEST(SimulatedDriversTest, GivesBuffersToTheCaller) {
   EXPECT_EQ(buffer.bytes, nullptr);
   EXPECT_EQ(MorwickReadBuffer(connection, row, row->getSnapshotSelectors(), &buffer), kMorwickRead);
   EXPECT_TRUE(buffer.bytes != nullptr && buffer.size == 0);
+  buffer.size = 77;
+  buffer.result = kRefused;
   for (int time = 0; time < 2; ++time) MorwickFreeBuffer(&buffer);
+  EXPECT_TRUE(buffer.bytes == nullptr && buffer.size == 0 && buffer.result == 0);
   MorwickFreeBuffer(nullptr);
   EXPECT_EQ(MorwickFindService(nullptr), 0U);
   EXPECT_EQ(CloseService(connection), 0);
