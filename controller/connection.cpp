@@ -25,13 +25,13 @@ int findNandExporterNew(NandExporter **row) {
     if (service == 0) continue;
     uint32_t connection = 0;
     if (OpenService(service, kNandConnectionType, &connection) == 0) {
-      // The prefix differs, so that a log tells which of the two searches found it.
+      // The prefix differs, so that a log tells which of the two searches found the controller.
       std::printf("Morwick_drel: findNandExporterNew: Controller found: %s\n", (*row)->className);
       (*row)->connection = connection;
       (*row)->service = service;
       return 1;
     }
-    // A driver that fails may still have set a handle. If not, it refuses 0.
+    // A driver that fails may still have set a handle. If not, CloseService refuses 0.
     CloseService(connection);
     ReleaseObject(service);
   }

@@ -9,7 +9,7 @@
 
 namespace {
 
-constexpr size_t kFirstRoom = 64 << 10;
+constexpr size_t kFirstRoom = 64 << 10;  // bytes
 
 static_assert(sizeof(MorwickRequest) == 24);
 static_assert(offsetof(MorwickRequest, argument) == 4);

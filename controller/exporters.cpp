@@ -1,4 +1,4 @@
-// The exporter table and the request numbers of each driver class.
+// The exporter table and the request numbers, which all driver classes share.
 
 #include <cstddef>
 
@@ -28,7 +28,7 @@ SelectorPair *KVRGetSnapshotHeaderSelectors() { return &snapshotHeaderSelectors;
 
 namespace {
 
-// A row, of what differs between classes.
+// A row; the parameters are what differs between classes.
 constexpr NandExporter Row(const char *className, const char *matchKey, int32_t exporterParamA,
                            uint32_t methodSelector, bool hasMSPStatistics = false) {
   return {

@@ -15,11 +15,11 @@
 namespace {
 
 constexpr char kActivityIdentifier[] = "org.morwick.grellon";
-constexpr uint32_t kRequestArgument = 1025;
-constexpr uint32_t kDeferChecks = 6;  // between two requests, one before each pause
+constexpr uint32_t kRequestArgument = 1025;  // of a task-scheduler request; platform.h
+constexpr uint32_t kDeferChecks = 6;         // between two requests, one before each pause
 constexpr uint32_t kPauseSeconds = 5;
 
-// What the controller answers one request with: the work still pending, 0 after a failed request.
+// Sends one request. Returns the work that is still pending; 0 after a failed request.
 uint32_t RequestWork(uint32_t connection, const NandExporter &row, const SelectorPair &selectors,
                      uint32_t iteration) {
   const MorwickRequest request = MorwickMakeRequest(&selectors, kRequestArgument);
@@ -33,8 +33,8 @@ uint32_t RequestWork(uint32_t connection, const NandExporter &row, const Selecto
   return status == 0 ? bdrPending : 0;
 }
 
-// Lets the controller and the host rest before the next request. False: the scheduler wants the
-// daemon to yield. There is no question after the last pause, the next request follows at once.
+// Lets the controller and the host rest before the next request. Returns false when the scheduler
+// wants the daemon to yield. It is not asked after the last pause.
 bool PauseUnlessDeferred(Activity *activity) {
   for (uint32_t check = 1; check <= kDeferChecks; ++check) {
     if (ActivityShouldDefer(activity)) {
@@ -47,7 +47,7 @@ bool PauseUnlessDeferred(Activity *activity) {
   return true;
 }
 
-// The work still pending when the loop ends: 0 when there is no more, or a request failed.
+// Returns the work that is still pending; 0 when there is no more, or a request failed.
 uint32_t RequestUntilDoneOrDeferred(Activity *activity, uint32_t connection,
                                     const NandExporter &row, const SelectorPair &selectors) {
   for (uint32_t iteration = 1;; ++iteration) {
@@ -65,7 +65,7 @@ uint32_t RequestUntilDoneOrDeferred(Activity *activity, uint32_t connection,
   }
 }
 
-// Opens the service and works on it; the connection is closed again in every case.
+// Opens, uses and closes a connection. Returns the work still pending; 0 without a connection.
 uint32_t WorkOnService(Activity *activity, uint32_t service, const NandExporter &row) {
   if (row.getTaskSchedulerSelectors == nullptr) return 0;
   const SelectorPair *selectors = row.getTaskSchedulerSelectors();
@@ -79,7 +79,7 @@ uint32_t WorkOnService(Activity *activity, uint32_t service, const NandExporter 
 }
 
 void EndRun(Activity *activity, uint32_t bdrPending) {
-  // Asked afresh: the scheduler may have changed its mind since the last defer check.
+  // Ask again: the scheduler may have changed its mind since the last defer check.
   if (bdrPending != 0 && ActivityShouldDefer(activity)) {
     SystemLog("deferring grellon daemon\n");
     SetActivityState(activity, kActivityStateDefer);

@@ -9,7 +9,7 @@ extern "C" {
 // Registers the activity; the platform calls the handler from then on.
 void RegisterTaskSchedulerActivity();
 
-// One run of the activity when it is in the run state, nothing otherwise. Blocks in driver calls
+// Does one run of the activity if it is in the run state, otherwise nothing. Blocks in driver calls
 // and sleeps; keeps no state from one run to the next.
 void TaskSchedulerActivityHandler(Activity *activity);
 }

@@ -1,4 +1,4 @@
-# Makes a fault that is still in harder to exploit, as far as compiler and linker can.
+# Makes faults that are left harder to exploit, as far as compiler and linker can.
 include(CheckCXXCompilerFlag)
 include(CheckLinkerFlag)
 include(CheckPIESupported)
@@ -16,7 +16,7 @@ foreach(flag relro now noexecstack)
   add_link_options($<$<BOOL:${MORWICK_HAS_z_${flag}}>:-Wl,-z,${flag}>)
 endforeach()
 
-# Works on optimised code only; sanitizers see more where calls are left as they are.
+# _FORTIFY_SOURCE needs optimised code. It replaces calls, and sanitizers see more in the original ones.
 if(NOT CMAKE_CXX_FLAGS MATCHES "-fsanitize|-O0|_FORTIFY_SOURCE")
   set(optimised $<CONFIG:Release,RelWithDebInfo,MinSizeRel>)
   add_compile_options($<${optimised}:-U_FORTIFY_SOURCE> $<${optimised}:-D_FORTIFY_SOURCE=2>)

@@ -1,10 +1,10 @@
 # shellcheck shell=bash
-# bash completion for morwick. What there is to complete stands in the program's own help.
+# bash completion for morwick, from the program's own help.
 
 _morwick() {
   local program=$1 current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
   local command=${COMP_WORDS[1]} help line="" before="" suffix=""
-  # bash takes --option=value for three words.
+  # bash splits --option=value into three words.
   if [ "$current" = = ]; then
     current="" before="="
   elif [ "$previous" = = ]; then

@@ -12,10 +12,10 @@
 namespace tools {
 namespace {
 
-// The old reading's entries of one name, and how many of them the later reading has so far.
+// The old reading's entries of one name. The first `matched` ones are also in the later reading.
 struct Occurrences {
   std::vector<Entry> entries;
-  size_t met = 0;
+  size_t matched = 0;
 };
 
 void PrintNumber(Json &json, const char *key, uint64_t magnitude, std::string_view digits) {
@@ -40,20 +40,20 @@ std::string_view RemarkOf(const Change &change) {
   return IsBackwards(change) ? "backwards" : "";
 }
 
-// The difference without its sign. Nothing when one of the two is missing.
+// The difference without its sign. Nothing when one of the two entries is missing.
 std::optional<uint64_t> MagnitudeOf(const Change &change) {
   if (!change.old || !change.now) return std::nullopt;
   const uint64_t difference = change.now->value() - change.old->value();
   return IsBackwards(change) ? -difference : difference;
 }
 
-// now - old, with its sign; empty when one of them is missing.
+// The new value less the old one, with its sign. Empty when one of the two is missing.
 std::string DifferenceOf(const Change &change) {
   const std::optional<uint64_t> magnitude = MagnitudeOf(change);
   return magnitude ? (IsBackwards(change) ? "-" : "") + std::to_string(*magnitude) : "";
 }
 
-// The difference per second. Nothing when it or the time is missing.
+// The difference per second. Nothing when it or the time is missing, or the rate is infinite.
 std::optional<double> RateOf(const Change &change, std::optional<double> seconds) {
   const std::optional<uint64_t> magnitude = MagnitudeOf(change);
   if (!magnitude || !seconds) return std::nullopt;
@@ -83,15 +83,15 @@ std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Stat
     for (const Entry &entry : now) {
       Change change = {std::nullopt, entry};
       const auto found = before.find(entry.name());
-      if (found != before.end() && found->second.met < found->second.entries.size()) {
-        change.old = found->second.entries[found->second.met++];
+      if (found != before.end() && found->second.matched < found->second.entries.size()) {
+        change.old = found->second.entries[found->second.matched++];
       }
       if (all || !change.old || change.old->value() != entry.value()) changes.push_back(change);
     }
     for (const Entry &entry : old) {
-      size_t &met = before[entry.name()].met;
-      if (met > 0) {
-        --met;
+      size_t &matched = before[entry.name()].matched;
+      if (matched > 0) {
+        --matched;
       } else {
         changes.push_back({entry, {}});
       }

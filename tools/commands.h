@@ -13,7 +13,7 @@ namespace tools {
 using Action = std::function<Status()>;
 
 // The sub-commands, in the order of the help. Each has a function (AddFind, AddStats, ...) that
-// adds it to the program. When a user calls the sub-command it sets the action.
+// adds it to the program. `*action` is set when the user calls the sub-command.
 #define FOR_EACH_COMMAND(COMMAND) \
   COMMAND(Find)                   \
   COMMAND(Stats)                  \

@@ -11,8 +11,8 @@
 namespace tools {
 
 // From finding a service to storing the connection no statement may throw: the handle would leak.
-Controller::Controller(const std::string &className, const std::string &what)
-    : className_(className), what_(what) {
+Controller::Controller(const std::string &className, const std::string &bufferName)
+    : className_(className), bufferName_(bufferName) {
   NandExporter *row = fleet::FindRow(className);
   errno = 0;
   const uint32_t service = row == nullptr ? findNandExporter(&row) : MorwickFindService(row);
@@ -20,14 +20,14 @@ Controller::Controller(const std::string &className, const std::string &what)
     row_ = row;
     const int32_t result = fleet::Open(service, &connection_);
     if (connection_ != 0) return;
-    Complain(name() + ": " + what,
+    Complain(name() + ": " + bufferName,
              "the connection was refused, result " + fleet::Hexadecimal(result));
   } else if (errno == ENOMEM) {
     RefuseMemory();
   } else if (className.empty()) {
-    Complain(what, "no controller is present");
+    Complain(bufferName, "no controller is present");
   } else {
-    Complain(className + ": " + what, "the controller is not present");
+    Complain(className + ": " + bufferName, "the controller is not present");
   }
 }
 
@@ -36,7 +36,7 @@ Controller::~Controller() {
   const int32_t result = CloseService(connection_);
   if (result == 0) return;
   try {
-    Note(name() + ": " + what_,
+    Note(name() + ": " + bufferName_,
          "closing the connection failed, result " + fleet::Hexadecimal(result));
   } catch (const std::bad_alloc &) {  // main complains of it
   }

@@ -15,10 +15,9 @@ using fleet::FindBufferKind;
 // A connection to a controller's driver. The destructor closes it.
 class Controller {
  public:
-  // Connects to the controller of the class; without a class, to the first that is present.
-  // Complaints name `what`, the buffer or stream to be read. When `connected` is false it has
-  // complained.
-  Controller(const std::string &className, const std::string &what);
+  // Connects to the controller of the class; without a class, to the first that is present. When
+  // it cannot, it complains. Messages name the buffer or stream to be read.
+  Controller(const std::string &className, const std::string &bufferName);
   ~Controller();
   Controller(const Controller &) = delete;
   Controller &operator=(const Controller &) = delete;
@@ -28,7 +27,7 @@ class Controller {
   // The row of the controller; null when none was found.
   const NandExporter *row() const { return row_; }
 
-  // The class of the controller. When none was found: the class that was asked for, maybe empty.
+  // The class of the controller. When none was found, the class that was asked for, maybe empty.
   std::string name() const { return row_ == nullptr ? className_ : row_->className; }
 
   bool Offers(const BufferKind &kind) const { return row_->*kind.selectors != nullptr; }
@@ -38,7 +37,7 @@ class Controller {
 
  private:
   std::string className_;
-  std::string what_;
+  std::string bufferName_;
   const NandExporter *row_ = nullptr;
   uint32_t connection_ = 0;
 };

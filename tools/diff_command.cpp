@@ -27,8 +27,8 @@ void PrintCsv(Output &output, const std::vector<Change> &changes, std::optional<
   }
 }
 
-// The seconds between two dumps by the controller's own clock. Nothing when the clock did not
-// advance.
+// The seconds between two dumps by the controller's own clock, after a note. Nothing when a dump
+// lacks the clock, or the clock did not advance.
 std::optional<double> TimeBetween(const Statistics &old, const Statistics &now) {
   const std::optional<uint64_t> before = old.Find("calendarTime");
   const std::optional<uint64_t> after = now.Find("calendarTime");
@@ -39,22 +39,22 @@ std::optional<double> TimeBetween(const Statistics &old, const Statistics &now) 
 }
 
 Status Diff(const Options &options) {
-  const Dump old = ReadDumpFile(options.oldFile, options.stream, options.className);
-  const Dump now = ReadDumpFile(options.newFile, options.stream, options.className);
-  Status status = std::max(old.status, now.status);
-  std::optional<Statistics> before, after;
+  const Dump oldDump = ReadDumpFile(options.oldFile, options.stream, options.className);
+  const Dump newDump = ReadDumpFile(options.newFile, options.stream, options.className);
+  Status status = std::max(oldDump.status, newDump.status);
+  std::optional<Statistics> oldStatistics, newStatistics;
   std::optional<std::vector<Change>> changes;
   std::optional<double> seconds = options.seconds;
-  if (old.bytes && now.bytes) {
-    before.emplace(old, options.stream, options.filter);
-    after.emplace(now, options.stream, options.filter);
-    status = before->Check(old);
-    status = std::max(status, after->Check(now));
-    if (!seconds) seconds = TimeBetween(*before, *after);
-    changes = FindChanges(*before, *after, options.all, now.subject);
-    if (!changes) {  // free their memory, to print the rest
-      before.reset();
-      after.reset();
+  if (oldDump.bytes && newDump.bytes) {
+    oldStatistics.emplace(oldDump, options.stream, options.filter);
+    newStatistics.emplace(newDump, options.stream, options.filter);
+    status = oldStatistics->Check(oldDump);
+    status = std::max(status, newStatistics->Check(newDump));
+    if (!seconds) seconds = TimeBetween(*oldStatistics, *newStatistics);
+    changes = FindChanges(*oldStatistics, *newStatistics, options.all, newDump.subject);
+    if (!changes) {  // memory was refused: free some for the output
+      oldStatistics.reset();
+      newStatistics.reset();
       status = kBadData;
     }
   }

@@ -18,7 +18,7 @@
 namespace tools {
 namespace {
 
-constexpr size_t kBlockSize = 64 << 10;
+constexpr size_t kBlockSize = 64 << 10;  // bytes
 
 }  // namespace
 
@@ -49,10 +49,10 @@ fleet::ReadResult Input::ReadRaw(char *bytes, size_t room) {
   while (error_ == 0) {
     const ssize_t count = read(descriptor_, bytes, room);
     if (count >= 0) {
-      read_ += static_cast<size_t>(count);
+      bytesRead_ += static_cast<size_t>(count);
       if (progress_.IsDue()) {
         const std::string total = size_ == 0 ? "" : " of " + std::to_string(size_ >> 10);
-        fmt::print(stderr, "\rmorwick: {}: {}{} KiB read", PrintableLine(name_), read_ >> 10,
+        fmt::print(stderr, "\rmorwick: {}: {}{} KiB read", PrintableLine(name_), bytesRead_ >> 10,
                    total);
       }
       return {static_cast<size_t>(count), ""};
@@ -70,14 +70,14 @@ void Input::ComplainOf(const std::string &fault) {
 void NoteUnreadInput() {
   struct stat status = {};
   if (fstat(STDIN_FILENO, &status) != 0) return;
-  bool isReady = false;
+  bool hasBytes = false;
   if (S_ISREG(status.st_mode)) {
-    isReady = lseek(STDIN_FILENO, 0, SEEK_CUR) < status.st_size;
+    hasBytes = lseek(STDIN_FILENO, 0, SEEK_CUR) < status.st_size;
   } else if (S_ISFIFO(status.st_mode) || S_ISSOCK(status.st_mode)) {
     int count = 0;
-    isReady = ioctl(STDIN_FILENO, FIONREAD, &count) == 0 && count > 0;
+    hasBytes = ioctl(STDIN_FILENO, FIONREAD, &count) == 0 && count > 0;
   }
-  if (isReady) Note("standard input", "was not read; name it, as -, to read it");
+  if (hasBytes) Note("standard input", "was not read; name it, as -, to read it");
 }
 
 WholeInput ReadInput(const std::string &file, uint64_t limit) {

@@ -38,9 +38,9 @@ class Input {
   std::string name_;
   fleet::Descriptor file_;
   int descriptor_;                           // of the file, or standard input
-  int error_ = descriptor_ < 0 ? errno : 0;  // of opening it
+  int error_ = descriptor_ < 0 ? errno : 0;  // errno of opening or reading
   uint64_t size_ = 0;
-  uint64_t read_ = 0;
+  uint64_t bytesRead_ = 0;
   ProgressLine progress_;
   fleet::GzipReader reader_{[this](char *bytes, size_t room) { return ReadRaw(bytes, room); }};
 };

@@ -18,20 +18,20 @@ namespace tools {
 
 // Where data comes from.
 struct Source {
-  std::string_view kind;  // file, controller
+  std::string_view kind;  // "file" or "controller"
   std::string name;       // empty when no controller was found
 };
 
-// Many readers store all numbers as doubles, and larger numbers lose their last digits there. So a
-// text with the same digits stands beside each of them.
+// Many readers store numbers as doubles, in which every number up to this one is exact. A larger
+// one has a text with the same digits beside it.
 constexpr uint64_t kLargestExact = uint64_t{1} << 53;
 
 // Begin the object only after reading and comparing: from then on the command may need no more
 // memory than the reserve that the object holds.
 class Json {
  public:
-  // Begins the object with its maker and its sources. When there is no memory for the reserve it
-  // writes nothing and throws std::bad_alloc.
+  // Begins the object with version, platform, command and sources. When there is no memory for the
+  // reserve it writes nothing and throws std::bad_alloc.
   Json(Output &output, std::string_view command, const std::vector<Source> &sources = {});
 
   void Key(std::string_view key) { writer_.Key(key.data(), Length(key)); }
@@ -40,7 +40,7 @@ class Json {
   // For text that is certainly UTF-8, such as the name of a statistic.
   void PlainText(std::string_view text) { writer_.String(text.data(), Length(text)); }
   void Number(std::unsigned_integral auto number) { writer_.Uint64(number); }
-  // A number that is already in decimal.
+  // A number whose decimal digits are known.
   void Digits(std::string_view digits) {
     writer_.RawValue(digits.data(), digits.size(), rapidjson::kNumberType);
   }
@@ -91,15 +91,14 @@ class Json {
     });
   }
 
-  // A member with one number or an array of them. When one is too large for a double, a second
-  // member (KEY_s) has them as texts. `each` calls the function that it gets with each value and
-  // its digits.
+  // A member with one number or an array of them. When one is above kLargestExact, a second member
+  // (KEY_s) has them as texts. `each` gets a function and calls it with each value and its digits.
   template <typename Each>
-  void Numbers(std::string_view key, bool array, Each each) {
+  void Numbers(std::string_view key, bool isArray, Each each) {
     const auto print = [&](auto printOne) {
-      if (array) BeginArray();
+      if (isArray) BeginArray();
       each(printOne);
-      if (array) EndArray();
+      if (isArray) EndArray();
     };
     bool exact = true;
     Key(key);
@@ -130,7 +129,7 @@ class Json {
     return static_cast<rapidjson::SizeType>(text.size());
   }
 
-  MemoryReserve reserve_{2 << 20};
+  MemoryReserve reserve_{2 << 20};  // bytes
   Stream stream_;
   char room_[4096] = {};  // for the writer's stack, instead of memory from the heap
   Memory memory_{room_, sizeof room_};

@@ -1,4 +1,4 @@
-// What is certain of single operations' latencies.
+// Bounds of the percentiles of latencies.
 
 #include "tools/latency_bounds.h"
 
@@ -7,8 +7,8 @@
 namespace tools {
 namespace {
 
-// How many operations of a group can take at least so long, the others nothing: one takes the
-// maximum, and what is left of the total is enough for so many more.
+// How many operations of a group can take at least `latency`, if the others take 0: one takes the
+// maximum, and the rest of the total is shared by as many as it is enough for.
 uint64_t MostAtLeast(const SnapshotOperations &group, uint32_t latency) {
   if (latency == 0) return group.count;
   if (latency > group.maxLatency) return 0;
@@ -17,8 +17,8 @@ uint64_t MostAtLeast(const SnapshotOperations &group, uint32_t latency) {
   return 1 + std::min(others, group.count - 1);
 }
 
-// How many can take at most so long, the others the maximum, which one takes in any case: each
-// saves the difference, and together they can save what the total lacks.
+// How many can take at most `latency`, if the others take the maximum, as one always does. Each
+// saves at least maxLatency - latency, and all together save allAtMaximum - totalLatency.
 uint64_t MostAtMost(const SnapshotOperations &group, uint32_t latency) {
   if (latency >= group.maxLatency) return group.count;
   const uint64_t allAtMaximum = uint64_t{group.count} * group.maxLatency;
@@ -27,8 +27,8 @@ uint64_t MostAtMost(const SnapshotOperations &group, uint32_t latency) {
                             group.count - 1);
 }
 
-// The first latency for which it holds, as it then does for all above; `last` if for none below.
-// The search starts at the guess, and is quick where that is near.
+// The first latency for which `holds` is true, as it then is for all above; `last` if it is true
+// for none below. The search starts at the guess, and is quick when the result is near.
 template <typename Holds>
 uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
   uint32_t first = 0;
@@ -48,7 +48,7 @@ uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
 
 void LatencyBounds::Add(const SnapshotOperations &group) {
   if (group.count == 0) return;
-  if (groups_.size() % 61 == 0) sample_.push_back(group);
+  if (groups_.size() % 61 == 0) sample_.push_back(group);  // a prime meets every priority
   groups_.push_back(group);
   maximum_ = std::max(maximum_, group.maxLatency);
 }
@@ -61,15 +61,15 @@ LatencyBounds::Bounds LatencyBounds::Search(const Groups &groups, unsigned perce
     return total;
   };
   const uint64_t count = sum([](const SnapshotOperations &group) { return group.count; });
-  // Counted from 1, rounded up; the count times a hundred may not fit.
+  // Counted from 1, rounded up. Divided first, because count * percent may not fit.
   const uint64_t rank = count / 100 * percent + (count % 100 * percent + 99) / 100;
-  const auto isReached = [&](uint32_t latency) {
+  const auto canBeAtMost = [&](uint32_t latency) {
     return sum([=](const auto &group) { return MostAtMost(group, latency); }) >= rank;
   };
-  const auto isPassed = [&](uint32_t latency) {
+  const auto mustBeAtMost = [&](uint32_t latency) {
     return sum([=](const auto &group) { return MostAtLeast(group, latency + 1); }) <= count - rank;
   };
-  return {First(guess.least, maximum_, isReached), First(guess.most, maximum_, isPassed)};
+  return {First(guess.least, maximum_, canBeAtMost), First(guess.most, maximum_, mustBeAtMost)};
 }
 
 std::optional<LatencyBounds::Bounds> LatencyBounds::Percentile(unsigned percent) const {

@@ -1,4 +1,4 @@
-// What is certain of single operations' latencies where only sums of groups of them are known.
+// Bounds of the percentiles of latencies, where only count, sum and maximum of groups are known.
 #ifndef TOOLS_LATENCY_BOUNDS_H
 #define TOOLS_LATENCY_BOUNDS_H
 
@@ -15,21 +15,21 @@ class LatencyBounds {
  public:
   void Add(const SnapshotOperations &group);
 
-  // The least and the most that the percentile can be, by nearest rank: there are operations that
-  // make the same groups and have it. Nothing without operations. Of groups that cannot be, such as
-  // one whose maximum is above its total, it is some latency up to the largest maximum.
+  // The least and the most that the percentile, by nearest rank, can be: for each of the two there
+  // are operations that make these groups and have it. Nothing without operations. When a group
+  // contradicts itself, as with a maximum above its total, both are at most the largest maximum.
   struct Bounds {
     uint32_t least = 0, most = 0;
   };
   std::optional<Bounds> Percentile(unsigned percent) const;
 
  private:
-  using Groups = std::deque<SnapshotOperations>;  // whose growth takes no room three times
+  using Groups = std::deque<SnapshotOperations>;  // a vector needs three times the room to grow
 
   Bounds Search(const Groups &groups, unsigned percent, Bounds guess) const;
 
   Groups groups_;
-  Groups sample_;  // a few of them, of any priority: the percentiles of all are near theirs
+  Groups sample_;  // a few of the groups; the search among all of them starts at its bounds
   uint32_t maximum_ = 0;
 };
 

@@ -1,4 +1,4 @@
-// What a file holds by its looks.
+// Guesses what a file holds.
 
 #include "tools/likely_content.h"
 
@@ -9,22 +9,22 @@
 namespace tools {
 namespace {
 
-// Text in UTF-8, Latin-1 or UTF-16. A record of a snapshot has control characters, or pairs of
-// bytes that are all zeros, the upper halves of its numbers, or all ones, which is erased flash.
+// Text in UTF-8, Latin-1 or UTF-16. A snapshot's record has control characters instead, or pairs of
+// bytes 0, the upper halves of its numbers, or pairs of bytes 0xff, which is erased flash.
 bool LooksLikeText(std::string_view beginning) {
   beginning = beginning.substr(0, sizeof(SnapshotRecord));
   for (size_t i = 0; i < beginning.size(); ++i) {
     const auto byte = static_cast<unsigned char>(beginning[i]);
-    const bool isHalf = i % 2 == 1 && beginning[i] == beginning[i - 1];
-    if (isHalf && (byte == 0 || byte == 0xff)) return false;
+    const bool isEqualPair = i % 2 == 1 && beginning[i] == beginning[i - 1];
+    if (isEqualPair && (byte == 0 || byte == 0xff)) return false;
     if (byte > 0 && byte < '\t') return false;
     if (byte > '\r' && byte < ' ' && byte != '\x1b') return false;
   }
   return true;
 }
 
-// Of records with a known key and its number of values a snapshot has hardly two. A newer firmware
-// has others, too.
+// A snapshot hardly has more than two records with a known key and its number of values. Statistics
+// of a newer firmware may have almost three times as many others.
 bool LooksLikeStatistics(MorwickStream stream, std::string_view beginning) {
   uint64_t known = 0;
   uint64_t others = 0;

@@ -1,4 +1,4 @@
-// What a file holds by its looks, for a note before it is printed as something else.
+// Guesses what a file holds, for a note when it does not look like a snapshot.
 #ifndef TOOLS_LIKELY_CONTENT_H
 #define TOOLS_LIKELY_CONTENT_H
 
@@ -7,7 +7,7 @@
 
 namespace tools {
 
-// What the beginning of something that is no snapshot looks like: text, statistics, packed data.
+// What the beginning looks like: "text", "statistics" or, for packed data, such as "zip data".
 // Empty when it may be a snapshot.
 std::string OtherThanSnapshot(std::string_view beginning);
 

@@ -17,7 +17,8 @@
 namespace tools {
 namespace {
 
-// The argument parser needs memory before main begins. Nobody could catch an exception there.
+// The argument parser needs memory before main begins, where nobody could catch an exception. This
+// runs before all constructors of the program: 101 is the first priority that is not reserved.
 [[gnu::constructor(101)]] void EndBeforeMainWithoutMemory() {
   std::set_new_handler([] {
     std::fputs("morwick: out of memory\n", stderr);
@@ -37,7 +38,6 @@ std::string KnownCommands(const CLI::App &app) {
   return fmt::format("{}", fmt::join(names, ", "));
 }
 
-// morwick help [COMMAND]
 void AddHelp(CLI::App &app, Action *action) {
   CLI::App *help = app.add_subcommand("help", "Say what a sub-command does and takes");
   const auto name = std::make_shared<std::string>();
@@ -54,7 +54,7 @@ void AddHelp(CLI::App &app, Action *action) {
   });
 }
 
-constexpr char kMissing[] = "a value is missing";
+constexpr char kValueMissing[] = "a value is missing";
 
 // Refuses an option with an empty value, such as --write=. The argument parser would take the next
 // word as its value.
@@ -63,7 +63,7 @@ void RefuseEmptyValues(int argc, char **argv) {
     const std::string_view word = argv[i];
     if (word == "--") break;
     if (word.starts_with("--") && word.find('=') == word.size() - 1) {
-      throw CLI::ValidationError(std::string(word.substr(0, word.size() - 1)), kMissing);
+      throw CLI::ValidationError(std::string(word.substr(0, word.size() - 1)), kValueMissing);
     }
   }
 }
@@ -72,7 +72,7 @@ void RefuseEmptyValues(int argc, char **argv) {
 void RefuseEmptyWords(const CLI::App &command) {
   for (const CLI::Option *option : command.get_options()) {
     if (option->nonpositional() && std::ranges::count(option->results(), "") > 0) {
-      throw CLI::ValidationError(option->get_name(), kMissing);
+      throw CLI::ValidationError(option->get_name(), kValueMissing);
     }
   }
 }

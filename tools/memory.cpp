@@ -29,7 +29,7 @@ void OnRefusal() {
 
 void LimitMemory() {
   std::set_new_handler(OnRefusal);
-#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)  // these need more
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)  // sanitizers need more
   rlimit limit = {};
   if (getrlimit(RLIMIT_AS, &limit) != 0 || limit.rlim_cur <= kMemoryLimit) return;
   limit.rlim_cur = kMemoryLimit;
@@ -52,7 +52,7 @@ bool MemoryWasRefused() { return refused; }
 bool TakeMemoryRefusal() { return refused && !refusalTaken.exchange(true); }
 
 // The limit counts address space, so pages that cannot be touched are enough and cost no memory.
-// They come from the system: after a full heap, the heap may have no block of that size left.
+// They come from the system, because a heap that was full may have no block of that size left.
 MemoryReserve::MemoryReserve(size_t size)
     : room_(mmap(nullptr, size, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0)), size_(size) {
   if (IsHeld()) held = this;

@@ -6,13 +6,13 @@
 
 namespace tools {
 
-// Call it once, before anything else. From then on the command takes at most 1 GiB, or less when
-// its caller has set a lower limit: a hostile dump then ends with a message. When C++ is refused
+// Call it once, at the start. From then on the command takes at most 1 GiB, or less when its caller
+// has set a lower limit: a hostile dump then ends with a message. When operator new is refused
 // memory, this is remembered. A reserve, if one is held, is given up; otherwise std::bad_alloc is
 // thrown.
 void LimitMemory();
 
-// For memory that is refused outside of operator new: the first remembers it, the second also
+// For memory that is refused outside of operator new: both remember the refusal, and the second
 // throws std::bad_alloc.
 void NoteMemoryRefusal();
 [[noreturn]] void RefuseMemory();
@@ -24,8 +24,8 @@ bool MemoryWasRefused();
 // Whether memory was refused since the last call.
 bool TakeMemoryRefusal();
 
-// A reserve for work that must be finished once it has begun. The first allocation of C++ that is
-// refused meanwhile gives it up and is tried again. Only one may exist at a time.
+// A reserve for work that must be finished once it has begun. When operator new is refused memory
+// meanwhile, the reserve is given up and operator new tries again. Only one may exist at a time.
 class MemoryReserve {
  public:
   explicit MemoryReserve(size_t size);

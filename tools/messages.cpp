@@ -20,7 +20,7 @@ namespace {
 constexpr size_t kMostKept = 1000;
 
 bool keeping = false;
-uint64_t linesPrinted = 0;
+uint64_t linesPrinted = 0;  // on a terminal
 std::vector<Message> kept;
 uint64_t leftOut = 0;
 

@@ -23,21 +23,21 @@ enum Status {
 void Complain(const std::string &subject, const std::string &reason);
 void Note(const std::string &subject, const std::string &reason);
 
-// Complains of wrong arguments, and returns the status for them; `help` are the arguments with
-// which morwick explains the right ones.
+// Complains of wrong arguments, and returns the status for them. `help` has the arguments that make
+// morwick explain the right ones.
 Status RefuseUsage(const std::string &reason, const std::string &help = "--help");
 
 // A line on the terminal that tells how far the work is. It is written again and again in the same
 // place.
 class ProgressLine {
  public:
-  // The line stays away for the first milliseconds; for ever where it is not shown.
+  // The line first appears after the delay, or never when it is not shown.
   ProgressLine(bool isShown, std::chrono::milliseconds delay);
   ~ProgressLine() { Clear(); }
   ProgressLine(const ProgressLine &) = delete;
   ProgressLine &operator=(const ProgressLine &) = delete;
 
-  // Whether to write it now, at its beginning.
+  // Whether the caller must write the line now, from its beginning ("\r").
   bool IsDue();
   // Call it before another line is printed.
   void Clear();
@@ -50,11 +50,11 @@ class ProgressLine {
 // Complains that memory was refused. It needs no memory, and prints its line only once.
 void ComplainOfMemory();
 
-// From then on messages are kept, a thousand at most, until an object of JSON prints them.
+// From this call on messages are kept, a thousand at most, until an object of JSON prints them.
 void KeepMessages();
 
 struct Message {
-  std::string_view severity;  // error, note
+  std::string_view severity;  // "error" or "note"
   std::string text;
 };
 
@@ -62,7 +62,7 @@ struct Message {
 // one tells how many more there were.
 std::vector<Message> TakeMessages();
 
-// How many lines were printed so far.
+// How many messages were printed on a terminal so far, without those of ComplainOfMemory.
 uint64_t LinesPrinted();
 
 }  // namespace tools

@@ -22,7 +22,7 @@ namespace {
 
 using std::chrono::steady_clock;
 
-constexpr mode_t kCollectorsMode = 0644;  // the collector runs as another user
+constexpr mode_t kFileMode = 0644;  // the collector reads the file as another user
 
 struct Label {
   std::string key;
@@ -37,7 +37,7 @@ struct File {
 struct Options {
   std::vector<Label> labels;
   std::vector<File> files;
-  std::vector<std::string> names;  // each of one of the streams
+  std::vector<std::string> names;  // of statistics
   Filter filter;
   std::string className;
   std::string output;  // empty for standard output
@@ -70,7 +70,7 @@ double FileTime(const std::string &file) {
          static_cast<double>(status.st_mtim.tv_nsec) * 1e-9;
 }
 
-// One sample for each series: its last value, in the place of its first.
+// One sample for each series, because Prometheus refuses two: the last value, in the first's place.
 std::vector<Sample> SamplesOf(const Statistics &statistics) {
   std::vector<Sample> samples = {};
   std::map<std::pair<std::string, std::string>, size_t> places;
@@ -116,7 +116,7 @@ std::vector<Reading> ReadFiles(const Options &options) {
   return readings;
 }
 
-// Sets the class of the controller when one was found.
+// Sets `*className` to the class of the controller, if one was found.
 std::vector<Reading> ReadLive(const Options &options, std::string *className) {
   Controller controller(options.className, "kvr");
   *className = controller.name();
@@ -132,10 +132,10 @@ std::vector<Reading> ReadLive(const Options &options, std::string *className) {
 // Labels as they stand in a line, without those that have no value.
 std::string ListOf(const std::vector<Label> &labels) {
   std::string list;
-  for (const auto &[key, label] : labels) {
-    if (label.empty()) continue;
+  for (const auto &[key, value] : labels) {
+    if (value.empty()) continue;
     list += (list.empty() ? "" : ",") + key + "=\"";
-    for (const char c : ValidText(label)) {
+    for (const char c : ValidText(value)) {
       if (c == '\\' || c == '"') list += '\\';
       list += c == '\n' ? std::string("\\n") : std::string(1, c);
     }
@@ -144,7 +144,7 @@ std::string ListOf(const std::vector<Label> &labels) {
   return list;
 }
 
-// The exposition, family by family.
+// The whole text, family by family: a family is all lines of one metric.
 std::string Compose(const Options &options, const std::string &className,
                     const std::vector<Reading> &readings) {
   std::string text;
@@ -191,10 +191,10 @@ Status Print(const Options &options) {
   if (options.files.empty()) NoteUnreadInput();
   const std::string text = Compose(options, className, readings);
   const Status status = std::ranges::all_of(readings, &Reading::good) ? kGood : kBadData;
-  return WriteWhole(text, options.output, status, kCollectorsMode);
+  return WriteWhole(text, options.output, status, kFileMode);
 }
 
-// Splits KEY=VALUE. The key must be valid for Prometheus, and none of our own.
+// Splits KEY=VALUE. The key must be valid for Prometheus, and not one of our own.
 Label SplitLabel(const std::string &text) {
   constexpr std::string_view kOurs[] = {"stream",     "name",    "index",
                                         "controller", "version", "platform"};
@@ -220,7 +220,7 @@ File SplitFile(const std::string &text) {
   return {*stream, text.substr(split + 1)};
 }
 
-// Takes pairs that `split` makes of texts; each key may be given only once.
+// Returns a function that appends to `pairs` what `split` makes of texts; each key only once.
 template <typename Pair, typename Key>
 auto TakeOnce(std::vector<Pair> *pairs, Key Pair::*key, Pair (*split)(const std::string &text),
               const std::string &option) {
@@ -262,7 +262,7 @@ void AddMetrics(CLI::App &app, Action *action) {
     }
     std::vector<MorwickStream> streams;
     for (const File &file : options->files) streams.push_back(file.stream);
-    if (streams.empty()) streams = {kMorwickKVR, kMorwickMSP};  // of a controller
+    if (streams.empty()) streams = {kMorwickKVR, kMorwickMSP};  // those that ReadLive reads
     options->filter = MakeFilter(streams, options->names);
     *action = [=] { return Print(*options); };
   });

@@ -20,11 +20,11 @@ enum class Format { kNormal, kJson, kCsv };
 
 using Filter = std::shared_ptr<const fleet::Selection>;
 
-// The options that commands share which read one stream of statistics.
+// The options of the commands that read one stream of statistics.
 struct StreamOptions {
   MorwickStream stream = kMorwickKVR;
   std::vector<std::string> names;
-  Filter filter;  // of the names
+  Filter filter;  // made of the names; null without names
   std::string className;
   Format format = Format::kNormal;
 };
@@ -51,9 +51,9 @@ void AddController(CLI::App *command, std::string *className, const std::string 
 // -w, --write: the name of a file, instead of standard output.
 void AddWrite(CLI::App *command, std::string *file, const std::string &description);
 
-constexpr double kMostSeconds = 1e9;
+constexpr double kMostSeconds = 1e9;  // as nanoseconds they fit 64 bits
 
-// A number from `least` to `most`: a whole one, or seconds with or without a fraction.
+// An option with a number from `least` to `most`: whole, or seconds when `Number` is a double.
 template <typename Number, typename Value>
 void AddNumber(CLI::App *command, const std::string &name, Value *value, Number least, Number most,
                const std::string &description) {

@@ -36,7 +36,7 @@ void PrepareStreams() {
 
   outputDescriptor = fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
   dup2(STDERR_FILENO, STDOUT_FILENO);
-  std::setvbuf(stdout, nullptr, _IONBF, 0);
+  std::setvbuf(stdout, nullptr, _IONBF, 0);  // its lines and messages stay in order
   std::signal(SIGPIPE, SIG_IGN);
 }
 
@@ -70,7 +70,7 @@ Output::Size Output::Window() {
 }
 
 bool Output::WaitWithReader(const timespec &time, const sigset_t &mask) {
-  pollfd reader = {outputDescriptor, 0, 0};  // an error is reported unasked
+  pollfd reader = {outputDescriptor, 0, 0};  // POLLERR is reported unasked
   if (ppoll(&reader, 1, &time, &mask) > 0) error_ = EPIPE;
   return error_ == 0;
 }

@@ -1,4 +1,4 @@
-// Standard output of the morwick command, and files that it writes.
+// Standard output of the morwick command.
 #ifndef TOOLS_OUTPUT_H
 #define TOOLS_OUTPUT_H
 
@@ -15,8 +15,8 @@ namespace tools {
 // that writing to it fails.
 void PrepareStreams();
 
-// The descriptor that now stands for what this number meant when the command was started; -1 for
-// one of the command's own.
+// The descriptor that now has the file which `number` had when the command was started; -1 for one
+// of the command's own.
 int OriginalDescriptor(int number);
 
 // Whether data goes to a terminal.
@@ -45,8 +45,8 @@ class Output {
     buffer_[length_++] = c;
   }
 
-  // Writes the buffer out, because a reader at the other end of a pipe waits for it. At a terminal
-  // the first bytes of a character stay in the buffer until the rest has come.
+  // Writes the buffer out, because a reader may wait for it. On a terminal the first bytes of a
+  // character stay in the buffer until the rest has come. False when writing has failed.
   bool Flush();
 
   // Writes the buffer out, then a control sequence for the terminal.
@@ -67,7 +67,7 @@ class Output {
   Status Finish(Status status);
 
  private:
-  static constexpr size_t kRoom = 64 << 10;
+  static constexpr size_t kRoom = 64 << 10;  // bytes
 
   bool WriteOut(std::string_view bytes);
 

@@ -1,4 +1,4 @@
-// morwick read: saves a buffer of a controller byte by byte.
+// morwick read: saves a buffer of a controller as it came.
 
 #include <memory>
 

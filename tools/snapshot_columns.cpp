@@ -32,13 +32,13 @@ SnapshotColumns::SnapshotColumns(const char *header)
     const bool isTriple = field.kind == kMorwickFieldPriorities;
     for (uint32_t part = 0; part < (isTriple ? 3 : 1); ++part) {
       const auto &[label, column] = field.names[part];
-      for (uint32_t k = 0; k < std::max(field.priorities, 1U); ++k) {
-        std::string name = ValidText(column);  // JSON would make names equal that differ
-        if (isTriple) name.append("_").append(std::to_string(k));
-        // Labels differ, but one may be RO_0 and another the RO of priorities.
+      for (uint32_t priority = 0; priority < std::max(field.priorities, 1U); ++priority) {
+        std::string name = ValidText(column);  // JSON would do so, and make two names equal
+        if (isTriple) name.append("_").append(std::to_string(priority));
+        // Labels differ, but one may be RO_0, which is also the first name of the priorities RO.
         while (!names.insert(name).second) name += "_2";
         const size_t offset =
-            field.offset + k * sizeof(SnapshotOperations) + part * sizeof(uint32_t);
+            field.offset + priority * sizeof(SnapshotOperations) + part * sizeof(uint32_t);
         columns_.push_back({name, label, field.kind, static_cast<uint32_t>(offset)});
       }
     }

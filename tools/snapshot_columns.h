@@ -12,7 +12,7 @@
 namespace tools {
 
 struct SnapshotColumn {
-  std::string name;  // each one another, in UTF-8
+  std::string name;  // unique, in UTF-8
   std::string label;
   MorwickFieldKind kind;
   uint32_t offset;  // of its 32 bits in the record
@@ -20,19 +20,19 @@ struct SnapshotColumn {
 
 class SnapshotColumns {
  public:
-  // One for each number, in the order of the text. Null stands for the fixed layout; any other
-  // header has passed fleet::CheckSnapshotHeader.
+  // A column for each number, in the order of the text. Null stands for the fixed layout; any other
+  // header must have passed fleet::CheckSnapshotHeader.
   explicit SnapshotColumns(const char *header);
 
-  // Why the records are no table; empty when they are.
+  // Why the records cannot be a table; empty when they can.
   const std::string &fault() const { return fault_; }
 
   const std::vector<SnapshotColumn> &all() const { return columns_; }
 
-  // Where the numbers with that label are, one for each priority; those of thousandths are none.
+  // The offsets of the numbers with that label, one for each priority. Thousandths are left out.
   std::vector<uint32_t> OffsetsOf(std::string_view label) const;
 
-  // Whether the text leaves the record out. It is whole, and there is no fault.
+  // Whether the text leaves the record out. The record must be whole, and fault() empty.
   bool LeavesOut(std::string_view record) const;
 
  private:

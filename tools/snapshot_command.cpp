@@ -1,5 +1,4 @@
-// morwick snapshot: prints a snapshot as the library's text, as CSV or JSON, or what it says as a
-// whole.
+// morwick snapshot: prints a snapshot as the library's text, as CSV or JSON, or its summary.
 
 #include <fmt/format.h>
 
@@ -39,8 +38,8 @@ struct Snapshot {
   std::string name;                   // in complaints
   std::optional<std::string> header;  // none: the fixed layout
   std::string headerName;
-  std::optional<std::string> bytes;        // of a controller
-  std::optional<SnapshotColumns> columns;  // where they are needed
+  std::optional<std::string> bytes;        // read from a controller; none: read the file
+  std::optional<SnapshotColumns> columns;  // unless the text is printed
   Status status = kGood;
 };
 
@@ -62,12 +61,12 @@ void ReadLive(const Options &options, Snapshot *snapshot) {
   if (snapshot->bytes) snapshot->status = kGood;
 }
 
-// Checks the header, if there is one, and reads the columns from it where they are needed. What is
-// wrong with it, empty for a good one.
+// Checks the header, if there is one, and takes the columns from it if they are needed. Returns its
+// fault; empty for a good one.
 std::string CheckLayout(const Options &options, Snapshot *snapshot) {
   if (snapshot->header) {
-    std::string wrong = fleet::CheckSnapshotHeader(*snapshot->header);
-    if (!wrong.empty()) return wrong;
+    std::string fault = fleet::CheckSnapshotHeader(*snapshot->header);
+    if (!fault.empty()) return fault;
   }
   if (options.format == Format::kNormal && !options.summary) return "";
   snapshot->columns.emplace(snapshot->header ? snapshot->header->data() : nullptr);
@@ -76,7 +75,7 @@ std::string CheckLayout(const Options &options, Snapshot *snapshot) {
   return missing.empty() ? "" : "does not describe " + missing + ", which --summary needs";
 }
 
-// Everything but the records of a file.
+// Reads and checks everything but the records of a file.
 Snapshot Prepare(const Options &options) {
   Snapshot snapshot;
   snapshot.source = {"file", options.file};
@@ -92,15 +91,15 @@ Snapshot Prepare(const Options &options) {
     snapshot.header = std::move(header.bytes);
   }
   if (snapshot.status != kGood) return snapshot;
-  const std::string wrong = CheckLayout(options, &snapshot);
-  if (!wrong.empty()) {
-    Complain(snapshot.headerName, wrong);
+  const std::string fault = CheckLayout(options, &snapshot);
+  if (!fault.empty()) {
+    Complain(snapshot.headerName, fault);
     snapshot.status = kBadData;
   }
   return snapshot;
 }
 
-// Each of the functions that print returns false when reading has failed.
+// Each function below that returns a bool returns false when reading has failed.
 
 // The library's text: legend, lines, an empty line.
 bool PrintFixedText(Output &output, SnapshotRecords &records) {
@@ -112,8 +111,8 @@ bool PrintFixedText(Output &output, SnapshotRecords &records) {
   return good;
 }
 
-// The library's text in the layout of the header. The status is bad when records are too long. A
-// hostile file has millions of them, so the first few are named and the others are counted.
+// The library's text in the layout of the header. Records that are too long make the status bad. A
+// hostile file may have millions, so the first few are named and the others are counted.
 bool PrintDescribedText(Output &output, SnapshotRecords &records, const Snapshot &snapshot,
                         Status *status) {
   constexpr uint64_t kMostNamed = 3;
@@ -137,8 +136,8 @@ bool PrintDescribedText(Output &output, SnapshotRecords &records, const Snapshot
   return good;
 }
 
-// Calls `take` with each record that the text has too. The output, if `take` writes to one, is
-// flushed after each block that came.
+// Calls `take` with each record that the text does not leave out. The output, if `take` writes to
+// one, is flushed after each block.
 template <typename TakeRecord>
 bool ForEachRecord(SnapshotRecords &records, const SnapshotColumns &columns, Output *output,
                    TakeRecord take) {
@@ -188,7 +187,7 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records,
   return good;
 }
 
-// Nothing is written before all records have come: an object that was begun must be ended.
+// Nothing is flushed before all records have come: refused memory then leaves no half object.
 bool PrintSummary(Output &output, Json *json, SnapshotRecords &records,
                   const SnapshotColumns &columns) {
   SnapshotSummary summary(columns);
@@ -202,14 +201,14 @@ bool PrintSummary(Output &output, Json *json, SnapshotRecords &records,
   return good;
 }
 
-// Says where the records end, when that is not as promised.
+// Says where the records end, unless they end as promised.
 Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, uint64_t promised) {
-  const auto ofPromised = [&] {
+  const auto promisedRecords = [&] {
     return std::to_string(promised) + " records that " + snapshot.headerName + " promises";
   };
   if (snapshot.header && records.count() < promised) {
     Complain(snapshot.name,
-             "ends after " + std::to_string(records.count()) + " of " + ofPromised());
+             "ends after " + std::to_string(records.count()) + " of " + promisedRecords());
     return kBadData;
   }
   if (!snapshot.header && records.rest() > 0) {
@@ -218,12 +217,11 @@ Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, uint64
     return kBadData;
   }
   if (records.rest() > records.recordSize()) {  // more than the record that is not printed
-    Note(snapshot.name, "goes on after the " + ofPromised());
+    Note(snapshot.name, "goes on after the " + promisedRecords());
   }
   return kGood;
 }
 
-// Prints in the format that was asked for.
 Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &output, Json *json) {
   if (snapshot.status != kGood) return snapshot.status;
   size_t recordSize = sizeof(SnapshotRecord);
@@ -243,7 +241,7 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
     return count;
   };
   SnapshotRecords records(read, recordSize, promised);
-  if (!records.Load()) return kBadUsage;
+  if (!records.Load()) return kUnreadable;
   if (records.rest() == 0) {
     Complain(snapshot.name, "there is nothing in it");
     return kBadData;
@@ -265,8 +263,8 @@ Status PrintRecords(const Options &options, const Snapshot &snapshot, Output &ou
   } else {
     good = PrintFixedText(output, records);
   }
-  if (!good) return kBadUsage;
-  if (!output.Flush()) return status;  // what is left then says nothing about the snapshot
+  if (!good) return kUnreadable;
+  if (!output.Flush()) return status;  // the end may not have been reached
   return std::max(status, JudgeEnd(snapshot, records, promised));
 }
 

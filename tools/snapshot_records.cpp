@@ -8,7 +8,7 @@
 namespace tools {
 namespace {
 
-constexpr size_t kBlockSize = 64 << 10;
+constexpr size_t kBlockSize = 64 << 10;  // bytes; stays in the cache
 
 }  // namespace
 
@@ -21,7 +21,7 @@ SnapshotRecords::SnapshotRecords(ReadBytes read, size_t recordSize, uint64_t mos
 bool SnapshotRecords::Load() { return Load(recordSize_); }
 
 bool SnapshotRecords::Load(size_t size) {
-  // What is no whole record yet goes to the front.
+  // The beginning of the next record moves to the front.
   char *front = buffer_.data() + recordSize_;
   filled_ -= used_;
   std::memmove(front, front + used_, filled_);
@@ -37,6 +37,7 @@ bool SnapshotRecords::Load(size_t size) {
 
 bool SnapshotRecords::ForEachBlock(const TakeBlock &take) {
   for (;;) {
+    // After the last record, a byte more than a record tells whether the snapshot goes on.
     if (!Load(recordSize_ + (count_ == most_ ? 1 : 0))) return false;
     const uint64_t count = std::min<uint64_t>(filled_ / recordSize_, most_ - count_);
     count_ += count;

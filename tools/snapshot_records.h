@@ -12,10 +12,10 @@ namespace tools {
 
 class SnapshotRecords {
  public:
-  // Reads at most `room` bytes, none at the end. Without a value, reading has failed.
+  // Reads at most `room` bytes; 0 at the end. Returns nothing when reading has failed.
   using ReadBytes = std::function<std::optional<size_t>(char *bytes, size_t room)>;
-  // Takes a block of whole records, in front of which lies room of one record that may be read.
-  // False ends the reading.
+  // Takes a block of whole records. The bytes of one record before it may be read, which
+  // fleet::DescribedText needs. Returning false ends the reading.
   using TakeBlock = std::function<bool(std::string_view block)>;
 
   // Hands out no more than `most` records.
@@ -27,7 +27,7 @@ class SnapshotRecords {
   // Hands out the blocks as they come. False when reading has failed.
   bool ForEachBlock(const TakeBlock &take);
 
-  // What was read, and not handed out yet.
+  // The bytes that were read and not handed out yet.
   std::string_view loaded() const {
     return std::string_view(buffer_).substr(recordSize_ + used_, filled_ - used_);
   }
@@ -37,11 +37,12 @@ class SnapshotRecords {
   // How many records were handed out.
   uint64_t count() const { return count_; }
 
-  // At the end: bytes that no record has that was handed out, up to more than one record of them.
+  // How many bytes were read and not handed out; ask before ForEachBlock or after its last block.
+  // When they are more than a record, others may follow that were not read.
   size_t rest() const { return filled_; }
 
  private:
-  // Reads until so much is there, or the end.
+  // Reads until `size` bytes are there, or the end.
   bool Load(size_t size);
 
   ReadBytes read_;
@@ -49,8 +50,8 @@ class SnapshotRecords {
   uint64_t most_;
   uint64_t count_ = 0;
   std::string buffer_;
-  size_t filled_ = 0;  // after the room of one record
-  size_t used_ = 0;    // of what is filled, the block that was handed out
+  size_t filled_ = 0;  // bytes, after the room of one record
+  size_t used_ = 0;    // of these, in the block that was handed out
 };
 
 }  // namespace tools

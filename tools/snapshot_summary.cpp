@@ -1,4 +1,4 @@
-// What a snapshot says as a whole.
+// The summary of a snapshot.
 
 #include "tools/snapshot_summary.h"
 
@@ -38,7 +38,7 @@ std::string MissingForSummary(const SnapshotColumns &columns) {
   for (const std::string_view label :
        {"RO", "RL", "RM", "WO", "WL", "WM", "HR", "HW", "NR", "NW", "T"}) {
     const size_t count = columns.OffsetsOf(label).size();
-    // Latencies are there for each number of operations.
+    // Each number of operations needs its latencies.
     const bool isLatency = label.ends_with('L') || label.ends_with('M');
     const std::string operations = {label[0], 'O'};
     if (count > 0 && (!isLatency || count == columns.OffsetsOf(operations).size())) continue;
@@ -53,32 +53,33 @@ SnapshotSummary::Operations::Operations(std::string_view itsName, char letter,
   const auto offsetsOf = [&](char first, char second) {
     return columns.OffsetsOf(std::string{first, second});
   };
-  counts = offsetsOf(letter, 'O');
-  totals = offsetsOf(letter, 'L');
-  maxima = offsetsOf(letter, 'M');
-  host = offsetsOf('H', letter).front();
-  nand = offsetsOf('N', letter).front();
+  countOffsets = offsetsOf(letter, 'O');
+  totalOffsets = offsetsOf(letter, 'L');
+  maximumOffsets = offsetsOf(letter, 'M');
+  hostOffset = offsetsOf('H', letter).front();
+  nandOffset = offsetsOf('N', letter).front();
 }
 
 void SnapshotSummary::Operations::Add(uint32_t timestamp, std::string_view record) {
   const auto number = [&](uint32_t offset) { return LoadLittleEndian32(&record[offset]); };
-  hostSectors += number(host);
-  nandSectors += number(nand);
-  uint64_t operationsHere = 0;
-  uint64_t latencyHere = 0;
-  for (size_t k = 0; k < counts.size(); ++k) {
-    const SnapshotOperations group = {number(counts[k]), number(totals[k]), number(maxima[k])};
+  hostSectors += number(hostOffset);
+  nandSectors += number(nandOffset);
+  uint64_t intervalCount = 0;
+  uint64_t intervalLatency = 0;
+  for (size_t i = 0; i < countOffsets.size(); ++i) {
+    const SnapshotOperations group = {number(countOffsets[i]), number(totalOffsets[i]),
+                                      number(maximumOffsets[i])};
     bounds.Add(group);
-    operationsHere += group.count;
-    latencyHere += group.totalLatency;
+    intervalCount += group.count;
+    intervalLatency += group.totalLatency;
     if (group.maxLatency > 0 && (!maximum || group.maxLatency > maximum->latency)) {
       maximum = {timestamp, double(group.maxLatency)};
     }
   }
-  count += operationsHere;
-  totalLatency += latencyHere;
-  if (operationsHere == 0) return;
-  const Interval interval = {timestamp, *Ratio(latencyHere, operationsHere)};
+  count += intervalCount;
+  totalLatency += intervalLatency;
+  if (intervalCount == 0) return;
+  const Interval interval = {timestamp, *Ratio(intervalLatency, intervalCount)};
   // Of two that are equally slow the earlier one stays in front.
   slowest.insert(std::ranges::upper_bound(slowest, interval.latency, std::ranges::greater(),
                                           &Interval::latency),
@@ -95,13 +96,13 @@ std::optional<double> SnapshotSummary::Operations::NandPerHost() const {
 }
 
 SnapshotSummary::SnapshotSummary(const SnapshotColumns &columns)
-    : timestamp_(columns.OffsetsOf("T").front()),
+    : timestampOffset_(columns.OffsetsOf("T").front()),
       reads_("reads", 'R', columns),
       writes_("writes", 'W', columns) {}
 
 void SnapshotSummary::Add(std::string_view record) {
   ++intervals_;
-  const uint32_t timestamp = LoadLittleEndian32(&record[timestamp_]);
+  const uint32_t timestamp = LoadLittleEndian32(&record[timestampOffset_]);
   reads_.Add(timestamp, record);
   writes_.Add(timestamp, record);
 }
@@ -151,14 +152,14 @@ void SnapshotSummary::Operations::Print(Json &json) const {
     json.Member("operations", count);
     json.Member("mean_latency_us", Mean());
     for (const auto &[percent, key] : kPercentiles) {
-      const auto limits = bounds.Percentile(percent);
-      if (!limits) {
+      const auto percentile = bounds.Percentile(percent);
+      if (!percentile) {
         json.Member(key, std::nullopt);
         continue;
       }
       json.Object(key, [&] {
-        json.Member("least", limits->least);
-        json.Member("most", limits->most);
+        json.Member("least", percentile->least);
+        json.Member("most", percentile->most);
       });
     }
     if (maximum) {

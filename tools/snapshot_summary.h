@@ -1,4 +1,4 @@
-// What a snapshot says as a whole: operations and latencies, sectors, the slowest intervals.
+// The summary of a snapshot: operations and latencies, sectors, the slowest intervals.
 #ifndef TOOLS_SNAPSHOT_SUMMARY_H
 #define TOOLS_SNAPSHOT_SUMMARY_H
 
@@ -15,17 +15,17 @@
 
 namespace tools {
 
-// The labels that the summary needs and the columns lack: "RM, HR"; empty when there are all.
+// The labels that the summary needs and the columns lack, such as "RM, HR"; empty for none.
 std::string MissingForSummary(const SnapshotColumns &columns);
 
 class SnapshotSummary {
  public:
-  // No label must be missing.
+  // MissingForSummary must be empty for these columns.
   explicit SnapshotSummary(const SnapshotColumns &columns);
 
   void Add(std::string_view record);
 
-  // Once, when all records were taken.
+  // Call it when all records are added.
   void Print(Output &output) const;
   void Print(Json &json) const;
 
@@ -38,7 +38,7 @@ class SnapshotSummary {
 
   // The reads, or the writes, of all priorities.
   struct Operations {
-    // `letter` is that of their labels.
+    // `letter` is the R or W of their labels.
     Operations(std::string_view name, char letter, const SnapshotColumns &columns);
 
     void Add(uint32_t timestamp, std::string_view record);
@@ -47,9 +47,9 @@ class SnapshotSummary {
     void Print(Json &json) const;
 
     std::string_view name;
-    // Where the numbers are, those of operations by priority.
-    std::vector<uint32_t> counts, totals, maxima;
-    uint32_t host, nand;
+    // In a record; those of operations by priority.
+    std::vector<uint32_t> countOffsets, totalOffsets, maximumOffsets;
+    uint32_t hostOffset, nandOffset;
 
     uint64_t count = 0;
     uint64_t totalLatency = 0;
@@ -60,7 +60,7 @@ class SnapshotSummary {
     uint64_t nandSectors = 0;
   };
 
-  uint32_t timestamp_;  // where it is
+  uint32_t timestampOffset_;
   Operations reads_;
   Operations writes_;
   uint64_t intervals_ = 0;

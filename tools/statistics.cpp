@@ -68,7 +68,7 @@ Statistics::Statistics(const Dump &dump, MorwickStream stream,
   const char *bytes = dump.bytes->data();
   const auto size = static_cast<uint32_t>(dump.bytes->size());
   // A parse may use up all memory. Printing its entries still needs some.
-  MemoryReserve reserve(8 << 20);
+  MemoryReserve reserve(8 << 20);  // bytes
   errno = 0;
   switch (stream) {
     case kMorwickKVR:

@@ -38,7 +38,7 @@ Dump ReadDumpLive(MorwickStream stream, const std::string &className);
 // Reads it through an open connection.
 Dump ReadDump(Controller &controller, MorwickStream stream);
 
-// An entry of the two lists.
+// An entry: a name and its value, from the two lists of a parser context.
 struct Entry {
   const ContextNode *nameNode;
   const ContextNode *valueNode;
@@ -75,7 +75,7 @@ class EntryIterator {
   const fleet::Selection *filter_;
 };
 
-// The lists of a dump, parsed by the functions in its row.
+// The entries of a dump, as the parser in its row makes them.
 class Statistics {
  public:
   Statistics(const Dump &dump, MorwickStream stream,
@@ -138,7 +138,7 @@ struct EntryGroup {
   }
 };
 
-// Takes the next group of entries, and goes on to what follows it; nothing after the last one.
+// Returns the next group of entries and moves `*next` past it; nothing after the last group.
 std::optional<EntryGroup> TakeGroup(EntryIterator *next);
 
 // The summary fields that the dump has, in the order of KVRStatsCxt, then the write amplification.

@@ -28,15 +28,15 @@ size_t LabelLength(const EntryGroup &group) {
          (group.IsArray() ? fmt::formatted_size("[0..{}]", group.count - 1) : 0);
 }
 
-// Each label stands left in the width of the longest one.
+// Prints the label, left-aligned in the width of the longest one.
 void PrintLabel(Output &output, std::string_view label, size_t width) {
-  static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');
+  static const std::string blanks(sizeof(ContextNode::text) + 32, ' ');  // a name and [0..N]
   output.Write(label);
   output.Write(std::string_view(blanks).substr(0, width - label.size()));
   output.Write(" : ");
 }
 
-// Prints each group, so each array, in one line.
+// Prints one line for each group, so also for each array.
 void PrintGroups(Output &output, const Statistics &statistics) {
   size_t width = 0;
   for (EntryIterator next = statistics.begin(); const auto group = TakeGroup(&next);) {

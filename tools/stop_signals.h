@@ -9,11 +9,11 @@
 
 namespace tools {
 
-// While one exists, SIGINT, SIGTERM and SIGHUP are remembered, so that the output ends with a whole
-// line. A second signal of the same kind ends the process, even when it hangs. SIGHUP stays ignored
-// if it was ignored (by nohup). SIGINT does not stay ignored: shells ignore it for all background
-// jobs. A change of the window's size (SIGWINCH) and a return from the background (SIGCONT) are
-// remembered too.
+// Once there is one, SIGINT, SIGTERM and SIGHUP are remembered, so that the output ends with a
+// whole line. A second signal of the same kind ends the process, even when it hangs. SIGHUP stays
+// ignored if it was ignored (by nohup). SIGINT does not stay ignored: shells ignore it for all
+// background jobs. A change of the window's size (SIGWINCH) and a return from the background
+// (SIGCONT) are remembered too.
 class StopSignals {
  public:
   StopSignals();
@@ -24,7 +24,7 @@ class StopSignals {
   enum class End { kTime, kResized, kContinued, kStopped };
 
   // Waits until the moment, until a signal arrives, or until the reader of the output has gone
-  // away.
+  // away, which is kStopped too.
   End WaitUntil(std::chrono::steady_clock::time_point moment, Output &output);
 
   // Ends the process by the signal that arrived; one must have arrived.

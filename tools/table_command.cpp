@@ -54,11 +54,11 @@ struct Options {
 // The command limits its memory. Threads with stacks and heaps of the usual size would take most of
 // it.
 void KeepThreadsSmall() {
-  constexpr size_t kStack = 512 << 10;
+  constexpr size_t kStackSize = 512 << 10;  // bytes; 8 MiB are usual
   mallopt(M_ARENA_MAX, 2);
   pthread_attr_t attributes;
   if (pthread_attr_init(&attributes) != 0) return;
-  pthread_attr_setstacksize(&attributes, kStack);
+  pthread_attr_setstacksize(&attributes, kStackSize);
   pthread_setattr_default_np(&attributes);
   pthread_attr_destroy(&attributes);
 }
@@ -95,7 +95,7 @@ std::jthread CountFiles(const Options &options, std::atomic<uint64_t> *total) {
       for (fleet::ListedFile file; files.Next(&file); ++count) {
         if (stop.stop_requested()) return;
       }
-    } catch (const std::bad_alloc &) {  // those who read will say so
+    } catch (const std::bad_alloc &) {  // the threads that read will say so
       return;
     }
     *total = count;
@@ -173,7 +173,7 @@ Status PrintRows(const Options &options, std::FILE *list, bool showProgress, Out
 
 Status PrintTable(Options options) {
   std::FILE *list = nullptr;
-  if (!OpenList(options, &list)) return kBadUsage;
+  if (!OpenList(options, &list)) return kUnreadable;
   if (IsPipe(list)) options.table.batchSize = 1;
   const bool showProgress = isatty(STDERR_FILENO) != 0 && !OutputIsTerminal();
   StopSignals signals;
@@ -185,7 +185,7 @@ Status PrintTable(Options options) {
   try {
     status = PrintRows(options, list, showProgress, output);
   } catch (const std::bad_alloc &) {
-    output.Flush();  // the last row would be cut
+    output.Flush();  // or the last row would be cut
     throw;
   }
   if (StopSignals::Stopped() != 0) {

@@ -1,4 +1,4 @@
-// Texts and numbers that come from outside.
+// Cleans texts for terminals, JSON and CSV; reads and writes numbers.
 
 #include "tools/text.h"
 

@@ -1,4 +1,4 @@
-// Texts and numbers that come from outside.
+// Cleans texts for terminals, JSON and CSV; reads and writes numbers.
 #ifndef TOOLS_TEXT_H
 #define TOOLS_TEXT_H
 
@@ -44,7 +44,7 @@ std::optional<Number> ParseNumber(std::string_view text, Number least, Number mo
   return number;
 }
 
-// For tables and series: 12.345.
+// Such as 12.345.
 std::string ThreeDecimals(double number);
 
 }  // namespace tools

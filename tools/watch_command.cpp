@@ -112,7 +112,7 @@ class RedrawnBlock {
   Output &output_;
   std::vector<std::string> lines_;
   std::vector<size_t> drawn_;  // the length of each line on the screen
-  uint64_t printed_ = 0;
+  uint64_t printed_ = 0;       // LinesPrinted() at the last drawing
 };
 
 // Reads again and again, and prints what changed since the last good reading.
@@ -123,7 +123,7 @@ class Watcher {
     if (options.format == Format::kCsv) output_.Write("time,name,value,difference,rate\n");
   }
 
-  // Reads once. False when nobody reads the output any more.
+  // Reads once. False when writing has failed.
   bool Read() {
     auto reading = std::make_unique<Reading>(options_);
     // Later readings are of the same controller. A search by class does not print that it was

@@ -37,7 +37,7 @@ struct Place {
 };
 
 // Finds the folder and the name of a path. `from` is the folder that a relative path starts in.
-// This function and those below return 0, or the error number as in errno.
+// The functions that return an int return 0, or the error number as in errno.
 int FindPlace(int from, const path &file, Place *place) {
   // The dot makes the kernel follow a link to a folder under its rules for links within a path.
   const path parent = file.parent_path() / ".";
@@ -114,21 +114,21 @@ std::string TemporaryName(const std::string &name) {
   return temporary;
 }
 
-// Writes a temporary file under the name `beside`, then renames it.
-int Replace(const Place &place, const std::string &beside, std::string_view bytes,
+// Writes a file under a temporary name, then renames it.
+int Replace(const Place &place, const std::string &temporary, std::string_view bytes,
             std::optional<mode_t> mode) {
   const int folder = place.folder.number();
-  Descriptor file(openat(folder, beside.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+  Descriptor file(openat(folder, temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
   if (!file.open()) return errno;
   const mode_t mask = umask(0);
   umask(mask);
   const bool replaced = WriteAll(file.number(), bytes) == 0 &&
                         fchmod(file.number(), mode.value_or(0666 & ~mask)) == 0 &&
                         fsync(file.number()) == 0 && file.Close() == 0 &&
-                        renameat(folder, beside.c_str(), folder, place.name.c_str()) == 0;
+                        renameat(folder, temporary.c_str(), folder, place.name.c_str()) == 0;
   if (replaced) return 0;
   const int error = errno;
-  unlinkat(folder, beside.c_str(), 0);
+  unlinkat(folder, temporary.c_str(), 0);
   return error;
 }
 
@@ -149,12 +149,12 @@ int WriteTarget(const std::string &file, std::string_view bytes, std::optional<m
   if (const int error = FindTarget(file, &target)) return error;
   if (target.descriptor) return WriteAll(*target.descriptor, bytes);
   if (!target.isFile) return WriteThrough(target.place, bytes);
-  const std::string beside = TemporaryName(target.place.name);
+  const std::string temporary = TemporaryName(target.place.name);
   // Signals wait meanwhile. So one that ends the command leaves no temporary file.
   sigset_t all, before;
   sigfillset(&all);
   sigprocmask(SIG_BLOCK, &all, &before);
-  const int error = Replace(target.place, beside, bytes, mode);
+  const int error = Replace(target.place, temporary, bytes, mode);
   sigprocmask(SIG_SETMASK, &before, nullptr);
   return error;
 }

@@ -12,7 +12,7 @@
 
 namespace tools {
 
-// Writes to a file, or to standard output without the name of one. Returns `status`, or kBadData
+// Writes to a file or, without its name, to standard output. Returns `status`, or kBadData
 // after a complaint. A file is written whole or not at all: under a temporary name in the same
 // folder, and then renamed. It gets `mode`, or the mode that the umask allows. A link stays a link,
 // and its target is written; but a link that another user planted in a shared folder such as /tmp
