@@ -1,9 +1,8 @@
-// What the library does for the morwick command, in one process and nothing around it: what the
-// command is timed against.
-//   library_work make FOLDER    the inputs: kvr.bin of 15 MB, snapshot.bin of 100 MB
-//   library_work fleet FOLDER COUNT  so many full KVR dumps of 22 KB, in folders of 100
-//   library_work stats FILE     parses and prints a line an entry
-//   library_work snapshot FILE  renders in one call and prints the text
+// Does the library's part of the command's work, alone in a process, to time the command against.
+//   library_work make FOLDER         makes the inputs: kvr.bin of 15 MB, snapshot.bin of 100 MB
+//   library_work fleet FOLDER COUNT  makes COUNT full KVR dumps of 22 KB, in folders of 100
+//   library_work stats FILE          parses and prints a line for each entry
+//   library_work snapshot FILE       renders in one call and prints the text
 
 #include <cstdio>
 #include <cstdlib>
@@ -70,6 +69,7 @@ void Stats(const std::string &file) {
 
 void Snapshot(const std::string &file) {
   const std::string bytes = ReadAll(file);
+  // More than the legend and the longest line take.
   uint64_t size = 2048 + bytes.size() / sizeof(SnapshotRecord) * 1024;
   char *text = static_cast<char *>(std::malloc(size));
   if (KVRParseSnapshotBuffer(bytes.data(), bytes.size(), text, &size) != 1) std::abort();

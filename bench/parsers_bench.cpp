@@ -16,7 +16,7 @@ namespace {
 
 using bench::Stream;
 
-// The plain version: the same walk and the same lists.
+// The plain version makes the same walk and lists. A text has at most 98 characters, and a NUL.
 template <typename Context>
 void PlainAdd(Context *context, const char *prefix, const char *name, uint64_t value) {
   auto *valueNode = static_cast<ContextNode *>(std::calloc(1, sizeof(ContextNode)));
@@ -50,7 +50,7 @@ void PlainAddAll(Context *context, const char *name, const char *separator, cons
   }
 }
 
-// `kUnit` is that of the length in the header, in bytes.
+// The length in the header counts units of kUnit bytes.
 template <typename Word, size_t kUnit, typename Element, typename Context>
 void PlainParse(Context *context, const Stream &stream, const auto &keys, const char *separator) {
   const char *position = stream.buffer.data();
@@ -65,8 +65,8 @@ void PlainParse(Context *context, const Stream &stream, const auto &keys, const 
   }
 }
 
-// The two blocks of each entry allocated, filled with zeros as a node must be, and freed, in the
-// parsers' order.
+// Allocates the two nodes of each entry, fills them with zeros, and frees them, in the parsers'
+// order.
 void BareHeap(size_t entries) {
   static std::vector<ContextNode *> nodes;
   nodes.resize(entries * 2);
@@ -81,7 +81,7 @@ void BareHeap(size_t entries) {
 
 template <typename Parse>
 void Measure(benchmark::State &state, const Stream &stream, Parse parse) {
-  malloc_trim(0);  // every benchmark starts from a heap in one piece
+  malloc_trim(0);  // gives back freed memory, so that every benchmark starts alike
   for (auto _ : state) parse(stream);
   state.counters["ns/entry"] = benchmark::Counter(
       static_cast<double>(stream.entries) * 1e-9,
@@ -123,7 +123,7 @@ void PlainMSP(const Stream &stream) {
 
 void Heap(const Stream &stream) { BareHeap(stream.entries); }
 
-// What a tool does that wants values without lists: every value goes to its column. The columns,
+// The work of a tool that wants values without lists: every value goes to its column. The columns,
 // one for each value of each key, are looked up once, by their names.
 template <MorwickStream kKind, typename Value>
 class Columns {

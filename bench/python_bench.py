@@ -11,8 +11,8 @@ dump = next(fleet.rglob("*.bin")).read_bytes()
 
 
 def compare(what, first, second, factor=1, runs=9):
-    """Each is called in turn and returns seconds; medians, and the medians of ratios and differences.
-    The first turn only warms the caches."""
+    """Calls both in turn; each returns seconds, printed times `factor`. Prints medians, and the medians
+    of ratios and differences. The first turn only warms the caches."""
     first(), second()
     times = [(first(), second()) for _ in range(runs)]
     medians = [statistics.median(column) for column in zip(*times)]
@@ -51,7 +51,7 @@ def table(**options):
 
 
 def by_threads(count, function, data, times):
-    """The same work, shared by so many threads."""
+    """The seconds that `count` threads take for the same work together."""
     def work():
         for _ in range(times // count): function(data)
 

@@ -40,7 +40,7 @@ const std::vector<SnapshotRecord> &Records() {
   return records;
 }
 
-// Writes pieces as the plain version does: each bounded, each one snprintf.
+// Writes each piece with one bounded snprintf.
 class PlainWriter {
  public:
   PlainWriter(char *output, size_t capacity) : output_(output), free_(capacity) {}
@@ -64,6 +64,7 @@ class PlainWriter {
   size_t free_;
 };
 
+// The columns up to the first number of RO, which one snprintf prints.
 constexpr char kHead[] =
     "T=%04u E=%02u HR=%4u HW=%4u NR=%4u NW=%4u TH=%8u.%02u GC=%4u W=%2u BI=%3u BU=%3u V=%5u "
     "BF=%2u/%2u P=%2u H=%2u/%2u X=%2u/%2u L=%3u/%3u C=%2u/%2u S=%4u U=%8u RO=%4u";
@@ -98,7 +99,7 @@ size_t PlainFixed(char *output, size_t capacity) {
   return static_cast<size_t>(writer.end() - output);
 }
 
-// The columns one by one: compiled formats of many arguments take six times as long.
+// Prints the columns one by one: one compiled format for all would take six times as long.
 size_t FmtFixed(char *output, size_t) {
   char *end = fmt::format_to(output, FMT_COMPILE("{}"), morwick::kSnapshotLegend);
 #define PRINT(format, value) end = fmt::format_to(end, FMT_COMPILE(format), value)

@@ -13,7 +13,7 @@
 
 namespace bench {
 
-// As often small as large, as counters are.
+// A value of up to `bits` bits. Each length is equally likely, as counters may be small or large.
 inline uint64_t MixedMagnitude(std::mt19937_64 &random, int bits) {
   return random() >> (64 - static_cast<int>(random() % static_cast<unsigned>(bits)) - 1);
 }
@@ -29,8 +29,8 @@ struct Stream {
   size_t entries = 0;
 };
 
-// Every key of a stream, so many times over. A header is two of `HeaderPart`: the key, and the
-// number of its values times `lengthUnit`. Values have up to so many bits.
+// Every key of a stream, `copies` times. A header is two of `HeaderPart`: the key, and the number
+// of its values times `lengthUnit`. Values have up to `bits` bits.
 template <typename HeaderPart, typename Value>
 Stream MakeStream(MorwickStream kind, uint32_t lengthUnit, int copies, std::mt19937_64 &random,
                   int bits = 8 * sizeof(Value)) {

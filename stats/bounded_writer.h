@@ -40,8 +40,8 @@ class BoundedWriter {
     return Advance(length);
   }
 
-  // Appends the text that `write` writes. It gets room for kRoom characters and returns the end of
-  // its text.
+  // Appends the text that `write` writes. `write` gets room for kRoom characters and returns the
+  // end of its text.
   template <size_t kRoom, typename Write>
   bool AppendWritten(Write write) {
     if (Fits(kRoom)) {  // nearly always; it saves a copy
@@ -51,8 +51,7 @@ class BoundedWriter {
     return Append(std::string_view(text, write(text)));
   }
 
-  // Appends the text that `print` prints. It gets room and its size, and returns what snprintf
-  // returns.
+  // Appends the text that `print` prints, given the room and its size. `print` returns as snprintf.
   template <typename Print>
   bool AppendPrinted(Print print) {
     const int length = print(position_, free_);
@@ -60,7 +59,7 @@ class BoundedWriter {
     return Advance(static_cast<size_t>(length));
   }
 
-  // Cuts the text to this length, at most the present one. The capacity must not be 0.
+  // Ends the text at this length, at most the present one. The capacity must not be 0.
   void EndAt(uint64_t length) { start_[length] = '\0'; }
 
  private:

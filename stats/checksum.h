@@ -7,7 +7,7 @@
 
 namespace morwick {
 
-// FNV-1a, 32 bits. To continue a checksum, pass it as `sum`.
+// FNV-1a of 32 bits, with its two constants. To continue a checksum, pass it as `sum`.
 constexpr uint32_t Checksum(std::string_view text, uint32_t sum = 0x811c9dc5) {
   for (const char c : text) sum = (sum ^ static_cast<uint8_t>(c)) * 0x01000193;
   return sum;

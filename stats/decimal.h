@@ -12,7 +12,8 @@ namespace morwick {
 // byte. Multiplications make all digits at once, without a branch for each.
 constexpr uint64_t EightDigits(uint32_t value) {
   // Two groups of four digits, then four of two, then eight of one, each in its own lane. 10486 /
-  // 2^20 is 1/100 for all numbers below 43,699, and 103 / 2^10 is 1/10 for all below 179.
+  // 2^20 divides numbers below 43,699 by 100, and 103 / 2^10 numbers below 179 by 10. The masks
+  // clear the bits that come from the lane above.
   const uint64_t fours = value / 10000 | static_cast<uint64_t>(value % 10000) << 32;
   const uint64_t hundreds = ((fours * 10486) >> 20) & 0x0000007f0000007f;
   const uint64_t twos = hundreds | (fours - hundreds * 100) << 16;

@@ -1,4 +1,4 @@
-// The empty node that each new entry is copied from.
+// The empty node. Other files only see its declaration; entry_list.h says why.
 
 #include "stats/entry_list.h"
 

@@ -14,15 +14,15 @@
 
 namespace morwick {
 
-constexpr size_t kLongestText = 98;
+constexpr size_t kLongestText = 98;  // as parser_context.h promises
 static_assert(sizeof(ContextNode::text) >= kLongestText + 1);
 static_assert(sizeof(ContextNode::text) >= kDecimalRoom);
 
-// All zeros. It is defined in another file so that the compiler copies it with eight stores. It
-// would clear a local node with a string instruction, which takes longer than both allocations.
+// All zeros. It is defined in another file, so that the compiler copies it with eight stores. Where
+// the compiler sees zeros it uses a string instruction, which takes longer than both allocations.
 extern const ContextNode kEmptyNode;
 
-// A name node that is in no list yet. Each entry of the name starts as a copy of it. This costs
+// A name node that is in no list. The name node of each entry starts as a copy of it, which costs
 // less than clearing a node and copying a text of varying length into it.
 class EntryName {
  public:
@@ -114,7 +114,7 @@ bool AppendElements(Context *ctx, const EntryName &name, const uint8_t *bytes, u
   return allAdded;
 }
 
-// Frees a node that is not null, and returns the next one.
+// Frees the node and returns the next one. Null: returns null.
 inline ContextNode *FreeNode(ContextNode *node) {
   if (node == nullptr) return nullptr;
   ContextNode *next = node->next;
@@ -124,9 +124,9 @@ inline ContextNode *FreeNode(ContextNode *node) {
   return next;
 }
 
-// Frees the two lists side by side, in the order in which their nodes were allocated. Freed one
-// list after the other, the heap would scatter the nodes of later parses, which then take six times
-// as long when they are large.
+// Frees the two lists side by side, in the order in which their nodes were allocated. If they were
+// freed one after the other, the heap would scatter the nodes of later parses: large ones would
+// take six times as long.
 template <typename Context>
 void FreeEntries(Context *ctx) {
   ContextNode *names = ctx->namesHead;

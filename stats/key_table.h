@@ -21,8 +21,8 @@ struct KeyRow {
 };
 
 // Rows in the order of their ids, each id once. For each id from the first to the last, `placeOfId`
-// has the number of its row counted from 1, or 0 without a row. The lookup is inline, because a
-// call would take longer than the rest of a record's walk.
+// has the number of its row, counted from 1, or 0 for an id without a row. The lookup is inline: a
+// call would take longer than the rest of the walk to a record.
 template <uint32_t kFirstId, size_t kIdCount, size_t kRowCount>
 struct KeyTable {
   std::array<MorwickKey, kRowCount> rows;
@@ -70,7 +70,7 @@ consteval Table MakeKeyTable(const std::array<KeyRow, kRowCount> &rows) {
   return table;
 }
 
-// Of the 64-bit statistics record stream, and of the MSP statistics record stream.
+// The 64-bit stream (KVR and FTL) and the MSP stream: first id, number of ids, number of rows.
 using StatsKeyTable = KeyTable<1, 659, 568>;
 using MSPKeyTable = KeyTable<4096, 4119, 95>;
 extern const StatsKeyTable kStatsKeys;

@@ -11,8 +11,8 @@
 namespace morwick {
 namespace {
 
-// Stores a known key: sets its summary field and appends a pair for each of its values. False when
-// memory was refused for a pair; the other pairs are still appended.
+// Sets the summary field of the record's key and appends an entry for each value. False when memory
+// was refused for an entry; the others are still appended.
 bool TakeRecord(KVRStatsCxt *ctx, const KnownRecord &record) {
   if (record.valueCount == 0) return true;  // its values would exceed the buffer
   SetSummaryField(ctx, record.key.id, record.values);

@@ -1,5 +1,5 @@
-// The keys of the MSP statistics record stream, in id order: id, name, 32-bit elements. Names are
-// published letter for letter.
+// The keys of the MSP statistics record stream, in id order: id, name, number of 32-bit values.
+// Names are published letter for letter.
 
 #include "stats/key_table.h"
 

@@ -6,7 +6,7 @@
 
 namespace {
 
-constexpr uint32_t kWidestElement = 8;
+constexpr uint32_t kWidestElement = 8;  // bytes
 constexpr uint32_t kMostElements = 65535;
 
 }  // namespace

@@ -11,12 +11,12 @@ bool AppendText(BoundedWriter &writer, const FormatText &text) {
   return writer.AppendFirst(text.characters, text.length);
 }
 
-// Prints like printf. A text that cannot fit is not started, because its padding could take
-// seconds.
+// Prints like printf. A text that cannot fit is not started: its padding could take seconds.
 template <typename Argument>
 bool AppendFormatted(BoundedWriter &writer, const Conversion &conversion, Argument argument) {
   return writer.AppendPrinted([&](char *room, size_t size) {
-    return size > conversion.least ? std::snprintf(room, size, conversion.text, argument) : -1;
+    return size > conversion.leastLength ? std::snprintf(room, size, conversion.text, argument)
+                                         : -1;
   });
 }
 

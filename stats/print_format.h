@@ -28,9 +28,9 @@ struct FormatText {
 // One conversion, such as %-08.3u.
 struct Conversion {
   char text[kFormatRoom] = {};  // ended by a NUL
-  uint64_t least = 0;           // characters that it prints, whatever its argument
+  uint64_t leastLength = 0;     // the fewest characters that it prints, whatever its argument
   // Nearly all conversions are a plain text, or an unsigned number in at most eight characters.
-  // These are printed without the C library, in a fifth of the time.
+  // These are plain: they are printed without the C library, in a fifth of the time.
   bool plain = false;
   char pad = ' ';
   uint32_t width = 1;
@@ -60,7 +60,7 @@ constexpr FormatText TakeText(std::string_view *rest) {
   return text;
 }
 
-// At most 14 digits: a format with more has no room for the rest of the conversion.
+// A format of 15 characters has at most 14 digits, so a number fits 64 bits.
 static_assert(kFormatRoom <= 20);
 constexpr uint64_t TakeNumber(std::string_view *rest) {
   uint64_t number = 0;
@@ -72,7 +72,7 @@ constexpr uint64_t TakeNumber(std::string_view *rest) {
 
 // Takes the next conversion, if it has one of the types.
 constexpr std::optional<Conversion> TakeConversion(std::string_view *rest, std::string_view types) {
-  constexpr uint64_t kPlainWidth = 8;
+  constexpr uint64_t kPlainWidth = 8;  // the widest that WritePadded pads
   const std::string_view start = *rest;
   rest->remove_prefix(1);
   const size_t flagCount = std::min(rest->find_first_not_of("-0+ #"), rest->size());
@@ -91,14 +91,14 @@ constexpr std::optional<Conversion> TakeConversion(std::string_view *rest, std::
 
   Conversion conversion;
   start.copy(conversion.text, start.size() - rest->size());
-  // The C library refuses a larger precision. For a text it would make no difference.
+  // The C library refuses a precision above INT_MAX. No text is so long, so it goes without one.
   if (type == 's' && precision > INT_MAX) {
     char *point = &conversion.text[start.find('.')];
     point[0] = 's';
     point[1] = '\0';
   }
   // The precision of a number is its least number of digits; that of a text its most characters.
-  conversion.least = std::max(width, type == 's' ? 0 : precision);
+  conversion.leastLength = std::max(width, type == 's' ? 0 : precision);
   conversion.plain = !hasPrecision && (type == 's' ? width == 0
                                                    : type == 'u' && width <= kPlainWidth &&
                                                          flags.find('-') == std::string_view::npos);
@@ -107,8 +107,8 @@ constexpr std::optional<Conversion> TakeConversion(std::string_view *rest, std::
   return conversion;
 }
 
-// Parses a format shorter than kFormatRoom. It may use fewer of these arguments. Returns nothing
-// when it uses any other.
+// Parses a format shorter than kFormatRoom. Returns nothing when the format uses other arguments
+// than these; it may use fewer.
 constexpr std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Arguments arguments) {
   const std::string_view types = arguments == Arguments::kOneText ? "s" : "diuoxX";
   const size_t most = arguments == Arguments::kTwoNumbers ? 2 : 1;
@@ -124,13 +124,13 @@ constexpr std::optional<PrintFormat> ReadPrintFormat(std::string_view text, Argu
   return format;
 }
 
-// As WritePadded does, where it fits.
+// Appends what WritePadded writes. False when it does not fit.
 inline bool PrintPadded(BoundedWriter &writer, uint32_t number, uint32_t width, char pad) {
   return writer.AppendWritten<kPaddedRoom>(
       [=](char *room) { return WritePadded(room, number, width, pad); });
 }
 
-// Print like printf. False when the text does not fit; the cost then is that of the part that fits.
+// Print like printf. False when the text does not fit, at the cost of the part that fits.
 bool PrintNumbers(BoundedWriter &writer, const PrintFormat &format,
                   std::span<const uint32_t> numbers);
 bool PrintText(BoundedWriter &writer, const PrintFormat &format, const char *text);

@@ -2,7 +2,7 @@
  * The walk over the records of a statistics dump: where the next record lies, or where the records
  * end and why. The three parsers and morwick/records.h are built on it. C11 and C++20 alike.
  * Comments that begin with an at sign are rules in ACSL: scripts/prove proves that the code keeps
- * them for any bytes of any length.
+ * them for any bytes of any length. There `s` is a stream, `b` its bytes and `o` an offset in them.
  */
 #ifndef STATS_RECORD_WALK_H
 #define STATS_RECORD_WALK_H
@@ -20,7 +20,7 @@ enum {
   kHighestId = 0x30000000 /* of KVR and FTL: a key above it is bad */
 };
 
-/* A record, or what ends the records. After the buffer's last whole header id and length are 0. */
+/* A record, or what ends the records. Where no whole header is left, id and length are 0. */
 struct WalkedRecord {
   uint32_t id;
   uint64_t offset;  /* of the header */
@@ -46,8 +46,7 @@ struct WalkedRecord {
       : o + HeaderSize(s) + Length(s, b, o) > size ? kMorwickTooLong
       : kMorwickRecord;
 
-    // Where the first that is no filler stands, from `o` on. A filler is a header alone, whatever
-    // its key.
+    // The offset of the first that is no filler, from `o` on. A filler is a record of length 0.
     logic integer Start(MorwickStream s, uint8_t *b, integer size, integer o) =
       s != kMorwickKVR && o + HeaderSize(s) <= size && Length(s, b, o) == 0
         ? Start(s, b, size, o + HeaderSize(s)) : o;
@@ -61,7 +60,7 @@ struct WalkedRecord {
         r.payload == r.offset && r.id == 0 && r.length == 0);
 */
 
-/* What the header at the offset says. */
+/* The header at the offset: its id, and below the length of its payload in bytes. */
 /*@ requires \valid_read(bytes + (offset .. offset + HeaderSize(stream) - 1));
     requires offset + HeaderSize(stream) <= UINT64_MAX;
     assigns \nothing;
@@ -80,7 +79,7 @@ static inline uint64_t HeaderLength(MorwickStream stream, const uint8_t *bytes, 
   return (uint64_t)LoadLittleEndian32(bytes + offset + 4) * 8;
 }
 
-/* Which of the steps a header is, when `left` bytes follow it. */
+/* The step for a header that `left` bytes follow. */
 /*@ assigns \nothing;
     ensures \result ==
       (stream == kMorwickFTL && id == 0xFFFF ? kMorwickEndRecord

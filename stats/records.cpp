@@ -24,7 +24,7 @@ std::span<const MorwickKey> KeysOf(MorwickStream stream) {
   return {};
 }
 
-// Sets the end of the walk. Later calls return it again.
+// Describes the end of the walk. The reader stays there, so that later calls return it again.
 int DescribeEnd(MorwickStep step, const WalkedRecord &walked, uint32_t valueWidth,
                 MorwickRecordReader &reader, MorwickRecord &record) {
   const uint64_t left = reader.size - walked.payload;
@@ -39,8 +39,7 @@ int DescribeEnd(MorwickStep step, const WalkedRecord &walked, uint32_t valueWidt
   return 0;
 }
 
-// One function for each stream, so that the format's rules are constants there. It takes half the
-// time.
+// One function for each stream, so that its rules are constants there: this halves the time.
 template <MorwickStream kStream>
 int NextRecord(MorwickRecordReader &reader, MorwickRecord &record) {
   using Rules = StreamRules<kStream>;

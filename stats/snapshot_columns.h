@@ -1,4 +1,4 @@
-// The line of the fixed layout, number by number, for code that is made for it when it is compiled.
+// The line of the fixed layout, number by number, for code that the compiler makes for each column.
 #ifndef STATS_SNAPSHOT_COLUMNS_H
 #define STATS_SNAPSHOT_COLUMNS_H
 
@@ -11,7 +11,7 @@
 
 namespace morwick {
 
-// What of a field is printed.
+// What a column prints of its number.
 enum class Part { kWhole, kThousands, kHundredths };
 
 struct Column {

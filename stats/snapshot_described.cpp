@@ -20,7 +20,7 @@ static_assert(offsetof(SnapshotFieldDescriptor, format) == 12);
 namespace morwick {
 namespace {
 
-// Of the header's text no more is looked at than the capacity holds.
+// Reads no more of the header's text than the capacity holds.
 bool AppendBanner(BoundedWriter &writer, uint32_t formatVersion, const char *text,
                   uint64_t capacity) {
   if (formatVersion < kSnapshotFirstTextVersion) return writer.Append(kSnapshotLegend);
@@ -28,7 +28,7 @@ bool AppendBanner(BoundedWriter &writer, uint32_t formatVersion, const char *tex
          writer.Append("\n");
 }
 
-// One value of each priority's triple, after its label.
+// The label, then one number of each priority's triple.
 bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *label,
                       const uint8_t *values, uint32_t width) {
   if (!PrintText(writer, field.format, label)) return false;
@@ -39,8 +39,8 @@ bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *lab
   return true;
 }
 
-// False when the buffer is full. Called for every field of every record: as a function of its own
-// it would take a twentieth more time.
+// False when the buffer is full. Always inline: a call for every field of every record would make
+// the rendering take a twentieth more time.
 [[gnu::always_inline]] inline bool AppendField(BoundedWriter &writer, const Field &field,
                                                const uint8_t *record) {
   const uint8_t *value = record + field.offset;
@@ -64,8 +64,7 @@ bool AppendPriorities(BoundedWriter &writer, const Field &field, const char *lab
   return true;
 }
 
-// The line of a record. Its first fields are read once a call instead of once a record: half the
-// time.
+// The line of a record. A call parses the first descriptors once for all records: half the time.
 class Line {
  public:
   explicit Line(const DescriptorTable &table)
@@ -85,15 +84,14 @@ class Line {
   }
 
  private:
-  static constexpr uint32_t kMostReady = 32;
+  static constexpr uint32_t kMostReady = 32;  // more than the fixed layout has
 
   const DescriptorTable &table_;
   uint32_t readyCount_;
   Field ready_[kMostReady];
 };
 
-// What a call comes to: the length of the lines that were completed, and whether the last record
-// has been dealt with.
+// The length of the text up to the last complete line, and whether no record is left.
 struct Rendered {
   uint64_t completed;
   bool done;
@@ -107,26 +105,26 @@ Rendered Render(const uint8_t *snapshot, uint64_t snapshotSize, const uint8_t *h
   const uint32_t recordCount = number(offsetof(SnapshotHeader, recordCount));
   const auto *text = reinterpret_cast<const char *>(header) + sizeof(SnapshotHeader);
   if (*state == 0 && !AppendBanner(writer, formatVersion, text, capacity)) return {0, false};
-  // The index of the record that ends the rendering, the header's last or the first one that does
-  // not lie in the snapshot whole. It is not printed itself.
-  uint32_t last = recordCount == 0 ? 0 : recordCount - 1;
+  // The index of the first record that is not printed: the header's last one, or the first one that
+  // does not lie in the snapshot whole.
+  uint32_t end = recordCount == 0 ? 0 : recordCount - 1;
   if (recordSize > 0)
-    last = static_cast<uint32_t>(std::min<uint64_t>(last, snapshotSize / recordSize));
+    end = static_cast<uint32_t>(std::min<uint64_t>(end, snapshotSize / recordSize));
   // Records too short for any number are empty, whatever the table says.
-  if (recordSize < kNumberSize) *state = std::max(*state, last);
-  if (*state >= last) return {0, true};
+  if (recordSize < kNumberSize) *state = std::max(*state, end);
+  if (*state >= end) return {0, true};
 
-  // Only now: where no record is left the header needs no descriptor table.
+  // Read only now: a header without records to print needs no descriptor table.
   const DescriptorTable table(header);
-  // Where no field tells an empty record, all are taken as empty: there is nothing to walk for.
-  if (!table.TellsEmptyRecords()) *state = last;
+  // Where no field tells an empty record, all count as empty.
+  if (!table.TellsEmptyRecords()) *state = end;
   const auto recordAt = [&](uint32_t index) { return snapshot + uint64_t{recordSize} * index; };
-  while (*state < last && table.IsEmpty(recordAt(*state))) ++*state;
-  if (*state >= last) return {0, true};
+  while (*state < end && table.IsEmpty(recordAt(*state))) ++*state;
+  if (*state >= end) return {0, true};
 
   const Line line(table);
   uint64_t completed = 0;
-  while (*state < last) {
+  while (*state < end) {
     const uint8_t *record = recordAt((*state)++);
     if (table.IsEmpty(record)) continue;
     if (!line.Append(writer, record)) return {completed, false};

@@ -1,4 +1,4 @@
-// The fields of snapshot records, with names that differ.
+// The fields of snapshot records, with unique names.
 
 #include "morwick/snapshot_fields.h"
 
@@ -30,7 +30,7 @@ class Layout {
   std::optional<DescriptorTable> table_;
 };
 
-// A text that fits where every name does.
+// A text with room for every name.
 struct Name {
   char text[kMorwickFieldNameRoom] = {};
   size_t length = 0;
@@ -55,26 +55,26 @@ size_t NameCount(MorwickFieldKind kind) {
   return kind == kMorwickFieldPriorities ? std::size(kTripleParts) : 1;
 }
 
-bool IsSign(char c) {
+bool IsBlankOrSign(char c) {
   const auto byte = static_cast<unsigned char>(c);
   const auto letter = byte | 0x20;
   return byte < 0x80 && byte != '_' && (byte < '0' || byte > '9') && (letter < 'a' || letter > 'z');
 }
 
-// What the text has before a number, without blanks and signs at its ends.
+// The text before a number, without blanks and signs at its ends.
 Name TextBefore(const Field &field, size_t part) {
   const FormatText before = field.kind == Field::kPriorities
                                 ? TripleLabel(field, kTripleParts[part])
                                 : field.format.texts[0];
   std::string_view text = before.view();
-  while (!text.empty() && IsSign(text.front())) text.remove_prefix(1);
-  while (!text.empty() && IsSign(text.back())) text.remove_suffix(1);
+  while (!text.empty() && IsBlankOrSign(text.front())) text.remove_prefix(1);
+  while (!text.empty() && IsBlankOrSign(text.back())) text.remove_suffix(1);
   Name name;
   name.Append(text);
   return name;
 }
 
-// The label, but for the number of one that came before.
+// The label, without the number that a repeated one gets.
 Name PlainLabel(const Field &field, size_t part) {
   Name label = TextBefore(field, part);
   if (label.length > 0) return label;

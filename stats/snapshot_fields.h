@@ -1,5 +1,5 @@
-// The fields of snapshot records, read from descriptors: those of a header, or those that stand
-// here for the fixed layout.
+// The fields of snapshot records, read from descriptors: those of a header, or those of the fixed
+// layout, which stand here.
 #ifndef STATS_SNAPSHOT_FIELDS_H
 #define STATS_SNAPSHOT_FIELDS_H
 
@@ -29,11 +29,11 @@ struct Field {
   PrintFormat format;
 };
 
-// The numbers of a triple in print order: what their label has for %s, and how they are printed.
+// A number of a triple, in print order. The label has the letter in place of %s.
 struct TriplePart {
   const char *letter;
   uint32_t offset;  // in the triple
-  uint32_t width;
+  uint32_t width;   // the fewest characters
 };
 inline constexpr TriplePart kTripleParts[] = {
     {"O", offsetof(SnapshotOperations, count), 4},
@@ -41,15 +41,15 @@ inline constexpr TriplePart kTripleParts[] = {
     {"M", offsetof(SnapshotOperations, maxLatency), 5},
 };
 
-// What its format may ask for.
+// The arguments that the format of such a field may use.
 constexpr Arguments ArgumentsOf(Field::Kind kind) {
   if (kind == Field::kThousandths) return Arguments::kTwoNumbers;
   if (kind == Field::kPriorities) return Arguments::kOneText;
   return Arguments::kOneNumber;
 }
 
-// The field of a descriptor. Of kind kNothing when there is nothing to print, or when what it asks
-// for is not there.
+// The field of a descriptor. Its kind is kNothing when the descriptor has an unknown kind, a field
+// outside the record, or a bad format.
 constexpr Field ReadField(const SnapshotFieldDescriptor &descriptor, uint32_t recordSize) {
   constexpr Field::Kind kKinds[] = {Field::kNumber, Field::kNumber, Field::kThousandths,
                                     Field::kPriorities};
@@ -71,7 +71,7 @@ constexpr Field ReadField(const SnapshotFieldDescriptor &descriptor, uint32_t re
   return field;
 }
 
-// What the text has before the numbers of that part: the format with the letter for its %s.
+// The text before the numbers of that part: the format with the letter in place of %s.
 constexpr FormatText TripleLabel(const Field &field, const TriplePart &part) {
   FormatText label = field.format.texts[0];
   if (field.format.conversionCount == 0) return label;
@@ -81,7 +81,7 @@ constexpr FormatText TripleLabel(const Field &field, const TriplePart &part) {
   return label;
 }
 
-// The descriptors of a header, which is whole.
+// The descriptors of a header, which must be whole.
 class DescriptorTable {
  public:
   explicit DescriptorTable(const uint8_t *header)
@@ -129,13 +129,13 @@ class DescriptorTable {
   uint32_t recordSize_;
 };
 
-// A field of the fixed layout, and the name of its column where that says more than the label.
+// A field of the fixed layout, and its column where that name says more than the label.
 struct FixedField {
   SnapshotFieldDescriptor descriptor;
   std::string_view column = {};
 };
 
-// All that is known of the fixed layout, in print order: its text and all tools' columns.
+// The fixed layout, in print order. Its text and the columns of all tools are made from it.
 #define FIELD(name) offsetof(SnapshotRecord, name), sizeof(SnapshotRecord::name)
 inline constexpr FixedField kFixedFields[] = {
     {{0, 0, FIELD(timestamp), "T=%04u"}},
@@ -169,7 +169,7 @@ inline constexpr FixedField kFixedFields[] = {
 #undef FIELD
 
 constexpr Field FixedFieldAt(size_t index) {
-  // A copy: under UndefinedBehaviorSanitizer GCC compares no address of a global when it compiles.
+  // A copy: with UndefinedBehaviorSanitizer GCC cannot compare a global's address at compile time.
   const SnapshotFieldDescriptor descriptor = kFixedFields[index].descriptor;
   return ReadField(descriptor, sizeof(SnapshotRecord));
 }

@@ -12,7 +12,7 @@
 
 namespace {
 
-// Writes in words what is wrong, where there is room for them. Returns the fault.
+// Writes the fault in words, unless `text` is null. Returns the fault.
 [[gnu::format(printf, 3, 4)]] MorwickHeaderFault Explain(MorwickHeaderFault fault, char *text,
                                                          const char *format, ...) {
   va_list arguments;

@@ -1,4 +1,4 @@
-// What the columns of a snapshot mean, as it stands at the head of the text.
+// The legend at the head of a snapshot's text: the meaning of its columns.
 #ifndef STATS_SNAPSHOT_LEGEND_H
 #define STATS_SNAPSHOT_LEGEND_H
 

@@ -9,12 +9,12 @@
 
 namespace morwick {
 
-constexpr size_t kLabelRoom = 4;    // copied whole: shorter than asking for its length
+constexpr size_t kLabelRoom = 4;    // the longest label; every copy has this size
 constexpr size_t kNumberRoom = 10;  // digits of the largest number
-constexpr size_t kPieceRoom = 64;   // what is written at once, of which a byte at least counts
+constexpr size_t kPieceRoom = 64;   // bytes of the largest store, which may go past the line's end
 constexpr size_t kLineRoom = kColumnCount * (kLabelRoom + kNumberRoom) + kPieceRoom;
 
-// What the column prints.
+// The number that the column prints.
 inline uint32_t ColumnValue(const Column &column, const uint8_t *record) {
   const uint32_t value = LoadLittleEndian32(record + column.offset);
   switch (column.part) {

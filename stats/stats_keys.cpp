@@ -1,5 +1,5 @@
-// The keys of the 64-bit statistics record stream, in id order: id, name, 64-bit elements. Names
-// are published letter for letter, odd spellings included.
+// The keys of the 64-bit statistics record stream, in id order: id, name, number of 64-bit values.
+// Names are published letter for letter, odd spellings included.
 
 #include "stats/key_table.h"
 

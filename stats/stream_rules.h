@@ -39,13 +39,13 @@ struct KnownRecord {
   const MorwickKey &key;
   const uint8_t *values;
   uint64_t length;      // of the payload, in bytes
-  uint32_t valueCount;  // of values that the parser takes
+  uint32_t valueCount;  // values that the parser takes
 };
 
 inline std::string_view NameOf(const MorwickKey &key) { return {key.name, key.nameLength}; }
 
-// Calls `take` with each record of a known key until it returns false. Returns what ended the walk;
-// kMorwickRecord when `take` did.
+// Calls `take` with each record of a known key until `take` returns false. Returns what ended the
+// walk; kMorwickRecord when `take` did.
 template <MorwickStream kStream, typename Take>
 MorwickStep ForEachKnownRecord(const void *buffer, uint32_t size, Take take) {
   const auto *bytes = static_cast<const uint8_t *>(buffer);

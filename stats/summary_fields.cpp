@@ -13,7 +13,7 @@
 namespace morwick {
 namespace {
 
-// The width of one value of a field; the field may be an array.
+// The width in bytes of one value of a field, which may be an array.
 template <typename Field>
 constexpr uint32_t kWidth = sizeof(std::remove_all_extents_t<Field>);
 
@@ -55,7 +55,7 @@ constexpr auto kPlaceOfId = [] {
   return places;
 }();
 
-// Fields, padding and the other members must fill the whole context. So a forgotten field does not
+// Fields, padding and the other members must fill the whole context: a forgotten field does not
 // compile.
 constexpr size_t kPadding = 4;  // before hostReads
 constexpr size_t kOthers = offsetof(KVRStatsCxt, exportVersion) + sizeof(KVRStatsCxt::parseMarker) +
@@ -79,7 +79,7 @@ void SetSummaryField(KVRStatsCxt *ctx, uint32_t id, const uint8_t *values) {
   const MorwickSummaryField &field = kFields[kPlaceOfId[id] - 1];
   char *place = reinterpret_cast<char *>(ctx) + field.offset;
   for (uint32_t i = 0; i < field.valueCount; ++i) {
-    const uint64_t value = LoadLittleEndian64(values + size_t{8} * i);
+    const uint64_t value = LoadLittleEndian64(values + sizeof(uint64_t) * i);
     if (field.valueWidth == sizeof value) {
       std::memcpy(place + sizeof value * i, &value, sizeof value);
     } else {

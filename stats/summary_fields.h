@@ -1,4 +1,4 @@
-// The summary fields of a KVR context: the one table that fills and lists them.
+// The summary fields of a KVR context. One table serves the parser and morwick/summary.h.
 #ifndef STATS_SUMMARY_FIELDS_H
 #define STATS_SUMMARY_FIELDS_H
 
@@ -6,7 +6,7 @@
 
 namespace morwick {
 
-// Stores the values of a key that has a summary field. The record must have the configured number.
+// Stores the values of a key, as many as are configured, if the key has a summary field.
 void SetSummaryField(KVRStatsCxt *ctx, uint32_t id, const uint8_t *values);
 
 }  // namespace morwick

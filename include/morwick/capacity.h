@@ -1,5 +1,5 @@
 /*
- * Two helpers for tools that present storage figures.
+ * Rounding and advertised capacity, for tools that show storage figures.
  *
  * Threads: pure functions, callable from any thread.
  */
@@ -16,9 +16,9 @@ extern "C" {
 
 /*
  * The value rounded to `sig` significant decimal digits, halves up. When more than 18 digits would
- * have to go the result is 0; when the rounded value does not fit 64 bits it is the largest that
- * does. The digits are counted in double precision: in values just below a power of ten, from 15
- * digits on, one too many is counted.
+ * have to be dropped the result is 0; when the rounded value does not fit 64 bits it is UINT64_MAX.
+ * Digits are counted in double precision: a value of 15 digits or more that is just below a power
+ * of ten counts as having one digit more.
  */
 MORWICK_EXPORT uint64_t roundSig(uint64_t value, uint64_t sig);
 

@@ -24,8 +24,8 @@ extern "C" {
 enum { kNandConnectionType = 0 };
 
 /*
- * What openKVRConnection fills. The record is the caller's, who fills it with zeros before its
- * first use; its handles are closeKVRConnection's.
+ * Filled by openKVRConnection. The record is the caller's, who fills it with zeros before its first
+ * use; closeKVRConnection gives its handles back.
  */
 typedef struct KVRConnection {
   uint32_t service;
@@ -44,7 +44,7 @@ MORWICK_EXPORT uint32_t findNandExporter(NandExporter **row);
  * Finds the first row whose driver is registered and can be opened; a driver that refuses is passed
  * over for the next row. Returns 1 with `*row` set and both handles stored in the row, to be given
  * back with ReleaseIOInterfaces; returns 0 in silence with `*row` at the terminating row otherwise.
- * A driver that says success without giving a handle is taken: the row's connection is then 0.
+ * A driver that reports success but gives no handle is accepted: the row's connection is then 0.
  */
 MORWICK_EXPORT int findNandExporterNew(NandExporter **row);
 
@@ -57,8 +57,8 @@ MORWICK_EXPORT void ReleaseIOInterfaces(NandExporter *row);
 /*
  * Finds as findNandExporter does and opens a connection. Returns the connection handle, to be given
  * back with TolkDisconnect, or 0 after a message on standard error: "No class found", without a
- * line end, when there is no driver, and a line with the result code when the driver refuses. A
- * driver that says success without giving a handle gets 0 in silence. `*row` is always set.
+ * line end, when there is no driver, and a line with the result code when the driver refuses. When
+ * a driver reports success but gives no handle, returns 0 in silence. `*row` is always set.
  */
 MORWICK_EXPORT uint32_t TolkConnect(NandExporter **row);
 
@@ -72,7 +72,7 @@ MORWICK_EXPORT void TolkDisconnect(uint32_t connection);
  * different controllers; `exporter` is then the row of the second, which the connection is to.
  * Returns 1, or 0 after a message on standard error; the record's handles are then 0 and everything
  * obtained was given back. Close a record before it is opened again: its handles are overwritten,
- * but for a connection that it still holds when no driver is found, which is closed.
+ * except that a connection which it still holds is closed when no driver is found.
  */
 MORWICK_EXPORT int openKVRConnection(KVRConnection *record);
 

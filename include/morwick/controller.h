@@ -34,14 +34,14 @@ extern "C" {
  */
 MORWICK_EXPORT uint32_t MorwickFindService(const NandExporter *row);
 
-/* A request to a driver, 24 bytes in the order of a controller; platform.h says what it means. */
+/* A request to a driver: 24 bytes in the controller's byte order. platform.h says what it means. */
 typedef struct MorwickRequest {
   uint32_t command;
   uint32_t argument;
   uint8_t reserved[16];
 } MorwickRequest;
 
-/* The request with the pair's second number as its command; the pair must be there. */
+/* The request with the pair's second number as its command; the pair must not be null. */
 static inline MorwickRequest MorwickMakeRequest(const SelectorPair *selectors, uint32_t argument) {
   MorwickRequest request = {0, 0, {0}};
   request.command = LittleEndian32(selectors->second);
@@ -49,11 +49,11 @@ static inline MorwickRequest MorwickMakeRequest(const SelectorPair *selectors, u
   return request;
 }
 
-/* A reply may be as large as this less one byte. */
+/* A reply must be smaller than this, 16 MiB. */
 enum { kMorwickLargestReply = 16 << 20 };
 
 typedef enum MorwickReadResult {
-  kMorwickRead,         /* the buffer is there */
+  kMorwickRead,         /* the buffer was read */
   kMorwickReadFailed,   /* the driver refused; `result` is its code */
   kMorwickReadTooLarge, /* the reply does not end before kMorwickLargestReply bytes */
   kMorwickReadNoMemory

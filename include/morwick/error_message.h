@@ -16,14 +16,14 @@ extern "C" {
 
 /*
  * The stored message, or null before there is one. Read it through GetAPIErrorMessage, and never
- * change it: the message is set once, nobody frees it, and there is no way back. A tool that wants
- * to know what is wrong with each of many buffers asks the walk over their records (records.h).
+ * change it: the message is set once and never freed or cleared. A tool that wants to know what is
+ * wrong with each of many buffers asks the walk over their records (records.h).
  */
 MORWICK_EXPORT extern char *GlobalAPIErrorMessage;
 
 /*
  * Formats as printf does and stores at most 1023 characters. Without memory for them, or with a
- * null format, nothing is stored; where printf itself would fail, what it had written before is.
+ * null format, nothing is stored. If formatting fails, the text before the failure is stored.
  */
 MORWICK_EXPORT void SetAPIErrorMessage(const char *format, ...)
     __attribute__((format(printf, 1, 2)));

@@ -17,7 +17,7 @@ extern "C" {
 typedef struct GenericParserCxt GenericParserCxt;
 typedef struct KVRStatsCxt KVRStatsCxt;
 
-/* The two numbers of one kind of controller request; equal in every pair of the library. */
+/* The numbers of one kind of controller request. In each pair of the library the two are equal. */
 typedef struct SelectorPair {
   uint32_t first;
   uint32_t second;
@@ -37,15 +37,15 @@ typedef uint32_t (*FTLStatsParser)(GenericParserCxt *ctx, const void *buffer, ui
 typedef void (*GenericParserRelease)(GenericParserCxt *ctx);
 
 /*
- * One row. A slot that the class lacks is null: test a slot before calling it. In the terminating
- * row every field is zero or null.
+ * One row. A function pointer is null where the class lacks the function: test it before a call. In
+ * the terminating row every field is zero or null.
  */
 typedef struct NandExporter {
-  const char *className;   /* searches go by this driver class name; null only in the last row */
+  const char *className;   /* the driver class that searches look for; null in the last row only */
   const char *matchKey;    /* for tools; no search in the library reads it */
   uint32_t connection;     /* written by findNandExporterNew only */
   uint32_t service;        /* written by findNandExporterNew only */
-  int32_t exporterParamA;  /* for tools, as is exporterParamB; not read here */
+  int32_t exporterParamA;  /* for tools, as is exporterParamB; the library reads neither */
   uint32_t methodSelector; /* driver method of the task-scheduler request */
   uint32_t exporterParamB;
 
@@ -59,10 +59,10 @@ typedef struct NandExporter {
   SelectorGetter getBandStatsSelectors;
 
   KVRStatsParser parseBufferToCxt;
-  KVRStatsRelease releaseContext; /* for what parseBufferToCxt filled */
+  KVRStatsRelease releaseContext; /* frees what parseBufferToCxt added */
   MSPStatsParser mspParseBufferToCxt;
   FTLStatsParser ftlParseBufferToCxt;
-  GenericParserRelease releaseGenericParserCxt; /* for what the MSP and FTL parsers filled */
+  GenericParserRelease releaseGenericParserCxt; /* frees what the MSP and FTL parsers added */
 } NandExporter;
 
 /*

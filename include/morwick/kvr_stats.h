@@ -69,9 +69,9 @@ typedef struct KVRStatsCxt {
 /*
  * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole
  * 64-bit word are ignored) and appends to whatever the context holds. An array's elements are named
- * by the key's name followed directly by the index. How many values a key has the key says, not the
- * record's length: those of a shorter record run on into what follows. Records with unknown keys,
- * and records whose values would run past the end of the buffer, are passed over.
+ * by the key's name followed directly by the index. The key, not the record's length, decides how
+ * many values are read: for a record that is too short they continue in the bytes after it. Records
+ * with unknown keys, and records whose values would exceed the buffer, are passed over.
  *
  * Returns 1 when the records were read to the end of the buffer. Returns 0, with everything that
  * was parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above

@@ -1,15 +1,15 @@
 /*
  * The numbers that controllers write and read: little-endian, on any alignment, whatever the host.
- * Comments that begin with an at sign are rules, which scripts/prove holds the code to.
+ * Comments that begin with an at sign are rules; scripts/prove proves that the code keeps them.
  *
- * Threads: pure functions, callable from any thread. The bytes must be there.
+ * Threads: pure functions, callable from any thread. The bytes must be readable.
  */
 #ifndef MORWICK_LITTLE_ENDIAN_H
 #define MORWICK_LITTLE_ENDIAN_H
 
 #include <stdint.h>
 
-/* Bytes at any address. The prover does not follow a cast. */
+/* Bytes at any address. The prover cannot follow a cast, so it gets the type without one. */
 #ifdef __FRAMAC__
 typedef uint8_t MorwickBytes;
 #else
@@ -20,7 +20,7 @@ typedef void MorwickBytes;
     logic integer Number32(uint8_t *b, integer o) = Number16(b, o) + 0x10000 * Number16(b, o + 2);
 */
 
-/* The number that the bytes hold. Compilers make one load of it. */
+/* The number that the bytes hold. Compilers turn the sum into one load. */
 /*@ requires \valid_read(bytes + (0 .. 1));
     assigns \nothing;
     ensures \result == Number16(bytes, 0); */
@@ -48,8 +48,8 @@ static inline uint64_t LoadLittleEndian64(const MorwickBytes *bytes) {
          ((uint64_t)b[7] << 56);
 }
 
-#ifndef __FRAMAC__ /* where these are not needed, and would be casts */
-/* The value in the order of a controller; also back again. */
+#ifndef __FRAMAC__ /* the prover cannot follow the casts here */
+/* Converts from the host's byte order to the controller's, or back. */
 static inline uint16_t LittleEndian16(uint16_t value) { return LoadLittleEndian16(&value); }
 static inline uint32_t LittleEndian32(uint32_t value) { return LoadLittleEndian32(&value); }
 static inline uint64_t LittleEndian64(uint64_t value) { return LoadLittleEndian64(&value); }

@@ -20,8 +20,8 @@
 #include "morwick/summary.h"
 
 /*
- * The version of the library that these headers belong to. One of the same major number runs what
- * was built with an earlier one.
+ * The version of the library that these headers belong to. Programs that were built with it also
+ * run with each later version of the same major number.
  */
 #define MORWICK_VERSION_MAJOR 1
 #define MORWICK_VERSION_MINOR 0

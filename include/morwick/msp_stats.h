@@ -14,8 +14,8 @@
  *
  *     00 10  04 00  05 00 00 00
  *
- * A length of 0 makes a filler of four bytes, whatever its key. The key 0x2FFE marks a record to be
- * passed over, 0x2FFF the end.
+ * A record of length 0 is a filler of four bytes, whatever its key. The key 0x2FFE marks a record
+ * to be passed over, 0x2FFF the end.
  *
  * Threads: no state outside the context and the buffer, but for the library's error message. One
  * context belongs to one thread at a time.

@@ -8,19 +8,18 @@
  * -DMORWICK_PLATFORM=FOLDER; no other code of the tree names a platform. Of the tree a platform
  * includes this header and its own files. A folder's CMakeLists.txt that calls morwick_plain_cxx
  * builds it without exceptions and without run-time type information; in any case no exception may
- * leave a function. Tests hold for any platform but where tests/CMakeLists.txt asks for
- * `simulated`: the unit tests (they bring a platform of their own), the header and export checks,
- * the package tests, and what stands in tests/FOLDER/ if there is one. platform/none/ is the
- * smallest one, without controllers; platform/simulated/ has some that are made up.
+ * leave a function. These tests run for any platform: the unit tests (they bring a platform of
+ * their own), the header and export checks, the package tests, and the tests in tests/FOLDER/ if
+ * there is one. platform/none/ is the smallest platform, without controllers; platform/simulated/
+ * has some that are made up.
  *
- * THREADS. Driver calls and SystemLog may come from any thread, several at once. The functions of
- * the activity are called as each comment says. No function may call back into the library but
+ * THREADS. Driver calls and SystemLog may come from any thread, several at once. The comment of
+ * each function of the activity says who calls it. No function may call back into the library but
  * through the handler that RegisterActivity was given.
  *
- * MEMORY. A function that gets no memory answers with its failure, and with errno ENOMEM, which
- * stands for no other failure. Nothing but SystemLog, RegisterActivity and RunMainQueue may end the
- * process: a tool that looks for a controller is not to die of it. Nor may anything but these three
- * change how the process handles signals.
+ * MEMORY. A function that is refused memory returns its failure and sets errno to ENOMEM; no other
+ * failure does. Only SystemLog, RegisterActivity and RunMainQueue may end the process or change how
+ * it handles signals: a tool must survive its search for a controller.
  */
 #ifndef MORWICK_PLATFORM_H
 #define MORWICK_PLATFORM_H
@@ -46,7 +45,7 @@ enum { kActivityStateRun = 2, kActivityStateDefer = 3 };
 /*
  * The platform's own text for matching a service by property. It stands in the exporter table as
  * the `matchKey` of some classes, for tools to read: the library itself searches by class name
- * only. A platform that calls it something else has the build define it.
+ * only. A platform with another text defines this macro in the build.
  */
 #ifndef PLATFORM_PROPERTY_MATCH_KEY
 #define PLATFORM_PROPERTY_MATCH_KEY "PropertyMatch"
@@ -88,13 +87,12 @@ MORWICK_EXPORT int32_t ReleaseObject(uint32_t service);
  * Calls the driver method `selector` with `inputSize` bytes at `input`. The driver writes at most
  * `*replySize` bytes to `reply`, which is the caller's, and sets `*replySize` to what it wrote; a
  * reply that is longer is cut. A call that fails writes nothing to `reply` and sets `*replySize` to
- * 0, whatever the reason: a handle that is not open is no exception. Blocks until the controller
- * has answered.
+ * 0, also when the handle is not open. Blocks until the controller has answered.
  *
  * The requests of the daemon and of tools are 24 bytes: two 32-bit numbers in the controller's byte
  * order, little-endian, and 16 zero bytes. The first number says what is asked for: it is `second`
  * of the SelectorPair (exporter.h). The second number is 1025 in a task-scheduler request, whose
- * reply is a 32-bit word, and 0 where a buffer is read, which is the reply.
+ * reply is a 32-bit word, and 0 in a request for a buffer, whose reply is the buffer.
  */
 MORWICK_EXPORT int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
                                         size_t inputSize, void *reply, size_t *replySize);
@@ -103,8 +101,8 @@ MORWICK_EXPORT int32_t CallStructMethod(uint32_t connection, uint32_t selector, 
  * The background activity. The daemon registers one, on its main thread, before RunMainQueue; the
  * identifier is not kept beyond the call unless it is copied. The handler is called on one thread
  * of the platform's choosing at a time, not the main thread: once at check-in, in a state other
- * than run, then in the run state each time the activity is due. When it is due the platform knows;
- * the daemon brings no schedule of its own.
+ * than run, then in the run state each time the activity is due. The platform decides when it is
+ * due; the daemon has no schedule of its own.
  */
 MORWICK_EXPORT void RegisterActivity(const char *identifier, ActivityCriteria criteria,
                                      ActivityHandler handler);
@@ -116,8 +114,8 @@ MORWICK_EXPORT int GetActivityState(Activity *activity);
 MORWICK_EXPORT bool ActivityShouldDefer(Activity *activity);
 
 /*
- * With kActivityStateDefer, in a run: hands the activity back, to be run again later. True when the
- * state was taken over. Called from its handler.
+ * Sets the activity's state. The daemon sets kActivityStateDefer in a run; the platform then runs
+ * the activity again later. True when the platform accepted the state. Called from its handler.
  */
 MORWICK_EXPORT bool SetActivityState(Activity *activity, int state);
 
@@ -132,8 +130,8 @@ MORWICK_EXPORT void RunMainQueue(void) __attribute__((noreturn));
 
 /*
  * Writes one message, formatted as printf does, to the system log at the default level. With that
- * level masked nothing is formatted. The text may bring a line end of its own. Never waits for
- * a reader of the log: a message without room is lost, and later messages count the lost ones.
+ * level masked nothing is formatted. The text may bring a line end of its own. Never waits for a
+ * reader of the log: a message without room is lost, and a later line tells how many were lost.
  */
 MORWICK_EXPORT void SystemLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
 

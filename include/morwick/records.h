@@ -46,7 +46,7 @@ typedef struct MorwickKey {
 /* What the walk met: a record, or what ended it. */
 typedef enum MorwickStep {
   kMorwickRecord,
-  kMorwickEndOfBuffer,  /* right after a record: the buffer is whole */
+  kMorwickEndOfBuffer,  /* the buffer ends right after a record, so it is whole */
   kMorwickEndRecord,    /* a record with the end key of FTL or MSP */
   kMorwickBadKey,       /* a KVR or FTL header with a key above 0x30000000 */
   kMorwickTooLong,      /* a record that needs more bytes than are left */
@@ -69,8 +69,8 @@ typedef struct MorwickRecord {
   const MorwickKey *key;   /* null for a key that the table does not know */
   const void *values;      /* the first value, little-endian */
   uint32_t valueWidth;     /* bytes of a value: 8, for MSP 4 */
-  uint32_t valueCount;     /* of values that the parser takes; 0 for an unknown key */
-  uint32_t recordedValues; /* that the record has room for */
+  uint32_t valueCount;     /* values that the parser takes; 0 for an unknown key */
+  uint32_t recordedValues; /* whole values that the record has room for */
   uint32_t lengthDiffers; /* 1 where the parser reports that the length is not the configured one */
 } MorwickRecord;
 
@@ -91,9 +91,9 @@ MORWICK_EXPORT void MorwickStartRecords(MorwickRecordReader *reader, MorwickStre
                                         const void *buffer, uint64_t size);
 
 /*
- * Sets `*record` to the next record and returns 1. At the end it describes the end there and
- * returns 0, now and at each later call. In FTL and MSP it passes over records of length 0, as the
- * parsers do. With a null pointer it returns 0 and sets nothing.
+ * Sets `*record` to the next record and returns 1. At the end it sets `*record` to what ended the
+ * walk and returns 0, now and at each later call. In FTL and MSP it passes over records of length
+ * 0, as the parsers do. With a null pointer it returns 0 and sets nothing.
  *
  * The values are those that the stream's parser takes: of a KVR record as many as are configured,
  * which may continue in the records after it, or none when they would exceed the buffer;
@@ -109,9 +109,9 @@ enum { kMorwickNameRoom = 100 };
 
 /*
  * Writes the name under which a parser adds the value with that index of a record of `valueCount`
- * values, at most kMorwickNameRoom bytes with the NUL, and returns its length without. The index is
- * not compared with `valueCount`. For a null key it returns 0 and writes an empty name; for a null
- * name it returns 0.
+ * values, at most kMorwickNameRoom bytes with the NUL, and returns its length without the NUL. The
+ * index is not compared with `valueCount`. For a null key it returns 0 and writes an empty name;
+ * for a null name it returns 0.
  */
 MORWICK_EXPORT uint32_t MorwickValueName(MorwickStream stream, const MorwickKey *key,
                                          uint32_t valueCount, uint32_t index, char *name);

@@ -72,15 +72,15 @@ typedef struct SnapshotRecord {
  */
 typedef struct SnapshotHeader {
   uint32_t unused1;
-  uint32_t formatVersion; /* decides what the banner is */
+  uint32_t formatVersion; /* chooses the banner: see kSnapshotFirstTextVersion */
   uint32_t recordSize;    /* bytes from one record to the next */
-  uint32_t recordCount;   /* the last one is never printed; 0 is as 1, no record is printed */
+  uint32_t recordCount;   /* the last record is never printed, so that 0 and 1 print none */
   uint32_t unused2[2];
   uint32_t descriptorTableOffset;
   uint32_t unused3[2];
 } SnapshotHeader;
 
-/* Below this format version the banner is the built-in legend, from it on the header text. */
+/* The banner, the head of the text, is the legend below this version, else the header text. */
 enum { kSnapshotFirstTextVersion = 6 };
 
 typedef struct SnapshotDescriptorTable {
@@ -91,28 +91,29 @@ typedef struct SnapshotDescriptorTable {
 /*
  * One field of a record and how to print it. Kinds: 0 and 1 a 32-bit number; 2 a 32-bit number in
  * thousandths, printed as two numbers, whole and hundredths; 3 triples of 32-bit numbers, one
- * triple for each priority. Other kinds print nothing. Of kind 3 the format is printed with the
- * text "O", before the first number of each triple, again with "L", before the second ones, and
- * with "M", before the third ones; the numbers take at least 4, 7 and 5 characters, and a "/"
- * stands between two.
+ * triple for each priority. Other kinds print nothing. Kind 3 prints the format with the text "O"
+ * and the first number of each triple, then the format with "L" and the second numbers, then with
+ * "M" and the third ones; the numbers take at least 4, 7 and 5 characters, and a "/" stands between
+ * two.
  */
 typedef struct SnapshotFieldDescriptor {
   uint16_t kind;
   uint16_t unused;
   uint32_t fieldOffset; /* within the record, in bytes */
-  uint32_t fieldSize;   /* in bytes; kind 3 only, 12 for each priority, a rest is left out */
+  uint32_t fieldSize;   /* in bytes; kind 3 only: 12 for each priority, a remainder is ignored */
   char format[16];      /* print format, label included, ended by a NUL */
 } SnapshotFieldDescriptor;
 
 /*
- * Renders `snapshotSize` bytes of SnapshotRecords: a legend, one line a record and an empty line.
+ * Renders `snapshotSize` bytes of SnapshotRecords: a legend, one line for each record and an empty
+ * line.
  * Bytes after the last whole record are ignored.
  *
  * `*outputSize` is the capacity of `output` in bytes. Returns 1 and sets it to the length of the
  * text without its NUL. Returns 0 and leaves it alone when the text and its NUL do not fit:
  * `output` then holds as much of the text as fits, ended by a NUL (nothing for a capacity of 0). A
- * null pointer gets 0; `snapshot` may be null when there is not one whole record. The number of
- * records is kept to 32 bits: 252 times 2^32 bytes are 1 and no record.
+ * null pointer gets 0; `snapshot` may be null when there is not one whole record. Of the number of
+ * records only the low 32 bits are used.
  */
 MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t snapshotSize,
                                                char *output, uint64_t *outputSize);
@@ -129,11 +130,11 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * banner does not fit, every call returns 0 with the empty text and `*state` at 0. A record whose
  * first described field begins with 32 bits of 0 is empty and prints no line.
  *
- * To lose no record, come again for the one that did not fit. After a call that completed lines set
+ * To lose no record, ask again for the one that did not fit. After a call that completed lines set
  * `*state` back by one: the record then has the buffer to itself. After a call that completed none,
- * restore the state that it began with (the banner was dropped with the record, and is due again at
- * 0) and give more room. Set back by one instead, it would fail at the same record for ever. A
- * hostile format asks for any room: at a bound leave the state, and the record is passed over.
+ * restore the state that it began with (at 0 the banner, dropped with the record, is written again)
+ * and give more room. Without more room it would fail at the same record for ever. A hostile
+ * format can ask for any room: at a bound leave the state, and the record is passed over.
  *
  *     uint64_t room = 4096;
  *     char *text = malloc(room);
@@ -158,7 +159,7 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  *     free(text);
  *
  * A null header, output, output size or state and a capacity of 0 get 0, and nothing is touched. A
- * null snapshot is one without records: 1 and the empty text, unless the banner does not fit.
+ * null snapshot has no records: the call returns 1 and the empty text if the banner fits.
  *
  * The header is not trusted, but it must be whole (ask snapshot_header.h first): its text,
  * descriptor table and descriptors are read where it says they are, the table only when a whole
@@ -169,7 +170,7 @@ MORWICK_EXPORT uint64_t KVRParseSnapshotBuffer(const void *snapshot, uint64_t sn
  * text by s. A field of kind 3 without priorities is the exception: nothing is read for it, so it
  * prints its three labels wherever its offset points. The flags -, 0, +, blank and #, width and
  * precision may be any, but a field wider than 2^31 - 1 characters fits no buffer. When the 32 bits
- * that tell an empty record lie outside the record, or no field is described, every record counts
+ * that mark an empty record lie outside the record, or no field is described, every record counts
  * as empty.
  */
 MORWICK_EXPORT uint64_t KVRParseSnapshotBufferWithInplaceParser(const void *snapshot,

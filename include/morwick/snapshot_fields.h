@@ -36,18 +36,17 @@ typedef enum MorwickFieldKind {
 enum { kMorwickFieldNameRoom = 32 };
 
 /*
- * Two names of a number. No two names of a layout have the same label.
+ * Two names of a number. No two numbers of a layout have the same label.
  *
- * The label is what the text has before the number, without blanks and signs at its ends: TH for
- * the format " TH=%8u.%02u". Letters, digits, "_" and bytes above 127 are no signs; between those
- * anything may stand. A number without a label is named by its offset, at_168. A label that came
- * before gets a number, X_2; where the layout has labels such as X_7 itself, numbers go on from
- * there, X_8.
+ * The label is the text before the number, without blanks and signs at its ends: TH for the format
+ * " TH=%8u.%02u". Signs are all characters but letters, digits, "_" and bytes above 127. A number
+ * without a label is named by its offset, at_168. A label that came before gets a number, X_2;
+ * where the layout has labels such as X_7 itself, numbers go on from there, X_8.
  *
- * The column is the label, or the name that says more, where the fixed layout has a field of that
- * kind and label: TH_us for TH, BF_fragments for BF, and BF_high_water for what a format such as
- * "/%2u" prints right after BF. For a repeated label, and for the number right after it, the column
- * is the label.
+ * The column is the label, or a name that says more where the fixed layout has a field of that kind
+ * and label: TH_us for TH, BF_fragments for BF, and BF_high_water for the number that a format such
+ * as "/%2u" prints right after BF. For a repeated label, and for the number right after it, the
+ * column is the label.
  */
 typedef struct MorwickFieldName {
   char label[kMorwickFieldNameRoom];
@@ -57,9 +56,9 @@ typedef struct MorwickFieldName {
 typedef struct MorwickSnapshotField {
   MorwickFieldKind kind;
   uint32_t offset;     /* of its first number in a record, in bytes, as the descriptor says */
-  uint32_t priorities; /* 0 but for kMorwickFieldPriorities, which has at least 1 */
-  /* Of one number names[0]; of priorities those of count, total and maximum latency, RO, RL and RM
-   * for the format " R%s=". The others are empty. */
+  uint32_t priorities; /* at least 1 for kMorwickFieldPriorities, else 0 */
+  /* One number has names[0]. Priorities have the names of count, total latency and maximum latency:
+   * RO, RL and RM for the format " R%s=". The others are empty. */
   MorwickFieldName names[3];
 } MorwickSnapshotField;
 
@@ -69,10 +68,11 @@ typedef struct MorwickSnapshotField {
  * must have passed MorwickCheckSnapshotHeader, and may have any alignment. A null field gets 0.
  *
  * A field whose kind is not kMorwickFieldWithoutNumber lies in the records that the header
- * describes. Of field 0 the offset tells an empty record, whatever its kind, and may lie outside.
+ * describes. The number at the offset of field 0 is 0 in an empty record, whatever the kind of the
+ * field; that offset may lie outside.
  *
- * The time grows with the number of descriptors, for the names are compared with all others. A
- * hostile header of 1 MiB has 37,000, and all its fields take minutes: refuse such a header first.
+ * Each name is compared with all others. A hostile header of 1 MiB has 37,000 descriptors, and all
+ * its fields take minutes: refuse such a header first.
  */
 MORWICK_EXPORT int MorwickSnapshotFieldAt(const void *header, uint32_t index,
                                           MorwickSnapshotField *field);

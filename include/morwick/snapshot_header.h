@@ -1,7 +1,6 @@
 /*
- * Whether a snapshot header is whole, to be asked before the renderings of snapshot.h and whatever
- * else follows its offsets are trusted with it: a header comes from a controller or a file, and may
- * be damaged or hostile.
+ * Checks whether a snapshot header is whole. A header comes from a controller or a file and may be
+ * damaged or hostile, so check it before snapshot.h or anything else follows its offsets.
  *
  * Threads: may be called from any thread.
  */
@@ -17,7 +16,7 @@
 extern "C" {
 #endif
 
-/* What is wrong with a header; the first of these, in this order. */
+/* The first fault of a header, in this order. */
 typedef enum MorwickHeaderFault {
   kMorwickHeaderIsWhole,
   kMorwickHeaderTooShort,     /* fewer bytes than SnapshotHeader has, or a null pointer */
@@ -33,9 +32,9 @@ enum { kMorwickHeaderTextRoom = 120 };
 /*
  * Checks a header of `size` bytes, of any alignment: its text (where the format version asks for
  * it), its descriptor table and its descriptors must lie inside, and its records must have a size.
- * Formats and fields need no check: the renderings look at each themselves. Unless `text` is null
- * it gets the fault in a few words with the bad value, at most kMorwickHeaderTextRoom
- * bytes with the NUL; the empty text for a whole header.
+ * Formats and fields need no check: the renderings check each themselves. Unless `text` is null it
+ * gets the fault in a few words with the bad value, at most kMorwickHeaderTextRoom bytes with the
+ * NUL; the empty text for a whole header.
  */
 MORWICK_EXPORT MorwickHeaderFault MorwickCheckSnapshotHeader(const void *header, uint64_t size,
                                                              char *text);

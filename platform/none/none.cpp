@@ -10,7 +10,7 @@
 
 namespace {
 
-constexpr int32_t kBadHandle = 1;
+constexpr int32_t kBadHandle = 1;  // any number but 0
 constexpr int kActivityStateNone = 0;
 
 }  // namespace

@@ -22,7 +22,7 @@
 namespace simulated {
 namespace {
 
-enum Result : int32_t {
+enum Result : int32_t {  // 0 is success; the other numbers are made up
   kSuccess = 0,
   kBadHandle = 0x101,
   kBadArgument = 0x102,
@@ -32,7 +32,7 @@ enum Result : int32_t {
   kNoMemory = 0x106,
 };
 
-constexpr uint32_t kTaskScheduler = 39;
+constexpr uint32_t kTaskScheduler = 39;  // a command, as those of kBuffers
 constexpr uint32_t kTaskSchedulerArgument = 1025;
 constexpr uint32_t kReadArgument = 0;
 using Request = std::array<uint32_t, 6>;  // command, argument, zeros
@@ -48,12 +48,12 @@ const char *NameOf(HandleKind kind) {
   return kind == HandleKind::kService ? "service" : "connection";
 }
 
-// All state of the simulated drivers. Calls may come from any thread: Ask makes one at a time.
+// All state of the simulated drivers. Calls may come from any thread; Ask lets one in at a time.
 class Drivers {
  public:
   Drivers() {
     const Scenario *scenario = TheScenario();
-    if (scenario != nullptr) controllers_ = scenario->controllers;  // or else a tool finds nothing
+    if (scenario != nullptr) controllers_ = scenario->controllers;  // else a tool finds none
   }
 
   // At exit: a handle that is still open was leaked.
@@ -64,7 +64,7 @@ class Drivers {
     }
   }
 
-  // Returns what the method returns, or `failure` when memory is refused.
+  // Calls the method on the one instance. Returns its answer, or `failure` when memory is refused.
   template <typename Answer>
   static Answer Ask(Answer failure, auto method, const auto &...arguments) {
     try {
@@ -92,7 +92,7 @@ class Drivers {
     return kSuccess;
   }
 
-  // A failed close leaves nothing open: there is no handle left to try it with again.
+  // A close that fails closes the handle all the same.
   int32_t Close(uint32_t connection) {
     Controller *controller = ControllerOf(HandleKind::kConnection, connection);
     if (controller == nullptr) return kBadHandle;

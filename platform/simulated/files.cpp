@@ -1,4 +1,4 @@
-// Reads files from outside and complains about them.
+// Reads files from outside, and prints complaints.
 
 #include "platform/simulated/files.h"
 
@@ -44,8 +44,8 @@ std::string Printable(std::string_view text) {
 std::string Quoted(std::string_view text) { return "'" + Printable(text) + "'"; }
 
 void Complain(const std::string &reason) {
-  pollfd room = {.fd = STDERR_FILENO, .events = POLLOUT, .revents = 0};
-  if (poll(&room, 1, 1000) == 0) return;
+  pollfd writable = {.fd = STDERR_FILENO, .events = POLLOUT, .revents = 0};
+  if (poll(&writable, 1, 1000) == 0) return;
   std::fprintf(stderr, "%s: %s\n", program_invocation_short_name, reason.c_str());
 }
 

@@ -1,4 +1,4 @@
-// Files from outside, and lines about them.
+// Reads files from outside, and prints complaints.
 #ifndef PLATFORM_SIMULATED_FILES_H
 #define PLATFORM_SIMULATED_FILES_H
 
@@ -12,7 +12,7 @@ namespace simulated {
 // or the error number as in errno.
 int ReadFile(const std::string &path, size_t most, std::string *bytes);
 
-// Text from outside. Bytes that could end a line or control a terminal are written as \x0a.
+// Makes text from outside safe to print: bytes other than printable ASCII become \x0a and the like.
 std::string Printable(std::string_view text);
 
 // The same in quotes.

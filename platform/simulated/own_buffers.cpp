@@ -1,7 +1,7 @@
-// Statistics, snapshot and snapshot header of a made-up controller. It was first powered on at a
-// fixed time, and all values follow from the time since then. Its load rises and falls once a
-// minute. All numbers are little-endian. It has its own copies of keys and columns, so that tests
-// notice a wrong one in the library.
+// Statistics, snapshot and snapshot header of a made-up controller. All values follow from its age,
+// in milliseconds since a fixed first power-on. Its load rises and falls once a minute. All numbers
+// are little-endian. Keys and columns are copied here, so that tests notice a wrong one in the
+// library.
 
 #include "platform/simulated/own_buffers.h"
 
@@ -21,18 +21,17 @@ namespace {
 
 constexpr uint64_t kFirstPowerOn = 1704067200;  // 2024, in seconds since 1970
 constexpr uint64_t kHour = 3'600'000;           // in milliseconds
-constexpr uint64_t kMinute = 60'000;
+constexpr uint64_t kMinute = 60'000;            // in milliseconds
 constexpr uint64_t kHoursAMonth = 730;
-constexpr double kSwing = 5'000;
+constexpr double kSwing = 5'000;  // the milliseconds by which BusyTime and age differ at most
 
-// The value at the first power-on, and how much each hour of the clock, each hour of work or each
-// month adds. An array is a histogram: each element has half the value of the element before it.
-enum Pace { kByLoad, kByClock, kByMonth };
+// An array is a histogram: each element has half the value of the element before it.
+enum Pace { kByLoad, kByClock, kByMonth };  // by hour of BusyTime, hour of age, month of age
 struct Counter {
   uint32_t id;
   uint32_t elementCount;
-  uint64_t start;
-  uint64_t growth;
+  uint64_t start;   // the value at the first power-on
+  uint64_t growth;  // in each hour or month
   Pace pace = kByLoad;
 };
 
@@ -76,23 +75,23 @@ constexpr Counter kMspStatistics[] = {
     {8214, 5, 0, 3'600},         // active time
 };
 
-// A second of the controller's life. Writes are slow in eight seconds of each two minutes.
+// A second of the controller's life.
 struct Second {
-  uint32_t number;
-  uint32_t noise;  // 0 to 15
-  uint32_t load;
-  uint32_t slowness;
+  uint32_t number;    // seconds since the first power-on
+  uint32_t noise;     // 0 to 15
+  uint32_t load;      // about 77 on average
+  uint32_t slowness;  // 1, or 10 when writes are slow
 
   uint32_t HostReads() const { return 26 * load; }
   uint32_t HostWrites() const { return 11 * load; }
   uint32_t Collected() const { return HostWrites() / 2; }
 };
 
-// Where the columns of a snapshot's interval are, how each is printed, and its value.
+// A column of a snapshot. A snapshot has an interval for each second.
 enum Kind : uint16_t { kPlain = 1, kThousandths = 2, kPriorities = 3 };
 struct Column {
   Kind kind;
-  uint32_t offset;
+  uint32_t offset;  // in the interval, in bytes, as are the sizes and offsets below
   std::string_view format;
   uint32_t (*valueOf)(const Second &s) = nullptr;  // AppendInterval sets those by priority
 };
@@ -134,7 +133,7 @@ constexpr Column kColumns[] = {
 // clang-format on
 
 constexpr uint32_t kIntervalCount = 120;
-constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};
+constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};  // whole words
 constexpr size_t kFormatSize = 16;
 
 template <typename Number>
@@ -142,49 +141,49 @@ void Append(Number number, std::string *buffer) {
   for (size_t i = 0; i < sizeof number; ++i) buffer->push_back(static_cast<char>(number >> 8 * i));
 }
 
-// The place of a time (in milliseconds) within the load's minute, as an angle.
-double PhaseAt(uint64_t time) {
-  return 2 * std::numbers::pi * static_cast<double>(time % kMinute) / kMinute;
+// The angle of an age within the minute in which the load rises and falls.
+double PhaseAt(uint64_t age) {
+  return 2 * std::numbers::pi * static_cast<double>(age % kMinute) / kMinute;
 }
 
-// The time that drives most counters. It is up to five seconds before or after the clock and never
-// goes back. The load is how much of it passes in a second.
-uint64_t BusyTime(uint64_t time) {
-  return time + static_cast<uint64_t>(std::llround(kSwing * std::sin(PhaseAt(time))));
+// Like the age, but it passes faster while the load is high. It never goes back.
+uint64_t BusyTime(uint64_t age) {
+  return age + static_cast<uint64_t>(std::llround(kSwing * std::sin(PhaseAt(age))));
 }
 
-// The load at a time, 1 on average: the derivative of BusyTime.
-double LoadAt(uint64_t time) {
-  return 1 + 2 * std::numbers::pi * kSwing / kMinute * std::cos(PhaseAt(time));
+// How fast BusyTime passes, 1 on average: the derivative of BusyTime.
+double LoadAt(uint64_t age) {
+  return 1 + 2 * std::numbers::pi * kSwing / kMinute * std::cos(PhaseAt(age));
 }
 
 // Multiplies whole hours and the rest separately: growth times milliseconds could exceed 64 bits.
-uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t clock) {
-  uint64_t time = counter.pace == kByLoad ? BusyTime(clock) : clock;
-  if (counter.pace == kByMonth) time /= kHoursAMonth;
+uint64_t ElementAt(const Counter &counter, uint32_t element, uint64_t age) {
+  uint64_t time = counter.pace == kByLoad ? BusyTime(age) : age;
+  if (counter.pace == kByMonth) time /= kHoursAMonth;  // a month then counts as an hour
   const uint64_t grown = time / kHour * counter.growth + time % kHour * counter.growth / kHour;
   return (counter.start + grown) >> element;
 }
 
-// Appends a record for each counter: id and length as `Half` of a header each, the length in units
-// of so many bytes. Counters stop at the largest `Value`.
-template <typename Half, typename Value, size_t kLengthUnit>
-void AppendCounters(std::span<const Counter> counters, uint64_t time, std::string *buffer) {
+// Appends a record for each counter. A header is two of `HeaderPart`: the id, and the length in
+// units of kLengthUnit bytes. Counters stop at the largest `Value`.
+template <typename HeaderPart, typename Value, size_t kLengthUnit>
+void AppendCounters(std::span<const Counter> counters, uint64_t age, std::string *buffer) {
   for (const Counter &counter : counters) {
-    Append(static_cast<Half>(counter.id), buffer);
-    Append(static_cast<Half>(counter.elementCount * sizeof(Value) / kLengthUnit), buffer);
+    Append(static_cast<HeaderPart>(counter.id), buffer);
+    Append(static_cast<HeaderPart>(counter.elementCount * sizeof(Value) / kLengthUnit), buffer);
     for (uint32_t i = 0; i < counter.elementCount; ++i) {
       constexpr uint64_t kLargest = std::numeric_limits<Value>::max();
-      Append(static_cast<Value>(std::min(ElementAt(counter, i, time), kLargest)), buffer);
+      Append(static_cast<Value>(std::min(ElementAt(counter, i, age), kLargest)), buffer);
     }
   }
 }
 
-constexpr uint32_t kNotShown = 4'200'000'000;
+constexpr uint32_t kNotShown = 4'200'000'000;  // larger than the value of any column
 
-// The interval that ended in the second with that number.
+// The interval that ended in the second with that number. Writes are slow in eight seconds of each
+// two minutes.
 void AppendInterval(uint32_t number, std::string *buffer) {
-  const uint32_t noise = number * 2654435761U >> 28;
+  const uint32_t noise = number * 2654435761U >> 28;  // the top four bits of a hash
   const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{number} * 1000)) + noise;
   const Second second = {number, noise, load, number % 120 < 8 ? 10U : 1U};
   // Words without a column get values that no column has, so that a wrong offset is seen.
@@ -205,8 +204,8 @@ void AppendInterval(uint32_t number, std::string *buffer) {
   for (const uint32_t word : interval) Append(word, buffer);
 }
 
-void AppendSnapshot(uint64_t time, std::string *buffer) {
-  const auto last = static_cast<uint32_t>(time / 1000);
+void AppendSnapshot(uint64_t age, std::string *buffer) {
+  const auto last = static_cast<uint32_t>(age / 1000);
   for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, buffer);
 }
 
@@ -230,25 +229,25 @@ void AppendSnapshotHeader(std::string *buffer) {
   }
 }
 
-// Milliseconds since the first power-on. When the clock is set to an earlier time, the controller
-// still has as many intervals as a snapshot holds.
-uint64_t Now() {
+// The controller's age now; at least the length of a snapshot, even when the clock is set to an
+// earlier time than the first power-on.
+uint64_t AgeNow() {
   using std::chrono::milliseconds;
   const int64_t now =
       std::chrono::duration_cast<milliseconds>(std::chrono::system_clock::now().time_since_epoch())
           .count();
   constexpr auto kPowerOn = static_cast<int64_t>(kFirstPowerOn * 1000);
-  constexpr int64_t kIntervals = int64_t{kIntervalCount} * 1000;
-  return static_cast<uint64_t>(std::max(now - kPowerOn, kIntervals));
+  constexpr int64_t kLeast = int64_t{kIntervalCount} * 1000;
+  return static_cast<uint64_t>(std::max(now - kPowerOn, kLeast));
 }
 
 }  // namespace
 
 std::string MakeOwnBuffer(std::string_view key) {
   std::string buffer;
-  if (key == "statistics") AppendCounters<uint32_t, uint64_t, 8>(kStatistics, Now(), &buffer);
-  if (key == "msp") AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, Now(), &buffer);
-  if (key == "snapshot") AppendSnapshot(Now(), &buffer);
+  if (key == "statistics") AppendCounters<uint32_t, uint64_t, 8>(kStatistics, AgeNow(), &buffer);
+  if (key == "msp") AppendCounters<uint16_t, uint32_t, 1>(kMspStatistics, AgeNow(), &buffer);
+  if (key == "snapshot") AppendSnapshot(AgeNow(), &buffer);
   if (key == "snapshot_header") AppendSnapshotHeader(&buffer);
   return buffer;
 }

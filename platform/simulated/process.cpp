@@ -26,7 +26,8 @@ void TakeStandardStreams() {
   if (descriptor >= 0) close(descriptor);
 }
 
-const sigset_t &WaitedFor() {
+// The signals that this file waits for.
+const sigset_t &Signals() {
   static const sigset_t signals = [] {
     sigset_t set;
     sigemptyset(&set);
@@ -42,7 +43,7 @@ const sigset_t &WaitedFor() {
 
 const Scenario &Take() {
   TakeStandardStreams();
-  // The failing write reports these two; they must not end the daemon.
+  // These two must not end the daemon: the write that fails reports the reason.
   signal(SIGPIPE, SIG_IGN);
   signal(SIGXFSZ, SIG_IGN);
   const Scenario *scenario = nullptr;
@@ -52,10 +53,9 @@ const Scenario &Take() {
     EndWithoutMemory();
   }
   if (scenario == nullptr) std::exit(2);
-  // Until here any signal ends the process: the scenario may come from a pipe that stays open.
-  // The signals are blocked before a second thread starts. So they never interrupt the activity's
-  // sleep.
-  pthread_sigmask(SIG_BLOCK, &WaitedFor(), nullptr);
+  // Until here a signal ends the process: the scenario may come from a pipe that stays open. Later
+  // threads inherit the blocked signals, so that none interrupts the activity's sleep.
+  pthread_sigmask(SIG_BLOCK, &Signals(), nullptr);
   return *scenario;
 }
 
@@ -67,22 +67,22 @@ const Scenario &TakeProcess() {
 }
 
 void EndWithoutMemory() {
-  Complain("out of memory");  // so short that the text needs no memory
+  Complain("out of memory");  // so short that the string takes no memory
   std::exit(2);
 }
 
 bool StopCameEarly() {
   const timespec now = {};
   bool stop = false;
-  for (int signal; (signal = sigtimedwait(&WaitedFor(), nullptr, &now)) > 0;) {
+  for (int signal; (signal = sigtimedwait(&Signals(), nullptr, &now)) > 0;) {
     stop = stop || signal != SIGUSR1;
   }
   return stop;
 }
 
-bool WaitToStop() {
+bool WaitForSignal() {
   int signal = 0;
-  sigwait(&WaitedFor(), &signal);
+  sigwait(&Signals(), &signal);
   return signal != SIGUSR1;
 }
 

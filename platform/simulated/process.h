@@ -7,10 +7,10 @@
 
 namespace simulated {
 
-// Each function that only a daemon calls begins with it. The first call must come from the main
-// thread and takes over the process: no file that is opened later becomes descriptor 0, 1 or 2, and
-// SIGPIPE and SIGXFSZ are ignored. Then it loads the scenario; without one the process ends with
-// status 2. From then on SIGTERM, SIGINT, SIGHUP and SIGUSR1 wait for WaitToStop.
+// RegisterActivity, RunMainQueue and SystemLog begin with it. The first call must come from the
+// main thread and takes over the process: no file that is opened later becomes descriptor 0, 1 or
+// 2, and SIGPIPE and SIGXFSZ are ignored. Then it loads the scenario; without one the process ends
+// with status 2. From then on SIGTERM, SIGINT, SIGHUP and SIGUSR1 wait for WaitForSignal.
 const Scenario &TakeProcess();
 
 // Ends the process with one line and status 2, because memory or a thread was refused.
@@ -22,9 +22,9 @@ bool StopCameEarly();
 
 // Waits for a signal. True when it asks the process to stop, false when it asks the activity to
 // yield.
-bool WaitToStop();
+bool WaitForSignal();
 
-// Sends SIGTERM to this process.
+// Sends SIGTERM to this process, which WaitForSignal takes.
 void Stop();
 
 }  // namespace simulated

@@ -27,7 +27,7 @@
 namespace simulated {
 namespace {
 
-// It takes about ten seconds: discovery, two requests, a deferral between them and the resumed run.
+// Takes about ten seconds: discovery, two requests, a deferral between them and the resumed run.
 constexpr std::string_view kBuiltInScenario = R"(
 [schedule]
 defer_at_check = [2]
@@ -37,9 +37,9 @@ class = "VeltoQRN3NVMeController"
 pending = 2
 )";
 
-constexpr double kLongestSeconds = 1e6;
+constexpr double kLongestSeconds = 1e6;  // far below where a wait would overflow
 constexpr size_t kLargestFile = 64 << 10;
-constexpr size_t kMostDots = 256;
+constexpr size_t kMostDots = 256;  // in one line
 
 // The first error of a scenario, and its line.
 struct BadScenario {
@@ -51,8 +51,8 @@ struct BadScenario {
   throw BadScenario{.line = where.begin.line, .reason = reason};
 }
 
-// Some texts must not reach the TOML library. For some characters beyond ASCII its tables run into
-// undefined behaviour. Each dot of a key takes some of its stack.
+// Keeps from the TOML library what it cannot bear: some characters beyond ASCII lead it into
+// undefined behaviour, and each dot of a key takes some of the stack.
 void CheckText(std::string_view text) {
   size_t line = 1;
   size_t dots = 0;
@@ -69,22 +69,22 @@ void CheckText(std::string_view text) {
   }
 }
 
-[[noreturn]] void Reject(const toml::node &node, std::string_view key, const std::string &reason) {
+[[noreturn]] void Refuse(const toml::node &node, std::string_view key, const std::string &reason) {
   Refuse(node.source(), Quoted(key) + " " + reason);
 }
 
-// Each Convert takes the value of a key.
+// Each Convert stores the value of a key, or refuses it.
 void Convert(const toml::node &node, std::string_view key, bool *target) {
   const auto value = node.value_exact<bool>();
-  if (!value) Reject(node, key, "must be true or false");
+  if (!value) Refuse(node, key, "must be true or false");
   *target = *value;
 }
 
 void Convert(const toml::node &node, std::string_view key, uint32_t *target, uint32_t least = 0) {
   const auto value = node.value_exact<int64_t>();
-  if (!value) Reject(node, key, "must be a whole number");
+  if (!value) Refuse(node, key, "must be a whole number");
   if (*value < least || *value > std::numeric_limits<uint32_t>::max()) {
-    Reject(node, key, "must be between " + std::to_string(least) + " and 4294967295");
+    Refuse(node, key, "must be between " + std::to_string(least) + " and 4294967295");
   }
   *target = static_cast<uint32_t>(*value);
 }
@@ -92,21 +92,21 @@ void Convert(const toml::node &node, std::string_view key, uint32_t *target, uin
 void Convert(const toml::node &node, std::string_view key, std::vector<uint32_t> *target,
              uint32_t least = 0) {
   const toml::array *array = node.as_array();
-  if (array == nullptr) Reject(node, key, "must be a list of whole numbers");
+  if (array == nullptr) Refuse(node, key, "must be a list of whole numbers");
   for (const toml::node &element : *array) Convert(element, key, &target->emplace_back(), least);
 }
 
 void Convert(const toml::node &node, std::string_view key, Fault *target) {
   if (node.is_boolean()) return Convert(node, key, &target->always);
   if (node.is_array()) return Convert(node, key, &target->calls, 1);
-  Reject(node, key, "must be true, false or a list of call numbers");
+  Refuse(node, key, "must be true, false or a list of call numbers");
 }
 
 void Convert(const toml::node &node, std::string_view key, std::chrono::milliseconds *target) {
-  if (!node.is_number()) Reject(node, key, "must be a number of seconds");
+  if (!node.is_number()) Refuse(node, key, "must be a number of seconds");
   const double seconds = node.value<double>().value_or(-1);
   if (!(seconds >= 0 && seconds <= kLongestSeconds)) {
-    Reject(node, key, "must be between 0 and 1000000 seconds");
+    Refuse(node, key, "must be between 0 and 1000000 seconds");
   }
   *target = std::chrono::milliseconds(std::llround(seconds * 1000));
 }
@@ -116,7 +116,7 @@ void AddFile(const toml::node &node, std::string_view key, std::vector<std::stri
              std::string_view folder) {
   const std::string name = node.value_exact<std::string>().value_or("");
   if (name.empty() || name.find('\0') != std::string::npos) {
-    Reject(node, key, "must be a file or a list of files");
+    Refuse(node, key, "must be a file or a list of files");
   }
   target->push_back(name[0] == '/' ? name : std::string(folder) + name);
 }
@@ -128,7 +128,7 @@ void Convert(const toml::node &node, std::string_view key, std::vector<std::stri
   for (const toml::node &element : *array) AddFile(element, key, target, folder);
 }
 
-// One table of the file. A key that nobody has asked for is unknown.
+// One table of the file. A key that was never asked for is unknown.
 class TableReader {
  public:
   explicit TableReader(const toml::table &table) : table_(table) {}

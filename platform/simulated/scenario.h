@@ -43,7 +43,7 @@ struct Fault {
 struct Controller {
   std::string className;
   uint32_t pending = 2;  // units of BDR work
-  Fault vanish;          // look-ups that find nothing
+  Fault vanish;          // searches that find nothing
   Fault refuseOpen;
   Fault failRequest;
   Fault failRead;
@@ -71,8 +71,8 @@ struct Scenario {
 // The driver method that takes the requests for a controller of the class; 0 for an unknown class.
 uint32_t RequestMethod(std::string_view className);
 
-// Parses the text of a scenario file. Names of files in it are relative to that file. For a bad
-// text returns nothing, with "FILE:LINE: reason" in `error`. Opens no file.
+// Parses the text of a scenario file; file names in it are relative to the folder of `file`. For a
+// bad text returns nothing, with "FILE:LINE: reason" in `error`. Opens no file.
 std::optional<Scenario> ParseScenario(std::string_view text, const std::string &file,
                                       std::string *error);
 

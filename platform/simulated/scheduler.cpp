@@ -10,7 +10,7 @@
 #include "morwick/platform.h"
 #include "platform/simulated/process.h"
 
-// The process has one. Its handler runs on the worker thread and calls the platform from there.
+// The process has one activity. Its handler runs on the worker thread and calls the platform there.
 struct Activity {
   ActivityHandler handler = nullptr;
   int state = 0;
@@ -26,6 +26,7 @@ struct Activity {
 namespace simulated {
 namespace {
 
+// States beside the two of the contract.
 constexpr int kActivityStateCheckIn = 0;
 constexpr int kActivityStateWait = 1;
 constexpr int kActivityStateDone = 5;
@@ -53,7 +54,7 @@ bool RunActivity(uint32_t checksToYield) {
   return deferred;
 }
 
-// False when the process is to stop instead.
+// Waits so long. False when the process is to stop before.
 bool WaitFor(std::chrono::milliseconds delay) {
   std::unique_lock lock(theActivity.mutex);
   return !theActivity.wakeUp.wait_for(lock, delay, [] { return theActivity.stopping; });
@@ -84,7 +85,7 @@ void Run(const Schedule &schedule) {
     Stop();  // at the end of the schedule the main queue ends as by SIGTERM
   });
   for (bool stop = false; !stop;) {
-    stop = WaitToStop();
+    stop = WaitForSignal();
     const std::lock_guard lock(theActivity.mutex);
     // Between two runs a wish to yield has no effect: CallHandler clears it.
     theActivity.yieldWanted = true;
@@ -122,8 +123,7 @@ void ExitTransactionClean() { theActivity.inTransaction = false; }
 
 void RunMainQueue() {
   const simulated::Schedule &schedule = simulated::TakeProcess().schedule;
-  // The lines that the library prints then appear among the lines of the log, not after all of
-  // them.
+  // So the lines that the library prints appear among the lines of the log, not after all of them.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
   try {
     simulated::Run(schedule);

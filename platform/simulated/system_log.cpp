@@ -26,7 +26,7 @@ namespace simulated {
 namespace {
 
 constexpr size_t kLongestMessage = 1024;
-using Line = std::array<char, kLongestMessage + 64>;
+using Line = std::array<char, kLongestMessage + 64>;  // with room for time, program and level
 
 // Where lines go. A line that cannot be written at once waits in a bounded space. Lines that do not
 // fit there, and lines whose write fails, are dropped and counted.
@@ -34,7 +34,7 @@ class Output {
  public:
   // Makes a line of a message; returns its length.
   using Format = int(const char *message, Line *line);
-  // Returns how much was written, 0 when there is no room now, or -1 when there will be none.
+  // Returns how much was written, 0 when there is no room now, or -1 when the write fails.
   using Write = ssize_t(int descriptor, const char *text, size_t length);
 
   Output(int descriptor, Format *format, Write *write)
@@ -51,20 +51,20 @@ class Output {
       const size_t length = std::strlen(waiting_.data());
       const ssize_t written = write_(descriptor_, waiting_.data(), length);
       if (written == 0) return false;
-      // One line is lost, or all lines that a lost count stands for.
-      if (written < 0) dropped_ += std::max(countWaits_, 1ULL);
+      // Counts the line, or all the lines that it was to report.
+      if (written < 0) dropped_ += std::max(reported_, 1ULL);
       // The rest of a line that was written in part keeps waiting.
       const bool done = written < 0 || static_cast<size_t>(written) == length;
       const size_t gone = done ? length + 1 : static_cast<size_t>(written);
       waitingSize_ -= gone;
       std::memmove(waiting_.data(), waiting_.data() + gone, waitingSize_);
-      if (done) countWaits_ = 0;
+      if (done) reported_ = 0;
     }
     if (dropped_ > 0) {
       std::array<char, 64> message;
       std::snprintf(message.data(), message.size(), "%llu lines of the log were dropped", dropped_);
       if (Put(message.data())) {
-        if (waitingSize_ > 0) countWaits_ = dropped_;
+        if (waitingSize_ > 0) reported_ = dropped_;
         dropped_ = 0;
       }
     }
@@ -72,7 +72,7 @@ class Output {
   }
 
  private:
-  // False when the line is lost.
+  // Writes the message as a line, or lets it wait. False when it is lost.
   bool Put(const char *message) {
     Line line;
     const auto length = static_cast<size_t>(format_(message, &line));
@@ -92,7 +92,7 @@ class Output {
   std::array<char, 16 << 10> waiting_ = {};  // lines, each with its NUL
   size_t waitingSize_ = 0;
   unsigned long long dropped_ = 0;
-  unsigned long long countWaits_ = 0;  // dropped lines that the first waiting line counts
+  unsigned long long reported_ = 0;  // dropped lines that the first waiting line reports
 };
 
 int FormatForTheSystem(const char *message, Line *line) {
@@ -105,7 +105,7 @@ int FormatForTheSystem(const char *message, Line *line) {
                        LOG_DAEMON | LOG_NOTICE, stamp.data(), getpid(), message);
 }
 
-// The socket is not connected, so that it reaches a log that was restarted.
+// The socket stays unconnected, so that lines reach a log that was restarted.
 ssize_t SendToTheSystem(int socket, const char *text, size_t length) {
   static constexpr sockaddr_un kReader = {.sun_family = AF_UNIX, .sun_path = "/dev/log"};
   const ssize_t written = sendto(socket, text, length, MSG_DONTWAIT | MSG_NOSIGNAL,
@@ -120,8 +120,8 @@ int FormatForAPerson(const char *message, Line *line) {
 ssize_t WriteToAPerson(int descriptor, const char *text, size_t length) {
   ssize_t written = send(descriptor, text, length, MSG_DONTWAIT | MSG_NOSIGNAL);
   if (written < 0 && errno == ENOTSOCK) {
-    pollfd room = {.fd = descriptor, .events = POLLOUT, .revents = 0};
-    if (poll(&room, 1, 0) == 0) return 0;
+    pollfd writable = {.fd = descriptor, .events = POLLOUT, .revents = 0};
+    if (poll(&writable, 1, 0) == 0) return 0;
     written = write(descriptor, text, length);
   }
   return written < 0 && errno == EAGAIN ? 0 : written;
@@ -140,7 +140,7 @@ int OpenStandardError() {
   return STDERR_FILENO;
 }
 
-// The journal names the stream that it reads from a service. A line written there would be logged
+// JOURNAL_STREAM names the stream that the journal reads. A line written there would be logged
 // twice.
 bool StandardErrorIsTheJournal() {
   const char *journal = std::getenv("JOURNAL_STREAM");
@@ -157,7 +157,7 @@ class Log {
  public:
   explicit Log(bool enabled) : enabled_(enabled) {}
 
-  // Lines that still wait have a second.
+  // Gives lines that still wait a second.
   ~Log() {
     for (int tries = 100; tries > 0 && !Flush(); --tries) usleep(10'000);
   }
