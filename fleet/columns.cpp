@@ -20,16 +20,17 @@ std::string ValueName(MorwickStream stream, const MorwickKey &key, uint32_t coun
   return {name.data(), length};
 }
 
-// How many letters must be inserted, removed or exchanged to turn one text into the other.
+// How many letters must be inserted, removed or replaced to turn one text into the other
+// (Levenshtein). row[j] is the distance between the letters of `one` so far and j of `other`.
 size_t Distance(std::string_view one, std::string_view other) {
   std::vector<size_t> row(other.size() + 1);
   std::iota(row.begin(), row.end(), size_t{0});
   for (size_t i = 0; i < one.size(); ++i) {
     size_t diagonal = std::exchange(row[0], i + 1);
     for (size_t j = 0; j < other.size(); ++j) {
-      const size_t exchanged = diagonal + (one[i] == other[j] ? 0 : 1);
+      const size_t replaced = diagonal + (one[i] == other[j] ? 0 : 1);
       diagonal = row[j + 1];
-      row[j + 1] = std::min({exchanged, row[j] + 1, row[j + 1] + 1});
+      row[j + 1] = std::min({replaced, row[j] + 1, row[j + 1] + 1});
     }
   }
   return row.back();
@@ -42,9 +43,9 @@ std::string Lower(std::string text) {
   return text;
 }
 
-// A name that continues the text is closer than all others.
+// The known name that is closest to this one; names that begin with this one come first.
 std::string ClosestName(std::span<const MorwickStream> streams, const std::string &name) {
-  const std::string text = Lower(name).substr(0, kMorwickNameRoom);
+  const std::string text = Lower(name).substr(0, kMorwickNameRoom);  // bounds the time
   std::vector<std::string> known;
   for (const MorwickStream stream : streams) {
     for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
@@ -59,10 +60,10 @@ std::string ClosestName(std::span<const MorwickStream> streams, const std::strin
   });
 }
 
-// The label of an array where it is printed in one line.
+// The label of an array that is printed in one line, "name[0..9]".
 std::string LabelOf(MorwickStream stream, const MorwickKey &key) {
   std::string label = ValueName(stream, key, key.valueCount, 0);
-  label.pop_back();
+  label.pop_back();  // the first element's 0
   return label + "[0.." + std::to_string(key.valueCount - 1) + "]";
 }
 
@@ -94,19 +95,19 @@ bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPat
   const auto matches = [&](const std::string &known) {
     return isPattern ? fnmatch(name.c_str(), known.c_str(), 0) == 0 : name == known;
   };
-  bool any = false;
+  bool found = false;
   for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
     const MorwickKey &key = *MorwickKeyAt(stream, i);
     if (!isPattern && !name.starts_with(key.name)) continue;
     const bool isLabel = !isPattern && key.valueCount > 1 && name == LabelOf(stream, key);
-    const bool all = isLabel || matches(key.name);
-    for (uint32_t k = 0; k < key.valueCount; ++k) {
-      if (!all && !matches(ValueName(stream, key, key.valueCount, k))) continue;
-      Add(stream, key, k);
-      any = true;
+    const bool wholeArray = isLabel || matches(key.name);
+    for (uint32_t index = 0; index < key.valueCount; ++index) {
+      if (!wholeArray && !matches(ValueName(stream, key, key.valueCount, index))) continue;
+      Add(stream, key, index);
+      found = true;
     }
   }
-  return any;
+  return found;
 }
 
 ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
@@ -117,10 +118,10 @@ ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
     const auto &[key, index, name] = selection.columns()[column];
     uint32_t &first = firstOfId_[key->id - firstId_];
     if (first == kNoColumn) {
-      first = static_cast<uint32_t>(columns_.size());
-      columns_.resize(columns_.size() + key->valueCount, kNoColumn);
+      first = static_cast<uint32_t>(columnOf_.size());
+      columnOf_.resize(columnOf_.size() + key->valueCount, kNoColumn);
     }
-    columns_[first + index] = column;
+    columnOf_[first + index] = column;
   }
 }
 
@@ -134,7 +135,7 @@ Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
     // An array with one value gives an entry with the name of the array, which has no column.
     if (first == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
-      const uint32_t column = columns_[first + i];
+      const uint32_t column = columnOf_[first + i];
       if (column == kNoColumn) continue;
       values[column] = MorwickValue(&record, i);
       present[column] = 1;

@@ -15,14 +15,14 @@
 
 namespace fleet {
 
-// A name that no statistic has; the text suggests the closest one.
+// A name that no statistic has. The text suggests the closest name, unless this one is a pattern.
 class UnknownName : public std::invalid_argument {
   using std::invalid_argument::invalid_argument;
 };
 
 // Statistics by name. The name of an array, or its label such as "name[0..9]", stands for all its
-// elements; the name of an element stands for that element. * ? and [ ] match as in a shell: first
-// the names of arrays, otherwise those of elements. Throws UnknownName.
+// elements; the name of an element stands for that element. * ? and [ ] match as in a shell: a
+// whole array by its name, or else its elements by theirs. Throws UnknownName.
 class Selection {
  public:
   struct Column {
@@ -31,15 +31,15 @@ class Selection {
     std::string name;
   };
 
-  // Without names: all values of all keys, in the order of the key table. At least one of the
-  // streams must have each name.
+  // Without names it has all values of all keys, in the order of the key table. Each name must be
+  // in at least one of the streams.
   Selection(std::span<const MorwickStream> streams, std::span<const std::string> names);
 
   // In the order of the names, each column once.
   const std::vector<Column> &columns() const { return columns_; }
 
-  // Whether an entry of that name is selected. A record that is too short gives one entry with the
-  // name of the array; it counts as the first element.
+  // Whether an entry of that name is selected. An array's record with a single value gives one
+  // entry, which has the name of the array; it counts as the first element.
   bool Has(std::string_view entryName) const { return names_.contains(entryName); }
 
  private:
@@ -48,7 +48,7 @@ class Selection {
   };
 
   void Add(MorwickStream stream, const MorwickKey &key, uint32_t index);
-  // The values of that name, or whose names match the pattern. False when there are none.
+  // Adds the values of that name, or those whose names match the pattern. False if there are none.
   bool AddAll(MorwickStream stream, const std::string &name, bool isPattern);
 
   std::vector<Column> columns_;
@@ -68,9 +68,9 @@ class ColumnFiller {
   static constexpr uint32_t kNoColumn = UINT32_MAX;
 
   MorwickStream stream_;
-  std::vector<uint32_t> firstOfId_;  // place in columns_, by key id less the first
+  std::vector<uint32_t> firstOfId_;  // by key id - firstId_: the first value's place in columnOf_
   uint32_t firstId_;
-  std::vector<uint32_t> columns_;  // for each value of a key that has a column
+  std::vector<uint32_t> columnOf_;  // for each value of the selected keys; may be kNoColumn
 };
 
 }  // namespace fleet

@@ -12,8 +12,8 @@
 
 namespace fleet {
 
-// A buffer that can be read from a controller: its name for people, and the slot of a row that
-// gives the numbers of the request.
+// A buffer that can be read from a controller: its name for people, and the member of NandExporter
+// whose function gives the numbers of the request.
 struct BufferKind {
   std::string_view name;
   SelectorGetter NandExporter::*selectors;
@@ -29,7 +29,7 @@ const BufferKind *FindBufferKind(std::string_view name);
 // A driver's result code, as messages show it.
 std::string Hexadecimal(int32_t result);
 
-// The rows of the table that have a class.
+// The rows of nand_exporters, without the empty one at its end.
 std::span<NandExporter> KnownControllers();
 
 // The row of the class, or null.
@@ -39,7 +39,7 @@ NandExporter *FindRow(std::string_view className);
 struct Presence {
   bool present = false;
   bool opened = false;  // the connection is closed again
-  int32_t result = 0;   // the driver's, of opening
+  int32_t result = 0;   // the driver's code for opening
 };
 // Throws std::bad_alloc when the platform has no memory.
 Presence Probe(const NandExporter &row);
@@ -48,7 +48,7 @@ Presence Probe(const NandExporter &row);
 // result; the connection is 0 when there is none.
 int32_t Open(uint32_t service, uint32_t *connection);
 
-// A buffer, or why it could not be read, with the driver's result if it is the driver that refused.
+// A buffer, or why it could not be read, with the driver's result code if the driver refused.
 struct Reply {
   std::optional<std::string> bytes = {};
   std::string fault = {};

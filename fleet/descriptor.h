@@ -12,7 +12,7 @@ namespace fleet {
 // A descriptor that its owner closes.
 class Descriptor {
  public:
-  // What open returned: negative when it failed.
+  // `number` is the result of open, which is negative when it failed.
   explicit Descriptor(int number = -1) : number_(number) {}
   Descriptor(Descriptor &&other) noexcept : number_(std::exchange(other.number_, -1)) {}
   Descriptor &operator=(Descriptor &&other) noexcept {
@@ -24,7 +24,7 @@ class Descriptor {
   bool open() const { return number_ >= 0; }
   int number() const { return number_; }
 
-  // The result of close.
+  // Returns the result of close, or 0 when nothing is open.
   int Close() { return number_ < 0 ? 0 : close(std::exchange(number_, -1)); }
 
  private:

@@ -16,7 +16,7 @@
 namespace fleet {
 namespace {
 
-constexpr size_t kFirstRoom = 256 << 10;
+constexpr size_t kFirstRoom = 256 << 10;  // bytes; ten times a dump of every key
 
 }  // namespace
 
@@ -49,8 +49,8 @@ DumpReader::Dump DumpReader::Read(const char *name, bool onlyFiles) {
   }
 }
 
-// Up to one byte above the limit, which is enough to notice a larger dump. The C library moves
-// large blocks without a second copy in memory.
+// Grows up to one byte above the limit, which is enough to notice a larger dump. realloc, unlike a
+// vector, moves large blocks without a second copy in memory.
 void DumpReader::Grow() {
   const size_t capacity = std::min<size_t>(std::max(kFirstRoom, capacity_ * 2), kLargestDump + 1);
   auto *bytes = static_cast<char *>(std::realloc(buffer_.get(), capacity));

@@ -12,22 +12,21 @@
 
 namespace fleet {
 
-// Larger dumps are refused. The size of a compressed dump is that of its content.
+// In bytes. No controller gives more; larger dumps are refused. Compressed ones count unpacked.
 constexpr uint64_t kLargestDump = 16 << 20;
 
 // "larger than 16777216 bytes".
 std::string TooLarge(uint64_t limit);
 
-// Reads dump after dump. One for each thread.
+// Reads dump after dump. Each thread needs a reader of its own.
 class DumpReader {
  public:
-  // Reads the file with that name; "-" is standard input. The bytes stay until the next call. When
-  // they are not the whole file, `fault` says why. With `onlyFiles` everything but a regular file
-  // is refused without opening it.
   struct Dump {
-    std::string_view bytes;
-    std::string fault;
+    std::string_view bytes;  // valid until the next call
+    std::string fault;       // why they are not the whole file; empty when they are
   };
+  // Reads the file with that name; "-" is standard input. With `onlyFiles` everything but a regular
+  // file is refused without opening it.
   Dump Read(const char *name, bool onlyFiles);
 
  private:

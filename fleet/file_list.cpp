@@ -21,14 +21,15 @@ bool IsFolder(const std::string &path) {
   return stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
-// The error of a call in words. Memory that was refused is no fault of a file.
+// The error number in words. Throws when memory was refused, which is no fault of a file.
 std::string FaultOf(int error) {
   if (error == ENOMEM) throw std::bad_alloc();
   return std::strerror(error);
 }
 
-// Lists the names in a folder, sorted by bytes, the first one at the end. Names of folders end with
-// a slash, so that they sort like the paths of their files. Returns the error number as in errno.
+// Lists the names in a folder in descending byte order, since the next one is taken from the end.
+// Names of folders end with a slash, so that they sort like the paths of their files. Returns the
+// error number as in errno.
 int ListFolder(const std::string &path, std::vector<std::string> *names) {
   const std::unique_ptr<DIR, int (*)(DIR *)> folder(opendir(path.c_str()), closedir);
   if (folder == nullptr) return errno;

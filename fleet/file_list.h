@@ -10,11 +10,11 @@
 
 namespace fleet {
 
-// A file that was named, or found in a folder.
+// A file, or a folder that cannot be read.
 struct ListedFile {
   std::string name;
-  bool inFolder = false;
-  std::string fault;  // why a folder cannot be read; later the fault of a dump
+  bool inFolder = false;  // found in a folder, not named by the user
+  std::string fault;      // why a folder cannot be read; later the fault of a dump
 };
 
 // Returns the files that names stand for, in the order of the names. A folder stands for all files
@@ -22,8 +22,8 @@ struct ListedFile {
 // one folder and in the folders above it. Throws std::bad_alloc.
 class FileList {
  public:
-  // Names from a list, if there is one, come after the others; each ends with `end`. Empty names
-  // are passed over, and "-" is a file with that name. The stream is closed at the end.
+  // Names read from `list`, if it is not null, come after `names`; each ends with `end`. There,
+  // empty names are passed over, and "-" is a file with that name. FileList closes `list`.
   explicit FileList(std::vector<std::string> names, std::FILE *list = nullptr, char end = '\n');
 
   // False after the last one.
@@ -36,16 +36,16 @@ class FileList {
   // A folder whose files are being returned.
   struct Folder {
     std::string path;                // with a slash at its end
-    std::vector<std::string> names;  // that are left, the next one at the end
+    std::vector<std::string> names;  // those not returned yet, the next one at the end
     uint64_t device = 0;
     uint64_t inode = 0;
   };
 
-  bool NextName(std::string *name);
+  bool NextName(std::string *name);  // of names_, then of list_; false after the last one
   std::string Enter(const std::string &path);
 
   std::vector<std::string> names_;
-  size_t next_ = 0;
+  size_t next_ = 0;  // index in names_
   std::unique_ptr<std::FILE, int (*)(std::FILE *)> list_;
   char end_;
   std::string listFault_;

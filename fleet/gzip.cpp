@@ -13,16 +13,16 @@ namespace fleet {
 namespace {
 
 constexpr unsigned char kMagic[] = {0x1f, 0x8b};
-constexpr size_t kBlock = 64 << 10;
-constexpr int kGzipOnly = MAX_WBITS + 16;
+constexpr size_t kBlock = 64 << 10;        // bytes read at once
+constexpr int kGzipOnly = MAX_WBITS + 16;  // for zlib: this format and no other
 
 }  // namespace
 
 struct GzipReader::Inflation {
   std::array<unsigned char, kBlock> packed;
   z_stream stream = {};
-  bool inMember = true;
-  bool damaged = false;
+  bool inMember = true;  // false after the end of a member, where another may begin
+  bool damaged = false;  // told when the bytes before the damage have been returned
 
   Inflation() {
     if (inflateInit2(&stream, kGzipOnly) != Z_OK) throw std::bad_alloc();
@@ -44,7 +44,7 @@ ReadResult GzipReader::Read(char *bytes, size_t room) {
 ReadResult GzipReader::ReadFirst(char *bytes, size_t room) {
   begun_ = true;
   size_t count = 0;
-  // At most a block: it is returned as it is, or moved to the room for packed data.
+  // Read at most a block, because packed data is moved to Inflation::packed.
   const size_t most = std::min(room, kBlock);
   while (count < std::min(most, sizeof kMagic)) {
     ReadResult more = read_(bytes + count, most - count);
@@ -91,7 +91,6 @@ ReadResult GzipReader::Inflate(char *bytes, size_t room) {
     const int result = inflate(&stream, Z_NO_FLUSH);
     if (result == Z_MEM_ERROR) throw std::bad_alloc();
     if (result == Z_STREAM_END) inflation.inMember = false;
-    // The bytes before the fault are returned first.
     inflation.damaged = result != Z_OK && result != Z_STREAM_END;
   }
   return {room - stream.avail_out, ""};

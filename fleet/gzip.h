@@ -9,7 +9,6 @@
 
 namespace fleet {
 
-// The result of reading.
 struct ReadResult {
   size_t count = 0;   // bytes; 0 at the end
   std::string fault;  // why reading failed; empty when it did not
@@ -18,14 +17,14 @@ struct ReadResult {
 // Reads up to `room` bytes; 0 only at the end.
 using ReadBytes = std::function<ReadResult(char *bytes, size_t room)>;
 
-// Returns what it reads, unpacked when the first two bytes are those of gzip. Several members are
-// read as one text.
+// Returns the bytes that it reads, unpacked when the first two are those of gzip. Gzip members that
+// follow each other are read as one.
 class GzipReader {
  public:
   explicit GzipReader(ReadBytes read);
   ~GzipReader();
 
-  // Bytes before a fault are returned by earlier calls.
+  // The bytes before a fault are returned first, and the fault by a later call.
   ReadResult Read(char *bytes, size_t room);
 
  private:

@@ -7,10 +7,11 @@
 namespace fleet {
 namespace {
 
-constexpr uint64_t kMostNamed = 3;  // records of another length; a hostile dump has millions
+// Faults that name a record of another length. More are counted: a hostile dump has millions.
+constexpr uint64_t kMostNamed = 3;
 
-// Names a record in a fault; `where` tells its place.
-std::string Name(const MorwickRecord &record, const std::string &where) {
+// The beginning of a fault; `where` tells the record's place.
+std::string BeginFault(const MorwickRecord &record, const std::string &where) {
   const std::string name = record.key == nullptr ? "" : std::string(", ") + record.key->name;
   return "the record " + where + " (key " + std::to_string(record.id) + name + ") ";
 }
@@ -19,15 +20,15 @@ std::string AtOffset(const MorwickRecord &record) {
   return "at offset " + std::to_string(record.offset);
 }
 
-// Why the records end there; empty for a good end.
+// Why the walk ended; empty for a good end.
 std::string FaultOf(const MorwickRecord &end) {
   switch (end.step) {
     case kMorwickRecord:
     case kMorwickEndOfBuffer:
     case kMorwickEndRecord: break;
-    case kMorwickBadKey: return Name(end, "there") + "has no valid key";
+    case kMorwickBadKey: return BeginFault(end, "there") + "has no valid key";
     case kMorwickTooLong:
-      return Name(end, "there") + "needs " + Bytes(end.length) + ", and " +
+      return BeginFault(end, "there") + "needs " + Bytes(end.length) + ", and " +
              std::to_string(end.left) + " are left";
     case kMorwickPartOfHeader: return "the rest, " + Bytes(end.left) + ", is not a whole header";
   }
@@ -41,7 +42,7 @@ std::string_view PackedFormat(std::string_view data) {
       {"\x28\xb5\x2f\xfd", "zstd"},
       {std::string_view("\xfd\x37\x7a\x58\x5a\0", 6), "xz"},
       {"BZh", "bzip2"},
-      {"\x1f\x8b", "gzip"},  // packed twice
+      {"\x1f\x8b", "gzip"},  // also what is left of a file that was packed twice
       {"PK\x03\x04", "zip"}};
   for (const auto &[begin, name] : kFormats) {
     if (data.starts_with(begin)) return name;
@@ -63,7 +64,7 @@ void Judge::Take(const MorwickRecord &record) {
   hasValues_ = hasValues_ || record.valueCount > 0;
   if (record.lengthDiffers == 0 || ++otherLengths_ > kMostNamed) return;
   const uint64_t configured = uint64_t{record.key->valueCount} * record.valueWidth;
-  verdict_.faults.push_back(Name(record, AtOffset(record)) + "has " + Bytes(record.length) +
+  verdict_.faults.push_back(BeginFault(record, AtOffset(record)) + "has " + Bytes(record.length) +
                             ", and " + std::to_string(configured) + " are configured");
 }
 

@@ -21,7 +21,7 @@ struct Verdict {
   std::vector<std::string> faults;  // none for a good dump
   std::string note;                 // something to know that is no fault
 
-  // All of them in one line; empty for a good dump.
+  // All faults in one line; empty for a good dump.
   std::string Fault() const;
 };
 
@@ -39,11 +39,11 @@ class Judge {
  private:
   std::string_view dump_;
   Verdict verdict_;
-  uint64_t otherLengths_ = 0;
+  uint64_t otherLengths_ = 0;  // records whose length is not the configured one
   bool hasValues_ = false;
 };
 
-// The same, with a walk of its own.
+// Walks through the dump and judges it.
 Verdict JudgeDump(MorwickStream stream, std::string_view dump);
 
 }  // namespace fleet

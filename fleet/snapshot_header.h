@@ -1,4 +1,4 @@
-// Reads a snapshot header, and checks it before the library is trusted with it.
+// Reads a snapshot header, and checks it before the library gets it.
 #ifndef FLEET_SNAPSHOT_HEADER_H
 #define FLEET_SNAPSHOT_HEADER_H
 
@@ -12,15 +12,15 @@ namespace fleet {
 // In bytes. Larger ones are refused.
 constexpr size_t kLargestHeader = 1 << 20;
 
-// Empty for a header that is whole, with records of a bearable size that can be told from empty
-// ones; otherwise what is wrong.
+// Says what is wrong; empty when the header is whole, its records are not too large, and its first
+// field, which tells empty records, lies inside them.
 std::string CheckSnapshotHeader(std::string_view file);
 
-// Empty for a header, which is whole, of a bearable number of fields; otherwise what is wrong. Null
-// stands for the fixed layout.
+// Says that a whole header has too many fields; empty when it has not. Null stands for the fixed
+// layout.
 std::string CheckFieldCount(const char *header);
 
-// The numbers that a file of at least the header's size begins with.
+// The numbers at the beginning of a file, which must be at least as large as a SnapshotHeader.
 SnapshotHeader LoadSnapshotHeader(std::string_view file);
 
 }  // namespace fleet

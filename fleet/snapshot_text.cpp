@@ -13,13 +13,14 @@
 namespace fleet {
 namespace {
 
+// In bytes. The first two are more than the fixed layout's legend and its longest line take.
 constexpr size_t kLegendRoom = 2048;
-constexpr size_t kLineRoom = 1024;  // of the fixed layout: more than the longest line
-constexpr size_t kLeastRoom = 64 << 10;
+constexpr size_t kLineRoom = 1024;
+constexpr size_t kFirstRoom = 64 << 10;
 
 }  // namespace
 
-// Without the empty line.
+// Returns the library's text without the empty line at its end.
 std::string_view FixedText::Render(std::string_view block) {
   text_.resize(
       std::max(text_.size(), kLegendRoom + block.size() / sizeof(SnapshotRecord) * kLineRoom));
@@ -30,42 +31,41 @@ std::string_view FixedText::Render(std::string_view block) {
 
 bool FixedText::Begin() {
   const std::string_view legend = Render({});
-  legend_ = legend.size();
+  legendSize_ = legend.size();
   return take_(legend);
 }
 
-bool FixedText::Print(std::string_view block) { return take_(Render(block).substr(legend_)); }
+bool FixedText::Print(std::string_view block) { return take_(Render(block).substr(legendSize_)); }
 
 DescribedText::DescribedText(TakeText take, std::string header)
     : take_(std::move(take)),
       header_(std::move(header)),
       recordSize_(LoadSnapshotHeader(header_).recordSize),
-      text_(kLeastRoom) {}
+      text_(kFirstRoom) {}
 
-// The library is given each block as a snapshot of its own, whose header has the block's record
-// count.
+// The library gets each block as a snapshot of its own, with a record count that is one too high:
+// it leaves out the last record that a header promises.
 bool DescribedText::Print(std::string_view block,
                           const std::function<void(uint32_t index)> &passedOver) {
   const auto count = static_cast<uint32_t>(block.size() / recordSize_);
   for (uint32_t next = 0; next < count;) {
-    // The banner belongs to state 0. Once it is written, the record before the next one takes the
-    // place of record 0.
-    const uint32_t before = bannerWritten_ ? 1 : 0;
-    const char *first = block.data() + size_t{recordSize_} * next - size_t{recordSize_} * before;
-    SetRecordCount(count - next + before + 1);
-    uint32_t state = before;
+    // At state 0 the library prints the banner. Once it is written, a call begins at state 1, and
+    // the record in front of the next one stands for record 0, which is skipped.
+    const uint32_t skipped = bannerWritten_ ? 1 : 0;
+    const char *first = block.data() + size_t{recordSize_} * next - size_t{recordSize_} * skipped;
+    SetRecordCount(count - next + skipped + 1);
+    uint32_t state = skipped;
     uint64_t size = text_.size();
     const bool done = KVRParseSnapshotBufferWithInplaceParser(
-                          first, size_t{recordSize_} * (count - next + before), text_.data(), &size,
-                          header_.data(), &state) == 1;
+                          first, size_t{recordSize_} * (count - next + skipped), text_.data(),
+                          &size, header_.data(), &state) == 1;
     if (size > 1) {
       bannerWritten_ = true;
       if (!take_({text_.data(), size - 1})) return false;
     }
     if (done) return true;
-    // The record that did not fit comes again, with the room to itself or, when it had that
-    // already, with more of it.
-    if (state > 0) next += state - before - 1;
+    // Print the record that did not fit again: first in the text or, if it was first, in more room.
+    if (state > 0) next += state - skipped - 1;
     if (size == 1 && !GrowText()) passedOver(next++);
   }
   return true;
@@ -79,7 +79,7 @@ void DescribedText::SetRecordCount(uint32_t count) {
 bool DescribedText::GrowText() {
   if (text_.size() == kMostText) return false;
   const size_t room = text_.size() * 2;
-  text_ = {};  // given back first: the old text is not needed
+  text_ = {};  // freed first, as the old text is not needed
   text_.resize(room);
   return true;
 }

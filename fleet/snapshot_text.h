@@ -29,20 +29,20 @@ class FixedText {
 
   TakeText take_;
   std::vector<char> text_;
-  size_t legend_ = 0;
+  size_t legendSize_ = 0;
 };
 
 // Text of the layout that a whole header describes. It passes over records whose text is longer
-// than kMostText.
+// than kMostText bytes.
 class DescribedText {
  public:
   static constexpr size_t kMostText = 8 << 20;
 
   DescribedText(TakeText take, std::string header);
 
-  // Prints the records of a block. Before each block but the first there must be room for one
-  // record that may be read. Calls `passedOver` with the index of each record that does not fit.
-  // False when `take` has ended the rendering.
+  // Prints the records of a block. In front of each block but the first, the bytes of one record
+  // must be readable; they may be any. Calls `passedOver` with the index in the block of each
+  // record that does not fit. False when `take` has ended the rendering.
   bool Print(std::string_view block, const std::function<void(uint32_t index)> &passedOver);
 
  private:

@@ -13,8 +13,8 @@ std::vector<Figure> Summarise(const KVRStatsCxt &summary,
     const MorwickSummaryField &field = *MorwickSummaryFieldAt(i);
     if (!isPresent(field.name)) continue;
     Figure &figure = figures.emplace_back(Figure{field.name, {}, std::nullopt});
-    for (uint32_t k = 0; k < field.valueCount; ++k) {
-      figure.values.push_back(MorwickSummaryValue(&summary, &field, k));
+    for (uint32_t index = 0; index < field.valueCount; ++index) {
+      figure.values.push_back(MorwickSummaryValue(&summary, &field, index));
     }
   }
   if (isPresent("hostWrites") && isPresent("nandWrites") && summary.hostWrites > 0) {

@@ -19,8 +19,8 @@ struct Figure {
   std::optional<double> ratio;  // instead of values
 };
 
-// The summary fields that the dump has, in the order of KVRStatsCxt, then how many sectors were
-// written to NAND for each sector that the host wrote.
+// The summary fields that the dump has, in the order of KVRStatsCxt, then writeAmplification: the
+// sectors written to NAND for each sector that the host wrote.
 std::vector<Figure> Summarise(const KVRStatsCxt &summary,
                               const std::function<bool(std::string_view name)> &isPresent);
 

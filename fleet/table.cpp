@@ -17,13 +17,13 @@
 namespace fleet {
 namespace {
 
-constexpr uint64_t kBatchesAhead = 8;  // that each thread may make before one is taken
+constexpr uint64_t kBatchesAhead = 8;  // that each thread may make before one is handed out
 
-// Makes rows. One for each thread.
+// Makes rows. Each thread has its own.
 class RowMaker {
  public:
   explicit RowMaker(const TableOptions &options)
-      : append_(options.appendRow),
+      : appendRow_(options.appendRow),
         filler_(options.stream, *options.selection),
         values_(options.selection->columns().size()),
         present_(values_.size()) {}
@@ -35,11 +35,11 @@ class RowMaker {
         std::ranges::fill(present_, 0);
         ListedFile &file = batch->files[i];
         if (file.fault.empty()) file.fault = Read(file);
-        append_({file, values_, present_}, &batch->rows);
+        appendRow_({file, values_, present_}, &batch->rows);
         batch->rowEnds.push_back(batch->rows.size());
       } catch (const std::bad_alloc &) {
         batch->rows.resize(before);
-        batch->files.resize(i);
+        batch->files.resize(i);  // ends the loop
         batch->outOfMemory = true;
       }
     }
@@ -55,21 +55,20 @@ class RowMaker {
     return dump.fault.empty() ? verdict.Fault() : dump.fault;
   }
 
-  void (*append_)(const Row &row, std::string *rows);
+  void (*appendRow_)(const Row &row, std::string *rows);
   DumpReader reader_;
   ColumnFiller filler_;
   std::vector<uint64_t> values_;
   std::vector<uint8_t> present_;
 };
 
-// As many as there are cores, but not more than there are descriptors. Each thread may hold a dump
-// of the largest size, and all of them must fit the memory of the command.
+// As many as `jobs`, or as there are cores, but not more than there are descriptors.
 size_t ThreadCount(uint64_t jobs) {
-  constexpr uint64_t kMost = 32;
+  constexpr uint64_t kMost = 32;  // dumps of the largest size fit into the command's 1 GiB
   constexpr uint64_t kOtherDescriptors = 16;
   cpu_set_t cores;
-  const bool known = sched_getaffinity(0, sizeof cores, &cores) == 0;
-  uint64_t count = jobs > 0 ? jobs : known ? static_cast<uint64_t>(CPU_COUNT(&cores)) : 1;
+  const bool coresKnown = sched_getaffinity(0, sizeof cores, &cores) == 0;
+  uint64_t count = jobs > 0 ? jobs : coresKnown ? static_cast<uint64_t>(CPU_COUNT(&cores)) : 1;
   rlimit limit = {};
   if (getrlimit(RLIMIT_NOFILE, &limit) == 0) {
     count = std::min<uint64_t>(
@@ -80,10 +79,10 @@ size_t ThreadCount(uint64_t jobs) {
 
 }  // namespace
 
-// Batches that several threads make, and that leave in the order of their files.
+// Several threads make batches, which are handed out in the order of their files.
 class Table::OrderedBatches {
  public:
-  // Threads make at most `ahead` batches before the first of them is taken.
+  // Threads make at most `ahead` batches before the first of them is handed out.
   OrderedBatches(TableOptions options, FileList list, size_t ahead)
       : options_(std::move(options)), list_(std::move(list)), made_(ahead) {}
 
@@ -96,7 +95,7 @@ class Table::OrderedBatches {
       try {
         batch = std::make_unique<Batch>();
         if (!maker) maker.emplace(options_);
-        if (!Take(batch.get(), &number)) return;
+        if (!TakeFiles(batch.get(), &number)) return;
       } catch (const std::bad_alloc &) {
         return Stop(true);
       }
@@ -118,7 +117,7 @@ class Table::OrderedBatches {
     return Got::kBatch;
   }
 
-  // Makes the threads end, after a failure the caller of Next too.
+  // Makes the threads end. After a failure Next returns kEnd, too.
   void Stop(bool failed) {
     const std::lock_guard lock(mutex_);
     stopped_ = true;
@@ -131,15 +130,15 @@ class Table::OrderedBatches {
   bool failed() const { return failed_; }
 
  private:
-  bool AtEnd() const { return failed_ || (listEnded_ && handedOut_ == taken_); }
+  bool AtEnd() const { return failed_ || (listEnded_ && handedOut_ == begun_); }
 
   // Takes the next files. False when there are none, or the threads must end.
-  bool Take(Batch *batch, uint64_t *number) {
-    // Reading the list may take time, so it has a lock of its own: batches leave meanwhile.
+  bool TakeFiles(Batch *batch, uint64_t *number) {
+    // The list has a lock of its own, so that batches are handed out while it is read.
     const std::lock_guard listLock(listMutex_);
     {
       std::unique_lock lock(mutex_);
-      isWanted_.wait(lock, [&] { return stopped_ || taken_ < handedOut_ + made_.size(); });
+      isWanted_.wait(lock, [&] { return stopped_ || begun_ < handedOut_ + made_.size(); });
       if (stopped_ || listEnded_) return false;
     }
     try {
@@ -147,14 +146,14 @@ class Table::OrderedBatches {
         batch->files.push_back(std::move(file));
       }
     } catch (const std::bad_alloc &) {
-      Stop(true);  // while the list is locked: another thread would go on after the lost names
+      Stop(true);  // before the list is unlocked: another thread would go on after the lost names
       return false;
     }
     const std::lock_guard lock(mutex_);
     listEnded_ = batch->files.size() < options_.batchSize;
     if (listEnded_) isMade_.notify_one();
     if (batch->files.empty()) return false;
-    *number = taken_++;
+    *number = begun_++;
     return true;
   }
 
@@ -164,9 +163,9 @@ class Table::OrderedBatches {
 
   std::mutex mutex_;  // guards all members below
   std::condition_variable isMade_, isWanted_;
-  std::vector<std::unique_ptr<Batch>> made_;  // by number, in a circle
-  uint64_t taken_ = 0;
-  uint64_t handedOut_ = 0;
+  std::vector<std::unique_ptr<Batch>> made_;  // a circle: by number modulo its size
+  uint64_t begun_ = 0;                        // batches whose files a thread has taken
+  uint64_t handedOut_ = 0;                    // batches that Next has returned
   bool listEnded_ = false;
   bool stopped_ = false;
   bool failed_ = false;  // memory was refused

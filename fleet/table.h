@@ -36,7 +36,7 @@ struct TableOptions {
 struct Batch {
   std::vector<ListedFile> files;
   std::string rows;
-  std::vector<size_t> rowEnds;  // for each file, in `rows`
+  std::vector<size_t> rowEnds;  // where the row of each file ends in `rows`
   bool outOfMemory = false;     // some files are missing
 };
 
@@ -44,7 +44,8 @@ class Table {
  public:
   // Starts to read. Throws std::bad_alloc when memory or all threads are refused.
   Table(const TableOptions &options, FileList list);
-  // May end before the last batch was taken. A thread that waits for a pipe is detached.
+  // May be called before Next has returned kEnd. Threads are detached then: one may wait for a
+  // pipe.
   ~Table();
   Table(const Table &) = delete;
   Table &operator=(const Table &) = delete;
