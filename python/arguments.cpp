@@ -15,8 +15,8 @@ namespace {
 
 std::string TypeOf(py::handle object) { return Py_TYPE(object.ptr())->tp_name; }
 
-// Whether items of that format are numbers or bytes, or records of them, in the words of Python's
-// module struct. The names of a record's fields stand between colons.
+// Whether a format of Python's module struct is that of numbers or bytes, or records of them. The
+// names of a record's fields stand between colons.
 bool IsPlain(std::string_view format) {
   constexpr std::string_view kPlain = "?cbBhHiIlLqQnNefdgspxT{}:()0123456789, @=<>!^";
   bool isName = false;
@@ -26,8 +26,8 @@ bool IsPlain(std::string_view format) {
   });
 }
 
-// NumPy has no format for records whose fields overlap or are not in order, as a header may have
-// them; but it knows whether there are pointers in them.
+// Whether they are NumPy's records without pointers. NumPy has no format for records whose fields
+// overlap or are not in order, and a header may describe such records.
 bool IsPlainRecords(py::handle object) {
   if (!py::isinstance<py::array>(object)) return false;
   const py::dtype type = py::reinterpret_borrow<py::array>(object).dtype();
@@ -63,20 +63,20 @@ py::bytes AsBytes(py::handle object, const char *name, size_t most) {
 }
 
 Buffer::Buffer(py::handle object, const char *name, int flags) {
-  const std::string named = name;
+  const std::string argument = name;
   if (PyObject_CheckBuffer(object.ptr()) == 0) {
-    throw py::type_error(named + " must be an object with a buffer, not " + TypeOf(object));
+    throw py::type_error(argument + " must be an object with a buffer, not " + TypeOf(object));
   }
   if (!IsPlainRecords(object)) flags |= PyBUF_FORMAT;
   if (PyObject_GetBuffer(object.ptr(), &view_, flags) != 0) {
     if (PyErr_ExceptionMatches(PyExc_MemoryError) != 0) throw py::error_already_set();
     py::error_already_set cause;  // such as a view that was released
-    const std::string why = named + ": " + std::string(py::str(cause.value()));
+    const std::string why = argument + ": " + std::string(py::str(cause.value()));
     py::raise_from(cause, PyExc_BufferError, why.c_str());
     throw py::error_already_set();
   }
   if (view_.format == nullptr || IsPlain(view_.format)) return;
-  throw py::type_error(named + " must hold numbers or bytes, not items of the format " +
+  throw py::type_error(argument + " must hold numbers or bytes, not items of the format " +
                        view_.format);
 }
 

@@ -1,4 +1,4 @@
-// Arguments of the module's functions, checked with their names in what is raised.
+// Checks the arguments of the module's functions; the errors raised name the argument.
 #ifndef PYTHON_ARGUMENTS_H
 #define PYTHON_ARGUMENTS_H
 
@@ -13,24 +13,24 @@ namespace python {
 
 namespace py = pybind11;
 
-// A str, as UTF-8; what cannot be said in it is escaped, so that no name is equal to it.
+// A str as UTF-8. Characters that UTF-8 cannot hold are escaped, so that the text is no known name.
 std::string AsString(py::handle object, const char *name);
 
 // "kvr", "ftl" or "msp".
 MorwickStream AsStream(py::handle stream);
 
-// An object's bytes, copied where they may change. More than `most` are refused before that.
+// An object's bytes, copied unless it is of Python's type bytes. More than `most` are refused.
 py::bytes AsBytes(py::handle object, const char *name, size_t most);
 
-// The bytes that an object shows, for as long as this lives: meanwhile it cannot be resized. What
-// holds pointers, such as an array of objects, is refused.
+// A view of an object's bytes. While it lives the object cannot be resized. Items that are or hold
+// pointers, such as Python objects, are refused.
 class Buffer {
  public:
-  // `flags` are those of Python that say how the bytes may lie.
+  // `flags` are those of PyObject_GetBuffer, which say how the bytes may lie.
   Buffer(py::handle object, const char *name, int flags = PyBUF_ND);
 
   size_t size() const { return static_cast<size_t>(view_.len); }
-  // Only where they lie one after the other.
+  // Only for contiguous bytes, which PyBUF_ND asks for.
   std::string_view bytes() const { return {static_cast<const char *>(view_.buf), size()}; }
   py::bytes Copy();
 
@@ -46,7 +46,7 @@ class Buffer {
 
 std::string_view ViewOf(const py::bytes &bytes);
 
-// Text that came from outside; what is not UTF-8 is kept as file names keep it.
+// Text that came from outside. Bytes that are not UTF-8 become surrogates, as in file names.
 py::str AsText(std::string_view text);
 
 }  // namespace python

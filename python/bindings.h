@@ -1,4 +1,4 @@
-// What each file of the module adds to it.
+// The functions by which each file of the module adds its part.
 #ifndef PYTHON_BINDINGS_H
 #define PYTHON_BINDINGS_H
 
@@ -6,8 +6,8 @@
 
 namespace python {
 
-// Each is called once, when the module is loaded. Then it also makes what lives as long as the
-// process: there are no threads yet that could wait for each other's lock.
+// Each is called once, when the module is loaded. Objects that live as long as the process are made
+// there, because no threads can wait for each other's lock yet.
 void BindStatistics(pybind11::module_ &module);
 void BindSnapshots(pybind11::module_ &module);
 void BindControllers(pybind11::module_ &module);

@@ -1,5 +1,5 @@
-// C++ objects in Python's hands. pybind11's own classes end the process where memory is refused
-// while an object is made; a capsule does not.
+// C++ objects in capsules, which Python owns. pybind11's own classes would end the process when
+// memory is refused while an object is made.
 #ifndef PYTHON_BOXED_H
 #define PYTHON_BOXED_H
 

@@ -14,7 +14,7 @@
 namespace python {
 namespace {
 
-// The package's own exception, with the driver's result if there is one.
+// Raises the package's ControllerError, with the driver's result if there is one.
 [[noreturn]] void Fail(const std::string &message, std::optional<int32_t> result) {
   const py::object type = py::module_::import("morwick").attr("ControllerError");
   py::object code = py::none();
@@ -45,8 +45,8 @@ const fleet::BufferKind &KindOf(py::handle kindName) {
 // A connection to a controller. Several threads may share it: a lock lets one call run at a time.
 class Connection {
  public:
-  // Opens it to the class, or with None to the first controller that is present. From finding a
-  // service to storing the connection nothing may throw: the handle would leak.
+  // Connects to the class, or for None to the first controller that is present. Nothing may throw
+  // between finding a service and storing the connection: the handle would leak.
   explicit Connection(py::handle className) {
     std::string absent = "no controller is present";
     std::span<NandExporter> rows = fleet::KnownControllers();
@@ -122,7 +122,7 @@ class Connection {
   uint32_t connection_ = 0;
 };
 
-// Class, present, opened, result of opening and what it offers, of each class that is known.
+// For each known class its name, Presence, and the buffers that it offers.
 py::list Controllers() {
   py::list all;
   for (const NandExporter &row : fleet::KnownControllers()) {

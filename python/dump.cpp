@@ -20,8 +20,8 @@
 namespace python {
 namespace {
 
-// Below this size two threads that ask for all values take longer with the lock given back than
-// without: they wait for it more than the walk takes.
+// In bytes. For smaller dumps two threads are slower when they give back the interpreter's lock:
+// they wait for it longer than the walk takes.
 constexpr size_t kWorthUnlocking = 128 << 10;
 
 py::int_ Number(uint64_t value) {
@@ -30,17 +30,17 @@ py::int_ Number(uint64_t value) {
   return number;
 }
 
-// The keys of a stream as Python sees them. Made once, and never freed: objects of the interpreter
-// must not be given back after its end.
+// The names of a stream's keys as Python objects. Made once, and never freed: objects of the
+// interpreter must not be given back after its end.
 class KeyNames {
  public:
   static const KeyNames &Of(MorwickStream stream) {
-    static const KeyNames *const stats = new KeyNames(kMorwickKVR);
+    static const KeyNames *const stats = new KeyNames(kMorwickKVR);  // FTL has the same keys
     static const KeyNames *const msp = new KeyNames(kMorwickMSP);
     return stream == kMorwickMSP ? *msp : *stats;
   }
 
-  // Keys have places by their ids.
+  // The key's place in names_.
   uint32_t PlaceOf(const MorwickKey &key) const { return key.id - firstId_; }
   size_t placeCount() const { return names_.size(); }
   py::handle NameAt(uint32_t place) const { return names_[place]; }
@@ -64,11 +64,11 @@ class KeyNames {
   }
 
   uint32_t firstId_;
-  std::vector<py::object> names_;
-  py::dict places_;
+  std::vector<py::object> names_;  // null for an id without a key
+  py::dict places_;                // by name
 };
 
-// Walked once; its values become Python's own when they are asked for.
+// A dump that was walked once. Its values become Python objects when they are asked for.
 class Dump {
  public:
   Dump(py::handle data, py::handle stream)
@@ -92,7 +92,7 @@ class Dump {
     end_ = end.offset;
   }
 
-  // The last value of that name: a number, or of an array all numbers. Raises KeyError.
+  // The value in the last record of that name: a number, or an array of them. Raises KeyError.
   py::object Value(py::handle name) const {
     if (const Found *found = Find(name)) return ValueOf(*found);
     PyErr_SetObject(PyExc_KeyError, name.ptr());
@@ -105,7 +105,7 @@ class Dump {
   py::bytes bytes() const { return bytes_; }
   py::object Fault() const { return fault_.empty() ? py::object(py::none()) : AsText(fault_); }
 
-  // All of them by name, in the order in which the names came first.
+  // All values by name, in the order in which the names first came.
   py::dict Values() const {
     py::dict values;
     for (const uint32_t place : order_) {
@@ -188,17 +188,17 @@ class Dump {
   MorwickStream stream_;
   const KeyNames &names_;
   std::vector<Found> found_;     // by place
-  std::vector<uint32_t> order_;  // places
+  std::vector<uint32_t> order_;  // places, as their keys first came
   std::string fault_;
   uint64_t end_ = 0;
 };
 
 // id, name and number of values of each key.
-py::list Keys(py::handle stream) {
-  const MorwickStream known = AsStream(stream);
+py::list Keys(py::handle streamName) {
+  const MorwickStream stream = AsStream(streamName);
   py::list keys;
-  for (uint32_t i = 0; i < MorwickKeyCount(known); ++i) {
-    const MorwickKey &key = *MorwickKeyAt(known, i);
+  for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
+    const MorwickKey &key = *MorwickKeyAt(stream, i);
     keys.append(py::make_tuple(key.id, key.name, key.valueCount));
   }
   return keys;

@@ -1,4 +1,4 @@
-// What the package `morwick` is made of.
+// The module _native, on which the package `morwick` is built.
 
 #include <exception>
 #include <stdexcept>
@@ -9,8 +9,8 @@
 
 namespace {
 
-// pybind11 has words of its own where an object of Python's is missing; that memory was refused
-// says more.
+// pybind11 throws a runtime_error when Python made no object. Where the reason is a MemoryError,
+// that is what the caller gets.
 void KeepMemoryError(std::exception_ptr error) {
   try {
     std::rethrow_exception(std::move(error));

@@ -15,7 +15,7 @@
 namespace python {
 namespace {
 
-// What a header says, or the fixed layout without one.
+// The layout that a header describes, or the fixed one for None.
 struct Layout {
   explicit Layout(py::handle object) : isFixed(object.is_none()) {
     if (isFixed) return;
@@ -27,7 +27,7 @@ struct Layout {
     recordCount = std::max(numbers.recordCount, 1U) - 1;  // the last is not printed
   }
 
-  // The bytes of the records that there are.
+  // The bytes of the whole records, of which there are at most recordCount.
   std::string_view RecordsOf(std::string_view data) const {
     return data.substr(0, std::min<uint64_t>(data.size() / recordSize, recordCount) * recordSize);
   }
@@ -38,9 +38,9 @@ struct Layout {
   uint64_t recordCount = UINT64_MAX;
 };
 
-// The fixed layout, with the numbers that have a name, which is that of SnapshotRecord: the public
-// fields know only labels. Made once, and never freed: NumPy ends the process where memory is
-// refused to newbyteorder, and objects of the interpreter must not be given back after its end.
+// NumPy's types of the fixed layout. The names are those of SnapshotRecord, because the public
+// fields have only labels. Made once, and never freed: NumPy ends the process when newbyteorder is
+// refused memory, and objects of the interpreter must not be given back after its end.
 struct FixedTypes {
   static const FixedTypes &Get() {
     static const FixedTypes *const types = new FixedTypes;
@@ -65,8 +65,8 @@ struct FixedTypes {
   }
 };
 
-// The numbers that the header describes. Those of the priorities of one field are a sub-array,
-// which goes by the label of the counts.
+// NumPy's type of the records that a header describes. The priorities of a field are a sub-array,
+// which is named by the label of their counts.
 py::object DescribedType(const Layout &layout) {
   const py::object number = py::dtype("<u4");
   const py::object &operations = FixedTypes::Get().operations;
@@ -89,8 +89,7 @@ py::object DescribedType(const Layout &layout) {
   return py::dtype(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
 }
 
-// The records of a snapshot in the layout of a header, or the fixed one with None, over the buffer
-// itself.
+// An array of the records over the buffer itself.
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
   const size_t count = layout.RecordsOf(Buffer(data, "data").bytes()).size() / layout.recordSize;

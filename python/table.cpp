@@ -22,7 +22,7 @@ void AppendRow(const fleet::Row &row, std::string *rows) {
   rows->append(reinterpret_cast<const char *>(row.present.data()), row.present.size());
 }
 
-// Reads all dumps. Without the interpreter's lock but for what is asked of it.
+// Reads all dumps. Takes the interpreter's lock only for signals and `progress`.
 Batches ReadAll(const fleet::TableOptions &options, const std::vector<std::string> &files,
                 const py::object &progress) {
   using Got = fleet::Table::Got;
@@ -31,7 +31,7 @@ Batches ReadAll(const fleet::TableOptions &options, const std::vector<std::strin
   Batches batches;
   uint64_t dumps = 0;
   uint64_t faults = 0;
-  auto next = std::chrono::steady_clock::now();
+  auto nextReport = std::chrono::steady_clock::now();
   for (Got got = Got::kBatch; got != Got::kEnd;) {
     std::unique_ptr<fleet::Batch> batch;
     got = table.Next(&batch, milliseconds(50));
@@ -41,8 +41,8 @@ Batches ReadAll(const fleet::TableOptions &options, const std::vector<std::strin
       for (const fleet::ListedFile &file : batch->files) faults += file.fault.empty() ? 0 : 1;
       batches.push_back(std::move(batch));
     }
-    if (got != Got::kEnd && std::chrono::steady_clock::now() < next) continue;
-    next = std::chrono::steady_clock::now() + milliseconds(100);
+    if (got != Got::kEnd && std::chrono::steady_clock::now() < nextReport) continue;
+    nextReport = std::chrono::steady_clock::now() + milliseconds(100);
     const py::gil_scoped_acquire acquire;
     if (PyErr_CheckSignals() != 0) throw py::error_already_set();
     if (!progress.is_none()) progress(dumps, faults);
@@ -51,34 +51,34 @@ Batches ReadAll(const fleet::TableOptions &options, const std::vector<std::strin
   return batches;
 }
 
-// Puts rows into columns, batch by batch: the values of a column that are written together lie side
-// by side.
+// Copies rows into columns, batch by batch and column by column, so that each value is written
+// beside the one before.
 void Spread(Batches batches, size_t width, size_t count, uint64_t *values, bool *missing) {
   const py::gil_scoped_release release;
   const size_t rowSize = width * (sizeof(uint64_t) + 1);
-  size_t first = 0;
+  size_t firstRow = 0;
   for (auto &batch : batches) {
     const size_t rows = batch->files.size();
     for (size_t column = 0; column < width; ++column) {
       for (size_t row = 0; row < rows; ++row) {
         const char *cells = batch->rows.data() + row * rowSize;
-        const size_t place = column * count + first + row;
+        const size_t place = column * count + firstRow + row;
         std::memcpy(&values[place], cells + column * sizeof(uint64_t), sizeof(uint64_t));
         missing[place] = cells[width * sizeof(uint64_t) + column] == 0;
       }
     }
-    first += rows;
+    firstRow += rows;
     batch.reset();
   }
 }
 
 // The files, their faults, the names of the columns, the values of each column, and where they are
 // missing.
-py::tuple Table(const std::vector<std::string> &files, py::handle stream,
+py::tuple Table(const std::vector<std::string> &files, py::handle streamName,
                 const std::vector<std::string> &names, uint64_t jobs, const py::object &progress) {
-  const MorwickStream known = AsStream(stream);
-  const auto selection = std::make_shared<const fleet::Selection>(std::span(&known, 1), names);
-  const fleet::TableOptions options = {known, selection, jobs, AppendRow};
+  const MorwickStream stream = AsStream(streamName);
+  const auto selection = std::make_shared<const fleet::Selection>(std::span(&stream, 1), names);
+  const fleet::TableOptions options = {stream, selection, jobs, AppendRow};
   Batches batches = ReadAll(options, files, progress);
   py::list columns;
   for (const auto &column : selection->columns()) columns.append(AsText(column.name));

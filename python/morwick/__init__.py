@@ -1,36 +1,22 @@
 """Statistics and snapshots of storage controllers, as values of Python and NumPy.
 
-A dump is what a controller answers when it is asked for its statistics: the bytes that
-`morwick read kvr -w FILE` saves, or that Controller.read gives. It is of one of three
-streams, "kvr", "ftl" or "msp", which keys() lists.
+A dump is the statistics of a controller: the bytes that `morwick read kvr -w FILE` saves, or
+that Controller.read returns. It is of one of three streams, "kvr", "ftl" or "msp"; keys() lists
+the statistics of each. A snapshot is a time series, with one record for each interval.
 
     >>> import morwick
     >>> s = morwick.parse(open("kvr.bin", "rb").read())
-    >>> s["hostWrites"]
-    123456789
-    >>> s["readCountHisto"]
-    array([900,  80,   7,   1,   0], dtype=uint64)
-    >>> s.fault is None
-    True
-
-A snapshot is a time series, one record for each interval:
-
-    >>> records = morwick.snapshot(open("snapshot.bin", "rb").read())
-    >>> records["reads"]["maxLatency"].max()
+    >>> s["hostWrites"], s["readCountHisto"], s.fault
+    (123456789, array([900,  80,   7,   1,   0], dtype=uint64), None)
+    >>> morwick.snapshot(open("snapshot.bin", "rb").read())["reads"]["maxLatency"].max()
     4200
-
-Many dumps are one table:
-
     >>> t = morwick.table("fleet/", names=["hostWrites", "nandWrites"])
     >>> t["nandWrites"] / t["hostWrites"]
-
-And what is in this machine answers for itself:
-
     >>> with morwick.Controller() as c:
     ...     c.statistics("kvr")["powerOnHours"]
 
-Dumps, snapshots and headers come from devices and files, and are not trusted: whatever is
-in them, nothing beyond their bytes is read. An argument of a wrong type is a TypeError that
+Dumps, snapshots and headers come from devices and files, and are not trusted: whatever is in
+them, nothing beyond their bytes is read. An argument of a wrong type raises a TypeError that
 names it. All functions may be called from several threads at once.
 
 __version__ is the library's version, `platform` the platform that it was built for.
@@ -62,8 +48,7 @@ Path = Union[str, bytes, "os.PathLike[str]", "os.PathLike[bytes]"]
 
 
 class Key(NamedTuple):
-    """A statistic that the library knows. `id` is its number in the dump, `size` how many values
-    it has: 1, or more for an array."""
+    """A statistic: `id` is its number in a dump, `size` how many values it has, 1 if no array."""
 
     id: int
     name: str
@@ -71,34 +56,27 @@ class Key(NamedTuple):
 
 
 def keys(stream: str) -> list[Key]:
-    """All statistics of a stream ("kvr", "ftl" or "msp"), in the order of their ids.
-
-    ValueError: there is no such stream.
-    """
+    """All statistics of a stream in the order of their ids. ValueError: there is no such stream."""
     return [Key(*key) for key in _native.keys(stream)]
 
 
 class Statistics(Mapping[str, Any]):
     """The statistics in a dump, by name, in the dump's order.
 
-    A value is an int, from 0 to 2**64 - 1, or for an array a new NumPy array of uint64, of
-    shape (n,). Where a name occurs more than once the last record counts. What a dump lacks
-    raises KeyError, which is not the same as 0. Values are made when they are asked for; the
-    bytes stay as they were when the dump was parsed.
-    """
+    A value is an int from 0 to 2**64 - 1, or for an array a new NumPy array of uint64, of shape
+    (n,). When a name occurs more than once, the last record counts. A name that the dump lacks
+    raises KeyError, which is not the same as 0. Values are made when they are asked for, from
+    the bytes as they were when the dump was parsed."""
 
     __slots__ = ("_dump", "_stream")
 
-    # Values are arrays too, which have no one truth to compare by.
+    # Arrays among the values cannot be compared to a single True or False.
     __eq__ = object.__eq__
     __hash__ = object.__hash__
 
     def __init__(self, data: Any, stream: str = "kvr") -> None:
         self._dump = _native.parse(data, stream)
         self._stream = stream
-
-    def _all(self) -> dict[str, Any]:
-        return _native.values(self._dump)
 
     def __getitem__(self, name: str) -> Any:
         return _native.value(self._dump, name)
@@ -107,43 +85,40 @@ class Statistics(Mapping[str, Any]):
         return _native.has(self._dump, name)
 
     def __iter__(self) -> Iterator[str]:
-        return iter(self._all())
+        return iter(_native.values(self._dump))
 
     def __len__(self) -> int:
         return _native.size(self._dump)
 
     def keys(self) -> KeysView[str]:
-        return self._all().keys()
+        return _native.values(self._dump).keys()
 
     def values(self) -> ValuesView[Any]:
-        return self._all().values()
+        return _native.values(self._dump).values()
 
     def items(self) -> ItemsView[str, Any]:
-        return self._all().items()
+        return _native.values(self._dump).items()
 
     @property
     def entries(self) -> list[tuple[str, int]]:
         """All values with their names, repeated ones included, as `morwick stats -o csv` lists
-        them. The elements of an array have a name each, such as readCountHisto0."""
+        them. Each element of an array has a name of its own, such as readCountHisto0."""
         return _native.entries(self._dump)
 
     @property
     def summary(self) -> dict[str, Any]:
-        """The main figures of a kvr dump: those of its fields that have a place of their own in
-        the library, as int or array of uint64, and writeAmplification, a float: sectors written
-        to NAND for each one that the host wrote. Empty for the other streams."""
+        """The main figures of a kvr dump as int or array of uint64, and writeAmplification, a
+        float: sectors written to NAND for each one that the host wrote. Empty for other streams."""
         return _native.summary(self._dump)
 
     @property
     def fault(self) -> str | None:
-        """What is wrong with the dump, and where its statistics end; None for a good dump. The
-        words are those of `morwick stats`."""
+        """What is wrong with the dump and where, as `morwick stats` says; None for a good dump."""
         return _native.fault(self._dump)
 
     @property
     def end(self) -> int:
-        """The offset in bytes at which the statistics end: the dump's size, or the place of the
-        end record or of a fault."""
+        """Where the statistics end, in bytes: at a fault, an end record or the dump's size."""
         return _native.end(self._dump)
 
     def __repr__(self) -> str:
@@ -156,57 +131,48 @@ class Statistics(Mapping[str, Any]):
 def parse(data: Any, stream: str = "kvr") -> Statistics:
     """The statistics in a dump.
 
-    `data` is any object with a buffer, such as bytes, bytearray, memoryview, mmap or an array;
-    it may be changed afterwards. Bad data is no exception: what could be read is there, and
-    `fault` tells the rest. Data that gzip has compressed is not unpacked; use gzip.decompress,
-    or `table`, which unpacks files.
+    `data` is any object with a buffer, such as bytes, bytearray, memoryview, mmap or an array; it
+    may be changed afterwards. Bad data raises nothing: the values before a fault are there, and
+    `fault` says what is wrong. Gzip data is not unpacked: use gzip.decompress or `table` for files.
 
-    TypeError: `data` has no buffer, or holds other things than numbers and bytes. BufferError:
-    its buffer cannot be had now. ValueError: there is no such stream, or `data` has 4 GiB or more.
-    """
+    TypeError: `data` has no buffer, or holds other things than numbers and bytes. BufferError: its
+    buffer cannot be had now. ValueError: there is no such stream, or `data` has 4 GiB or more."""
     return Statistics(data, stream)
 
 
 def snapshot(data: Any, header: Any = None) -> npt.NDArray[np.void]:
-    """The records of a snapshot as a NumPy structured array of shape (n,), over the buffer
-    itself: nothing is copied, and the array keeps the buffer from being closed or resized.
+    """The records of a snapshot as a NumPy structured array of shape (n,), over the buffer itself:
+    nothing is copied, and the array keeps the buffer from being closed or resized.
 
-    All numbers are little-endian uint32, as they are stored. Without a header the records are
-    of the fixed layout, of 252 bytes, with the names of SnapshotRecord in morwick/snapshot.h;
-    `reads` and `writes` have shape (n, 4), by priority, with the fields count, totalLatency and
-    maxLatency (microseconds). Bytes after the last whole record are left out.
+    All numbers are little-endian uint32, as they are stored. Without a header the records are of
+    the fixed layout, of 252 bytes, with the names of SnapshotRecord in morwick/snapshot.h; `reads`
+    and `writes` have shape (n, 4), by priority, with the fields count, totalLatency and maxLatency
+    (microseconds). Bytes after the last whole record are left out.
 
-    With a header, which `morwick read snapshot_header` saves, the fields are those that it
-    describes, each under its label, such as "TH" for the format " TH=%8u.%02u". Numbers that
-    are printed with a fraction are in thousandths. Numbers by priority are one field under the
-    label of their counts, such as "RO", of shape (n, priorities), with the same three fields.
-    As in the text, the last record that the header promises is left out. Records that were
-    not filled, whose first field is 0, have no line in the text, and are there.
+    With a header, as `morwick read snapshot_header` saves it, the fields are those that it
+    describes, each under its label: "TH" for the format " TH=%8u.%02u". Numbers printed with a
+    fraction are in thousandths. Numbers by priority are one field under the label of their counts,
+    such as "RO", of shape (n, priorities), with the same three fields. As in the text, the last
+    record that the header promises is left out. Records that were not filled, whose first field is
+    0, are in the array, although the text has no line for them.
 
-    TypeError: an argument has no buffer, or holds other things than numbers and bytes, such as
-    an array of objects. BufferError: `data` is not contiguous, or a buffer cannot be had now.
-    ValueError: the header is not whole, and says what is wrong.
-    """
+    TypeError: an argument has no buffer, or holds other things than numbers and bytes. BufferError:
+    `data` is not contiguous, or a buffer cannot be had now. ValueError tells the header's fault."""
     return _native.snapshot(data, header)
 
 
 def render(data: Any, header: Any = None) -> str:
-    """The text of a snapshot: in the fixed layout, or the one that the header describes.
-
-    A line whose text is longer than 8 MiB, which a hostile header can ask for, is left out.
-    Bytes of a header's text that are not UTF-8 are kept by surrogateescape. Errors are those of
-    snapshot().
-    """
+    """The text of a snapshot: in the fixed layout, or the one that the header describes. Lines
+    longer than 8 MiB, which a hostile header can ask for, are left out. Bytes of a header's text
+    that are not UTF-8 are kept by surrogateescape. Errors are those of snapshot()."""
     return _native.render(data, header)
 
 
 class Table(Mapping[str, "np.ma.MaskedArray[Any, np.dtype[np.uint64]]"]):
-    """Many dumps: a row each, and a column for each statistic.
-
-    table[name] is a NumPy masked array of uint64, in which the values are masked that a dump
-    lacks. `files` are the names of the files, `faults` what is wrong with each, None for a good
-    dump. Leave rows with a fault out before you rank: a cut dump has less, not better, figures.
-    """
+    """Many dumps: a row each, and a column for each statistic. table[name] is a NumPy masked array
+    of uint64, in which the values that a dump lacks are masked. `files` are the names of the files,
+    and `faults` says what is wrong with each, None for a good dump. Leave out rows with a fault
+    before you rank: a cut dump has fewer figures, not better ones."""
 
     __eq__ = object.__eq__
     __hash__ = object.__hash__
@@ -233,33 +199,26 @@ class Table(Mapping[str, "np.ma.MaskedArray[Any, np.dtype[np.uint64]]"]):
         return f"<morwick.Table of {len(self.files)} files: {len(self)} columns>"
 
     def to_pandas(self) -> Any:
-        """The table as a pandas.DataFrame with the columns file, fault and those of the
-        statistics, in nullable UInt64. ImportError: pandas is not installed."""
+        """The table as a pandas.DataFrame with the columns file, fault and those of the statistics,
+        in nullable UInt64. ImportError: pandas is not installed."""
         import pandas  # type: ignore[import]
 
-        columns: dict[str, Any] = {"file": self.files, "fault": self.faults}
-        for name, column in self._columns.items():
-            columns[name] = pandas.arrays.IntegerArray(self._values[column], self._missing[column])
-        return pandas.DataFrame(columns)
+        columns = dict(zip(self, map(pandas.arrays.IntegerArray, self._values, self._missing)))
+        return pandas.DataFrame({"file": self.files, "fault": self.faults, **columns})
 
 
 def table(files: Path | Iterable[Path], stream: str = "kvr", names: str | Iterable[str] | None = None,
           jobs: int | None = None, progress: Callable[[int, int], object] | None = None) -> Table:  # fmt: skip
     """Reads many dumps into one table, as `morwick table` does, in the order of the files.
 
-    `files` is a path or several; a folder stands for all files in it and below, and dumps may
-    be compressed by gzip. `names` are the statistics that are wanted: the name of an array
-    stands for all its elements, "host*" for all names that begin so; without it there is a
-    column for every value of every known key. `jobs` is the number of threads, as many as
-    there are cores without it. `progress` is called now and then, and at the end, with the
-    number of dumps that were read and how many of them have a fault; what it raises ends the
-    reading. So does Ctrl-C. Python's lock is released meanwhile.
-
-    A file that cannot be read is no exception: its row has a fault.
-
-    TypeError: an argument is of a wrong type. ValueError: there is no such stream, or no
-    statistic of such a name, or `jobs` is below 1.
-    """
+    `files` is a path or several; a folder stands for all files in it and below, and dumps may be
+    compressed by gzip. `names` are the wanted statistics: the name of an array stands for all its
+    elements, "host*" for all names that begin so; without it there is a column for every value of
+    every known key. `jobs` is the number of threads; without it there is one for each core.
+    `progress` is called now and then, and at the end, with the number of dumps read and of those
+    with a fault. An exception in it, or Ctrl-C, ends the reading. Python's lock is released
+    meanwhile. A file that cannot be read raises nothing: its row has a fault. ValueError: there is
+    no such stream or statistic, or `jobs` is below 1."""
     if progress is not None and not callable(progress):
         raise TypeError(f"progress must be callable, not {type(progress).__name__}")
     return Table(*_native.table(_paths(files), stream, _names(names), _jobs(jobs), progress))
@@ -273,9 +232,9 @@ def _items(argument: Any, name: str, what: str) -> Iterator[Any]:
 
 
 def _paths(files: Path | Iterable[Path]) -> list[bytes]:
-    one = isinstance(files, (str, bytes, os.PathLike))
+    is_path = isinstance(files, (str, bytes, os.PathLike))
     paths = []
-    for file in [files] if one else _items(files, "files", "a path or an iterable of paths"):
+    for file in [files] if is_path else _items(files, "files", "a path or an iterable of paths"):
         try:
             paths.append(os.fsencode(file))
         except TypeError as error:
@@ -312,8 +271,8 @@ def _jobs(jobs: int | None) -> int:
 
 
 class ControllerError(Exception):
-    """A controller that is absent or has failed. `result` is the driver's result code, None
-    where the driver was not asked or did not fail."""
+    """A controller is absent or has failed. `result` is the driver's result code, or None when the
+    driver was not asked or did not fail."""
 
     def __init__(self, message: str, result: int | None = None) -> None:
         super().__init__(message, result)
@@ -324,11 +283,9 @@ class ControllerError(Exception):
 
 
 class ControllerClass(NamedTuple):
-    """A class of controllers that the library knows, and what there is of it in this machine.
-
-    `opened` tells whether a connection could be opened, which is closed again, and `result` is
-    the driver's result code of that, 0 for success. `offers` are what Controller.read can read.
-    """
+    """A class of controllers that the library knows, and whether this machine has one. `opened`
+    tells whether a connection could be opened, which is closed again; `result` is the driver's
+    result code for that, 0 for success. `offers` names what Controller.read can read."""
 
     name: str
     present: bool
@@ -338,20 +295,15 @@ class ControllerClass(NamedTuple):
 
 
 def controllers() -> list[ControllerClass]:
-    """All known classes of controllers, in the order in which Controller() looks for them. One
-    that is absent, or refuses, is no exception."""
+    """All known classes, present or not, in the order in which Controller() looks for them."""
     return [ControllerClass(*each) for each in _native.controllers()]
 
 
 class Controller:
-    """A connection to a controller, to be used with `with`: it is closed at the end of the
-    block, whatever happens, and at the latest when the object goes.
-
-    `name` is a class of controllers(); without it the first one that is present is taken.
-
-    ControllerError: it is not present, or its driver refuses. ValueError: there is no such
-    class. A controller that is closed raises ValueError when it is read from.
-    """
+    """A connection to a controller, to be used with `with`: it is closed at the end of the block,
+    whatever happens, and at the latest when the object goes. `name` is a class of controllers();
+    without it the first one that is present is taken. ControllerError: it is not present, or its
+    driver refuses. ValueError: there is no such class, or a closed controller is read from."""
 
     def __init__(self, name: str | None = None) -> None:
         self._connection = _native.connect(name)
@@ -362,22 +314,20 @@ class Controller:
         return _native.name(self._connection)
 
     def read(self, what: str) -> bytes:
-        """What the controller answers: "kvr", "ftl" (both are in "statistics"), "msp",
-        "snapshot", "snapshot_header", "band", "defects" or "telemetry".
-
-        Waits for the answer; Python's lock is released meanwhile. ControllerError: the driver
-        fails, or the class does not offer it. ValueError: there is nothing of that name.
-        """
+        """The controller's answer. `what` is "kvr", "ftl" (both are in "statistics"), "msp",
+        "snapshot", "snapshot_header", "band", "defects" or "telemetry". Waits for the answer;
+        Python's lock is released meanwhile. ControllerError: the driver fails, or the class does
+        not offer it. ValueError: there is nothing of that name."""
         return _native.read(self._connection, what)
 
     def statistics(self, stream: str = "kvr") -> Statistics:
         """Reads and parses the statistics of a stream. Errors are those of read() and parse()."""
-        _native.keys(stream)  # raises when there is none
+        _native.keys(stream)  # raises when there is no such stream, before anything is read
         return parse(self.read(stream), stream)
 
     def snapshot(self) -> npt.NDArray[np.void]:
-        """Reads the snapshot, in the layout of the controller's own header if it offers one.
-        Errors are those of read() and snapshot()."""
+        """Reads the snapshot, in the layout of the controller's own header if it offers one. Errors
+        are those of read() and snapshot()."""
         offered = _native.offers(self._connection, "snapshot_header")
         header = self.read("snapshot_header") if offered else None
         return snapshot(self.read("snapshot"), header)

@@ -1,4 +1,4 @@
-"""The module beside the command, by what both make of the same bytes; and what it owes Python."""
+"""Compares the module with the command on the same bytes, and tests it as a module of Python."""
 
 import ctypes, gzip, json, mmap, os, pathlib, pickle, random, struct, subprocess, sys, textwrap, threading
 from concurrent.futures import ThreadPoolExecutor
@@ -12,11 +12,9 @@ import morwick
 SOURCE = pathlib.Path(os.environ["SOURCE"])
 COMMAND = os.environ["MORWICK"]
 SANITIZED = bool(os.environ.get("SANITIZED"))
-COUNT = 25 if SANITIZED else 500  # the command takes its time there
+COUNT = 25 if SANITIZED else 500  # random dumps of a stream; a sanitized command is slow
 STREAMS = ["kvr", "ftl", "msp"]
-SNAPSHOT = (SOURCE / "examples/snapshot.bin").read_bytes()
-HEADER = (SOURCE / "examples/snapshot_header.bin").read_bytes()
-KVR = (SOURCE / "examples/kvr.bin").read_bytes()
+SNAPSHOT, HEADER, KVR = [(SOURCE / f"examples/{name}.bin").read_bytes() for name in ("snapshot", "snapshot_header", "kvr")]
 
 
 def run(*words, text=True, **environment):
@@ -28,27 +26,28 @@ def command(*words):
 
 
 def random_dump(stream, seed):
-    """Records of keys that the stream knows, few of them so that they come again; some of another
-    length or unknown, and the end sometimes cut or overwritten."""
-    chance = random.Random(f"{stream} {seed}")
-    keys = chance.sample(morwick.keys(stream), 12)
-    head, letter, unit, bits = ("HH", "I", 4, 33) if stream == "msp" else ("II", "Q", 1, 65)
+    """Records of a few known keys, so that keys repeat. Some records have another length or an unknown
+    key. The end may be cut, and other bytes may follow."""
+    draw = random.Random(f"{stream} {seed}")
+    keys = draw.sample(morwick.keys(stream), 12)
+    # The formats of header and value, a value's length in the header, and 1 more than its bits.
+    header, value, length, bits = ("HH", "I", 4, 33) if stream == "msp" else ("II", "Q", 1, 65)
     dump = b""
-    for _ in range(chance.randrange(40)):
-        key = chance.choice(keys)
-        size = chance.choice([key.size] * 5 + [0, 1, key.size // 2, key.size + 1])
-        number = chance.choice([key.id] * 9 + [chance.randrange(0x2FFE)])
-        values = [chance.getrandbits(chance.randrange(bits)) for _ in range(size)]
-        dump += struct.pack(f"<{head}{size}{letter}", number, unit * size, *values)
-    if chance.random() < 0.3:
-        dump = dump[: chance.randrange(len(dump) + 1)]
-    return dump + bytes(chance.getrandbits(8) for _ in range(chance.choice([0, 0, 0, 2, 9])))
+    for _ in range(draw.randrange(40)):
+        key = draw.choice(keys)
+        size = draw.choice([key.size] * 5 + [0, 1, key.size // 2, key.size + 1])
+        number = draw.choice([key.id] * 9 + [draw.randrange(0x2FFE)])  # below the end keys
+        values = [draw.getrandbits(draw.randrange(bits)) for _ in range(size)]
+        dump += struct.pack(f"<{header}{size}{value}", number, length * size, *values)
+    if draw.random() < 0.3:
+        dump = dump[: draw.randrange(len(dump) + 1)]
+    return dump + bytes(draw.getrandbits(8) for _ in range(draw.choice([0, 0, 0, 2, 9])))
 
 
 @pytest.fixture(scope="module")
 def dumps(tmp_path_factory):
-    """Files of each stream: every fuzz seed, without the byte that chooses, every example, and
-    random ones; each a mixture of what is read as its own stream and as the others."""
+    """Files for each stream: random dumps of it, and every example and fuzz seed, whichever stream it
+    is of. A seed's first byte, which chooses what is fuzzed, is left out."""
     folder = tmp_path_factory.mktemp("dumps")
     for stream in STREAMS:
         for seed in range(COUNT):
@@ -74,20 +73,20 @@ def test_statistics_are_those_of_the_command(dumps, stream):
         data = file.read_bytes()
         statistics = morwick.parse(data, stream)
         entries, last = [], {}
-        for entry in report["entries"]:  # a dict keeps the place of the first
+        for entry in report["entries"]:
             name, values = entry["name"], entry.get("values") or [entry["value"]]
             entries += [(f"{name}{i}" if "values" in entry else name, value) for i, value in enumerate(values)]
-            key = keys[name if name in keys else name[:-1]]  # an array's only value has its number in the name
-            last[key.name] = values if key.size > 1 else values[0]
+            key = keys[name]
+            last[key.name] = values if key.size > 1 else values[0]  # at the place of the first
         assert statistics.entries == entries, file
         assert plain(statistics.items()) == list(last.items()), file
         assert plain((name, statistics[name]) for name in statistics) == list(last.items())
         summary = [(name, float(f"{value:.3f}") if isinstance(value, float) else value)
                    for name, value in plain(statistics.summary.items())]  # fmt: skip
-        said = report.get("summary", {}).items()  # a large number comes once more, as NAME_s
-        assert summary == [item for item in said if not item[0].endswith("_s")], file
-        said = [message["text"] for message in report["messages"] if message["severity"] == "error"]
-        assert (statistics.fault or "") == "; ".join(text.removeprefix(f"{file}: ") for text in said)
+        reported = report.get("summary", {}).items()  # a large number comes once more, as NAME_s
+        assert summary == [item for item in reported if not item[0].endswith("_s")], file
+        errors = [message["text"] for message in report["messages"] if message["severity"] == "error"]
+        assert (statistics.fault or "") == "; ".join(text.removeprefix(f"{file}: ") for text in errors)
         assert 0 <= statistics.end <= len(data)
         bytewise = np.frombuffer(data, np.uint8)
         for same in bytearray(data), bytewise, np.repeat(bytewise, 2)[::2], memoryview(data)[::-1][::-1]:
@@ -127,23 +126,23 @@ def test_table_takes_what_the_command_takes(tmp_path):
     assert "No such file" in morwick.table("missing").faults[0]
 
 
-IN_ORDER = """timestamp erasedBands hostReads hostWrites nandReads nandWrites hysteresisTime collectedSectors
+CSV_ORDER = """timestamp erasedBands hostReads hostWrites nandReads nandWrites hysteresisTime collectedSectors
     wearLevelBands intermediatePendingErase userPendingErase freeNodes bufferFragments bufferHighWater preemptPercent
     qosDelaysNormal qosDelaysExtreme expeditesSucceeded expeditesFailed oldestCommandAge qosInterval commandTagsMin
     commandTagsMax freeSegments hostUnmaps reads writes""".split()
 
 
 def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
-    chance = random.Random(3)
+    draw = random.Random(3)
     for number in range(2 if SANITIZED else 20):
-        # The header promises fewer records than the first has, and the last is cut.
-        data = SNAPSHOT + SNAPSHOT[:600] if number == 0 else chance.randbytes(chance.randrange(252, 4000))
+        # The first data has more records than the header promises, and its last one is cut.
+        data = SNAPSHOT + SNAPSHOT[:600] if number == 0 else draw.randbytes(draw.randrange(252, 4000))
         (tmp_path / "data").write_bytes(data)
         for header, words in (None, []), (HEADER, ["--header", SOURCE / "examples/snapshot_header.bin"]):
             assert morwick.render(data, header).encode() == command("snapshot", *words, tmp_path / "data")
             heading, *rows = command("snapshot", "-o", "csv", *words, tmp_path / "data").decode().splitlines()
             records = morwick.snapshot(data, header)
-            names = IN_ORDER if header is None else records.dtype.names
+            names = CSV_ORDER if header is None else records.dtype.names
             columns = []
             for field in map(records.__getitem__, names):
                 parts = [field[part].T for part in field.dtype.names] if field.ndim == 2 else [field[None]]
@@ -178,7 +177,7 @@ def test_views_keep_their_buffers():
     for data, resize in (bytearray(SNAPSHOT), bytearray.clear), (mmap.mmap(-1, 504), mmap.mmap.close):
         with memoryview(data) as view:
             records = [morwick.snapshot(view)[::2], morwick.snapshot(data)]
-        data[0] = 77  # the same bytes
+        data[0] = 77  # which the records show too
         while records:
             with pytest.raises(BufferError):
                 resize(data)
@@ -191,7 +190,7 @@ def test_views_keep_their_buffers():
     assert statistics["hostReads"] == 918273645 and statistics.entries[0] == ("exportVersion", 7)
 
 
-HUGE = np.lib.stride_tricks.as_strided(np.zeros(1, np.uint64), (1 << 29,), (0,))  # 4 GiB, of 8 bytes
+HUGE = np.lib.stride_tricks.as_strided(np.zeros(1, np.uint64), (1 << 29,), (0,))  # 4 GiB that take 8 bytes
 OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
 
 
@@ -237,8 +236,7 @@ def test_threads_find_the_same(dumps):
 
     def work(_):
         table = morwick.table(dumps, names="host*", jobs=3)
-        columns = [table[name].filled(1).tolist() for name in table]
-        return columns, table.faults, len(morwick.parse(large).entries)
+        return [table[name].filled(1).tolist() for name in table], table.faults, len(morwick.parse(large).entries)
 
     with ThreadPoolExecutor(4) as pool:
         first, *others = pool.map(work, range(8))
@@ -256,7 +254,7 @@ def test_progress_and_an_interrupt_end_the_reading(tmp_path):
 
 
 def play(scenario, code):
-    """What a fresh interpreter prints, with the platform's complaints of handles that are open."""
+    """What the code prints in a fresh interpreter, with the platform's complaints about open handles."""
     played = run(sys.executable, "-c", "import morwick\n" + textwrap.dedent(code),
                  GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios" / scenario))  # fmt: skip
     return played.stdout + played.stderr
@@ -289,8 +287,7 @@ def test_controllers_are_read_and_given_back():
     words, hexadecimal, result = first.rsplit(maxsplit=2)
     assert words == "VeltoQRN3NVMeController: the connection was refused, result"
     assert int(result) == int(hexadecimal, 16) != 0 and second == "KVRStorage: the controller is not present None"
-    assert play("fails.toml", failing).startswith(
-        "VeltoEmbeddedNVMeController: msp: this controller does not offer it None\n")  # fmt: skip
+    assert play("fails.toml", failing).startswith("VeltoEmbeddedNVMeController: msp: this controller does not offer it None\n")
     assert "closing the connection failed, result" in play("fails.toml", "morwick.Controller().close()")
 
 
@@ -321,13 +318,13 @@ for call in calls:
 """
 LEAK = """
 class Heap(ctypes.Structure): _fields_ = [(name, ctypes.c_size_t) for name in "abcdefghij"]
-heap = ctypes.CDLL(None).mallinfo2
+heap = ctypes.CDLL(None).mallinfo2  # e, its hblkhd, and h, its uordblks, are the bytes in use
 heap.restype = Heap
 def grow():
     before = heap()
     for call in calls * 100: call()
     now = heap(); return now.h + now.e - before.h - before.e
-grow(); grown = grow()
+grow(); grown = grow()  # the first call fills caches
 assert grown < 40000, grown
 """
 
@@ -346,8 +343,7 @@ def test_types_hold():
 
 
 def test_everything_public_is_described_and_nothing_else_exported():
-    own = {name: value for name, value in vars(morwick).items()
-           if getattr(value, "__module__", "").startswith("morwick")}
+    own = {name: value for name, value in vars(morwick).items() if getattr(value, "__module__", "").startswith("morwick")}
     assert {name for name in own if name[0] != "_"} == {*morwick.__all__} - {"platform"}
     assert all(own[name].__doc__ for name in morwick.__all__ if name != "platform")
     library = run("nm", "-D", "--defined-only", morwick._native.__file__)
