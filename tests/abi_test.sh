@@ -11,8 +11,9 @@ source "$tests/documented.sh"
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
-# What the headers in a folder come to. A variable holds each fact by its type: a function's signature, a
-# record, and the number of an enumerator as the length of an array. Usage: describe INCLUDE_FOLDER FILE
+# Writes the binary interface of the headers in a folder. Each fact is the type of a variable: a function's
+# signature, a record, and an enumerator's number plus 1000, so that it is positive, as the length of an array.
+# Usage: describe INCLUDE_FOLDER FILE
 describe() {
   {
     echo '#include "morwick/morwick.h"'

@@ -12,7 +12,8 @@ namespace {
 void Handle() { TaskSchedulerActivityHandler(nullptr); }
 
 TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
-  const NandExporter whole = nand_exporters[0];
+  const NandExporter originalRow = nand_exporters[0];
+  const SelectorPair originalPair = taskSchedulerSelectors;
   PlayCases("activity_handler.txt", [&](Script &script) {
     if (script.contains("without task scheduler")) {
       nand_exporters[0].getTaskSchedulerSelectors = nullptr;
@@ -23,8 +24,8 @@ TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
     }
     Handle();
     if (script.contains("again")) Handle();
-    nand_exporters[0] = whole;
-    taskSchedulerSelectors = {39, 39};
+    nand_exporters[0] = originalRow;
+    taskSchedulerSelectors = originalPair;
   });
 }
 
@@ -43,7 +44,7 @@ TEST(ActivityHandlerTest, EndsEveryRunWhateverFails) {
 
 TEST(ActivityHandlerTest, CountsIterationsWithoutEnd) {
   std::string replies;
-  for (int i = 0; i < 70000; ++i) replies += "1 ";
+  for (int i = 0; i < 70000; ++i) replies += "1 ";  // more than 16 bits count
   const std::string outcome = Play({{"present", "KVRStorage"}, {"replies", replies + "0"}}, Handle);
   EXPECT_NE(outcome.find("log iter# 70001 - DONE - no more BDR\n"), std::string::npos);
 }

@@ -13,8 +13,8 @@ ROOT, BUILD = os.path.abspath("build/attack"), os.path.abspath("build/release")
 MORWICK, GRELLON = BUILD + "/tools/morwick", BUILD + "/grellon"
 PRELOAD = f"{BUILD}/tests/librefuse_memory.so {BUILD}/tests/libfast_sleep.so"
 STOP = (signal.SIGTERM, signal.SIGINT, signal.SIGHUP)
-MEANINGLESS = (signal.SIGUSR1, signal.SIGPIPE, signal.SIGXFSZ)
-HANDLES = re.compile(rb"still open|already released| is unknown$|of another kind|did not end", re.M)
+HARMLESS = (signal.SIGUSR1, signal.SIGPIPE, signal.SIGXFSZ)  # to the daemon
+MISUSE = re.compile(rb"still open|already released| is unknown$|of another kind|did not end", re.M)
 STARTED = re.compile(rb"start grellon|Controller found")
 CONTROL = re.compile("[\0-\x09\x0b-\x1f\x7f-\x9f\udc80-\udcff]")
 MOST_OUTPUT = 16 << 20
@@ -29,8 +29,8 @@ GOOD = {"live.toml": NVME + FILES, "works.toml": QUICK % 1 + NVME, "bad.toml": b
 GOOD |= {f"faults-{runs}.toml": QUICK % runs + NVME + FAULTS for runs in (5, 50, 100000)}
 for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_header.bin"):
     GOOD[example] = Path("examples", example).read_bytes() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
-# Two thousand entries, too large for a double, whose JSON is larger than the command's buffer; the one
-# with the odd name is cut. Five hundred records and a part of one.
+# many and more: 2,000 entries each, too large for a double, with more JSON than the command's buffer holds.
+# The dump with the odd name is cut. long: 500 snapshot records and a part of one.
 many = [b"".join(struct.pack("<IIQ", 4, 1, start << 54 | n) for n in range(2000)) for start in (1, 2)]
 GOOD |= {"many.bin": many[0], "more.bin": many[1], "odd\udcff.bin": many[0][:-4]}
 GOOD |= {name + ".gz": gzip.compress(GOOD[name + ".bin"], mtime=0) for name in ("kvr", "snapshot")}
@@ -49,7 +49,7 @@ thread = threading.local()
 
 
 def folder():
-    """One for each thread, with good files."""
+    """This thread's folder. At first it has the good files."""
     if not hasattr(thread, "folder"):
         thread.folder = tempfile.mkdtemp(dir=ROOT)
         fill(GOOD)
@@ -62,7 +62,7 @@ def fill(files):
 
 
 def take(name):
-    """The content of a file, which is gone then."""
+    """Removes a file and returns its content; None without a file."""
     if not os.path.exists(f"{folder()}/{name}"):
         return None
     with open(f"{folder()}/{name}", "rb") as source:
@@ -71,8 +71,9 @@ def take(name):
 
 
 def run(program, scenario, draw=None, sent=(), ends=(), **environment):
-    """Runs a program to its end, sending signals at random moments: any before it has said that it is at
-    work may end it, and each of `ends`. `fault` is what no program may do."""
+    """Runs a program to its end and sends it the signals in `sent` at random moments. A signal may end it
+    before it says that it has started, and one in `ends` at any time. The result's `fault` is what no
+    program may do."""
     global most_memory
     preload = f"{PRELOAD} {BUILD}/tests/libfast_watch.so" if "watch" in program else PRELOAD
     environment |= {"GRELLON_SCENARIO": scenario + ".toml", "LD_PRELOAD": preload}
@@ -87,11 +88,11 @@ def run(program, scenario, draw=None, sent=(), ends=(), **environment):
             time.sleep(draw.random() * draw.choice((0.003, 0.01, 0.04)))
             result.deaths += [] if STARTED.search(os.pread(errors.fileno(), 4096, 0)) else [-each]
             os.kill(process.pid, each)
-        begin, ended = time.monotonic(), os.pidfd_open(process.pid)
-        if not select.select([ended], [], [], 15)[0]:
+        begin, handle = time.monotonic(), os.pidfd_open(process.pid)
+        if not select.select([handle], [], [], 15)[0]:
             result.fault = "hangs"
             process.kill()
-        os.close(ended)
+        os.close(handle)
         result.status, result.took = process.wait(), time.monotonic() - begin
         output.seek(0)
         errors.seek(0)
@@ -102,7 +103,7 @@ def run(program, scenario, draw=None, sent=(), ends=(), **environment):
         most_memory, result.fault = memory, f"takes {memory} KiB"
     if not 0 <= result.status < 128 and result.status not in result.deaths:
         result.fault = result.fault or "is killed"
-    if HANDLES.search(result.errors):
+    if MISUSE.search(result.errors):
         result.fault = "misuses a handle"
     if [name for name in os.listdir(folder()) if name.startswith("out.") and take(name)]:
         result.fault = "leaves a file beside the one it writes"
@@ -110,15 +111,15 @@ def run(program, scenario, draw=None, sent=(), ends=(), **environment):
 
 
 def same(program, one, other):
-    """But for times, and rates that are reckoned from them."""
+    """Whether two outputs are equal, but for times and the rates computed from them."""
     if {"watch", "metrics"}.isdisjoint(program) or None in (one, other):
         return one == other
     return len({re.sub(rb" +|\d+([-:.]\d+)+", b"", text) for text in (one, other)}) == 1
 
 
 def whole_json(program, output, status=None):
-    """Each line is an object, and the status, where it is given, that of the last one. Of a watch it is
-    that of the worst one."""
+    """Whether each line is an object, the last one with `status` if that is given. A watch may end with the
+    status of an earlier object."""
     if "json" not in program:
         return True
     try:
@@ -156,7 +157,7 @@ def interrupt(number):
     draw = random.Random(f"{SEED} signals {number}")
     last = draw.choice(STOP)
     if number % 2 == 0:
-        sent = [*draw.choices(MEANINGLESS, k=draw.randrange(3)), last]
+        sent = [*draw.choices(HARMLESS, k=draw.randrange(3)), last]
         scenario = draw.choice(("works", "faults-5", "faults-50", "faults-100000"))
         result = run([GRELLON], scenario, draw, sent)
         return result, result.status in result.deaths or (
@@ -172,7 +173,7 @@ def interrupt(number):
 
 
 def exchange(number):
-    """While a file is written somebody exchanges the link to it for one to a device, or its folder."""
+    """Writes a file while a thread exchanges the link to it for one to a device, or moves its folder."""
     here, name, done = folder() + "/there", ("link", "old")[number % 2], threading.Event()
     os.mkdir(here)
     fill({"there/old": b"old"})
@@ -189,11 +190,11 @@ def exchange(number):
             os.rename(here, here + ".moved")
             os.rename(here + ".moved", here)
 
-    somebody = threading.Thread(target=(exchange_link, exchange_folder)[number % 2])
-    somebody.start()
+    exchanger = threading.Thread(target=(exchange_link, exchange_folder)[number % 2])
+    exchanger.start()
     result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
     done.set()
-    somebody.join()
+    exchanger.join()
     good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (b"old", GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good
@@ -238,11 +239,11 @@ def mutated(draw, good):
 
 
 def carry_out(attack, jobs, pool):
-    """Returns the number of runs, of findings, and the longest time, in seconds."""
+    """Returns the number of runs, of findings, and the longest run in seconds."""
     jobs, end, numbers = list(jobs), float("inf"), itertools.count()
     if SECONDS > 0:  # the first one always
         jobs[1:] = random.Random(SEED).sample(jobs[1:], len(jobs) - 1)
-        end = time.monotonic() + SECONDS / 5
+        end = time.monotonic() + SECONDS / 5  # attacks
 
     def one(job):
         if time.monotonic() > end:
@@ -260,7 +261,7 @@ def carry_out(attack, jobs, pool):
     return len(times), sum(found), max(times)
 
 
-for ignored in STOP:  # a shell ignores it for background jobs, and so do all programs that they start
+for ignored in STOP:  # background jobs of a shell ignore some, and so do all programs that they start
     signal.signal(ignored, signal.SIG_DFL)
 shutil.rmtree(ROOT, ignore_errors=True)
 os.makedirs(ROOT)

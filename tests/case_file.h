@@ -1,4 +1,4 @@
-// A file under tests/cases, line by line: what a failing case is found by is its file and line.
+// Reads a file under tests/cases line by line. Tests name a failing case by its file and line.
 #ifndef TESTS_CASE_FILE_H
 #define TESTS_CASE_FILE_H
 
@@ -9,7 +9,7 @@
 #include <sstream>
 #include <string>
 
-// The number that a case writes, in C's notation. The test fails when it is none.
+// The number that a text is in C's notation. The test fails when it is no number.
 inline uint64_t Number(const std::string &text) {
   size_t end = 0;
   const uint64_t number = std::stoull(text, &end, 0);  // throws where no number begins
@@ -37,10 +37,10 @@ class CaseFile {
     return static_cast<bool>(std::getline(file_, *line));
   }
 
-  // What the next line begins with; NUL at the end.
+  // The first character of the next line; NUL at the end of the file.
   char Peek() { return file_.peek() == EOF ? '\0' : static_cast<char>(file_.peek()); }
 
-  // Of the line that was read last.
+  // File and number of the line that was read last.
   std::string where() const { return name_ + ":" + std::to_string(number_); }
 
  private:

@@ -11,11 +11,11 @@
 
 namespace {
 
-// Goes in by one of the four ways, gives back what it obtained and prints the outcome. A record
-// that is opened may hold a connection.
+// Finds or connects in one of four ways, gives back the handles and prints the outcome. `held` is
+// the connection that the record holds before it is opened.
 void Use(const std::string &way, uint32_t held = 0) {
   NandExporter *row = &nand_exporters[2];  // every search begins at the first all the same
-  KVRConnection record = {77, held, row};
+  KVRConnection record = {77, held, row};  // opening must overwrite the 77
   bool good = false;
   if (way == "find") {
     if (const uint32_t service = findNandExporter(&row)) good = ReleaseObject(service) == 0;
@@ -59,7 +59,7 @@ TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {
   });
 }
 
-// What findNandExporterNew keeps in the row is nobody else's.
+// Other functions do not use the handles that findNandExporterNew keeps in the row.
 TEST(ConnectionTest, SearchesAnewEachTime) {
   const std::string outcome = Play({{"present", "KVRStorage"}}, [] {
     NandExporter *kept = nullptr;

@@ -1,7 +1,8 @@
 /*
- * A tool in C, or in C++, of the examples in the public headers, which tests/install_test.sh takes
- * from there. Prints the table, what the examples make of a snapshot header, a snapshot and a dump,
- * one after the other in standard input, and what the controller reports.
+ * A tool, in C or C++, made of the examples in the public headers, which tests/install_test.sh
+ * extracts. Reads a snapshot header, a snapshot and a dump, one after the other, from standard
+ * input. Prints the exporter table, what the examples make of the three, and what the controller
+ * reports.
  */
 
 #include <inttypes.h>
@@ -34,6 +35,7 @@ static int PrintController(void) {
 }
 
 int main(void) {
+  // The sizes of the example files; the dump may be smaller.
   static char header[816], snapshot[120 * sizeof(SnapshotRecord)], dump[1000];
   fread(header, 1, sizeof header, stdin);
   fread(snapshot, 1, sizeof snapshot, stdin);

@@ -29,9 +29,8 @@ def wait_for(text, times=1):
 
 
 def early_signals():
-    """The scenario comes late, from a pipe. Signals that are blocked meanwhile are there afterwards: one to
-    yield means nothing before there is a run, one to stop leaves nothing to run. Others end the daemon
-    while it waits for the scenario."""
+    """The scenario comes late, from a pipe. Blocked signals count after it: one to yield means nothing before
+    a run, and one to stop leaves nothing to run. Other signals end the daemon while it waits."""
     os.mkfifo(SCENARIO)
     for option, signals, outcome in (
             ("block", [SIGUSR1], (0, 1)), ("block", [SIGTERM], (0, 0)), ("block", [SIGHUP, SIGUSR1], (0, 0)),
@@ -71,7 +70,7 @@ def random_faults():
 
 
 def outputs_that_take_nothing():
-    """Whatever becomes of what it prints, it ends as it would have."""
+    """The daemon ends as usual, whatever becomes of its output."""
     faults = "vanish = [4]\nfail_close = true\n"
     for scenario, status in (QUICK % (1, 2), 0), (QUICK % (5, 2) + faults, 0), ("a = \n", 2):
         SCENARIO.write_text(scenario)
@@ -83,17 +82,17 @@ def outputs_that_take_nothing():
 
 
 def unread_logs():
-    """Neither standard error nor, where a folder may be put in the place of /dev, the system's log is read."""
+    """Nobody reads standard error or, where this test may replace /dev, the system's log."""
     _, full = os.pipe()
     os.write(full, bytes(fcntl.fcntl(full, fcntl.F_GETPIPE_SZ)))
     os.mkdir("dev")
     Path("dev/null").touch()
     log = socket.socket(socket.AF_UNIX, socket.SOCK_DGRAM)
     log.bind("dev/log")
-    there = "mount --bind /dev/null dev/null && mount --rbind dev /dev && exec $0"
-    elsewhere = ["unshare", "-m", "bash", "-c", there] if os.system("unshare -m true") == 0 else []
+    replace_dev = "mount --bind /dev/null dev/null && mount --rbind dev /dev && exec $0"
+    before = ["unshare", "-m", "bash", "-c", replace_dev] if os.system("unshare -m true") == 0 else []
     SCENARIO.write_text(LONG)
-    daemon = start(*elsewhere, errors=full)
+    daemon = start(*before, errors=full)
     wait_for("Controller found")
     time.sleep(2)  # for more lines than may wait
     daemon.terminate()

@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Puts each query of a Grafana dashboard to a Prometheus, for all machines: it must parse, and return a
+# Sends each query of a Grafana dashboard to a Prometheus server, for all machines. Each must return a
 # number. Usage: dashboard.sh DASHBOARD ADDRESS
 set -euo pipefail
 

@@ -1,5 +1,5 @@
 # shellcheck shell=bash
-# What the public headers in the folder $1 declare, for scripts that hold something against it.
+# Functions that list what the public headers in the folder $1 declare. Other scripts source this file.
 
 headers() { cat "$1"/morwick/*.h | tr '\n' ' '; }
 

@@ -47,7 +47,7 @@ TEST(ErrorMessageTest, IsOneOfThoseThatEightThreadsReportAtOnce) {
     std::set<std::string> possible;
     const char *seen[8] = {};  // by each thread, once it has reported
     for (int i = 0; i < 8; ++i) {
-      const std::string length = std::to_string(i < 3 ? i + 1 : i + 11);  // configured are ten
+      const std::string length = std::to_string(i < 3 ? i + 1 : i + 11);  // ten is the good length
       possible.insert("KVRFTLParseBufferToCxt: hostWriteLogHisto(14): (#10) cfg elements != (" +
                       length + ") buffer elements");
       threads.emplace_back([&start, seenHere = &seen[i], length] {

@@ -38,7 +38,7 @@ bool Lists(const std::string &key, const std::string &word) {
   return (" " + platform.script[key] + " ").find(" " + word + " ") != std::string::npos;
 }
 
-// The word that is next in turn, or `otherwise` when they have run out.
+// Takes the key's next word off the script; returns `otherwise` when none is left.
 std::string Take(const std::string &key, const std::string &otherwise) {
   std::string &words = platform.script[key];
   if (words.empty()) return otherwise;
@@ -177,8 +177,8 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
   auto *pending = static_cast<uint32_t *>(reply);
   EXPECT_TRUE(*replySize == 4 && *pending == 0);
   *pending = static_cast<uint32_t>(Number(Take("replies", "0")));
-  *replySize = 1;  // not looked at, and not what the next call may begin with
-  // The pair is a writable global: a request takes what stands in it then.
+  *replySize = 1;  // the caller must ignore it, and set it to 4 again for the next call
+  // The pair is a writable global: each request must read it anew.
   const std::string second = std::to_string(taskSchedulerSelectors.second);
   taskSchedulerSelectors.second = static_cast<uint32_t>(Number(Take("commands", second)));
   return Result(Fails("call"));

@@ -16,9 +16,9 @@
 // "keeps state": it cannot be set.
 using Script = std::map<std::string, std::string>;
 
-// What the body did to a fresh platform with this script: what it printed, if anything, and after
-// a line end its calls, one a line. The test fails when it left a handle open or returned one that
-// was not.
+// Runs the body on a fresh platform with this script. Returns what it printed, if anything, with a
+// line end after it, then its calls, one a line. The test fails when the body left a handle open
+// or gave back one that was not open.
 std::string Play(const Script &script, const std::function<void()> &body);
 
 // Plays the cases of a file under tests/cases and compares each outcome with the expected one. A
@@ -26,8 +26,7 @@ std::string Play(const Script &script, const std::function<void()> &body);
 // outcome. The body may read keys of its own from the script.
 void PlayCases(const std::string &file, const std::function<void(Script &)> &body);
 
-// Plays again and again, with every call failing alone and with every other one, and gives back
-// each outcome.
+// Plays once for each call that fails alone, and for each two that fail. Returns all outcomes.
 std::vector<std::string> PlayEveryFailure(Script script, const std::function<void()> &body);
 
 #endif

@@ -1,5 +1,5 @@
-"""Holds what Dask makes of 2,000 dumps against `morwick table`: with a scheduler and two workers that are
-processes of their own, at a terminal, with a worker that is killed half-way, and without a cluster.
+"""Compares what examples/fleet.py makes of 2,000 dumps with `morwick table`: with Dask's scheduler and two
+workers as processes, at a terminal, with a worker that is killed half-way, and without a cluster.
 Usage: fleet_test.py MORWICK SOURCE"""
 import bisect, contextlib, csv, io, os, pathlib, re, subprocess, sys, tempfile, textwrap, time
 from concurrent.futures import ThreadPoolExecutor
@@ -9,12 +9,12 @@ sys.path.append(source + "/examples")  # workers do not look there: they must be
 import fleet, pandas
 from dask.distributed import Client
 
-# Of the keys 4 counts writes of the host, 18 those of the flash, 47 the grown bad blocks.
-word = lambda key, value: bytes([key, 0, 0, 0, 1, 0, 0, 0]) + value.to_bytes(8, "little")
-spoilt = {  # each would stand out if a fault, or what is missing, were taken for a value
-    101: b"", 303: b"PK\3\4xxxxyyyyzzzz", 505: word(4, 1) + word(18, 900) + word(47, 900) + b"cut",
-    707: word(4, 0) + word(18, 900) + word(47, 0), 909: word(18, 900) + word(47, 0), 911: word(7, 5),
-    1111: word(4, 2**64 - 1) + word(18, 2**64 - 3) + word(47, 2**63 + 1)}
+# Key 4 counts the host's writes, 18 those to NAND, 47 the grown bad blocks.
+record = lambda key, value: bytes([key, 0, 0, 0, 1, 0, 0, 0]) + value.to_bytes(8, "little")
+odd_dumps = {  # by the file's index; each would stand out if a fault or a gap were taken for a value
+    101: b"", 303: b"PK\3\4xxxxyyyyzzzz", 505: record(4, 1) + record(18, 900) + record(47, 900) + b"cut",
+    707: record(4, 0) + record(18, 900) + record(47, 0), 909: record(18, 900) + record(47, 0), 911: record(7, 5),
+    1111: record(4, 2**64 - 1) + record(18, 2**64 - 3) + record(47, 2**63 + 1)}
 
 
 def as_rows(table):
@@ -22,18 +22,19 @@ def as_rows(table):
 
 
 def ten_of(rows):
-    """The ten drives that stand out most, without pandas. A folder is a drive, its last readable dump counts."""
+    """The ten drives that stand out most, without pandas. A folder is a drive; its last good dump counts."""
     drives = {os.path.dirname(row[0]): row for row in rows if not row[1]}.values()
     figures = [(file, int(nand) / int(host) if nand and host.strip("0") else None, int(bad) if bad else None)
                for file, _, host, nand, bad in drives]
     columns = {i: sorted(row[i] for row in figures if row[i] is not None) for i in (1, 2)}
-    share = lambda all, value: (bisect.bisect_left(all, value) + bisect.bisect(all, value) + 1) / len(all)
+    rank = lambda column, value: (  # twice the percentile of pandas
+        bisect.bisect_left(column, value) + bisect.bisect(column, value) + 1) / len(column)
     return sorted(figures, reverse=True, key=lambda row: (
-        max([share(columns[i], row[i]) for i in (1, 2) if row[i] is not None], default=0)))[:10]
+        max([rank(columns[i], row[i]) for i in (1, 2) if row[i] is not None], default=0)))[:10]
 
 
 def wait_for(condition):
-    for _ in range(600):
+    for _ in range(600):  # 60 seconds
         if found := condition():
             return found
         time.sleep(0.1)
@@ -60,7 +61,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
     subprocess.run([sys.executable, source + "/examples/make_fleet.py", "fleet"], check=True)
     files = fleet.list_dumps(work + "/fleet")
     assert len(files) == 2000
-    for index, dump in spoilt.items():
+    for index, dump in odd_dumps.items():
         pathlib.Path(files[index]).write_bytes(dump)
     table = subprocess.run([morwick, "table", "-s", "kvr", "-n", ",".join(fleet.NAMES), work + "/fleet"],
                            capture_output=True, text=True).stdout
@@ -85,7 +86,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
             assert screen[-1].endswith("status 1"), screen
             assert pathlib.Path("fleet.png").read_bytes().startswith(b"\x89PNG")
 
-            # What the page shows, on this machine and on the cluster.
+            # The script that docs/archive.md shows, without the cluster and on it.
             page = pathlib.Path(source + "/docs/archive.md").read_text()
             lines = textwrap.dedent(re.search("    import glob.*?\n(?=[^ \n])", page, re.DOTALL)[0])
             lines = lines.replace("/var/lib/dumps", work + "/fleet")
@@ -101,7 +102,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
             # One dump is a pipe. The worker that comes to it waits there, and is killed.
             pipe = work + "/pipe"
             os.mkfifo(pipe)
-            wait_for(lambda: not any(client.has_what().values()))  # nothing of what was before
+            wait_for(lambda: not any(client.has_what().values()))  # no results of earlier scripts
             read = threads.submit(fleet.read, files[:1100] + [pipe] + files[1100:], scheduler)
             wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
             [waiting] = [worker for worker, parts in client.processing().items() if parts]
@@ -110,7 +111,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
             [process] = [process for process in processes if process.pid == pid]
             process.kill()
             process.wait()
-            wait_for(lambda: write_to(pipe, spoilt[1111]))
+            wait_for(lambda: write_to(pipe, odd_dumps[1111]))
             assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
             assert len(client.scheduler_info()["workers"]) == 1
         assert as_rows(fleet.read(files)) == rows, "without a cluster"

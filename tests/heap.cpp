@@ -3,7 +3,7 @@
 #include <cstdlib>
 #include <new>
 
-// Counted too, wherever it is called, the standard library's own code included.
+// These go by malloc, so that it counts each `new`, also those in the standard library.
 void *operator new(size_t size) {
   void *block = std::malloc(size);
   if (block == nullptr) throw std::bad_alloc();

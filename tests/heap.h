@@ -10,7 +10,8 @@
 // since the last call, those with new included.
 extern "C" unsigned long RefuseAllocation(unsigned long number);
 
-// A copy of the bytes from index 1 on, which is never aligned, to the very end of the allocation.
+// A copy of the bytes that begins at index 1, so that it is never aligned, and ends with the
+// allocation.
 std::vector<char> Unaligned(const std::string &bytes);
 
 #endif

@@ -47,7 +47,7 @@ for header in $(cd "$source/include/morwick" && grep -l '^ \*     .*;$' ./*.h); 
     { echo "tests/consumer.c does not have the example of $header"; exit 1; }
 done
 
-# Programs against the tree $1, which is called $2.
+# Builds programs against the tree $1 and runs them; $2 names their build folders.
 build_and_consume() {
   local language compile tree=$1 name=$2
   cat >"$work/CMakeLists.txt" <<'END_OF_PROJECT'

@@ -1,4 +1,4 @@
-// Each kernel for snapshot lines against the plain code.
+// Compares each kernel that writes snapshot lines with the plain code.
 
 #include <gtest/gtest.h>
 #include <sys/mman.h>
@@ -19,7 +19,7 @@ constexpr size_t kPage = 4096;
 constexpr uint32_t kEdges[] = {0,      1,       10,       100,       1000,      10000,
                                100000, 1000000, 10000000, 100000000, 1000000000};
 
-// Record and line at the two ends of a page without neighbours.
+// Puts record and line at the two ends of a page; what lies around it cannot be accessed.
 class LineKernelTest : public testing::TestWithParam<morwick::LineKernel> {
  protected:
   void SetUp() override {
@@ -29,7 +29,7 @@ class LineKernelTest : public testing::TestWithParam<morwick::LineKernel> {
     ASSERT_EQ(mprotect(page_, kPage, PROT_READ | PROT_WRITE), 0);
   }
 
-  // The record now at one end, now at the other.
+  // The record lies at one end and at the other by turns.
   void Check(const Words &words) {
     recordFirst_ = !recordFirst_;
     char *record = recordFirst_ ? page_ : page_ + kPage - sizeof words;
@@ -41,7 +41,7 @@ class LineKernelTest : public testing::TestWithParam<morwick::LineKernel> {
               std::string_view(expected, morwick::WriteLine(expected, bytes)));
   }
 
-  // Of any length, or one of the three around a power of ten, or the largest.
+  // A number of any length, or one of the three around a power of ten or 0; 0 - 1 is the largest.
   uint32_t AnyNumber() {
     const uint64_t random = random_();
     const uint32_t any = static_cast<uint32_t>(random >> 32) >> random % 32;

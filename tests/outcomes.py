@@ -1,5 +1,5 @@
-"""Plays each fault of tests/cases/outcomes.txt with each command. Writes down what comes of it, as the top
-of that file says, and fails with the difference. With SESSION_UPDATE=yes in the environment the file takes it."""
+"""Plays each fault of tests/cases/outcomes.txt with each command, compares the outcomes with those in the file,
+whose top explains them, and fails with the difference. SESSION_UPDATE=yes in the environment updates the file."""
 import difflib, json, jsonschema, os, re, struct, subprocess, sys, tempfile
 from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
@@ -28,7 +28,7 @@ def run(kind, fault, command):
 
 
 def outcome(kind, fault, commands):
-    """A line of statuses, and one for each text: in a command's column what the command says it of."""
+    """A line of statuses and one for each message, with its subjects in the column of the command."""
     source = fault if kind == "FILE" else CONTROLLER
     if kind == "controller":
         Path("scenario").write_text("\n".join(["[[controller]]", f"class = '{source}'", *fault.split(", ")]))
@@ -37,8 +37,8 @@ def outcome(kind, fault, commands):
     rows = {"".join(exposed for _, _, exposed in results): [[str(status)] for status, _, _ in results]}
     for column, (_, said, _) in enumerate(results):
         for line in said:
-            of, text = re.fullmatch(r"(@?(?:\w+: )?)(.*)", line.replace(source + ": ", "@", 1)).groups()
-            rows.setdefault(text, [[] for _ in commands])[column].append(of.removesuffix(": ") or "x")
+            subject, text = re.fullmatch(r"(@?(?:\w+: )?)(.*)", line.replace(source + ": ", "@", 1)).groups()
+            rows.setdefault(text, [[] for _ in commands])[column].append(subject.removesuffix(": ") or "x")
     cells = [[",".join(cell) or "." for cell in row] for row in rows.values()]
     widths = [max(map(len, column)) for column in zip(*cells)]
     return [f"    {' '.join(map(str.ljust, row, widths))} | {text}".rstrip(" |")

@@ -14,7 +14,7 @@ namespace {
 
 // Parses once, unaligned, into contexts that hold an entry already, while the allocation with the
 // number `refused` fails. `how` is the kind, with "-context" or "-data" after it when a null
-// pointer takes their place. Returns the visible result as text, and leaves no block.
+// pointer takes their place. Returns the visible result as text, and frees all memory.
 std::string Parse(const std::string &how, const std::string &stream, size_t refused) {
   const Kind kind = KindOf(how.substr(0, how.find('-')));
   const std::string null = how.substr(std::min(how.size(), how.find('-')));
@@ -29,7 +29,7 @@ std::string Parse(const std::string &how, const std::string &stream, size_t refu
   RefuseAllocation(refused);
   const uint64_t result = ParseInto(null == "-context" ? nullptr : &contexts, kind,
                                     null == "-data" ? nullptr : buffer.data() + 1, bytes.size());
-  EXPECT_GE(RefuseAllocation(0), refused) << "so many there were not";
+  EXPECT_GE(RefuseAllocation(0), refused) << "there were fewer allocations";
   const Entries entries = EntriesOf(contexts, kind);
   EXPECT_TRUE(entries.sound);
   if (refused == 0 && null.empty() && kind != kArray) {
@@ -74,11 +74,12 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
 }
 
 TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
-  const std::string hard = Stream(kMSP, "4096:4 5");
+  const std::string dump = Stream(kMSP, "4096:4 5");
   GenericParserCxt context = {};
-  EXPECT_EQ(KVRMSPParseBufferToCxt(&context, hard.data(), 0x500000000), 0U);
+  // The parser keeps the low 32 bits of the size.
+  EXPECT_EQ(KVRMSPParseBufferToCxt(&context, dump.data(), 0x500000000), 0U);
   EXPECT_TRUE(TakeMessage().ends_with("Passed in invalid buffer or empty buffer"));
-  EXPECT_EQ(KVRMSPParseBufferToCxt(&context, hard.data(), 0x500000008), 1U);
+  EXPECT_EQ(KVRMSPParseBufferToCxt(&context, dump.data(), 0x500000008), 1U);
   ReleaseGenericParserCxt(&context);
   KVRReleaseContext(nullptr);
   ReleaseGenericParserCxt(nullptr);

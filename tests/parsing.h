@@ -1,4 +1,4 @@
-// The parsers side by side, and the message that they leave, for tests and fuzz targets alike.
+// Calls each parser in the same way and reads what it leaves, for tests and fuzz targets.
 #ifndef TESTS_PARSING_H
 #define TESTS_PARSING_H
 
@@ -16,8 +16,8 @@ struct Contexts {
   GenericParserCxt generic;
 };
 
-// Parses into the context that is the kind's, or into none. Of an array, the first byte is the
-// width of its elements.
+// Parses into the context of the kind, or into none when `contexts` is null. For an array the first
+// byte is the width of its elements.
 inline uint64_t ParseInto(Contexts *contexts, Kind kind, const char *data, size_t size) {
   KVRStatsCxt *kvr = contexts == nullptr ? nullptr : &contexts->kvr;
   GenericParserCxt *generic = contexts == nullptr ? nullptr : &contexts->generic;
@@ -37,7 +37,7 @@ inline uint64_t ParseInto(Contexts *contexts, Kind kind, const char *data, size_
 struct Entries {
   std::string text;  // "name=value " for each entry
   size_t count = 0;
-  // Lists of equal length whose tails are the last nodes; texts that say the values.
+  // The lists have the same length, the tails are the last nodes, and the texts are the values.
   bool sound = true;
 
   template <typename Context>
@@ -78,7 +78,7 @@ inline Entries EntriesOf(const Contexts &contexts, Kind kind) {
   return kind == kKVR ? Entries(contexts.kvr) : Entries(contexts.generic);
 }
 
-// Looks at the message and forgets it.
+// Returns the error message and clears it.
 inline std::string TakeMessage() {
   std::string message = GetAPIErrorMessage();
   std::free(GlobalAPIErrorMessage);

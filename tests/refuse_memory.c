@@ -1,8 +1,8 @@
 #define _GNU_SOURCE
 
 // Preloaded into a process under attack: refuses the allocation with the number in REFUSE, counted
-// from 1, and leaves the number of all allocations in the file named by ALLOCATIONS. The unit tests
-// have it with other names for the heap's functions, to which the linker sends the calls (--wrap).
+// from 1, and leaves the number of all allocations in the file named by ALLOCATIONS. In the unit
+// tests the functions have other names, to which the linker redirects calls (--wrap).
 
 #include <errno.h>
 #include <sched.h>
@@ -32,8 +32,7 @@ void *calloc(size_t number, size_t size) {
 
 void *realloc(void *block, size_t size) { return Refuses() ? NULL : __libc_realloc(block, size); }
 
-/* For a process that chooses itself: counts anew, and refuses that one. Returns the number so far.
- */
+/* Counts anew, and refuses the allocation with this number. Returns the count so far. */
 unsigned long RefuseAllocation(unsigned long number) {
   refused = number;
   return atomic_exchange(&count, 0);

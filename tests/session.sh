@@ -16,13 +16,13 @@ cp -r "$SOURCE"/examples/{*.bin,fleet} .
 [[ $session != *.md ]] || { sed -E 's/^    ([$>] )/\1/' "$session" >document && session=$PWD/document; }
 export LD_PRELOAD=
 
-# With pauses a thousand times shorter; the sanitizer would rather be preloaded before them.
+# With pauses a thousand times shorter. verify_asan_link_order: a sanitizer would insist on being loaded first.
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
 # A watch, with pauses and seconds a thousand times shorter.
 fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" watch "$@"; }
 # Runs morwick at a time of day, in milliseconds since 1970.
 at() { NOW=$1 LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" "${@:2}" 2>/dev/null; }
-# What it prints as JSON is kept, and checked at the end, as is what it says about open handles.
+# Runs the command; its JSON, and what it then says about open handles, is kept and checked at the end.
 morwick() {
   case " $* " in *" json "*) ;; *) "$MORWICK" "$@"; return ;; esac
   "$MORWICK" "$@" >object 2>errors

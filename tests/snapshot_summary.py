@@ -1,30 +1,31 @@
 #!/usr/bin/env python3
-"""Holds the summaries of snapshots, JSON on standard input, against those computed plainly from the files."""
+"""Compares the summaries of snapshots, JSON on standard input, with those computed plainly from the files."""
 import bisect, itertools, json, math, random, struct, sys
 from pathlib import Path
 
 
 def span(groups, percent):
-    """The least and the most that the percentile of single operations can be, by nearest rank."""
+    """The least and the greatest latency that the percentile of all operations can be, by nearest rank. Of each
+    group only the count, the total and the longest latency are known."""
     groups = [group for group in groups if group[0]]
     rank = math.ceil(sum(group[0] for group in groups) * percent / 100)
     latencies = range(max(group[2] for group in groups))
 
-    def enough(latency):  # can operations up to the rank take so little?
+    def can_be(latency):  # can operations up to the rank take so little?
         return sum(count if latency >= longest else
                    min(count - 1, max(0, count * longest - total) // (longest - latency))
                    for count, total, longest in groups) >= rank
 
-    def too_much(latency):  # can none of those from the rank on take more?
+    def cannot_exceed(latency):  # can none of those from the rank on take more?
         return sum(0 if latency >= longest else
                    1 + min(count - 1, max(0, total - longest) // (latency + 1))
                    for count, total, longest in groups) <= sum(count for count, *_ in groups) - rank
 
-    return [bisect.bisect_left(latencies, True, key=key) for key in (enough, too_much)]
+    return [bisect.bisect_left(latencies, True, key=key) for key in (can_be, cannot_exceed)]
 
 
 def tried_span(groups, percent):
-    """The same from all operations that make such groups."""
+    """The same, found by trying all operations that make such groups."""
     possible = [[latencies for latencies in itertools.product(range(longest + 1), repeat=count)
                  if sum(latencies) == total and max(latencies) == longest] for count, total, longest in groups]
     rank = math.ceil(sum(group[0] for group in groups) * percent / 100)
@@ -36,7 +37,7 @@ def check(name, line):
     records = list(struct.iter_unpack("<63I", Path(name).read_bytes()))
     summary = json.loads(line)["summary"]
     assert summary["intervals"] == len(records)
-    for kind, base, host, nand in ("reads", 14, 27, 29), ("writes", 2, 28, 30):
+    for kind, base, host, nand in ("reads", 14, 27, 29), ("writes", 2, 28, 30):  # words of a record
         counts = [sum(record[base:base + 12:3]) for record in records]
         totals = [sum(record[base + 1:base + 12:3]) for record in records]
         means = sorted((total / count, -i)

@@ -73,6 +73,7 @@ TEST(FixedSnapshotTest, PrintsAnyNumberOfRecords) {
   std::string text(kCount * 400, '\0');
   uint64_t size = text.size();
   EXPECT_EQ(kFixed(snapshot.data(), snapshot.size(), text.data(), &size), 1U);
+  // The legend has 27 lines, and the last line is empty.
   EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 27 + static_cast<ptrdiff_t>(kCount) + 1);
 }
 
@@ -101,7 +102,7 @@ std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fiel
   return text.substr(kBanner.size());
 }
 
-// A descriptor as cases write it; what stands after the arrow is left.
+// Reads a descriptor as cases write it, up to the arrow.
 SnapshotFieldDescriptor ReadDescriptor(std::istringstream &columns) {
   SnapshotFieldDescriptor field = {};
   std::string format, arrow;
@@ -139,8 +140,8 @@ TEST(DescribedSnapshotTest, PrintsNumbersAsPrintfDoes) {
   }
 }
 
-// A count, thousandths, labels without a priority and a priority without labels. Of twelve bytes
-// the third record is empty, and the fourth is cut.
+// A count, thousandths, labels without a priority and a priority without labels. When a record has
+// twelve bytes, the third is empty, and the fourth is cut.
 const Fields kCounting = {
     {0, 9, 0, 0, "N=%u"}, {2, 9, 4, 0, " A=%u.%02u"}, {3, 9, 0, 0, "%4s="}, {3, 9, 12, 12, ""}};
 constexpr uint32_t kWords[] = {65536, 0, 7, 2, 100000, 7, 0, 5000, 7, 4, 9000000, 7};
@@ -172,7 +173,7 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
 TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
   const std::string records(reinterpret_cast<const char *>(kWords), kSize);
   const std::string legend = Render("", 1338).text;  // no room for the line end after it
-  // What the header says where no record is printed: the numbers and the text, and a table nowhere.
+  // A header without its descriptor table, which must not be read when no record is printed.
   const auto bare = [](std::string header) {
     constexpr uint32_t kNowhere = 0xfffffff0;
     std::memcpy(&header[24], &kNowhere, sizeof kNowhere);
@@ -215,7 +216,7 @@ TEST(SnapshotTest, TakesNullPointersAndHugeSizes) {
   EXPECT_STREQ(output, "untouched");
   EXPECT_TRUE(size == sizeof output && state == 7);
   EXPECT_EQ(kDescribed(nullptr, 36, output, &size, header.data(), &(state = 0)), 1U);
-  // Of so many records, kept to 32 bits, there is none; nothing may be read.
+  // The number of records, 2^32, is 0 when kept to 32 bits; nothing may be read.
   EXPECT_EQ(kFixed(nullptr, uint64_t{252} << 32, output, &(size = sizeof output)), 1U);
   EXPECT_EQ(size, 1338U);
   // Of records of 2 GiB, the third lies beyond what 32 bits address.
@@ -231,7 +232,7 @@ TEST(SnapshotTest, TakesNullPointersAndHugeSizes) {
 }
 
 TEST(DescribedSnapshotTest, ReadsNoDescriptorThatIsNotNeeded) {
-  // One that is not counted is none.
+  // With a count of 0, the descriptor there does not matter.
   std::string bare = Header(6, 4, 3, {{0, 9, 0, 0, "%u"}});
   bare[52] = 0;
   EXPECT_EQ(Render("no field, no line", 500, bare), (Rendered{1, 1, "", 2}));
@@ -241,7 +242,7 @@ TEST(DescribedSnapshotTest, ReadsNoDescriptorThatIsNotNeeded) {
     const std::string header = Header(6, 8, 3, {{4, 9, offset, 0, ""}});
     EXPECT_EQ(Render("sixteen bytes...", 500, header).text, offset == 4 ? kBanner + "\n\n" : "");
   }
-  // Where there is no record to print none is read but the first.
+  // When no record is printed, only the first descriptor is read.
   bare[52] = 9;
   EXPECT_EQ(Render(std::string(8, '\0'), 500, bare, 1), (Rendered{1, 1, "", 2}));
 }

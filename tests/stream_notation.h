@@ -44,7 +44,7 @@ inline std::string Stream(Kind kind, const std::string &notation) {
   return bytes;
 }
 
-// What stands before the next bar, without the blanks around it.
+// The text before the next bar, without the blanks around it.
 inline std::string TakeColumn(std::istringstream &columns) {
   std::string column;
   std::getline(columns, column, '|');

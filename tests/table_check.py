@@ -1,4 +1,4 @@
-"""Holds a table against what `stats` prints for the same dumps: each value, and each fault.
+"""Compares a table with what `stats` prints for the same dumps: each value, and each fault.
 Usage: table_check.py MORWICK STREAM FILE..."""
 import csv, io, subprocess, sys
 
@@ -7,7 +7,7 @@ run = lambda *words: subprocess.run([morwick, *words], capture_output=True, erro
 table = run("table", "-s", stream, "--", *files)
 heading, *rows = csv.reader(io.StringIO(table.stdout, newline=""))
 assert [row[0] for row in rows] == files, "a row for each file, in their order"
-said = []
+errors = []
 for row in rows:
     stats = run("stats", "-s", stream, "-o", "csv", "--", row[0])
     values = dict(csv.reader(io.StringIO(stats.stdout)))  # the last one of a name
@@ -20,7 +20,7 @@ for row in rows:
     faults = [fault for fault in faults if "the end record" not in fault]
     assert row[1] == "; ".join(faults), (row[1], faults)
     assert (stats.returncode == 0) == (row[1] == "")
-    said += [f"morwick: {row[0]}: {row[1]}"] if row[1] else []
-assert table.stderr.splitlines() == said, (table.stderr, said)
-assert table.returncode == (1 if said else 0)
-print(len(rows), "dumps agree,", len(said), "of them with a fault,", len(heading) - 2, "columns")
+    errors += [f"morwick: {row[0]}: {row[1]}"] if row[1] else []
+assert table.stderr.splitlines() == errors, (table.stderr, errors)
+assert table.returncode == (1 if errors else 0)
+print(len(rows), "dumps agree,", len(errors), "of them with a fault,", len(heading) - 2, "columns")

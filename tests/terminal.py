@@ -1,6 +1,6 @@
-"""Runs a command at a terminal and prints what is on its screen in the end: ROWS COLUMNS COMMAND...
-"ROWSxCOLUMNS@SECONDS" before the command resizes the window meanwhile; "SIGNAL@SECONDS" sends a signal.
-Then how many lines have left the screen at its top, what modes are not as they were, and how it ended."""
+"""Runs a command at a terminal. Prints the screen at its end, then how many lines have left it at the top,
+which modes have changed, and how the command ended. "ROWSxCOLUMNS@SECONDS" resizes the window at that time,
+"SIGNAL@SECONDS" sends a signal. Usage: terminal.py ROWS COLUMNS [EVENT@SECONDS...] COMMAND..."""
 import fcntl, os, pty, select, signal, struct, sys, termios, time
 import pyte
 
@@ -25,7 +25,7 @@ while True:
     if select.select([terminal], [], [], max(due, 0))[0]:
         try:
             output = os.read(terminal, 65536)
-        except OSError:  # nobody is at the other end
+        except OSError:  # the command has ended
             break
         stream.feed(output)
     elif events:

@@ -1,5 +1,5 @@
-// The simulated platform as tests reach it: a scenario, a controller, a reading. The platform has
-// one scenario a process, so run the tests by ctest, which gives each a process of its own.
+// Helpers for tests of the simulated platform. The platform has one scenario a process, so run the
+// tests by ctest, which gives each a process of its own.
 #ifndef TESTS_SIMULATED_PLATFORM_H
 #define TESTS_SIMULATED_PLATFORM_H
 
@@ -12,13 +12,14 @@
 
 #include "morwick/platform.h"
 
+// Result codes of the simulated drivers.
 constexpr int32_t kBadHandle = 0x101;
 constexpr int32_t kBadArgument = 0x102;
 constexpr int32_t kRefused = 0x103;
 constexpr int32_t kDeviceError = 0x104;
 constexpr int32_t kNotOffered = 0x105;
 
-// A file in memory, by its name in the one folder where all of them are.
+// Makes a file in memory, and returns its name in the folder of the scenario, /proc/self/fd.
 inline std::string File(const std::string &text) {
   const int file = memfd_create("file", 0);
   EXPECT_EQ(write(file, text.data(), text.size()), static_cast<ssize_t>(text.size()));

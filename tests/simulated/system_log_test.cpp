@@ -147,7 +147,7 @@ void CheckFullLog(int reader, int writer) {
   EXPECT_EQ(fcntl(STDERR_FILENO, F_GETFL) & O_NONBLOCK, 0) << "others write there too";
   dup2(standardError, STDERR_FILENO);
   CheckOneGap(log, line, static_cast<unsigned>(unread) / lineSize + kWaiting);
-  CheckOneGap(systemLog, line, 0);  // what waited went when there was no log
+  CheckOneGap(systemLog, line, 0);  // the lines that waited were dropped when there was no log
 }
 
 TEST(SimulatedSystemLogTest, NeverWaitsForAPipe) {
