@@ -1,9 +1,9 @@
 """Reads the dumps of a fleet with Dask, here or on a cluster, and says which drives stand out.
 
 A drive is a folder of dumps whose names are in the order of their days; its last good dump counts.
-A drive stands out when few have a write amplification as high, or as many grown bad blocks. How both
-spread over the fleet is drawn. A dump with a fault is named on standard error and ranks nowhere; the
-status is 1 then."""
+A drive stands out when few have a write amplification as high, or as many grown bad blocks. A picture
+shows how both spread over the fleet. A dump with a fault is named on standard error and ranks nowhere;
+the status is 1 then."""
 
 import argparse
 import os
@@ -17,8 +17,8 @@ from tqdm import tqdm
 
 NAMES = ["hostWrites", "nandWrites", "numGrownBad"]
 MEASURES = {"amplification": "write amplification", "numGrownBad": "grown bad blocks"}
-PART = 200  # dumps: worth handing out, and soon read, so that no worker waits long for another
-LOOPBACK = {"dashboard_address": "127.0.0.1:0", "worker_dashboard_address": "127.0.0.1:0"}
+PART = 200  # dumps in a task: few enough that no worker waits long for another at the end
+LOOPBACK = {"dashboard_address": "127.0.0.1:0", "worker_dashboard_address": "127.0.0.1:0"}  # any port
 
 
 def list_dumps(path):
@@ -34,10 +34,10 @@ def list_dumps(path):
 
 
 def read(files, scheduler=None):
-    """The statistics, a row for each dump. One machine needs no processes: threads read at once."""
+    """The statistics, a row for each dump. One machine needs no processes: threads read in parallel."""
     parts = [files[i:i + PART] for i in range(0, len(files), PART)]
     with Client(scheduler) if scheduler else Client(processes=False, **LOOPBACK) as client:
-        # Not pure: the same name may stand for another dump next time.
+        # Not pure: a file may have other content next time.
         tables = client.map(morwick.table, parts, names=NAMES, jobs=1, pure=False)
         for _ in tqdm(as_completed(tables), "reading", len(tables), disable=None):
             pass  # the bar moves, at a terminal
@@ -56,7 +56,7 @@ def rank(table):
 
 
 def draw(drives, picture):
-    """How many drives have at least how much; dots are the ten that stand out most."""
+    """Draws how many drives have each value or more; dots are the ten that stand out most."""
     figure = Figure(figsize=(9, 4.2), layout="constrained")
     panels = figure.subplots(1, 2, sharey=True)
     for panel, (name, title) in zip(panels, MEASURES.items()):

@@ -1,7 +1,7 @@
 /*
- * Reads statistics and snapshot header of the first controller, and says of each whether it can be
- * trusted: the records of the statistics one after the other, with their values, and where they
- * end; and whether the header is whole.
+ * Reads the statistics and the snapshot header of the first controller. Prints the values of the
+ * statistics and how they end, and whether the header is whole. The status is 1 when one of them
+ * cannot be read or trusted.
  *
  *     cc inspect.c $(pkg-config --cflags --libs morwick) -o inspect
  */
@@ -10,6 +10,7 @@
 
 #include "morwick/morwick.h"
 
+/* By MorwickStep. */
 static const char *const kEnds[] = {"",
                                     "right after a record",
                                     "at an end record",
@@ -40,7 +41,7 @@ static int InspectHeader(const MorwickBuffer *header) {
   return fault == kMorwickHeaderIsWhole ? 0 : 1;
 }
 
-/* Reads a buffer, if the class has it, and inspects it. */
+/* Reads a buffer, if the class has it, and inspects it. Returns 0 when all is well. */
 static int Inspect(const KVRConnection *controller, SelectorGetter getSelectors,
                    int (*inspect)(const MorwickBuffer *buffer)) {
   MorwickBuffer buffer;

@@ -21,6 +21,7 @@ for number in range(1000):
     for day in (24, 25):
         host += random.randrange(10 ** 9)
         bad += random.random() < 0.1
+        # The keys of hostWrites, nandWrites and numGrownBad.
         values = {4: host, 18: int(host * amplification), 47: bad}
         (drive / f"2026-11-{day}.bin").write_bytes(
             b"".join(struct.pack("<IIQ", key, 1, value) for key, value in values.items()))
