@@ -1,6 +1,6 @@
 // Files from outside: the first byte chooses between a scenario, a snapshot header, names of
-// statistics, a list of files, and what may be compressed by gzip. A header that passes its check
-// is used, at the end of its own allocation.
+// statistics, a list of files, and data that may be gzip's. A header that passes its check is used
+// from an allocation of its size, so that each byte read after its end is seen.
 
 #include <unistd.h>
 
@@ -55,11 +55,11 @@ void CheckHeader(std::string_view file) {
   assert(columns.fault().empty() != columns.all().empty());
 }
 
-// A selection has each column once, and asks for all of its names.
+// A selection has each column once, and has the names of all its columns.
 void CheckNames(MorwickStream stream, std::string_view text) {
   std::vector<std::string> names;
-  std::istringstream words{std::string(text)};
-  for (std::string name; std::getline(words, name, ',');) names.push_back(name);
+  std::istringstream list{std::string(text)};
+  for (std::string name; std::getline(list, name, ',');) names.push_back(name);
   if (names.size() > 4) return;  // each takes its time
   try {
     const fleet::Selection selection({&stream, 1}, names);
@@ -78,10 +78,10 @@ void CheckNames(MorwickStream stream, std::string_view text) {
   }
 }
 
-// Each name that is not empty is handed out once, in an empty folder, where no name is a folder.
+// Each name that is not empty comes once. This runs in an empty folder, where no name is a folder.
 void CheckList(char end, std::string_view text) {
   if (text.empty() || text.find_first_of("/.-") != std::string_view::npos) return;
-  if (end == '\n') text = text.substr(0, text.find('\0'));  // refused from there on
+  if (end == '\n') text = text.substr(0, text.find('\0'));  // a list of lines ends at a NUL
   std::vector<std::string> expected;
   std::istringstream names{std::string(text)};
   for (std::string name; std::getline(names, name, end);) {
@@ -98,7 +98,7 @@ void CheckList(char end, std::string_view text) {
   assert(!isThere);
 }
 
-// What is unpacked does not depend on the sizes of the pieces that go in and come out.
+// Unpacks data that is read in pieces of `in` bytes, in pieces of `out` bytes.
 std::string Unpack(std::string_view data, size_t in, size_t out) {
   size_t taken = 0;
   fleet::GzipReader reader([&](char *bytes, size_t room) -> fleet::ReadResult {
@@ -117,6 +117,7 @@ std::string Unpack(std::string_view data, size_t in, size_t out) {
   }
 }
 
+// The result does not depend on the sizes of the pieces.
 void CheckGzip(std::string_view data) {
   const std::string whole = Unpack(data, data.size() + 1, 1 << 16);
   assert(Unpack(data, 1, 1 << 16) == whole && Unpack(data, 3, 7) == whole);

@@ -21,7 +21,7 @@ using tools::SnapshotColumn;
 
 constexpr uint32_t kTableOffset = sizeof(SnapshotHeader) + 12;
 
-// Exactly as large as it must be, so that a byte too many is seen.
+// A header with room for so many descriptors and no more, so that a byte read after them is seen.
 std::vector<char> HeaderFrom(std::string_view &input, uint32_t descriptors) {
   std::vector<char> header(kTableOffset + 8 + descriptors * sizeof(SnapshotFieldDescriptor));
   input.remove_prefix(input.copy(header.data(), header.size()));
@@ -31,7 +31,7 @@ std::vector<char> HeaderFrom(std::string_view &input, uint32_t descriptors) {
   return header;
 }
 
-// The text in a buffer, which must be so long and end in the buffer.
+// The text in a buffer. It must have this length, with its NUL in the buffer.
 std::string TextIn(const std::vector<char> &output, uint64_t length) {
   assert(length < output.size());
   assert(std::memchr(output.data(), '\0', output.size()) == output.data() + length);
@@ -64,7 +64,7 @@ std::string RenderFixed(const std::vector<char> &snapshot, size_t capacity) {
   return TextIn(output, fits ? size : capacity - 1);
 }
 
-// As the format, which the fields have passed, prints the number.
+// The number as the format prints it, which passed the check of the fields.
 std::string Printed(const MorwickSnapshotField &field, const char *format, uint32_t number) {
   std::vector<char> text(8192);
 #pragma clang diagnostic ignored "-Wformat-nonliteral"
@@ -76,7 +76,7 @@ std::string Printed(const MorwickSnapshotField &field, const char *format, uint3
   return text.data();
 }
 
-// The columns of a line, in its order. The fields lie in the record.
+// The fields lie in the record, and the numbers of the columns stand in the line in their order.
 void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn> &columns,
                std::string_view record, const std::string &line) {
   size_t at = 0;
@@ -101,7 +101,7 @@ void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn
   assert(column == columns.end());
 }
 
-// Each record alone, in place of the second of two: no banner is before its line.
+// Renders each record as the second of two, so that no banner is before its line.
 void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t capacity) {
   if (!fleet::CheckSnapshotHeader({header.data(), header.size()}).empty()) return;
   const tools::SnapshotColumns columns(header.data());

@@ -1,5 +1,5 @@
-// The parsers, the array add, and the walk over records, entry by entry beside each parser. The
-// first byte chooses.
+// Checks the parsers, the adding of arrays, and the walk over records, whose entries must be those
+// of the parser. The first byte chooses.
 
 #include <cassert>
 #include <cstring>
@@ -8,7 +8,7 @@
 
 namespace {
 
-// What came of it, as text.
+// Parses, and returns the entries and the result as text.
 std::string Parse(Kind kind, const char *data, size_t size) {
   Contexts contexts = {};
   const uint64_t result = ParseInto(&contexts, kind, data, size);
@@ -29,8 +29,8 @@ std::string Parse(Kind kind, const char *data, size_t size) {
   return entries.text + std::to_string(result);
 }
 
-// The walk takes what the parser takes, and ends where it ends: a KVR parse fails at a record that
-// ends it, and the others find nothing from there on.
+// The walk takes the values that the parser takes, and ends where the parser ends: at a record that
+// ends the walk a KVR parse fails, and the others find no more entries.
 void CheckWalk(Kind kind, std::string_view dump) {
   MorwickRecord end;
   const std::string walked = WalkedEntries(kind, dump.data(), dump.size(), &end);
