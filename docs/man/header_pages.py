@@ -1,7 +1,11 @@
 #!/usr/bin/env python3
-"""Writes the manual page of each public header, morwick_NAME.3, out of the header itself: the comment of
+"""Writes the manual page of each public header, morwick_NAME.3, from the header itself: the comment of
 the file, then each declaration with its own. The date is that of the library's page.
-Usage: header_pages.py FOLDER LIBRARY_PAGE HEADER..."""
+Usage: header_pages.py FOLDER LIBRARY_PAGE HEADER...
+
+A header must have this layout. Blank lines separate its parts, each a comment, a declaration, or a comment
+right above its declaration. The first part is the comment of the file. In comments, code is indented by
+four. An exported name is the first one before a bracket or semicolon. A body ends with "}" in column 1."""
 
 import re
 import sys
@@ -17,33 +21,33 @@ def literal(code, offset=""):
 
 
 def prose(comment):
-    """Paragraphs, one sentence a line; those that are indented stay as they are."""
-    page = ""
+    """A comment as paragraphs, one sentence a line. Indented ones are code and stay as they are."""
+    paragraphs = ""
     text = re.sub(r"(?m)^(/\*| \*/?) ?| ?\*/$", "", comment).strip("\n")
     for paragraph in text.split("\n\n"):
         if paragraph.startswith("    "):
-            page += literal(re.sub("(?m)^    ", "", paragraph), " -offset indent")
+            paragraphs += literal(re.sub("(?m)^    ", "", paragraph), " -offset indent")
         else:
             sentences = re.sub(r"(?<=[.?!:]) (?=[A-Z])", "\n", " ".join(paragraph.split()))
-            # No hyphen within a name such as bytesPerPage at the end of a line.
+            # Keeps a name such as bytesPerPage from being hyphenated at the end of a line.
             whole = re.sub(r"\b(?=\w*[a-z][A-Z])", r"\\%", escaped(sentences))
-            page += ".Pp\n" + re.sub("`(.*?)`", r"\\fI\1\\fP", whole) + "\n"
-    return page
+            paragraphs += ".Pp\n" + re.sub("`(.*?)`", r"\\fI\1\\fP", whole) + "\n"
+    return paragraphs
 
 
 def declaration(code):
-    """What a user of the library sees: no export mark, no body. The mark has 15 characters."""
+    """Code without export marks and bodies. Continued lines move left by the mark's 15 characters."""
     code = re.sub(r"(?ms)^static inline (.*?) \{\n.*?^\}$", r"\1;", code)
     return re.sub(r"(?m)^MORWICK_EXPORT ", "", re.sub(r"\n {15}(?= )", "\n", code))
 
 
 def page(header, date, pages):
     source = re.sub(r"(?s)/\*@.*?\*/\n+", "", header.read_text(encoding="utf-8"))  # annotations for the prover
-    chunks = [re.fullmatch(r"(?s)(/\*.*?\*/|)\s*(.*)", chunk).groups()
-              for chunk in re.split(r"\n{2,}(?=\S)", source.strip())]
-    about = chunks[0][0]
+    parts = [re.fullmatch(r"(?s)(/\*.*?\*/|)\s*(.*)", part).groups()  # comment and code
+             for part in re.split(r"\n{2,}(?=\S)", source.strip())]
+    about = parts[0][0]
     names, description = [f"morwick_{header.stem}"], prose(about)
-    for comment, code in chunks[1:]:
+    for comment, code in parts[1:]:
         if re.match(r"#include|#ifdef __cplusplus|#endif|\}", code):
             continue
         names += re.findall(r"(?m)^(?:MORWICK_EXPORT|static inline) [^;{(\[]*?(\w+)[;(\[]", code)
