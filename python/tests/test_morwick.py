@@ -1,6 +1,6 @@
 """Compares the module with the command on the same bytes, and tests it as a module of Python."""
 
-import ctypes, gzip, json, mmap, os, pathlib, pickle, random, struct, subprocess, sys, textwrap, threading
+import ctypes, gzip, json, mmap, os, pathlib, pickle, random, re, struct, subprocess, sys, textwrap, threading
 from concurrent.futures import ThreadPoolExecutor
 
 import numpy as np
@@ -318,14 +318,12 @@ for call in calls:
 """
 LEAK = """
 class Heap(ctypes.Structure): _fields_ = [(name, ctypes.c_size_t) for name in "abcdefghij"]
-heap = ctypes.CDLL(None).mallinfo2  # e, its hblkhd, and h, its uordblks, are the bytes in use
-heap.restype = Heap
+heap = ctypes.CDLL(None).mallinfo2; heap.restype = Heap  # e (hblkhd) and h (uordblks) are the bytes in use
 def grow():
     before = heap()
     for call in calls * 100: call()
     now = heap(); return now.h + now.e - before.h - before.e
-grow(); grown = grow()  # the first call fills caches
-assert grown < 40000, grown
+grow(); grown = grow(); assert grown < 40000, grown  # the first call fills caches
 """
 
 
@@ -346,5 +344,7 @@ def test_everything_public_is_described_and_nothing_else_exported():
     own = {name: value for name, value in vars(morwick).items() if getattr(value, "__module__", "").startswith("morwick")}
     assert {name for name in own if name[0] != "_"} == {*morwick.__all__} - {"platform"}
     assert all(own[name].__doc__ for name in morwick.__all__ if name != "platform")
-    library = run("nm", "-D", "--defined-only", morwick._native.__file__)
-    assert [line.split()[-1] for line in library.stdout.splitlines()] == ["PyInit__native"]
+    assert all(f"morwick.{name}" in pathlib.Path(__file__).read_text() for name in own if name[0].islower())
+    stub = re.findall(r"^def (\w+)", (SOURCE / "python/morwick/_native.pyi").read_text(), re.M)
+    assert stub and all(hasattr(morwick._native, name) for name in stub)
+    assert run("nm", "-D", "--defined-only", morwick._native.__file__).stdout.split()[2:] == ["PyInit__native"]
