@@ -121,6 +121,18 @@ TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
   });
 }
 
+// More fields than are prepared before the first record.
+TEST(DescribedSnapshotTest, PrintsEachOfManyFields) {
+  const std::vector<uint32_t> record = {11, 22, 33, 44, 55, 66, 77};
+  Fields fields;
+  std::string expected;
+  for (uint32_t i = 0; i < 40; ++i) {
+    fields.push_back({0, 9, i % 7 * 4, 0, "%u"});
+    expected += std::to_string(record[i % 7]) + "\n";
+  }
+  EXPECT_EQ(RenderFields(record, fields), expected + "\n");
+}
+
 // Every conversion that passes the check prints what the C library prints.
 TEST(DescribedSnapshotTest, PrintsNumbersAsPrintfDoes) {
   std::mt19937 random(1);
