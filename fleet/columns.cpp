@@ -134,8 +134,7 @@ Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
     judge.Take(record);
     if (record.valueCount == 0) return;
     const uint32_t place = placeOfKey_[record.key->id - lowestId_];
-    // The parser names the only value of an array's record without an index, and columns of arrays
-    // have an index: the value has no column.
+    // The parser names an array's only value without an index. No column has that name.
     if (place == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
       const uint32_t column = columnOf_[place + i];

@@ -13,8 +13,7 @@
 namespace fleet {
 namespace {
 
-// In bytes. kLegendRoom is more than the fixed layout's legend takes, kLineRoom more than its
-// longest line.
+// In bytes. The fixed layout's legend and longest line take less than the first two.
 constexpr size_t kLegendRoom = 2048;
 constexpr size_t kLineRoom = 1024;
 constexpr size_t kFirstRoom = 64 << 10;

@@ -19,12 +19,10 @@ namespace {
 
 using tools::SnapshotColumn;
 
-constexpr uint32_t kTextRoom = 12;
-constexpr uint32_t kTableOffset = sizeof(SnapshotHeader) + kTextRoom;
+constexpr uint32_t kTableOffset = sizeof(SnapshotHeader) + 12;  // 12 bytes of text
 constexpr uint32_t kFieldsOffset = kTableOffset + sizeof(SnapshotDescriptorTable);
 
-// A header with room for that many descriptors and no more, so that the sanitizer sees a read
-// after them.
+// A header with no room after its descriptors, so that the sanitizer sees a read after them.
 std::vector<char> HeaderFrom(std::string_view &input, uint32_t descriptors) {
   std::vector<char> header(kFieldsOffset + descriptors * sizeof(SnapshotFieldDescriptor));
   input.remove_prefix(input.copy(header.data(), header.size()));
@@ -68,8 +66,7 @@ std::string RenderFixed(const std::vector<char> &snapshot, size_t capacity) {
   return TextIn(output, fits ? size : capacity - 1);
 }
 
-// Prints the number by the format, which the library has checked: MorwickSnapshotFieldAt gave its
-// field.
+// Prints the number by the format, which the library has checked: MorwickSnapshotFieldAt gave it.
 std::string Printed(const MorwickSnapshotField &field, const char *format, uint32_t number) {
   std::vector<char> text(8192);  // more than the largest capacity, in which the text did fit
 #pragma clang diagnostic ignored "-Wformat-nonliteral"
@@ -106,8 +103,7 @@ void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn
   assert(column == columns.end());
 }
 
-// Renders each record alone: as record 1 after an empty record 0, from state 1, so that no banner
-// is printed.
+// Renders each record as record 1 after an empty record 0: from state 1 no banner is printed.
 void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t capacity) {
   if (!fleet::CheckSnapshotHeader({header.data(), header.size()}).empty()) return;
   const tools::SnapshotColumns columns(header.data());

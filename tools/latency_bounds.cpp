@@ -51,8 +51,7 @@ uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
 
 void LatencyBounds::Add(const SnapshotOperations &group) {
   if (group.count == 0) return;
-  // 61 shares no factor with the usual number of priorities, so the sample has all of them.
-  if (groups_.size() % 61 == 0) sample_.push_back(group);
+  if (groups_.size() % 61 == 0) sample_.push_back(group);  // a prime, to sample each priority
   groups_.push_back(group);
   maximum_ = std::max(maximum_, group.maxLatency);
 }

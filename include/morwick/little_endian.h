@@ -52,10 +52,7 @@ static inline uint64_t LoadLittleEndian64(const MorwickBytes *bytes) {
 
 #ifndef __FRAMAC__ /* the prover cannot follow the casts here */
 
-/*
- * Converts from the host's byte order to the controller's, or back: the value itself on a
- * little-endian host, the value with its bytes swapped on a big-endian one.
- */
+/* Converts to the controller's byte order or back: swaps the bytes on a big-endian host only. */
 static inline uint16_t LittleEndian16(uint16_t value) { return LoadLittleEndian16(&value); }
 static inline uint32_t LittleEndian32(uint32_t value) { return LoadLittleEndian32(&value); }
 static inline uint64_t LittleEndian64(uint64_t value) { return LoadLittleEndian64(&value); }

@@ -25,11 +25,8 @@ constexpr uint64_t kMinute = 60'000;            // in milliseconds
 constexpr uint64_t kHoursAMonth = 730;
 constexpr double kSwing = 5'000;  // the most that BusyTime and age differ, in milliseconds
 
-enum Pace {
-  kByLoad,   // grows with each hour of BusyTime
-  kByClock,  // with each hour of age
-  kByMonth   // with each month of age
-};
+// A value grows with each hour of BusyTime, hour of age or month of age.
+enum Pace { kByLoad, kByClock, kByMonth };
 struct Counter {
   uint32_t id;
   uint32_t elementCount;  // more than 1: a histogram; each element has half the value before it
