@@ -75,6 +75,7 @@ Selection::Selection(std::span<const MorwickStream> streams, std::span<const std
     const bool isPattern = name.find_first_of("*?[") != std::string::npos;
     bool found = false;
     for (const MorwickStream stream : streams) {
+      // A label such as name[0..9] looks like a pattern, so the exact name goes first.
       found = AddAll(stream, name, false) || (isPattern && AddAll(stream, name, true)) || found;
     }
     if (found) continue;
@@ -88,6 +89,7 @@ void Selection::Add(MorwickStream stream, const MorwickKey &key, uint32_t index)
   std::string name = ValueName(stream, key, key.valueCount, index);
   if (!names_.insert(name).second) return;
   columns_.push_back({&key, index, std::move(name)});
+  // An array's record with one value has this name; Has treats it as the first element.
   if (index == 0) names_.insert(ValueName(stream, key, 1, 0));
 }
 
@@ -98,7 +100,7 @@ bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPat
   bool found = false;
   for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
     const MorwickKey &key = *MorwickKeyAt(stream, i);
-    if (!isPattern && !name.starts_with(key.name)) continue;
+    if (!isPattern && !name.starts_with(key.name)) continue;  // quick: no name of this key
     const bool isLabel = !isPattern && key.valueCount > 1 && name == LabelOf(stream, key);
     const bool wholeArray = isLabel || matches(key.name);
     for (uint32_t index = 0; index < key.valueCount; ++index) {
@@ -111,17 +113,17 @@ bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPat
 }
 
 ColumnFiller::ColumnFiller(MorwickStream stream, const Selection &selection)
-    : stream_(stream), firstId_(MorwickKeyAt(stream, 0)->id) {
+    : stream_(stream), lowestId_(MorwickKeyAt(stream, 0)->id) {
   const uint32_t lastId = MorwickKeyAt(stream, MorwickKeyCount(stream) - 1)->id;
-  firstOfId_.assign(lastId - firstId_ + 1, kNoColumn);
+  placeOfKey_.assign(lastId - lowestId_ + 1, kNoColumn);
   for (uint32_t column = 0; column < selection.columns().size(); ++column) {
     const auto &[key, index, name] = selection.columns()[column];
-    uint32_t &first = firstOfId_[key->id - firstId_];
-    if (first == kNoColumn) {
-      first = static_cast<uint32_t>(columnOf_.size());
+    uint32_t &place = placeOfKey_[key->id - lowestId_];
+    if (place == kNoColumn) {
+      place = static_cast<uint32_t>(columnOf_.size());
       columnOf_.resize(columnOf_.size() + key->valueCount, kNoColumn);
     }
-    columnOf_[first + index] = column;
+    columnOf_[place + index] = column;
   }
 }
 
@@ -131,11 +133,11 @@ Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
   return judge.Finish(WalkRecords(stream_, dump, [&](const MorwickRecord &record) {
     judge.Take(record);
     if (record.valueCount == 0) return;
-    const uint32_t first = firstOfId_[record.key->id - firstId_];
-    // An array with one value gives an entry with the name of the array, which has no column.
-    if (first == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
+    const uint32_t place = placeOfKey_[record.key->id - lowestId_];
+    // The parser names an array's only value without an index. No column has that name.
+    if (place == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
-      const uint32_t column = columnOf_[first + i];
+      const uint32_t column = columnOf_[place + i];
       if (column == kNoColumn) continue;
       values[column] = MorwickValue(&record, i);
       present[column] = 1;

@@ -39,7 +39,7 @@ class Selection {
   const std::vector<Column> &columns() const { return columns_; }
 
   // Whether an entry of that name is selected. An array's record with a single value gives one
-  // entry, which has the name of the array; it counts as the first element.
+  // entry without an index in its name; it counts as the first element.
   bool Has(std::string_view entryName) const { return names_.contains(entryName); }
 
  private:
@@ -58,6 +58,7 @@ class Selection {
 // Copies the values of dumps into columns.
 class ColumnFiller {
  public:
+  // All columns of the selection must be of that stream.
   ColumnFiller(MorwickStream stream, const Selection &selection);
 
   // Sets the value of each column that the dump has, and sets its `present` to 1. Other columns
@@ -68,9 +69,10 @@ class ColumnFiller {
   static constexpr uint32_t kNoColumn = UINT32_MAX;
 
   MorwickStream stream_;
-  std::vector<uint32_t> firstOfId_;  // by key id - firstId_: the first value's place in columnOf_
-  uint32_t firstId_;
-  std::vector<uint32_t> columnOf_;  // for each value of the selected keys; may be kNoColumn
+  // The values of a key begin in columnOf_ at placeOfKey_[id - lowestId_].
+  std::vector<uint32_t> placeOfKey_;  // kNoColumn for a key without columns
+  uint32_t lowestId_;
+  std::vector<uint32_t> columnOf_;  // the column of each value, or kNoColumn
 };
 
 }  // namespace fleet

@@ -13,7 +13,7 @@
 namespace fleet {
 namespace {
 
-// In bytes. The first two are more than the fixed layout's legend and its longest line take.
+// In bytes. The fixed layout's legend and longest line take less than the first two.
 constexpr size_t kLegendRoom = 2048;
 constexpr size_t kLineRoom = 1024;
 constexpr size_t kFirstRoom = 64 << 10;
@@ -43,14 +43,14 @@ DescribedText::DescribedText(TakeText take, std::string header)
       recordSize_(LoadSnapshotHeader(header_).recordSize),
       text_(kFirstRoom) {}
 
-// The library gets each block as a snapshot of its own, with a record count that is one too high:
-// it leaves out the last record that a header promises.
+// The library never prints the last record that a header counts. So it gets each block as a
+// snapshot of its own, with a count that is one higher than the number of its records.
 bool DescribedText::Print(std::string_view block,
                           const std::function<void(uint32_t index)> &passedOver) {
   const auto count = static_cast<uint32_t>(block.size() / recordSize_);
   for (uint32_t next = 0; next < count;) {
-    // At state 0 the library prints the banner. Once it is written, a call begins at state 1, and
-    // the record in front of the next one stands for record 0, which is skipped.
+    // The library prints the banner only at state 0. After the banner a call begins at state 1: the
+    // library skips record 0, and the record before the next one takes that place.
     const uint32_t skipped = bannerWritten_ ? 1 : 0;
     const char *first = block.data() + size_t{recordSize_} * next - size_t{recordSize_} * skipped;
     SetRecordCount(count - next + skipped + 1);
@@ -64,7 +64,8 @@ bool DescribedText::Print(std::string_view block,
       if (!take_({text_.data(), size - 1})) return false;
     }
     if (done) return true;
-    // Print the record that did not fit again: first in the text or, if it was first, in more room.
+    // The library went past the record that did not fit, hence - 1. Try it again: at the start of
+    // an empty text, or with more room if the text was already empty.
     if (state > 0) next += state - skipped - 1;
     if (size == 1 && !GrowText()) passedOver(next++);
   }

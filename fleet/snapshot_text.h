@@ -40,7 +40,7 @@ class DescribedText {
 
   DescribedText(TakeText take, std::string header);
 
-  // Prints the records of a block. In front of each block but the first, the bytes of one record
+  // Prints the records of a block. Before each block except the first, the bytes of one record
   // must be readable; they may be any. Calls `passedOver` with the index in the block of each
   // record that does not fit. False when `take` has ended the rendering.
   bool Print(std::string_view block, const std::function<void(uint32_t index)> &passedOver);

@@ -16,7 +16,8 @@
 
 namespace fleet {
 
-// One dump: a value for each column, with 1 in `present` when the dump has it.
+// The row of one file. `values` has an element for each column; it counts only where `present`
+// has 1.
 struct Row {
   const ListedFile &file;  // with the dump's fault, empty for a good one
   std::span<const uint64_t> values;
@@ -37,15 +38,16 @@ struct Batch {
   std::vector<ListedFile> files;
   std::string rows;
   std::vector<size_t> rowEnds;  // where the row of each file ends in `rows`
-  bool outOfMemory = false;     // some files are missing
+  bool outOfMemory = false;     // memory was refused: the last files of this batch are missing
 };
 
 class Table {
  public:
-  // Starts to read. Throws std::bad_alloc when memory or all threads are refused.
+  // Starts to read. Fewer threads than wanted are enough. Throws std::bad_alloc when memory is
+  // refused or no thread can be started.
   Table(const TableOptions &options, FileList list);
-  // May be called before Next has returned kEnd. Threads are detached then: one may wait for a
-  // pipe.
+  // Waits for the threads only when Next has returned kEnd. Before that it leaves them to end by
+  // themselves, because one may be stuck reading a pipe.
   ~Table();
   Table(const Table &) = delete;
   Table &operator=(const Table &) = delete;
@@ -55,9 +57,9 @@ class Table {
   // The next batch, in order, if it is ready in time.
   Got Next(std::unique_ptr<Batch> *batch, std::chrono::milliseconds time);
 
-  // Why the list of names was not read to its end. Ask at the end.
+  // Why the list of names was not read to its end. Valid after Next has returned kEnd.
   const std::string &listFault() const;
-  // Whether the end came early because memory was refused.
+  // Whether Next returned kEnd early, because memory was refused outside the rows of a batch.
   bool outOfMemory() const;
 
  private:

@@ -1,5 +1,5 @@
-// Both snapshot renderings, and the fields and columns beside them: each number of a column stands
-// in the text. The input: a capacity, the number of descriptors, a header with so many descriptors,
+// Fuzzes both snapshot renderings and the columns. Checks that the text holds each number of each
+// column. The input: a capacity, the number of descriptors, a header with that many descriptors,
 // and the snapshot.
 
 #include <cassert>
@@ -19,11 +19,12 @@ namespace {
 
 using tools::SnapshotColumn;
 
-constexpr uint32_t kTableOffset = sizeof(SnapshotHeader) + 12;
+constexpr uint32_t kTableOffset = sizeof(SnapshotHeader) + 12;  // 12 bytes of text
+constexpr uint32_t kFieldsOffset = kTableOffset + sizeof(SnapshotDescriptorTable);
 
-// A header with room for so many descriptors and no more, so that a byte read after them is seen.
+// A header with no room after its descriptors, so that the sanitizer sees a read after them.
 std::vector<char> HeaderFrom(std::string_view &input, uint32_t descriptors) {
-  std::vector<char> header(kTableOffset + 8 + descriptors * sizeof(SnapshotFieldDescriptor));
+  std::vector<char> header(kFieldsOffset + descriptors * sizeof(SnapshotFieldDescriptor));
   input.remove_prefix(input.copy(header.data(), header.size()));
   std::memcpy(&header[offsetof(SnapshotHeader, descriptorTableOffset)], &kTableOffset, 4);
   std::memcpy(&header[kTableOffset], &descriptors, 4);
@@ -51,6 +52,7 @@ std::string RenderDescribed(const std::vector<char> &header, const std::vector<c
     assert(state >= before);
     whole += TextIn(output, size - 1);
     if (result == 1) break;
+    // A call makes progress, unless the banner does not fit: then it never will.
     assert(result == 0 && (state > before || (state == 0 && size == 1)));
   }
   return whole;
@@ -64,9 +66,9 @@ std::string RenderFixed(const std::vector<char> &snapshot, size_t capacity) {
   return TextIn(output, fits ? size : capacity - 1);
 }
 
-// The number as the format prints it, which passed the check of the fields.
+// Prints the number by the format, which the library has checked: MorwickSnapshotFieldAt gave it.
 std::string Printed(const MorwickSnapshotField &field, const char *format, uint32_t number) {
-  std::vector<char> text(8192);
+  std::vector<char> text(8192);  // more than the largest capacity, in which the text did fit
 #pragma clang diagnostic ignored "-Wformat-nonliteral"
   const int length =
       field.kind == kMorwickFieldThousandths
@@ -83,7 +85,7 @@ void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn
   auto column = columns.begin();
   MorwickSnapshotField field;
   for (uint32_t i = 0; MorwickSnapshotFieldAt(header.data(), i, &field) == 1; ++i) {
-    const char *format = &header[kTableOffset + 8 + i * sizeof(SnapshotFieldDescriptor) +
+    const char *format = &header[kFieldsOffset + i * sizeof(SnapshotFieldDescriptor) +
                                  offsetof(SnapshotFieldDescriptor, format)];
     const bool isTriple = field.kind == kMorwickFieldPriorities;
     const uint32_t count = isTriple                                   ? 3 * field.priorities
@@ -101,7 +103,7 @@ void CheckLine(const std::vector<char> &header, const std::vector<SnapshotColumn
   assert(column == columns.end());
 }
 
-// Renders each record as the second of two, so that no banner is before its line.
+// Renders each record as record 1 after an empty record 0: from state 1 no banner is printed.
 void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t capacity) {
   if (!fleet::CheckSnapshotHeader({header.data(), header.size()}).empty()) return;
   const tools::SnapshotColumns columns(header.data());
@@ -110,7 +112,7 @@ void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t ca
     assert(tools::IsValidText(column.name) && names.insert(column.name).second);
   }
   const uint32_t recordSize = LoadLittleEndian32(&header[offsetof(SnapshotHeader, recordSize)]);
-  const uint32_t count = 3;
+  const uint32_t count = 3;  // one more than there are: the last one counted is never printed
   std::memcpy(&header[offsetof(SnapshotHeader, recordCount)], &count, sizeof count);
   for (; snapshot.size() >= recordSize; snapshot.remove_prefix(recordSize)) {
     const std::string_view record = snapshot.substr(0, recordSize);
@@ -135,6 +137,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   std::string_view input(reinterpret_cast<const char *>(data) + 3, size - 3);
   const std::vector<char> header = HeaderFrom(input, data[2] % 40);
   const std::vector<char> snapshot(input.begin(), input.end());
+  // The same input gives the same text: nothing uninitialised is printed.
   assert(RenderDescribed(header, snapshot, capacity) ==
          RenderDescribed(header, snapshot, capacity));
   CheckColumns(header, input, capacity);

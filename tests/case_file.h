@@ -9,7 +9,8 @@
 #include <sstream>
 #include <string>
 
-// The number that a text is in C's notation. The test fails when it is no number.
+// Reads a number in C's notation, such as 12 or 0x1F. The test fails when the text is anything
+// else.
 inline uint64_t Number(const std::string &text) {
   size_t end = 0;
   const uint64_t number = std::stoull(text, &end, 0);  // throws where no number begins
@@ -19,6 +20,7 @@ inline uint64_t Number(const std::string &text) {
 
 class CaseFile {
  public:
+  // CASES is the folder tests/cases; CMake defines it.
   explicit CaseFile(const std::string &name) : name_(name), file_(CASES "/" + name) {
     EXPECT_TRUE(file_) << name;
   }
@@ -57,7 +59,7 @@ void ForEachCase(const std::string &file, Body body) {
   for (std::string line; cases.Next(&line);) {
     SCOPED_TRACE(cases.where());
     std::istringstream columns(line);
-    columns.unsetf(std::ios::dec);
+    columns.unsetf(std::ios::dec);  // the prefix then decides: 0x is hexadecimal, 0 octal
     body(columns);
   }
 }

@@ -7,8 +7,9 @@
 namespace tools {
 namespace {
 
-// How many operations of a group can take at least `latency`, if the others take 0: one takes the
-// maximum, and the rest of the total is shared by as many as it is enough for.
+// How many operations of the group can take at least `latency`. Most can when one takes the
+// maximum, as many others as the rest of the total allows take exactly `latency`, and the others
+// take 0.
 uint64_t MostAtLeast(const SnapshotOperations &group, uint32_t latency) {
   if (latency == 0) return group.count;
   if (latency > group.maxLatency) return 0;
@@ -17,8 +18,9 @@ uint64_t MostAtLeast(const SnapshotOperations &group, uint32_t latency) {
   return 1 + std::min(others, group.count - 1);
 }
 
-// How many can take at most `latency`, if the others take the maximum, as one always does. Each
-// saves at least maxLatency - latency, and all together save allAtMaximum - totalLatency.
+// How many operations of the group can take at most `latency`. The total is allAtMaximum -
+// totalLatency less than if all took the maximum, as at least one does. Each operation of at most
+// `latency` uses up at least maxLatency - latency of that.
 uint64_t MostAtMost(const SnapshotOperations &group, uint32_t latency) {
   if (latency >= group.maxLatency) return group.count;
   const uint64_t allAtMaximum = uint64_t{group.count} * group.maxLatency;
@@ -27,8 +29,9 @@ uint64_t MostAtMost(const SnapshotOperations &group, uint32_t latency) {
                             group.count - 1);
 }
 
-// The first latency for which `holds` is true, as it then is for all above; `last` if it is true
-// for none below. The search starts at the guess, and is quick when the result is near.
+// Returns the lowest latency below `last` for which `holds` is true, or `last` when there is none.
+// Once `holds` is true, it is true for all higher latencies. A binary search that first stays near
+// the guess: at most `step` away, four times as far each time.
 template <typename Holds>
 uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
   uint32_t first = 0;
@@ -48,7 +51,7 @@ uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
 
 void LatencyBounds::Add(const SnapshotOperations &group) {
   if (group.count == 0) return;
-  if (groups_.size() % 61 == 0) sample_.push_back(group);  // a prime meets every priority
+  if (groups_.size() % 61 == 0) sample_.push_back(group);  // a prime, to sample each priority
   groups_.push_back(group);
   maximum_ = std::max(maximum_, group.maxLatency);
 }
@@ -63,9 +66,11 @@ LatencyBounds::Bounds LatencyBounds::Search(const Groups &groups, unsigned perce
   const uint64_t count = sum([](const SnapshotOperations &group) { return group.count; });
   // Counted from 1, rounded up. Divided first, because count * percent may not fit.
   const uint64_t rank = count / 100 * percent + (count % 100 * percent + 99) / 100;
+  // The percentile can be this low: enough operations can take at most `latency`.
   const auto canBeAtMost = [&](uint32_t latency) {
     return sum([=](const auto &group) { return MostAtMost(group, latency); }) >= rank;
   };
+  // It cannot be higher: too few operations can take more than `latency`.
   const auto mustBeAtMost = [&](uint32_t latency) {
     return sum([=](const auto &group) { return MostAtLeast(group, latency + 1); }) <= count - rank;
   };

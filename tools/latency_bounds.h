@@ -15,9 +15,10 @@ class LatencyBounds {
  public:
   void Add(const SnapshotOperations &group);
 
-  // The least and the most that the percentile, by nearest rank, can be: for each of the two there
-  // are operations that make these groups and have it. Nothing without operations. When a group
-  // contradicts itself, as with a maximum above its total, both are at most the largest maximum.
+  // The least and the most that the percentile, by nearest rank, can be. Both are exact: some
+  // operations with these counts, totals and maxima have it. Nothing without operations. When a
+  // group contradicts itself, as with a maximum above its total, both are at most the largest
+  // maximum.
   struct Bounds {
     uint32_t least = 0, most = 0;
   };

@@ -75,7 +75,7 @@ std::string CheckLayout(const Options &options, Snapshot *snapshot) {
   return missing.empty() ? "" : "does not describe " + missing + ", which --summary needs";
 }
 
-// Reads and checks everything but the records of a file.
+// Reads and checks everything except the records of a file.
 Snapshot Prepare(const Options &options) {
   Snapshot snapshot;
   snapshot.source = {"file", options.file};

@@ -1,11 +1,13 @@
 #!/usr/bin/env python3
 """Writes the manual page of each public header, morwick_NAME.3, from the header itself: the comment of
-the file, then each declaration with its own. The date is that of the library's page.
+the file, then each declaration, followed by its own comment. The date is that of the library's page.
 Usage: header_pages.py FOLDER LIBRARY_PAGE HEADER...
 
 A header must have this layout. Blank lines separate its parts, each a comment, a declaration, or a comment
-right above its declaration. The first part is the comment of the file. In comments, code is indented by
-four. An exported name is the first one before a bracket or semicolon. A body ends with "}" in column 1."""
+right above its declaration. Parts that begin with #endif or ask for the compiler (#ifdef __NAME) are left
+out. The first part is the comment of the file. It begins with the page's summary, which ends at the first
+. , : or ;. In comments, code is indented by four. The name that an exported declaration gives stands right
+before its first bracket or semicolon. A body is one line, or ends with "}" in column 1."""
 
 import re
 import sys
@@ -23,6 +25,7 @@ def literal(code, offset=""):
 def prose(comment):
     """A comment as paragraphs, one sentence a line. Indented ones are code and stay as they are."""
     paragraphs = ""
+    # Without the comment marks and the star of each line.
     text = re.sub(r"(?m)^(/\*| \*/?) ?| ?\*/$", "", comment).strip("\n")
     for paragraph in text.split("\n\n"):
         if paragraph.startswith("    "):
@@ -37,7 +40,7 @@ def prose(comment):
 
 def declaration(code):
     """Code without export marks and bodies. Continued lines move left by the mark's 15 characters."""
-    code = re.sub(r"(?ms)^static inline (.*?) \{\n.*?^\}$", r"\1;", code)
+    code = re.sub(r"(?ms)^static inline ([^{]*) \{(?:[^\n]+|\n.*?^)\}$", r"\1;", code)
     return re.sub(r"(?m)^MORWICK_EXPORT ", "", re.sub(r"\n {15}(?= )", "\n", code))
 
 
@@ -48,7 +51,7 @@ def page(header, date, pages):
     about = parts[0][0]
     names, description = [f"morwick_{header.stem}"], prose(about)
     for comment, code in parts[1:]:
-        if re.match(r"#include|#ifdef __cplusplus|#endif|\}", code):
+        if re.match(r"#include|#if\w+ __|#endif|\}", code):
             continue
         names += re.findall(r"(?m)^(?:MORWICK_EXPORT|static inline) [^;{(\[]*?(\w+)[;(\[]", code)
         if not code:
@@ -64,6 +67,7 @@ def page(header, date, pages):
         ".Sh SYNOPSIS", f".In morwick/{header.name}",
         ".Sh DESCRIPTION", description.strip(),
         ".Sh SEE ALSO", " ,\n".join(f".Xr {name} 3" for name in ["libmorwick", *sorted(also - {names[0], "morwick_export"})]), ""])
+    # No paragraph begins right after a heading or at the start of an item.
     return re.sub(r"(?m)^(\.(?:Sh|It).*\n)\.Pp\n", r"\1", text)
 
 

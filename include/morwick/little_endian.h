@@ -1,5 +1,5 @@
 /*
- * The numbers that controllers write and read: little-endian, on any alignment, whatever the host.
+ * The numbers that controllers write and read: little-endian, at any alignment, whatever the host.
  * Comments that begin with an at sign are rules; scripts/prove proves that the code keeps them.
  *
  * Threads: pure functions, callable from any thread. The bytes must be readable.
@@ -9,11 +9,13 @@
 
 #include <stdint.h>
 
-/* Bytes at any address. The prover cannot follow a cast, so it gets the type without one. */
-#ifdef __FRAMAC__
+#ifdef __FRAMAC__ /* the prover cannot follow a cast from void, so for it the bytes are uint8_t */
 typedef uint8_t MorwickBytes;
 #else
+
+/* Bytes at any address. */
 typedef void MorwickBytes;
+
 #endif
 
 /*@ logic integer Number16(uint8_t *b, integer o) = b[o] + 0x100 * b[o + 1];
@@ -49,10 +51,12 @@ static inline uint64_t LoadLittleEndian64(const MorwickBytes *bytes) {
 }
 
 #ifndef __FRAMAC__ /* the prover cannot follow the casts here */
-/* Converts from the host's byte order to the controller's, or back. */
+
+/* Converts to the controller's byte order or back: swaps the bytes on a big-endian host only. */
 static inline uint16_t LittleEndian16(uint16_t value) { return LoadLittleEndian16(&value); }
 static inline uint32_t LittleEndian32(uint32_t value) { return LoadLittleEndian32(&value); }
 static inline uint64_t LittleEndian64(uint64_t value) { return LoadLittleEndian64(&value); }
+
 #endif
 
 #endif

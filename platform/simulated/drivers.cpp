@@ -92,7 +92,7 @@ class Drivers {
     return kSuccess;
   }
 
-  // A close that fails closes the handle all the same.
+  // Even a close that fails closes the handle.
   int32_t Close(uint32_t connection) {
     Controller *controller = ControllerOf(HandleKind::kConnection, connection);
     if (controller == nullptr) return kBadHandle;

@@ -23,15 +23,15 @@ constexpr uint64_t kFirstPowerOn = 1704067200;  // 2024, in seconds since 1970
 constexpr uint64_t kHour = 3'600'000;           // in milliseconds
 constexpr uint64_t kMinute = 60'000;            // in milliseconds
 constexpr uint64_t kHoursAMonth = 730;
-constexpr double kSwing = 5'000;  // the milliseconds by which BusyTime and age differ at most
+constexpr double kSwing = 5'000;  // the most that BusyTime and age differ, in milliseconds
 
-// An array is a histogram: each element has half the value of the element before it.
-enum Pace { kByLoad, kByClock, kByMonth };  // by hour of BusyTime, hour of age, month of age
+// A value grows with each hour of BusyTime, hour of age or month of age.
+enum Pace { kByLoad, kByClock, kByMonth };
 struct Counter {
   uint32_t id;
-  uint32_t elementCount;
-  uint64_t start;   // the value at the first power-on
-  uint64_t growth;  // in each hour or month
+  uint32_t elementCount;  // more than 1: a histogram; each element has half the value before it
+  uint64_t start;         // the value at the first power-on
+  uint64_t growth;        // in each hour or month
   Pace pace = kByLoad;
 };
 
@@ -80,22 +80,22 @@ struct Second {
   uint32_t number;    // seconds since the first power-on
   uint32_t noise;     // 0 to 15
   uint32_t load;      // about 77 on average
-  uint32_t slowness;  // 1, or 10 when writes are slow
+  uint32_t slowness;  // 1, or 10 in seconds when writes, and a little also reads, are slow
 
   uint32_t HostReads() const { return 26 * load; }
   uint32_t HostWrites() const { return 11 * load; }
   uint32_t Collected() const { return HostWrites() / 2; }
 };
 
-// A column of a snapshot. A snapshot has an interval for each second.
+// A column of a snapshot. A snapshot has a record for each second.
 enum Kind : uint16_t { kPlain = 1, kThousandths = 2, kPriorities = 3 };
 struct Column {
   Kind kind;
-  uint32_t offset;  // in the interval, in bytes, as are the sizes and offsets below
+  uint32_t offset;  // in the record, in bytes, as are the sizes and offsets below
   std::string_view format;
-  uint32_t (*valueOf)(const Second &s) = nullptr;  // AppendInterval sets those by priority
+  uint32_t (*valueOf)(const Second &s) = nullptr;  // null by priority: AppendRecord sets those
 };
-constexpr uint32_t kIntervalSize = 252;
+constexpr uint32_t kRecordSize = 252;
 constexpr uint32_t kPriorityCount = 4;
 constexpr uint32_t kOperationsSize = 12;  // count, total latency, maximum latency
 constexpr uint32_t kReadsOffset = 56;
@@ -132,8 +132,9 @@ constexpr Column kColumns[] = {
 };
 // clang-format on
 
-constexpr uint32_t kIntervalCount = 120;
-constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};  // whole words
+constexpr uint32_t kRecordCount = 120;
+// Filled with NULs to a whole number of 32-bit words.
+constexpr std::string_view kHeaderText{"Simulated controller\0\0\0\0", 24};
 constexpr size_t kFormatSize = 16;
 
 template <typename Number>
@@ -180,33 +181,33 @@ void AppendCounters(std::span<const Counter> counters, uint64_t age, std::string
 
 constexpr uint32_t kNotShown = 4'200'000'000;  // larger than the value of any column
 
-// The interval that ended in the second with that number. Writes are slow in eight seconds of each
+// The record of the second with that number. Writes are slow in eight seconds of each
 // two minutes.
-void AppendInterval(uint32_t number, std::string *buffer) {
+void AppendRecord(uint32_t number, std::string *buffer) {
   const uint32_t noise = number * 2654435761U >> 28;  // the top four bits of a hash
   const auto load = static_cast<uint32_t>(70 * LoadAt(uint64_t{number} * 1000)) + noise;
   const Second second = {number, noise, load, number % 120 < 8 ? 10U : 1U};
   // Words without a column get values that no column has, so that a wrong offset is seen.
-  std::array<uint32_t, kIntervalSize / sizeof(uint32_t)> interval;
-  std::iota(interval.begin(), interval.end(), kNotShown);
+  std::array<uint32_t, kRecordSize / sizeof(uint32_t)> record;
+  std::iota(record.begin(), record.end(), kNotShown);
   for (const Column &column : kColumns) {
-    if (column.valueOf != nullptr) interval[column.offset / 4] = column.valueOf(second);
+    if (column.valueOf != nullptr) record[column.offset / 4] = column.valueOf(second);
   }
   const auto setOperations = [&](uint32_t offset, uint32_t count, uint32_t latency) {
     const uint32_t operations[] = {count, count * latency, 9 * latency};
-    std::ranges::copy(operations, &interval[offset / 4]);
+    std::ranges::copy(operations, &record[offset / 4]);
   };
   for (uint32_t priority = 0; priority < kPriorityCount; ++priority) {
     const uint32_t place = priority * kOperationsSize;
-    setOperations(kWritesOffset + place, 3 * load >> priority, (90 + noise) * second.slowness);
-    setOperations(kReadsOffset + place, 7 * load >> priority, 60 + noise + 5 * second.slowness);
+    setOperations(kWritesOffset + place, (3 * load) >> priority, (90 + noise) * second.slowness);
+    setOperations(kReadsOffset + place, (7 * load) >> priority, 60 + noise + 5 * second.slowness);
   }
-  for (const uint32_t word : interval) Append(word, buffer);
+  for (const uint32_t word : record) Append(word, buffer);
 }
 
 void AppendSnapshot(uint64_t age, std::string *buffer) {
   const auto last = static_cast<uint32_t>(age / 1000);
-  for (uint32_t ago = kIntervalCount; ago-- > 0;) AppendInterval(last - ago, buffer);
+  for (uint32_t ago = kRecordCount; ago-- > 0;) AppendRecord(last - ago, buffer);
 }
 
 // Describes the snapshot. The last record that a header counts is never printed, so the header
@@ -216,13 +217,13 @@ void AppendSnapshotHeader(std::string *buffer) {
   constexpr uint32_t kTextOffset = 36;
   constexpr uint32_t kColumnsOffset = kTextOffset + kHeaderText.size();
   for (const uint32_t word :
-       {0U, kVersion, kIntervalSize, kIntervalCount + 1, 0U, 0U, kColumnsOffset, 0U, 0U}) {
+       {0U, kVersion, kRecordSize, kRecordCount + 1, 0U, 0U, kColumnsOffset, 0U, 0U}) {
     Append(word, buffer);
   }
   buffer->append(kHeaderText);
-  Append(uint64_t{std::size(kColumns)}, buffer);
+  Append(uint64_t{std::size(kColumns)}, buffer);  // and the unused bytes after it
   for (const Column &column : kColumns) {
-    Append(uint32_t{column.kind}, buffer);
+    Append(uint32_t{column.kind}, buffer);  // and the unused bytes after it
     Append(column.offset, buffer);
     Append(column.kind == kPriorities ? kPriorityCount * kOperationsSize : 4, buffer);
     buffer->append(column.format).append(kFormatSize - column.format.size(), '\0');
@@ -237,7 +238,7 @@ uint64_t AgeNow() {
       std::chrono::duration_cast<milliseconds>(std::chrono::system_clock::now().time_since_epoch())
           .count();
   constexpr auto kPowerOn = static_cast<int64_t>(kFirstPowerOn * 1000);
-  constexpr int64_t kLeast = int64_t{kIntervalCount} * 1000;
+  constexpr int64_t kLeast = int64_t{kRecordCount} * 1000;
   return static_cast<uint64_t>(std::max(now - kPowerOn, kLeast));
 }
 

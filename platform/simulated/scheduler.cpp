@@ -54,7 +54,7 @@ bool RunActivity(uint32_t checksToYield) {
   return deferred;
 }
 
-// Waits so long. False when the process is to stop before.
+// Waits for the delay. False when the process is to stop before it has passed.
 bool WaitFor(std::chrono::milliseconds delay) {
   std::unique_lock lock(theActivity.mutex);
   return !theActivity.wakeUp.wait_for(lock, delay, [] { return theActivity.stopping; });
