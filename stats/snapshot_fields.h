@@ -168,6 +168,18 @@ inline constexpr FixedField kFixedFields[] = {
 };
 #undef FIELD
 
+constexpr size_t kUnprinted =
+    sizeof(SnapshotRecord::unprinted1) + sizeof(SnapshotRecord::unprinted2) +
+    sizeof(SnapshotRecord::unprinted3) + sizeof(SnapshotRecord::unprinted4) +
+    sizeof(SnapshotRecord::unprinted5) + sizeof(SnapshotRecord::unprinted6);
+static_assert(
+    [] {
+      size_t size = kUnprinted;
+      for (const FixedField &field : kFixedFields) size += field.descriptor.fieldSize;
+      return size == sizeof(SnapshotRecord);
+    }(),
+    "a member of SnapshotRecord has no row");
+
 constexpr Field FixedFieldAt(size_t index) {
   // A copy: with UndefinedBehaviorSanitizer GCC cannot compare a global's address at compile time.
   const SnapshotFieldDescriptor descriptor = kFixedFields[index].descriptor;

@@ -100,7 +100,7 @@ TEST(RecordsTest, ListsAndFindsEveryKey) {
   }
 }
 
-TEST(SummaryTest, ReadsNothingOutsideTheContext) {
+TEST(SummaryTest, ReadsNothingOutsideTheContextAndGoesByTheKey) {
   KVRStatsCxt context;
   std::memset(&context, 0xff, sizeof context);
   const uint32_t count = MorwickSummaryFieldCount();
@@ -110,6 +110,8 @@ TEST(SummaryTest, ReadsNothingOutsideTheContext) {
     EXPECT_NE(MorwickSummaryValue(&context, field, field->valueCount - 1), 0U);
     EXPECT_EQ(MorwickSummaryValue(&context, field, field->valueCount), 0U);
     EXPECT_EQ(MorwickSummaryValue(nullptr, field, 0), 0U);
+    const MorwickKey *key = MorwickFindKey(kMorwickKVR, field->name);
+    EXPECT_TRUE(key != nullptr && key->id == field->id) << field->name;
   }
   EXPECT_EQ(MorwickSummaryValue(&context, nullptr, 0), 0U);
 }
