@@ -14,7 +14,7 @@ namespace {
 // Finds or connects in one of four ways, gives back the handles and prints the outcome. `held` is
 // the connection that the record holds before it is opened.
 void Use(const std::string &way, uint32_t held = 0) {
-  NandExporter *row = &nand_exporters[2];  // every search begins at the first all the same
+  NandExporter *row = &nand_exporters[2];  // no search begins here
   KVRConnection record = {77, held, row};  // opening must overwrite the 77
   bool good = false;
   if (way == "find") {

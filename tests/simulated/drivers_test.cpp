@@ -88,6 +88,12 @@ TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
     EXPECT_EQ(Read(connection, row->methodSelector, row->getTaskSchedulerSelectors()->second, 1025),
               std::string("\1\0\0\0", 4))
         << "two units of work, unless the scenario has others";
+    for (const SelectorGetter get :
+         {row->getStatsSelectors, row->getMSPStatsSelectors, row->getDefectsListSelectors,
+          row->getTelemetryListSelectors, row->getTaskSchedulerSelectors, row->getSnapshotSelectors,
+          row->getSnapshotHeaderSelectors, row->getBandStatsSelectors}) {
+      EXPECT_TRUE(get == nullptr || get()->first == get()->second);
+    }
     EXPECT_EQ(CloseService(connection), 0);
   }
 }
