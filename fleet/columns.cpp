@@ -21,7 +21,8 @@ std::string ValueName(MorwickStream stream, const MorwickKey &key, uint32_t coun
 }
 
 // How many letters must be inserted, removed or replaced to turn one text into the other
-// (Levenshtein). row[j] is the distance between the letters of `one` so far and j of `other`.
+// (Levenshtein). row[j] is the distance of the part of `one` read so far from the first j letters
+// of `other`.
 size_t Distance(std::string_view one, std::string_view other) {
   std::vector<size_t> row(other.size() + 1);
   std::iota(row.begin(), row.end(), size_t{0});
@@ -76,7 +77,7 @@ Selection::Selection(std::span<const MorwickStream> streams, std::span<const std
     bool found = false;
     for (const MorwickStream stream : streams) {
       // A label such as name[0..9] looks like a pattern, so the exact name goes first.
-      found = AddAll(stream, name, false) || (isPattern && AddAll(stream, name, true)) || found;
+      if (AddAll(stream, name, false) || (isPattern && AddAll(stream, name, true))) found = true;
     }
     if (found) continue;
     if (isPattern) throw UnknownName("no statistic has a name like '" + name + "'");
@@ -89,7 +90,8 @@ void Selection::Add(MorwickStream stream, const MorwickKey &key, uint32_t index)
   std::string name = ValueName(stream, key, key.valueCount, index);
   if (!names_.insert(name).second) return;
   columns_.push_back({&key, index, std::move(name)});
-  // An array's record with one value has this name; Has treats it as the first element.
+  // The parser gives an array's only value a name without an index. Has takes it for the first
+  // element.
   if (index == 0) names_.insert(ValueName(stream, key, 1, 0));
 }
 
@@ -100,7 +102,7 @@ bool Selection::AddAll(MorwickStream stream, const std::string &name, bool isPat
   bool found = false;
   for (uint32_t i = 0; i < MorwickKeyCount(stream); ++i) {
     const MorwickKey &key = *MorwickKeyAt(stream, i);
-    if (!isPattern && !name.starts_with(key.name)) continue;  // quick: no name of this key
+    if (!isPattern && !name.starts_with(key.name)) continue;  // only saves time
     const bool isLabel = !isPattern && key.valueCount > 1 && name == LabelOf(stream, key);
     const bool wholeArray = isLabel || matches(key.name);
     for (uint32_t index = 0; index < key.valueCount; ++index) {
@@ -132,9 +134,9 @@ Verdict ColumnFiller::Fill(std::string_view dump, std::span<uint64_t> values,
   Judge judge(dump);
   return judge.Finish(WalkRecords(stream_, dump, [&](const MorwickRecord &record) {
     judge.Take(record);
-    if (record.valueCount == 0) return;
+    if (record.valueCount == 0) return;  // also an unknown key, which is null
     const uint32_t place = placeOfKey_[record.key->id - lowestId_];
-    // The parser names an array's only value without an index. No column has that name.
+    // An array's only value has a name without an index, and a table no column for that name.
     if (place == kNoColumn || (record.valueCount == 1 && record.key->valueCount > 1)) return;
     for (uint32_t i = 0; i < record.valueCount; ++i) {
       const uint32_t column = columnOf_[place + i];

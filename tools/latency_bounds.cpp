@@ -7,9 +7,9 @@
 namespace tools {
 namespace {
 
-// How many operations of the group can take at least `latency`. Most can when one takes the
-// maximum, as many others as the rest of the total allows take exactly `latency`, and the others
-// take 0.
+// How many operations of the group can take at least `latency`. The number is largest when one
+// takes the maximum, as many others as the rest of the total allows take little more than
+// `latency`, and the remaining ones take 0.
 uint64_t MostAtLeast(const SnapshotOperations &group, uint32_t latency) {
   if (latency == 0) return group.count;
   if (latency > group.maxLatency) return 0;
@@ -18,20 +18,20 @@ uint64_t MostAtLeast(const SnapshotOperations &group, uint32_t latency) {
   return 1 + std::min(others, group.count - 1);
 }
 
-// How many operations of the group can take at most `latency`. The total is allAtMaximum -
-// totalLatency less than if all took the maximum, as at least one does. Each operation of at most
-// `latency` uses up at least maxLatency - latency of that.
+// How many operations of the group can take at most `latency`. If all took the maximum, the total
+// would be larger by `missing`. Each operation of at most `latency` takes up at least maxLatency -
+// latency of that. One operation takes the maximum.
 uint64_t MostAtMost(const SnapshotOperations &group, uint32_t latency) {
   if (latency >= group.maxLatency) return group.count;
   const uint64_t allAtMaximum = uint64_t{group.count} * group.maxLatency;
   if (group.totalLatency >= allAtMaximum) return 0;
-  return std::min<uint64_t>((allAtMaximum - group.totalLatency) / (group.maxLatency - latency),
-                            group.count - 1);
+  const uint64_t missing = allAtMaximum - group.totalLatency;
+  return std::min<uint64_t>(missing / (group.maxLatency - latency), group.count - 1);
 }
 
 // Returns the lowest latency below `last` for which `holds` is true, or `last` when there is none.
-// Once `holds` is true, it is true for all higher latencies. A binary search that first stays near
-// the guess: at most `step` away, four times as far each time.
+// Once `holds` is true, it is true for all higher latencies. The guess, at most `last`, is usually
+// close: the binary search stays at most `step` away from it, four times as far each time.
 template <typename Holds>
 uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
   uint32_t first = 0;
@@ -51,7 +51,8 @@ uint32_t First(uint32_t guess, uint32_t last, Holds holds) {
 
 void LatencyBounds::Add(const SnapshotOperations &group) {
   if (group.count == 0) return;
-  if (groups_.size() % 61 == 0) sample_.push_back(group);  // a prime, to sample each priority
+  // Callers add the priorities in turn. A prime distance does not always meet the same priority.
+  if (groups_.size() % 61 == 0) sample_.push_back(group);
   groups_.push_back(group);
   maximum_ = std::max(maximum_, group.maxLatency);
 }
@@ -66,7 +67,7 @@ LatencyBounds::Bounds LatencyBounds::Search(const Groups &groups, unsigned perce
   const uint64_t count = sum([](const SnapshotOperations &group) { return group.count; });
   // Counted from 1, rounded up. Divided first, because count * percent may not fit.
   const uint64_t rank = count / 100 * percent + (count % 100 * percent + 99) / 100;
-  // The percentile can be this low: enough operations can take at most `latency`.
+  // The percentile can be as low as `latency`: enough operations can take no more.
   const auto canBeAtMost = [&](uint32_t latency) {
     return sum([=](const auto &group) { return MostAtMost(group, latency); }) >= rank;
   };

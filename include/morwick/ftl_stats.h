@@ -1,6 +1,7 @@
 /*
  * The FTL statistics parser. It reads the 64-bit record stream that kvr_stats.h describes. Unlike
- * the KVR parser it takes no value from after a record, and it reports wrong lengths.
+ * the KVR parser it never reads values past the end of a record, and it reports arrays of a wrong
+ * length.
  *
  * Threads: no state except the context, the buffer and the library's error message. One context
  * belongs to one thread at a time.
@@ -26,12 +27,12 @@ extern "C" {
  * Returns the number of scalar records read plus the number of array elements added. Records of
  * unknown keys and records of length 0 are passed over. Parsing ends at the end of the buffer, at a
  * record of the end key 0xFFFF, at a bad header (a key above 0x30000000 or a length past the end),
- * and when an element of an array could not be added. What was parsed before is kept. The other
- * elements of that array are still added, but none of them is counted.
+ * and when an element of an array could not be added: the other elements of that array are still
+ * added, but none of them is counted. What was parsed before is kept.
  *
  * Messages (error_message.h) are recorded for a scalar that could not be added (it still counts),
- * for an array whose length differs from its configured one (the smaller number is added), and for
- * an array that could not be added. With a null context nothing is added: scalars are still
+ * for an array whose length differs from its number in the key table (the smaller one is added),
+ * and for an array that could not be added. With a null context nothing is added: scalars are still
  * counted, and the first array ends the parsing. A null buffer gets 0.
  */
 MORWICK_EXPORT uint32_t KVRFTLParseBufferToCxt(GenericParserCxt *ctx, const void *buffer,

@@ -21,20 +21,21 @@ typedef enum MorwickHeaderFault {
   kMorwickHeaderIsWhole,
   kMorwickHeaderTooShort,     /* fewer bytes than SnapshotHeader has, or a null pointer */
   kMorwickHeaderNoRecordSize, /* the record size is 0 */
-  kMorwickHeaderNoTextEnd,    /* the header text is due, and has no NUL */
-  kMorwickHeaderNoTable,      /* the descriptor table lies outside */
-  kMorwickHeaderNoDescriptors /* descriptors lie outside */
+  kMorwickHeaderNoTextEnd,    /* the format version asks for a header text, which has no NUL */
+  kMorwickHeaderNoTable,      /* the descriptor table is not within `size` */
+  kMorwickHeaderNoDescriptors /* not all descriptors are within `size` */
 } MorwickHeaderFault;
 
 /* Room for every text of MorwickCheckSnapshotHeader, with its NUL. */
 enum { kMorwickHeaderTextRoom = 120 };
 
 /*
- * Checks a header of `size` bytes, of any alignment: its text (where the format version asks for
- * it), its descriptor table and its descriptors must lie inside, and its records must have a size.
- * Formats and fields need no check: the renderings check each themselves. Unless `text` is null it
- * gets the fault in a few words with the bad value, at most kMorwickHeaderTextRoom bytes with the
- * NUL; the empty text for a whole header.
+ * Checks a header of `size` bytes, of any alignment: the header text (where the format version asks
+ * for it), the descriptor table and the descriptors must lie inside, and records must have a size.
+ * Formats and fields need no check: the functions of snapshot.h check them before they print.
+ * Returns the first fault. If `text` is not null, the fault is also written there in a few words
+ * with the bad value: at most kMorwickHeaderTextRoom bytes with the NUL, the empty text for a whole
+ * header.
  */
 MORWICK_EXPORT MorwickHeaderFault MorwickCheckSnapshotHeader(const void *header, uint64_t size,
                                                              char *text);

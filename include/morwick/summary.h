@@ -20,7 +20,7 @@ typedef struct MorwickSummaryField {
   const char *name;    /* as in KVRStatsCxt */
   uint32_t id;         /* the key that the field is set from; it has the same name */
   uint32_t offset;     /* in KVRStatsCxt, in bytes */
-  uint32_t valueWidth; /* bytes of a value: 4, the low half of what the key carries, or 8 */
+  uint32_t valueWidth; /* bytes of a value: 8, or 4 for the low half of the key's value */
   uint32_t valueCount; /* 1, or more for an array */
 } MorwickSummaryField;
 
@@ -30,7 +30,7 @@ MORWICK_EXPORT uint32_t MorwickSummaryFieldCount(void);
 MORWICK_EXPORT const MorwickSummaryField *MorwickSummaryFieldAt(uint32_t index);
 
 /* A value of a context's field, by its index from 0; 0 when the field has no such value, when no
- * buffer had its key, and for null pointers. */
+ * parsed buffer had its key, and for null pointers. */
 MORWICK_EXPORT uint64_t MorwickSummaryValue(const KVRStatsCxt *ctx,
                                             const MorwickSummaryField *field, uint32_t index);
 

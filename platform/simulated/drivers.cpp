@@ -32,7 +32,7 @@ enum Result : int32_t {  // 0 is success; the other numbers are made up
   kNoMemory = 0x106,
 };
 
-constexpr uint32_t kTaskScheduler = 39;  // a command, as those of kBuffers
+constexpr uint32_t kTaskScheduler = 39;  // a command number, like those of kBuffers in scenario.h
 constexpr uint32_t kTaskSchedulerArgument = 1025;
 constexpr uint32_t kReadArgument = 0;
 using Request = std::array<uint32_t, 6>;  // command, argument, zeros
@@ -116,7 +116,7 @@ class Drivers {
       return kBadArgument;
     }
     std::memcpy(request.data(), input, sizeof request);
-    if (!std::all_of(&request[2], request.end(), [](uint32_t word) { return word == 0; })) {
+    if (!std::all_of(request.begin() + 2, request.end(), [](uint32_t word) { return word == 0; })) {
       return kBadArgument;
     }
     const uint32_t command = le32toh(request[0]);
@@ -151,6 +151,7 @@ class Drivers {
                       std::string *answer) {
     const auto *buffer = std::ranges::find(kBuffers, command, &Buffer::command);
     if (buffer == kBuffers.end()) return kBadArgument;
+    // Both faults count every read, so both are asked before any return.
     const bool isShort = controller->shortRead.Hits();
     if (controller->failRead.Hits()) return kDeviceError;
     if (argument != kReadArgument) return kBadArgument;
@@ -164,7 +165,7 @@ class Drivers {
       return kDeviceError;
     }
     // A reply that fills the room may be cut. The caller then asks again with more room and must
-    // get the same file.
+    // get the same file. The last file stays for all later reads.
     if (answer->size() < room && files.size() > 1) files.erase(files.begin());
     if (isShort) answer->resize(answer->size() / 2);
     return kSuccess;
@@ -208,6 +209,7 @@ struct MatchingRequest {
 
 MatchingRequest *ServiceMatching(const char *className) {
   if (className == nullptr) return nullptr;
+  // Drivers are not needed, but Ask turns refused memory into null.
   return Drivers::Ask<MatchingRequest *>(
       nullptr, [=](const Drivers &) { return new MatchingRequest{className}; });
 }

@@ -12,7 +12,7 @@
 namespace simulated {
 
 int ReadFile(const std::string &path, size_t most, std::string *bytes) {
-  bytes->resize(most);  // before there is a file to close: memory may be refused
+  bytes->resize(most);  // before the file is open: if memory is refused, it stays closed
   const int file = open(path.c_str(), O_RDONLY | O_CLOEXEC);
   if (file < 0) return errno;
   size_t size = 0;

@@ -9,7 +9,7 @@
 namespace simulated {
 
 // Reads at most the first `most` bytes of the file, so that devices and FIFOs work too. Returns 0,
-// or the error number as in errno.
+// or the error number as in errno; `bytes` means nothing then.
 int ReadFile(const std::string &path, size_t most, std::string *bytes);
 
 // Makes text from outside safe to print: bytes other than printable ASCII become \x0a and the like.

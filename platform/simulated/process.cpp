@@ -53,8 +53,9 @@ const Scenario &Take() {
     EndWithoutMemory();
   }
   if (scenario == nullptr) std::exit(2);
-  // Until here a signal ends the process: the scenario may come from a pipe that stays open. Later
-  // threads inherit the blocked signals, so that none interrupts the activity's sleep.
+  // Signals are blocked only now: the scenario may come from a pipe that stays open, and a signal
+  // must end the wait for it. Threads that start later inherit the mask, so that no signal
+  // interrupts the activity's sleep.
   pthread_sigmask(SIG_BLOCK, &Signals(), nullptr);
   return *scenario;
 }
@@ -72,9 +73,9 @@ void EndWithoutMemory() {
 }
 
 bool StopCameEarly() {
-  const timespec now = {};
+  const timespec noWait = {};
   bool stop = false;
-  for (int signal; (signal = sigtimedwait(&Signals(), nullptr, &now)) > 0;) {
+  for (int signal; (signal = sigtimedwait(&Signals(), nullptr, &noWait)) > 0;) {
     stop = stop || signal != SIGUSR1;
   }
   return stop;
