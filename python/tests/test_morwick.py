@@ -260,7 +260,7 @@ def play(scenario, code):
     return played.stdout + played.stderr
 
 
-def test_controllers_are_read_and_given_back():
+def test_controllers_are_read_and_given_back(tmp_path):
     assert play("statistics.toml", """
         with morwick.Controller() as c:
             print(c.name, c.read("statistics") == open("kvr.bin", "rb").read(), c.statistics("ftl")["version"])
@@ -283,10 +283,12 @@ def test_controllers_are_read_and_given_back():
             try: morwick.Controller(name).read("msp")
             except morwick.ControllerError as error: print(error, error.result)
         """
-    first, second = play("refuses.toml", failing).splitlines()
-    words, hexadecimal, result = first.rsplit(maxsplit=2)
-    assert words == "VeltoQRN3NVMeController: the connection was refused, result"
-    assert int(result) == int(hexadecimal, 16) != 0 and second == "KVRStorage: the controller is not present None"
+    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\n")
+    refused, unread = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder)]
+    assert refused[1] == "KVRStorage: the controller is not present None"
+    for line, cause in (refused[0], "VeltoQRN3NVMeController: the connection was refused"), (unread[0], "VeltoQRN3NVMeController: msp: reading failed"):
+        words, hexadecimal, result = line.rsplit(maxsplit=2)
+        assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
     assert play("fails.toml", failing).startswith("VeltoEmbeddedNVMeController: msp: this controller does not offer it None\n")
     assert "closing the connection failed, result" in play("fails.toml", "morwick.Controller().close()")
 
