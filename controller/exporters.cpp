@@ -66,9 +66,8 @@ static_assert(offsetof(NandExporter, releaseGenericParserCxt) + sizeof(void *) =
               sizeof(NandExporter));
 
 // In search order. constinit: the table must be whole before any code runs.
-constinit NandExporter nand_exporters[] = {
+constinit NandExporter nand_exporters[16] = {
     Row("VeltoQRN3NVMeController", kNVMeMatchKey, -1, 9, /*hasMSPStatistics=*/true),
     Row("VeltoEmbeddedNVMeController", kNVMeMatchKey, -1, 9),
     Row("KVRStorage", PLATFORM_PROPERTY_MATCH_KEY, 5, 8),
-    {},
 };

@@ -21,7 +21,8 @@ describe() {
     for name in $(documented_records "$1"); do echo "$name *record_$name;"; done
     for name in $(documented_enumerators "$1"); do echo "char enumerator_${name}[1000 + $name];"; done
   } >"$work/interface.c"
-  cc -std=c11 -g -shared -fPIC -I "$1" "$work/interface.c" -o "$work/interface.so"
+  include=$(realpath "$1")
+  (cd "$work" && cc -std=c11 -g -shared -fPIC -I "$include" interface.c -o interface.so)
   abidw --no-corpus-path --no-comp-dir-path --no-show-locs --out-file "$2" "$work/interface.so"
 }
 

@@ -66,10 +66,12 @@ typedef struct NandExporter {
 } NandExporter;
 
 /*
- * The rows in search order, then the terminating row. Reading needs no lock; only
- * findNandExporterNew writes to it (two handle fields), and it must not run on two threads at once.
+ * The rows in search order, then the terminating row, then room for classes to come: the linker may
+ * give a program its own copy of the table, so the size must never change. Reading needs no lock;
+ * only findNandExporterNew writes to it (two handle fields), and it must not run on two threads at
+ * once.
  */
-MORWICK_EXPORT extern NandExporter nand_exporters[];
+MORWICK_EXPORT extern NandExporter nand_exporters[16];
 
 /* The request numbers, initialised statically and never written by the library. */
 MORWICK_EXPORT extern SelectorPair statsSelector;
