@@ -22,8 +22,8 @@ struct Column {
   Part part = Part::kWhole;
 };
 
-// The line, in print order, as the fields' formats say. A label that is too long, or a column too
-// many, does not compile.
+// The line, in print order, as the fields' formats say. A label that is too long, or more columns
+// than kColumnCount, does not compile.
 inline constexpr size_t kColumnCount = 50;
 inline constexpr std::array<Column, kColumnCount> kColumns = [] {
   std::array<Column, kColumnCount> columns;
@@ -56,7 +56,7 @@ inline constexpr std::array<Column, kColumnCount> kColumns = [] {
   }
   return columns;
 }();
-static_assert(kColumns.back().width > 0, "there are fewer columns");
+static_assert(kColumns.back().width > 0, "kColumnCount is more than the columns");
 static_assert(
     [] {
       for (size_t i = 0; i != std::size(kFixedFields); ++i) {

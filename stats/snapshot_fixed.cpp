@@ -1,6 +1,7 @@
 // Snapshots of the fixed record layout as text.
 
 #include <cstddef>
+#include <string_view>
 #include <utility>
 
 #include "morwick/snapshot.h"
@@ -19,6 +20,25 @@ static_assert(offsetof(SnapshotRecord, wearLevelBands) == 132);
 static_assert(offsetof(SnapshotRecord, hysteresisTime) == 156);
 static_assert(offsetof(SnapshotRecord, freeNodes) == 180);
 static_assert(offsetof(SnapshotRecord, commandTagsMax) == 216);
+
+// A label such as " HW=" has the line "HW  - Host Writes" in the legend.
+static_assert(
+    [] {
+      for (const Column &column : kColumns) {
+        std::string_view label = column.label;
+        if (!label.ends_with('=')) continue;  // one more number of the same label
+        label = label.substr(label.find_first_not_of(' '));
+        label.remove_suffix(1);
+        const std::string_view rest = std::string_view("   - ").substr(label.size() - 1);
+        size_t at = kSnapshotLegend.find(label);
+        while (!kSnapshotLegend.substr(at + label.size()).starts_with(rest)) {
+          at = kSnapshotLegend.find(label, at + 1);
+          if (at == kSnapshotLegend.npos) return false;
+        }
+      }
+      return true;
+    }(),
+    "a column has no line in the legend");
 
 // The column is a constant here, and so are its label, width and padding: this takes a quarter less
 // time than a loop over the columns.

@@ -1,6 +1,6 @@
 /*
  * A tool, in C or C++, made of the examples in the public headers, which tests/install_test.sh
- * extracts. Reads a snapshot header, a snapshot and a dump, one after the other, from standard
+ * extracts. Reads a snapshot, a dump and a snapshot header, one after the other, from standard
  * input. Prints the exporter table, what the examples make of the three, and what the controller
  * reports.
  */
@@ -35,11 +35,11 @@ static int PrintController(void) {
 }
 
 int main(void) {
-  // The sizes of the example files; the dump may be smaller.
-  static char header[816], snapshot[120 * sizeof(SnapshotRecord)], dump[1000];
-  fread(header, 1, sizeof header, stdin);
+  // The sizes of the example files; the header may be smaller.
+  static char snapshot[120 * sizeof(SnapshotRecord)], dump[256], header[4096];
   fread(snapshot, 1, sizeof snapshot, stdin);
   const uint64_t size = fread(dump, 1, sizeof dump, stdin);
+  fread(header, 1, sizeof header, stdin);
   for (const NandExporter *row = nand_exporters; row->className != NULL; ++row) {
     printf("%s %" PRId32 " %" PRIu32 " %" PRIu32 " %s\n", row->className, row->exporterParamA,
            row->methodSelector, row->exporterParamB, row->matchKey);

@@ -23,7 +23,7 @@ KVRStorage 5 8 8 PropertyMatch
 END_OF_TABLE
   "$morwick" stats -s kvr --long kvr.bin | sed 's/ *: / = /'
   "$morwick" snapshot -o csv snapshot.bin |
-    awk -F , 'NR == 1 { split($0, names) } NR == 2 { for (i = 1; i <= 25; ++i) print names[i], $i }'
+    awk -F , 'NR == 1 { split($0, names) } NR == 2 { for (i = 1; names[i] !~ /_0/; ++i) print names[i], $i }'
   [ "$1" = CXX ] || "$morwick" snapshot --header snapshot_header.bin snapshot.bin
   [ "$platform" != simulated ] || cat <<'END_OF_READING'
 Morwick: findNandExporter: Controller found: VeltoQRN3NVMeController
@@ -35,7 +35,7 @@ END_OF_READING
 # Usage: consume LANGUAGE PROGRAM
 consume() {
   cd "$source/examples"
-  expect "$(cat snapshot_header.bin snapshot.bin kvr.bin |
+  expect "$(cat snapshot.bin kvr.bin snapshot_header.bin |
     GRELLON_SCENARIO=$scenarios/statistics.toml "$2" 2>/dev/null)" "$(expected "$1")"
 }
 
