@@ -28,12 +28,12 @@ TEST(Controllers, AreOpenedOnlyByAHandle) {
       {{{"present", nand_exporters[1].className}}, {false, false, 0}, ""},
   };
   for (const auto &[script, presence, journal] : cases) {
-    EXPECT_EQ(Play(script,
-                   [&] {
-                     errno = ENOMEM;  // as an earlier call may leave it
-                     const fleet::Presence found = fleet::Probe(row);
-                     EXPECT_EQ(std::tie(found.present, found.opened, found.result), presence);
-                   }),
-              journal);
+    fleet::Presence found;
+    const auto probe = [&] {
+      errno = ENOMEM;  // as an earlier call may leave it
+      found = fleet::Probe(row);
+    };
+    EXPECT_EQ(Play(script, probe), journal);
+    EXPECT_EQ(std::tie(found.present, found.opened, found.result), presence);
   }
 }
