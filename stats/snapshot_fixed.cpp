@@ -33,7 +33,7 @@ static_assert(
         size_t at = kSnapshotLegend.find(label);
         while (!kSnapshotLegend.substr(at + label.size()).starts_with(rest)) {
           at = kSnapshotLegend.find(label, at + 1);
-          if (at == kSnapshotLegend.npos) return false;
+          if (at == std::string_view::npos) return false;
         }
       }
       return true;
