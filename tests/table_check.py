@@ -1,4 +1,5 @@
-"""Compares a table with what `stats` prints for the same dumps: each value, and each fault.
+"""Compares a table with what `stats` prints for the same dumps, each value and each fault, and with a table of
+a third of its columns.
 Usage: table_check.py MORWICK STREAM FILE..."""
 import csv, io, subprocess, sys
 
@@ -21,6 +22,8 @@ for row in rows:
     assert row[1] == "; ".join(faults), (row[1], faults)
     assert (stats.returncode == 0) == (row[1] == "")
     errors += [f"morwick: {row[0]}: {row[1]}"] if row[1] else []
+some = run("table", "-s", stream, "-n", ",".join(heading[2::3]), "--", *files)
+assert list(csv.reader(io.StringIO(some.stdout, newline=""))) == [row[:2] + row[2::3] for row in (heading, *rows)]
 assert table.stderr.splitlines() == errors, (table.stderr, errors)
 assert table.returncode == (1 if errors else 0)
 print(len(rows), "dumps agree,", len(errors), "of them with a fault,", len(heading) - 2, "columns")
