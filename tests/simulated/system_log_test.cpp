@@ -187,4 +187,40 @@ TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsForTheLogSomeTimeAtTheEnd) {
               "^grellon: last line\n<29>.*: 1 lines of the log were dropped\n$");
 }
 
+int readerOfErrors = 0;
+
+ssize_t ReadErrors(char *text, size_t room) {
+  const ssize_t size = read(readerOfErrors, text, room);
+  return std::max<ssize_t>(size, 0);
+}
+
+// The system's log stays full. Standard error is a pipe with less room than all lines need. It is
+// read a quarter of a second after the end.
+[[noreturn]] void EndWhileBothAreFull() {
+  Play("");
+  std::atexit([] {
+    static std::array<char, 20'000> text;
+    std::fprintf(stdout, "%.*s", static_cast<int>(ReadErrors(text.data(), text.size())),
+                 text.data());
+  });
+  int ends[2] = {};
+  if (pipe2(ends, O_NONBLOCK) != 0) std::abort();
+  readerOfErrors = ends[0];
+  dup2(STDERR_FILENO, STDOUT_FILENO);
+  dup2(ends[1], STDERR_FILENO);
+  systemLogError = EAGAIN;
+  for (unsigned line = 0; line < 2600;) SystemLog(kLine, ++line);
+  std::signal(SIGALRM, [](int) {
+    static std::array<char, 65536> text;
+    ReadErrors(text.data(), text.size());
+  });
+  ualarm(250'000, 0);
+  std::exit(0);
+}
+
+TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsForAPersonThoughTheLogIsFull) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  EXPECT_EXIT(EndWhileBothAreFull(), testing::ExitedWithCode(0), "line 0000000002600\n$");
+}
+
 }  // namespace
