@@ -118,6 +118,9 @@ TEST(SimulatedDriversTest, RefusesAndReportsBadHandles) {
   EXPECT_EQ(CloseService(second), kBadHandle);
   EXPECT_EQ(CallStructMethod(connection, 8, nullptr, 0, nullptr, &size), kBadHandle);
   EXPECT_EQ(size, 0U);
+  EXPECT_EQ(OpenService(service, 0, &connection), 0);
+  EXPECT_GT(connection, second) << "a number is used twice";
+  EXPECT_EQ(CloseService(connection), 0);
   EXPECT_EQ(ReleaseObject(service), 0);
   EXPECT_EQ(OpenService(service, 0, &connection), kBadHandle);
   EXPECT_EQ(CloseService(0), kBadHandle);
