@@ -11,6 +11,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
+#include <ctime>
 #include <regex>
 #include <sstream>
 #include <vector>
@@ -52,6 +53,10 @@ std::vector<std::string> Texts(const std::string &log) {
 
 TEST(SimulatedSystemLogTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
   Play("");
+  setenv("TZ", "FAR-11:30", 1);
+  const time_t now = std::time(nullptr) + (11 * 60 + 30) * 60;
+  char hour[16];
+  std::strftime(hour, sizeof hour, "%b %e %H:", std::gmtime(&now));
   testing::internal::CaptureStderr();
   for (const char *text : {"100%", "line\n", ""}) SystemLog("%s", text);
   SystemLog("%01100d", 7);
@@ -59,8 +64,8 @@ TEST(SimulatedSystemLogTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
   EXPECT_EQ(testing::internal::GetCapturedStderr(),
             "grellon: 100%\ngrellon: line\ngrellon: \ngrellon: " + cut + "\n");
   EXPECT_EQ(Texts(systemLog), (std::vector<std::string>{"100%", "line", "", cut}));
-  // Facility daemon, level notice.
-  const std::string begin = "<29>[A-Z][a-z]{2} [ 1-3][0-9] [0-2][0-9]:[0-5][0-9]:[0-6][0-9] ";
+  // Facility daemon, level notice, local time.
+  const std::string begin = std::string("<29>") + hour + "[0-5][0-9]:[0-6][0-9] ";
   const std::string each = begin + "grellon\\[" + std::to_string(getpid()) + "\\]: .*\n";
   EXPECT_TRUE(std::regex_match(systemLog, std::regex(each + each + each + each))) << systemLog;
 }
