@@ -17,6 +17,9 @@ TEST(NoPlatformTest, OffersNothing) {
   EXPECT_TRUE(size == 0 && reply[0] == '#');
   EXPECT_TRUE(CloseService(7) != 0 && ReleaseObject(7) != 0);
   EXPECT_FALSE(SetActivityState(nullptr, 1) || ActivityShouldDefer(nullptr));
+  testing::internal::CaptureStderr();
+  for (const char *text : {"100%\n", "", "line"}) SystemLog("%s", text);
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "grellon: 100%\ngrellon: \ngrellon: line\n");
 }
 
 }  // namespace
