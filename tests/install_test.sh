@@ -12,8 +12,8 @@ trap 'rm -rf "$work"' EXIT
 # Usage: expect TEXT EXPECTED_TEXT
 expect() { diff --label expected --label got -u <(echo "$2") <(echo "$1"); }
 
-# What tests/consumer.c prints: the table, and what the command says of the same files. On another platform
-# the controllers are those that the machine has. Usage: expected LANGUAGE
+# What tests/consumer.c prints: the table, what the command says of the same files, and what the simulated
+# controller reports. Usage: expected LANGUAGE
 expected() {
   local morwick=$prefix/bin/morwick
   cat <<'END_OF_TABLE'
@@ -32,11 +32,14 @@ VeltoQRN3NVMeController: version 7, host reads 918273645, band erases 40961
 END_OF_READING
 }
 
+# On another platform the controllers are those that the machine has, and nobody can expect what they report.
 # Usage: consume LANGUAGE PROGRAM
 consume() {
+  local known=
+  [ "$platform" = simulated ] || known=/^Morwick:/Q
   cd "$source/examples"
   expect "$(cat snapshot.bin kvr.bin snapshot_header.bin |
-    GRELLON_SCENARIO=$scenarios/statistics.toml "$2" 2>/dev/null)" "$(expected "$1")"
+    GRELLON_SCENARIO=$scenarios/statistics.toml "$2" 2>/dev/null | sed "$known")" "$(expected "$1")"
 }
 
 # The examples in the headers, with so little room that each way of their loops is taken.

@@ -64,6 +64,7 @@ with tempfile.TemporaryDirectory() as folder:
             kind, commands = line.split(": ")[0], line.split(": ")[1].split(" | ")
 if os.environ.get("SESSION_UPDATE") == "yes":
     CASES.write_text("\n".join([*played, ""]))
+    expected = played
 difference = list(difflib.unified_diff(expected, played, "expected", "played", lineterm=""))
 print("\n".join(difference) or "as expected")
 sys.exit(bool(difference))
