@@ -89,12 +89,15 @@ TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", nullptr, 4, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, "abcd", 4, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, nullptr, 4, 0), 1);
-  const std::string bytes(65536, 1);
-  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", bytes.data(), 1, 65536), 0);
+  std::vector<uint64_t> values(65536);  // of each length; their text is checked
+  std::mt19937_64 random(1);
+  std::ranges::generate(values, [&] { return random() >> random() % 64; });
+  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", values.data(), 8, 65536), 0);
   EXPECT_EQ(Entries(context).count, 0U);
-  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", bytes.data(), 1, 65535), 1);
-  EXPECT_TRUE(Entries(context).text.ends_with(" a65534=1 "));
-  EXPECT_EQ(Entries(context).count, 65535U);
+  EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", values.data(), 8, 65535), 1);
+  const Entries entries(context);
+  EXPECT_TRUE(entries.sound && entries.count == 65535);
+  EXPECT_NE(entries.text.find(" a65534="), entries.text.npos);
   ReleaseGenericParserCxt(&context);
   RefuseAllocation(1);
   EXPECT_EQ(AddSingleValueToGenericContext(&context, "", "a", 1), 0);
@@ -114,21 +117,6 @@ TEST(ParserContextTest, CutsNamesAt98Characters) {
     EXPECT_EQ(Entries(context).text, expected);
     ReleaseGenericParserCxt(&context);
   }
-}
-
-TEST(ParserContextTest, WritesEachValueAsTheCLibraryDoes) {
-  GenericParserCxt context = {};
-  const auto add = [&](uint64_t value) {
-    EXPECT_EQ(AddSingleValueToGenericContext(&context, "", "n", value), 1);
-  };
-  uint64_t power = 1;
-  for (int digits = 1; digits <= 20; ++digits, power *= 10) {
-    for (const uint64_t value : {power - 1, power, power + 1}) add(value);
-  }
-  std::mt19937_64 random(1);
-  for (int round = 0; round < 20000; ++round) add(random() >> random() % 64);
-  EXPECT_TRUE(Entries(context).sound);
-  ReleaseGenericParserCxt(&context);
 }
 
 }  // namespace
