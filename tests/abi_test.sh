@@ -44,7 +44,6 @@ while IFS='|' read -r header edit; do
   rm -rf "$work/include"
   cp -r "$1" "$work/include"
   sed -i -E "$edit" "$work/include/morwick/${header% }"
-  ! cmp -s "$1/morwick/${header% }" "$work/include/morwick/${header% }" || { echo "breaks nothing: $edit"; exit 1; }
   describe "$work/include" "$work/broken.abi"
   ! abidiff "$tests/morwick.abi" "$work/broken.abi" >/dev/null || { echo "not noticed: $edit"; exit 1; }
   breaks=$((breaks + 1))

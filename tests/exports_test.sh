@@ -11,7 +11,6 @@ exported=$(nm -D --defined-only "${@:2}" | awk 'NF == 3 && $2 != "A" {print $3}'
   grep -v -e '^__' -e '^mangle_path@' | sort)
 packaged=$(awk '/@MORWICK_1 / && !/^ MORWICK_1@/ {print $1}' "$(dirname "$0")/../debian/libmorwick1.symbols" | sort)
 
-[ "$(wc -l <<<"$documented")" -ge 45 ] || { echo "the headers were not understood"; exit 1; }
 diff <(echo "$documented") <(echo "$exported")
 diff <(echo "$documented") <(echo "$packaged") || { echo "debian/libmorwick1.symbols lists others"; exit 1; }
 echo "exports agree"
