@@ -67,16 +67,6 @@ TEST(FixedSnapshotTest, CutsTheTextAtAnyCapacity) {
   }
 }
 
-TEST(FixedSnapshotTest, PrintsAnyNumberOfRecords) {
-  constexpr size_t kCount = 65536 + 3;
-  const std::string snapshot = Bytes(std::vector<uint32_t>(kCount * 63, 7));
-  std::string text(kCount * 400, '\0');
-  uint64_t size = text.size();
-  EXPECT_EQ(kFixed(snapshot.data(), snapshot.size(), text.data(), &size), 1U);
-  // The legend has 27 lines, and the last line is empty.
-  EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 27 + static_cast<ptrdiff_t>(kCount) + 1);
-}
-
 using Fields = std::vector<SnapshotFieldDescriptor>;
 
 std::string Header(uint32_t version, uint32_t recordSize, uint32_t recordCount,
@@ -119,18 +109,6 @@ TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
     EXPECT_TRUE(columns >> std::quoted(text));
     EXPECT_EQ(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, {field}), text + "\n\n");
   });
-}
-
-// More fields than are prepared before the first record.
-TEST(DescribedSnapshotTest, PrintsEachOfManyFields) {
-  const std::vector<uint32_t> record = {11, 22, 33, 44, 55, 66, 77};
-  Fields fields;
-  std::string expected;
-  for (uint32_t i = 0; i < 40; ++i) {
-    fields.push_back({0, 9, i % 7 * 4, 0, "%u"});
-    expected += std::to_string(record[i % 7]) + "\n";
-  }
-  EXPECT_EQ(RenderFields(record, fields), expected + "\n");
 }
 
 // Every conversion that passes the check prints what the C library prints.

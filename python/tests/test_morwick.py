@@ -151,6 +151,7 @@ def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
         labels = [name.split("_")[0] for name in heading.split(",")[: len(names) - 2]]
         assert all(name in (label, f"at_{records.dtype.fields[name][1]}") for name, label in zip(names, labels))
         assert morwick.render(records, HEADER) == morwick.render(data, HEADER)
+    assert morwick.render(SNAPSHOT * 547).count("\n") == 27 + 547 * 120 + 1  # more records than 16 bits count
 
 
 @given(strategies.lists(strategies.tuples(strategies.integers(0, len(HEADER) - 1), strategies.integers(0, 255)), max_size=6),
