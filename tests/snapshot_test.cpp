@@ -219,6 +219,12 @@ TEST(SnapshotTest, TakesNullPointersAndHugeSizes) {
   EXPECT_EQ(kDescribed(memory, 6 * kGiB, output, &(size = 500), huge.data(), &(state = 2)), 1U);
   EXPECT_STREQ(output, "9\n");
   munmap(memory, 6 * kGiB);
+  MorwickSnapshotField field = {};
+  field.offset = 7;
+  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 27, &field), 0);
+  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 0xffffffff, &field), 0);
+  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 0, nullptr), 0);
+  EXPECT_EQ(field.offset, 7U);
 }
 
 TEST(DescribedSnapshotTest, ReadsNoDescriptorThatIsNotNeeded) {
@@ -272,15 +278,6 @@ TEST(SnapshotFieldsTest, ReadsDescriptorsAndGivesNamesThatDiffer) {
     }
     EXPECT_EQ(FieldsOf(Header(6, recordSize, 9, fields)), expected);
   }
-}
-
-TEST(SnapshotFieldsTest, TakesNullPointersAndAnyIndex) {
-  MorwickSnapshotField field = {};
-  field.offset = 7;
-  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 27, &field), 0);
-  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 0xffffffff, &field), 0);
-  EXPECT_EQ(MorwickSnapshotFieldAt(nullptr, 0, nullptr), 0);
-  EXPECT_EQ(field.offset, 7U);
 }
 
 }  // namespace
