@@ -58,8 +58,8 @@ Presence Probe(const NandExporter &row) {
   if (service == 0) return {};
   uint32_t connection = 0;
   const int32_t result = Open(service, &connection);
-  if (connection != 0) CloseService(connection);
-  return {true, connection != 0, result};
+  if (connection != 0) CloseService(connection);  // a driver may leave one where it fails
+  return {true, result == 0 && connection != 0, result};
 }
 
 int32_t Open(uint32_t service, uint32_t *connection) {
