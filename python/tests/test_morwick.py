@@ -118,8 +118,9 @@ def test_table_is_that_of_the_command(dumps, stream, names):
 def test_table_takes_what_the_command_takes(tmp_path):
     (tmp_path / "a\udcff").write_bytes(KVR)
     (tmp_path / "b").write_bytes(gzip.compress(KVR[:20]))
-    for files in (tmp_path, str(tmp_path), [os.fsencode(tmp_path)], iter([tmp_path / "a\udcff", tmp_path / "b"])):
-        table = morwick.table(files, names="hostReads", jobs=2)
+    name = os.fsencode(tmp_path)
+    for files in (tmp_path, str(tmp_path), name, [name], iter([tmp_path / "a\udcff", tmp_path / "b"])):
+        table = morwick.table(files, names="hostReads", jobs=2**70)
         assert table.files == [f"{tmp_path}/a\udcff", f"{tmp_path}/b"]
         assert table["hostReads"].tolist() == [918273645, None]
         assert table.faults[0] is None and "offset 16" in table.faults[1]
@@ -309,6 +310,7 @@ def test_controllers_are_read_and_given_back(tmp_path):
         assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
     assert play("fails.toml", failing).startswith("VeltoEmbeddedNVMeController: msp: this controller does not offer it None\n")
     assert "closing the connection failed, result" in play("fails.toml", "morwick.Controller().close()")
+    assert "ZeroDivisionError: division" in play("fails.toml", "with morwick.Controller(): 1 / 0").splitlines()[-1]
 
 
 WORK = """
@@ -317,12 +319,14 @@ examples = sys.argv[1] + "/examples/"
 data, header, kvr = [open(examples + name + ".bin", "rb").read() for name in ("snapshot", "snapshot_header", "kvr")]
 def read():
     with morwick.Controller() as c: return c.read("snapshot")
+def table():
+    table = morwick.table(examples + "fleet", names=["host*"], jobs=2, progress=lambda *now: None)
+    assert len(table.files) == 6
 calls = [lambda: dict(morwick.parse(bytearray(kvr)).items()), lambda: morwick.parse(kvr).entries,
          lambda: morwick.parse(kvr).summary, lambda: morwick.parse(kvr[:100] + b"1").fault,
          lambda: morwick.parse(kvr)["readCountHisto"], lambda: morwick.keys("msp"),
          lambda: morwick.snapshot(data), lambda: morwick.snapshot(data, header),
-         lambda: morwick.render(data), lambda: morwick.render(data, header), morwick.controllers, read,
-         lambda: morwick.table(examples + "fleet", names=["host*"], jobs=2, progress=lambda *now: None)]
+         lambda: morwick.render(data), lambda: morwick.render(data, header), morwick.controllers, read, table]
 for call in calls * 3: call()
 """
 REFUSE = """
