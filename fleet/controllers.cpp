@@ -8,6 +8,7 @@
 #include <cstdio>
 #include <memory>
 #include <new>
+#include <utility>
 
 namespace fleet {
 namespace {
@@ -58,14 +59,16 @@ Presence Probe(const NandExporter &row) {
   if (service == 0) return {};
   uint32_t connection = 0;
   const int32_t result = Open(service, &connection);
-  if (connection != 0) CloseService(connection);  // a driver may leave one where it fails
-  return {true, result == 0 && connection != 0, result};
+  if (connection != 0) CloseService(connection);
+  return {true, connection != 0, result};
 }
 
 int32_t Open(uint32_t service, uint32_t *connection) {
   *connection = 0;
   const int32_t result = OpenService(service, kNandConnectionType, connection);
   ReleaseObject(service);
+  // A driver that fails may still have stored a handle.
+  if (result != 0 && *connection != 0) CloseService(std::exchange(*connection, 0));
   return result;
 }
 

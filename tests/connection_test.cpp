@@ -13,7 +13,7 @@
 
 namespace {
 
-// Finds or connects in one of the ways, gives back the handles and prints the outcome. `held` is
+// Goes in the way that the case names, gives back the handles and prints the outcome. `held` is
 // the connection that the record holds before it is opened.
 void Use(const std::string &way, uint32_t held = 0) {
   NandExporter *row = &nand_exporters[2];  // no search begins here

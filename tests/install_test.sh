@@ -32,7 +32,7 @@ VeltoQRN3NVMeController: version 7, host reads 918273645, band erases 40961
 END_OF_READING
 }
 
-# On another platform the controllers are those that the machine has, and nobody can expect what they report.
+# On another platform the controllers are those of the machine: nobody knows before what they report.
 # Usage: consume LANGUAGE PROGRAM
 consume() {
   local known=

@@ -89,7 +89,7 @@ TEST(ParsersTest, TakeNullPointersAndHugeSizes) {
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", nullptr, 4, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, "abcd", 4, 1), 0);
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, nullptr, nullptr, 4, 0), 1);
-  std::vector<uint64_t> values(65536);  // of each length; their text is checked
+  std::vector<uint64_t> values(65536);  // of 1 to 64 bits; Entries checks the text
   std::mt19937_64 random(1);
   std::ranges::generate(values, [&] { return random() >> random() % 64; });
   EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "a", values.data(), 8, 65536), 0);

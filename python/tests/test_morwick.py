@@ -153,7 +153,7 @@ def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
         labels = [name.split("_")[0] for name in heading.split(",")[: len(names) - 2]]
         assert all(name in (label, f"at_{records.dtype.fields[name][1]}") for name, label in zip(names, labels))
         assert morwick.render(records, HEADER) == morwick.render(data, HEADER)
-    assert morwick.render(SNAPSHOT * 547).count("\n") == 27 + 547 * 120 + 1  # more records than 16 bits count
+    assert morwick.render(SNAPSHOT * 547).count("\n") == 27 + 547 * 120 + 1  # more than 65,535 records
 
 
 @given(strategies.lists(strategies.tuples(strategies.integers(0, len(HEADER) - 1), strategies.integers(0, 255)), max_size=6),
@@ -198,7 +198,7 @@ def test_buffers_of_any_shape_are_read():
     for data in np.frombuffer(KVR, bool), words, np.asfortranarray(words), (Record * words.size).from_buffer_copy(KVR):
         assert morwick.parse(data).entries == morwick.parse(KVR).entries
     assert len(morwick.snapshot(SNAPSHOT, HEADER.ljust(1 << 20))) == 120
-    assert len(morwick.snapshot(SNAPSHOT, HEADER[:12] + bytes(4) + HEADER[16:])) == 0  # counts as 1, which is not printed
+    assert len(morwick.snapshot(SNAPSHOT, HEADER[:12] + bytes(4) + HEADER[16:])) == 0  # the last record that a header counts is not printed
     (released := memoryview(KVR)).release()
     with pytest.raises(BufferError) as raised:
         morwick.parse(released)

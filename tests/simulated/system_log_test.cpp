@@ -194,11 +194,11 @@ TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsForTheLogSomeTimeAtTheEnd) {
 
 FILE *slowReader = nullptr;
 
-// The system's log stays full. Standard error is a pipe with less room than all lines need, which
-// is read a quarter of a second later, to the last line.
+// The system's log stays full. Standard error is a pipe that is too small for all lines. A child
+// reads it, up to the last line, a quarter of a second later.
 [[noreturn]] void EndWhileBothAreFull() {
   Play("");
-  // NOLINTNEXTLINE(cert-env33-c): nobody else gives this command
+  // NOLINTNEXTLINE(cert-env33-c): the command is a constant
   slowReader = popen("sleep 0.25; sed -n '2600{p;q}' >&2", "w");
   dup2(fileno(slowReader), STDERR_FILENO);
   std::atexit([] { pclose(slowReader); });  // after the log's own end
