@@ -54,7 +54,7 @@ std::vector<std::string> Texts(const std::string &log) {
 TEST(SimulatedSystemLogTest, LogsToTheSystemAndToThePersonAtTheTerminal) {
   Play("");
   setenv("TZ", "FAR-11:30", 1);
-  const time_t now = std::time(nullptr) + (11 * 60 + 30) * 60;
+  const time_t now = std::time(nullptr) + 41'400;  // 11:30 hours
   char hour[16];
   std::strftime(hour, sizeof hour, "%b %e %H:", std::gmtime(&now));
   testing::internal::CaptureStderr();
