@@ -1,13 +1,13 @@
 """Reads controllers of the simulated platform, each time in a fresh interpreter."""
 
-import sys, textwrap
+import json, os, sys, textwrap
 
-from test_morwick import SOURCE, run
+from test_morwick import COMMAND, SOURCE, run
 
 
 def play(scenario, code):
     """What the code prints in a fresh interpreter, with the platform's complaints about open handles."""
-    played = run(sys.executable, "-c", "import concurrent.futures, morwick\n" + textwrap.dedent(code),
+    played = run("timeout", "60", sys.executable, "-c", "import concurrent.futures, morwick, pickle, threading\n" + textwrap.dedent(code),
                  GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios" / scenario))  # fmt: skip
     return played.stdout + played.stderr
 
@@ -18,31 +18,56 @@ def test_controllers_are_read_and_given_back(tmp_path):
             print(c.name, c.read("statistics") == open("kvr.bin", "rb").read(), c.statistics("ftl")["version"])
             print(c.snapshot().dtype.names[0], len(c.snapshot()), c.statistics("msp").fault)
             with concurrent.futures.ThreadPoolExecutor() as pool: print({*pool.map(c.read, ["msp"] * 999)} == {c.read("msp")})
+        c.close()
         left = morwick.Controller("VeltoQRN3NVMeController")
-        print([(each.name, each.present, each.opened) for each in morwick.controllers()])
-        for call in lambda: c.read("kvr"), lambda: left.read("nothing"), lambda: left.read(7):
+        for call in lambda: c.read("kvr"), lambda: left.read("nothing"), lambda: left.read(7), lambda: left.statistics("nothing"):
             try: call()
             except (ValueError, TypeError) as error: print(error)
         """.replace('"kvr.bin"', repr(str(SOURCE / "examples/kvr.bin")))) == textwrap.dedent("""\
         VeltoQRN3NVMeController True 5
         T 120 None
         True
-        [('VeltoQRN3NVMeController', True, True), ('VeltoEmbeddedNVMeController', False, False), ('KVRStorage', False, False)]
         the controller is closed
         what must be one of kvr, ftl, statistics, msp, snapshot, snapshot_header, band, defects, telemetry, not 'nothing'
         what must be a str, not int
+        stream must be 'kvr', 'ftl' or 'msp', not 'nothing'
         """)  # fmt: skip
     failing = """
-        for name in None, "KVRStorage":
+        for name in None, "KVRStorage", "VeltoEmbeddedNVMeController":
             try: morwick.Controller(name).read("msp")
-            except morwick.ControllerError as error: print(error, error.result)
+            except morwick.ControllerError as error: print(same := pickle.loads(pickle.dumps(error)), same.result)
         """
     (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\n")
     refused, unread = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder)]
-    assert refused[1] == "KVRStorage: the controller is not present None"
+    assert refused[1:] == ["KVRStorage: the controller is not present None",
+                           "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
+    found = json.loads(run(COMMAND, "find", "-o", "json", GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios/refuses.toml")).stdout)
+    states = [(each["class"], each["state"] != "absent", each["state"] == "present", each.get("result", 0), tuple(each["offers"]))
+              for each in found["controllers"]]  # fmt: skip
+    assert play("refuses.toml", "print([tuple(each) for each in morwick.controllers()])") == f"{states}\n"
     for line, cause in (refused[0], "VeltoQRN3NVMeController: the connection was refused"), (unread[0], "VeltoQRN3NVMeController: msp: reading failed"):
         words, hexadecimal, result = line.rsplit(maxsplit=2)
         assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
-    assert play("fails.toml", failing).startswith("VeltoEmbeddedNVMeController: msp: this controller does not offer it None\n")
-    assert "closing the connection failed, result" in play("fails.toml", "morwick.Controller().close()")
+    for failing in "c.close()", "with c: pass":
+        assert "closing the connection failed, result" in play("fails.toml", "c = morwick.Controller()\n" + failing)
     assert "ZeroDivisionError: division" in play("fails.toml", "with morwick.Controller(): 1 / 0").splitlines()[-1]
+
+
+def test_a_call_waits_without_the_interpreter(tmp_path):
+    """Pipes in the place of files make the platform wait until another thread has written."""
+    for first in "controllers", "Controller":
+        for name in "scenario", "msp":
+            (tmp_path / name).unlink(missing_ok=True)
+            os.mkfifo(tmp_path / name)
+        assert play(tmp_path / "scenario", f"""
+            def write(): open("{tmp_path}/scenario", "w").write("[[controller]]\\nclass = 'VeltoQRN3NVMeController'\\nmsp = 'msp'\\n")
+            threading.Thread(target=write).start()
+            morwick.{first}()
+            with concurrent.futures.ThreadPoolExecutor() as pool, morwick.Controller() as c:
+                data = pool.submit(c.read, "msp")
+                with open("{tmp_path}/msp", "wb") as pipe:
+                    closed = pool.submit(c.close)
+                    print(*concurrent.futures.wait([data, closed], 0.3).done)
+                    pipe.write(b"bytes")
+                print(data.result(), closed.result())
+            """) == "\nb'bytes' None\n"  # fmt: skip
