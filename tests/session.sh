@@ -41,6 +41,13 @@ le32() {
     printf %b "$(printf '\\x%02x' $((n & 255)) $((n >> 8 & 255)) $((n >> 16 & 255)) $((n >> 24 & 255)))"
   done
 }
+# A snapshot header with a number of fields, and a field of it: kind, offset, size and text.
+layout() { le32 0 6 "$1" 5 0 0 40 0 0 0 "$2" 0; }
+field() {
+  le32 "$1" "$2" "$3"
+  printf %s "$4"
+  head -c $((16 - ${#4})) /dev/zero
+}
 
 # Waits, for 20 seconds at most, until a command succeeds.
 await() {
