@@ -9,10 +9,10 @@
 
 namespace fleet {
 
-// A descriptor that its owner closes.
+// Owns a descriptor, and closes it at the end.
 class Descriptor {
  public:
-  // `number` is the result of open, which is negative when it failed.
+  // `number` is the result of open(2), which is negative when it failed.
   explicit Descriptor(int number = -1) : number_(number) {}
   Descriptor(Descriptor &&other) noexcept : number_(std::exchange(other.number_, -1)) {}
   Descriptor &operator=(Descriptor &&other) noexcept {
@@ -21,7 +21,7 @@ class Descriptor {
   }
   ~Descriptor() { Close(); }
 
-  bool open() const { return number_ >= 0; }
+  bool isOpen() const { return number_ >= 0; }
   int number() const { return number_; }
 
   // Returns the result of close, or 0 when nothing is open.
@@ -31,7 +31,8 @@ class Descriptor {
   int number_;
 };
 
-// After a failed read (POLLIN) or write (POLLOUT): waits if it must, and says whether to try again.
+// Called right after a read (POLLIN) or a write (POLLOUT) has failed, as it looks at errno. Waits
+// until a non-blocking descriptor is ready. False when trying again would not help.
 bool CanTryAgain(int descriptor, short events);
 
 // Writes all bytes and waits when it must. Returns 0, or the error number as in errno.

@@ -31,7 +31,7 @@ DumpReader::Dump DumpReader::Read(const char *name, bool onlyFiles) {
   const Descriptor file(std::strcmp(name, "-") == 0
                             ? fcntl(STDIN_FILENO, F_DUPFD_CLOEXEC, 0)
                             : open(name, O_RDONLY | O_CLOEXEC | (onlyFiles ? O_NONBLOCK : 0)));
-  if (!file.open()) return {{}, std::strerror(errno)};
+  if (!file.isOpen()) return {{}, std::strerror(errno)};
   GzipReader reader([&](char *bytes, size_t room) -> ReadResult {
     for (;;) {
       const ssize_t count = read(file.number(), bytes, room);

@@ -22,7 +22,8 @@ void AppendRow(const fleet::Row &row, std::string *rows) {
   rows->append(reinterpret_cast<const char *>(row.present.data()), row.present.size());
 }
 
-// Reads all dumps. Takes the interpreter's lock only for signals and `progress`.
+// Reads all dumps. Takes the interpreter's lock, for signals and `progress`, at most ten times a
+// second, because other threads of Python may hold it for long.
 Batches ReadAll(const fleet::TableOptions &options, const std::vector<std::string> &files,
                 const py::object &progress) {
   using Got = fleet::Table::Got;

@@ -19,7 +19,7 @@ static_assert(sizeof(ContextNode::text) >= kLongestText + 1);
 static_assert(sizeof(ContextNode::text) >= kDecimalRoom);
 
 // All zeros. It is defined in another file, so that the compiler copies it with eight stores. Where
-// the compiler sees zeros it uses a string instruction, which takes longer than both allocations.
+// the compiler sees zeros it uses `rep stos`, which takes longer than both allocations.
 extern const ContextNode kEmptyNode;
 
 // A name node that is in no list. The name node of each entry starts as a copy of it, which costs

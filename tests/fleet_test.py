@@ -1,17 +1,20 @@
-"""Compares what examples/fleet.py makes of 2,000 dumps with `morwick table`: with Dask's scheduler and two
-workers as processes, at a terminal, with a worker that is killed half-way, and without a cluster.
+"""Runs examples/fleet.py and the script of docs/archive.md on 2,000 dumps, and holds their results against
+those of `morwick table`: on a cluster of three processes at a terminal, after a worker is killed, and without.
 Usage: fleet_test.py MORWICK SOURCE"""
 import bisect, contextlib, csv, io, os, pathlib, re, subprocess, sys, tempfile, textwrap, time
 from concurrent.futures import ThreadPoolExecutor
 
 morwick, source = sys.argv[1:]
-sys.path.append(source + "/examples")  # workers do not look there: they must be sent the code
+sys.path.append(source + "/examples")  # workers do not look there: none of their work may need fleet.py
 import fleet, pandas
 from dask.distributed import Client
 
 # Key 4 counts the host's writes, 18 those to NAND, 47 the grown bad blocks.
 record = lambda key, value: bytes([key, 0, 0, 0, 1, 0, 0, 0]) + value.to_bytes(8, "little")
-odd_dumps = {  # by the file's index; each would stand out if a fault or a gap were taken for a value
+# By the file's index, which is odd for a drive's last dump: empty, a zip file, a part of a header, no writes
+# of the host, twice a figure that is missing, and numbers too large for a double. If a fault or a gap were
+# taken for a value, the drive would stand out.
+strange_dumps = {
     101: b"", 303: b"PK\3\4xxxxyyyyzzzz", 505: record(4, 1) + record(18, 900) + record(47, 900) + b"cut",
     707: record(4, 0) + record(18, 900) + record(47, 0), 909: record(18, 900) + record(47, 0), 911: record(7, 5),
     1111: record(4, 2**64 - 1) + record(18, 2**64 - 3) + record(47, 2**63 + 1)}
@@ -57,11 +60,11 @@ def start(*words):
 
 with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, open(work + "/log", "w+") as log:
     os.chdir(work)
-    os.mkdir("cluster")
+    os.mkdir("cluster")  # from which nobody can import what is here
     subprocess.run([sys.executable, source + "/examples/make_fleet.py", "fleet"], check=True)
     files = fleet.list_dumps(work + "/fleet")
     assert len(files) == 2000
-    for index, dump in odd_dumps.items():
+    for index, dump in strange_dumps.items():
         pathlib.Path(files[index]).write_bytes(dump)
     table = subprocess.run([morwick, "table", "-s", "kvr", "-n", ",".join(fleet.NAMES), work + "/fleet"],
                            capture_output=True, text=True).stdout
@@ -75,7 +78,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
             scheduler = client.scheduler.address
 
             screen = subprocess.run(
-                [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # ends after 60 s at the latest
+                [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # may be silent for 60 s
                  sys.executable, source + "/examples/fleet.py", work + "/fleet", "--scheduler", scheduler],
                 capture_output=True, text=True).stdout.splitlines()
             assert screen[0].startswith("reading: 100%|█") and "10/10" in screen[0], screen
@@ -106,12 +109,12 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
             read = threads.submit(fleet.read, files[:1100] + [pipe] + files[1100:], scheduler)
             wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
             [waiting] = [worker for worker, parts in client.processing().items() if parts]
-            assert client.has_what()[waiting], "parts that it has read must be lost too"
+            assert client.has_what()[waiting], "no part that it has read would be lost with it"
             pid = client.run(os.getpid, workers=[waiting])[waiting]
             [process] = [process for process in processes if process.pid == pid]
             process.kill()
             process.wait()
-            wait_for(lambda: write_to(pipe, odd_dumps[1111]))
+            wait_for(lambda: write_to(pipe, strange_dumps[1111]))
             assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
             assert len(client.scheduler_info()["workers"]) == 1
         assert as_rows(fleet.read(files)) == rows, "without a cluster"

@@ -4,8 +4,9 @@
 # difference. In a document, a file of Markdown, the commands are indented too, and what is indented
 # without one before it is not played.
 # GRELLON, MORWICK and SOURCE name the programs and the tree, FAST_SLEEP, FAST_WATCH and REFUSE_MEMORY
-# libraries to preload; ctest sets them. SANITIZED is set where a sanitizer leaves no room for limits of memory.
-# Usage: session.sh SESSION; with SESSION_UPDATE=yes what is printed now is written into the session.
+# libraries to preload; ctest sets them. SANITIZED is set for sanitizers, which cannot run with little memory.
+# Usage: session.sh SESSION; with SESSION_UPDATE=yes what is printed now is written into the session, but not
+# into a document.
 set -uo pipefail
 session=$(realpath "$1")
 work=$(mktemp -d)
@@ -13,16 +14,17 @@ trap 'kill "${pid:-}" 2>/dev/null; rm -rf "$work"' EXIT
 cd "$work" || exit 1
 : "${SANITIZED:=}"
 cp -r "$SOURCE"/examples/{*.bin,fleet} .
-[[ $session != *.md ]] || { sed -E 's/^    ([$>] )/\1/' "$session" >document && session=$PWD/document; }
+[[ $session != *.md ]] || { SESSION_UPDATE= && sed -E 's/^    ([$>] )/\1/' "$session" >document && session=$PWD/document; }
 export LD_PRELOAD=
 
 # With pauses a thousand times shorter. verify_asan_link_order: a sanitizer would insist on being loaded first.
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
 # A watch, with pauses and seconds a thousand times shorter.
 fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" watch "$@"; }
-# Runs morwick at a time of day, in milliseconds since 1970.
+# Runs morwick with a clock that stands at these milliseconds since 1970.
 at() { NOW=$1 LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" "${@:2}" 2>/dev/null; }
-# Runs the command; its JSON, and what it then says about open handles, is kept and checked at the end.
+# Runs the command. With -o json its output and messages are kept for the checks at the end: the schema,
+# and that the simulated drivers complain of no handle that was left open.
 morwick() {
   case " $* " in *" json "*) ;; *) "$MORWICK" "$@"; return ;; esac
   "$MORWICK" "$@" >object 2>errors
@@ -41,7 +43,7 @@ le32() {
     printf %b "$(printf '\\x%02x' $((n & 255)) $((n >> 8 & 255)) $((n >> 16 & 255)) $((n >> 24 & 255)))"
   done
 }
-# A snapshot header with a number of fields, and a field of it: kind, offset, size and text.
+# A snapshot header: record size, number of fields. Then each of its fields: kind, offset, size, text.
 layout() { le32 0 6 "$1" 5 0 0 40 0 0 0 "$2" 0; }
 field() {
   le32 "$1" "$2" "$3"

@@ -42,7 +42,7 @@ int FindPlace(int from, const path &file, Place *place) {
   // The dot makes the kernel follow a link to a folder under its rules for links within a path.
   const path parent = file.parent_path() / ".";
   Descriptor folder(openat(from, parent.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
-  if (!folder.open()) return errno;
+  if (!folder.isOpen()) return errno;
   place->folder = std::move(folder);
   place->name = file.filename().empty() ? "." : file.filename().native();
   return 0;
@@ -84,7 +84,7 @@ int FindTarget(const std::string &file, Target *target) {
     const Place &place = target->place;
     const Descriptor entry(
         openat(place.folder.number(), place.name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
-    if (!entry.open()) return errno == ENOENT ? 0 : errno;
+    if (!entry.isOpen()) return errno == ENOENT ? 0 : errno;
     struct stat folder = {}, status = {};
     if (fstat(place.folder.number(), &folder) != 0) return errno;
     if (fstat(entry.number(), &status) != 0) return errno;
@@ -119,7 +119,7 @@ int Replace(const Place &place, const std::string &temporary, std::string_view b
             std::optional<mode_t> mode) {
   const int folder = place.folder.number();
   Descriptor file(openat(folder, temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
-  if (!file.open()) return errno;
+  if (!file.isOpen()) return errno;
   const mode_t mask = umask(0);
   umask(mask);
   const bool replaced = WriteAll(file.number(), bytes) == 0 &&
@@ -136,7 +136,7 @@ int Replace(const Place &place, const std::string &temporary, std::string_view b
 int WriteThrough(const Place &place, std::string_view bytes) {
   const Descriptor device(openat(place.folder.number(), place.name.c_str(),
                                  O_WRONLY | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC));
-  if (!device.open()) return errno;
+  if (!device.isOpen()) return errno;
   struct stat status = {};
   if (fstat(device.number(), &status) != 0) return errno;
   // A file has taken its place meanwhile. Writing into it would leave its old end in place.

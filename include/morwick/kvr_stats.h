@@ -34,8 +34,9 @@ extern "C" {
 
 /*
  * Owned by the caller, who fills it with zeros before its first use. Each summary field holds the
- * (first) value of the last record of its key, cut to the field's width; a key that no buffer had
- * leaves its field alone. The first four fields are those of GenericParserCxt.
+ * value of the last record of its key, an array the first ones, cut to the field's width; a key
+ * that no buffer had leaves its field alone. The units are the controller's own: `hostWrites` and
+ * its like count sectors. The first four fields are those of GenericParserCxt.
  */
 typedef struct KVRStatsCxt {
   ContextNode *namesHead;
@@ -43,7 +44,7 @@ typedef struct KVRStatsCxt {
   ContextNode *valuesHead;
   ContextNode *valuesTail;
   uint32_t exportVersion; /* 0 after a parse that ended at a bad header */
-  int32_t parseMarker;    /* -1 after any parse */
+  int32_t parseMarker;    /* -1 after any parse, also one that failed */
   uint32_t reserved1;
   uint32_t numVirtualBlocks;
   uint32_t blocksPerVirtualBlock;
@@ -70,15 +71,16 @@ typedef struct KVRStatsCxt {
  * Parses `size` bytes of 64-bit statistics records (any alignment; bytes after the last whole
  * 64-bit word are ignored) and appends to whatever the context holds. An array's elements are named
  * by the key's name followed directly by the index. The key, not the record's length, decides how
- * many values are read: for a record that is too short they continue in the bytes after it. Records
- * with unknown keys, and records whose values would exceed the buffer, are passed over.
+ * many values are read: for a record that is too short they continue in the bytes after it, which
+ * are still read as the next records too. Records with unknown keys, and records whose values would
+ * exceed the buffer, are passed over.
  *
  * Returns 1 when the records were read to the end of the buffer. Returns 0, with everything that
  * was parsed before kept, for a buffer of fewer than 8 bytes, at a bad header (a key above
  * 0x30000000 or a length past the end; `exportVersion` is then set to 0) and when memory is
  * refused. The entry that was refused memory is missing; the later elements of its array are still
  * appended, and the records after it are not read. Its summary field is still set. A null
- * context or buffer gets 0. No message is recorded.
+ * context or buffer gets 0. Error messages (error_message.h) are never recorded.
  */
 MORWICK_EXPORT int KVRParseBufferToCxt(KVRStatsCxt *ctx, const void *buffer, uint32_t size);
 
