@@ -22,12 +22,13 @@
 namespace simulated {
 namespace {
 
-enum Result : int32_t {  // 0 is success; the other numbers are made up
+// 0 is success; the other numbers are made up. As with real drivers some are negative.
+enum Result : int32_t {
   kSuccess = 0,
   kBadHandle = 0x101,
   kBadArgument = 0x102,
-  kRefused = 0x103,
-  kDeviceError = 0x104,
+  kRefused = static_cast<int32_t>(0xE0000103),
+  kDeviceError = static_cast<int32_t>(0xE0000104),
   kNotOffered = 0x105,
   kNoMemory = 0x106,
 };

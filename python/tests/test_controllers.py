@@ -41,6 +41,8 @@ def test_controllers_are_read_and_given_back(tmp_path):
     refused, unread = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder)]
     assert refused[1:] == ["KVRStorage: the controller is not present None",
                            "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
+    absent = "VeltoQRN3NVMeController"  # although a later class is present
+    assert f"{absent}: the controller is not present" in play("fails.toml", f"morwick.Controller('{absent}')")
     found = json.loads(run(COMMAND, "find", "-o", "json", GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios/refuses.toml")).stdout)
     states = [(each["class"], each["state"] != "absent", each["state"] == "present", each.get("result", 0), tuple(each["offers"]))
               for each in found["controllers"]]  # fmt: skip
@@ -48,8 +50,9 @@ def test_controllers_are_read_and_given_back(tmp_path):
     for line, cause in (refused[0], "VeltoQRN3NVMeController: the connection was refused"), (unread[0], "VeltoQRN3NVMeController: msp: reading failed"):
         words, hexadecimal, result = line.rsplit(maxsplit=2)
         assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
-    for failing in "c.close()", "with c: pass":
-        assert "closing the connection failed, result" in play("fails.toml", "c = morwick.Controller()\n" + failing)
+    for closing in "c.close()", "with c: pass":
+        assert play("fails.toml", f"c = morwick.Controller()\ntry:\n  {closing}\nexcept Exception as error: print(error, error.result)") == (
+            f"VeltoEmbeddedNVMeController: closing the connection failed, result 0xe0000104 {0xe0000104}\n")
     assert "ZeroDivisionError: division" in play("fails.toml", "with morwick.Controller(): 1 / 0").splitlines()[-1]
 
 

@@ -254,7 +254,7 @@ OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
     (ValueError, r"no statistic has the name '\ud800'", [lambda: morwick.table([], names="\ud800")]),
     (TypeError, "jobs must be an int, not str", [lambda: morwick.table([], jobs="2")]),
     (ValueError, "jobs must be at least 1, not 0", [lambda: morwick.table([], jobs=0)]),
-    (TypeError, "progress must be callable, not int", [lambda: morwick.table([], progress=1)]),
+    (TypeError, "progress must be callable, not int", [lambda: morwick.table([], progress=0)]),
     (TypeError, "name must be a str, not int", [lambda: morwick.Controller(7)]),
     (ValueError, "name: there is no controller class 'None'", [lambda: morwick.Controller("None")]),
 ])  # fmt: skip

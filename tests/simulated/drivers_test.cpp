@@ -22,8 +22,10 @@ struct Exchange {
       if ((columns >> std::ws).peek() != '-') columns >> word;
     }
     std::string arrow;
-    columns >> arrow >> result;
+    std::string code;
+    columns >> arrow >> code;
     EXPECT_TRUE(columns && arrow == "->");
+    result = static_cast<int32_t>(Number(code));
     std::getline(columns >> std::ws, reply);
     if (reply.starts_with('=')) reply = {static_cast<char>(Number(reply.substr(1))), 0, 0, 0};
   }

@@ -125,7 +125,9 @@ void CheckFullLog(int reader, int writer) {
   systemLogError = EAGAIN;
   alarm(20);  // in case it waits
   unsigned line = 0;
-  while (line < 20'000) SystemLog(kLine, ++line);
+  // A terminal has room once more, after the kernel has moved what was written.
+  pollfd room = {.fd = STDERR_FILENO, .events = POLLOUT, .revents = 0};
+  while (line < 20'000 || poll(&room, 1, 50) > 0) SystemLog(kLine, ++line);
   // A complaint is given up, too.
   const uint32_t request[6] = {13};
   char reply[4];
@@ -141,8 +143,8 @@ void CheckFullLog(int reader, int writer) {
   systemLogError = 0;
   // A terminal hands a line on some time after it was written.
   pollfd more = {.fd = reader, .events = POLLIN, .revents = 0};
-  while (line < 20'100 || poll(&more, 1, 200) > 0) {
-    if (line < 20'100) SystemLog(kLine, ++line);
+  for (const unsigned last = line + 99; line < last || poll(&more, 1, 200) > 0;) {
+    if (line < last) SystemLog(kLine, ++line);
     std::array<char, 5000> some;
     const ssize_t size = read(reader, some.data(), some.size());
     if (size > 0) log.append(some.data(), static_cast<size_t>(size));
