@@ -148,7 +148,8 @@ CSV_ORDER = """timestamp erasedBands hostReads hostWrites nandReads nandWrites h
 
 def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
     draw = random.Random(3)
-    odd = HEADER.replace(b" E=", b"\xff\xc3=")  # no UTF-8
+    odd = HEADER.replace(b" E=", b"\xff\xc3=")  # no UTF-8, and three priorities
+    odd = odd.replace(struct.pack("<II", 56, 48), struct.pack("<II", 56, 36))
     (tmp_path / "header").write_bytes(odd)
     for number in range(2 if SANITIZED else 20):
         # The first data has more records than the header promises, and its last one is cut.
