@@ -1,6 +1,6 @@
 """Compares the module with the command on the same bytes, and tests it as a module of Python."""
 
-import ctypes, gzip, json, mmap, os, pathlib, pickle, random, re, struct, subprocess, sys, threading
+import ctypes, gzip, json, mmap, os, pathlib, pickle, random, re, signal, struct, subprocess, sys, threading
 from concurrent.futures import ThreadPoolExecutor
 
 import numpy as np
@@ -301,11 +301,14 @@ def test_progress_and_an_interrupt_end_the_reading(tmp_path):
     with pytest.raises(ZeroDivisionError):
         morwick.table([SOURCE / "examples"] * 50, progress=lambda dumps, faults: 1 / 0)
     os.mkfifo(tmp_path / "pipe")
-    threading.Timer(0.5, lambda: os.kill(os.getpid(), 2)).start()
+    signal.alarm(60)  # ends what no interrupt ends
     seen = []
-    with pytest.raises(KeyboardInterrupt):
-        morwick.table(tmp_path / "pipe", progress=lambda *now: seen.append(now))
+    for progress in None, lambda *now: seen.append(now):
+        threading.Timer(0.5, lambda: os.kill(os.getpid(), signal.SIGINT)).start()
+        with pytest.raises(KeyboardInterrupt):
+            morwick.table(tmp_path / "pipe", progress=progress)
     assert {*seen} == {(0, 0)} and 1 < len(seen) < 8  # now and then, also while nothing comes
+    signal.alarm(0)
     os.close(os.open(tmp_path / "pipe", os.O_WRONLY))  # the thread that waited goes
 
 
