@@ -37,7 +37,7 @@ def test_controllers_are_read_and_given_back(tmp_path):
             try: morwick.Controller(name).read("msp")
             except morwick.ControllerError as error: print(same := pickle.loads(pickle.dumps(error)), same.result)
         """
-    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\n")
+    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\nsnapshot_header = '/'\n")
     refused, unread = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder)]
     assert refused[1:] == ["KVRStorage: the controller is not present None",
                            "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
@@ -46,14 +46,16 @@ def test_controllers_are_read_and_given_back(tmp_path):
     found = json.loads(run(COMMAND, "find", "-o", "json", GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios/refuses.toml")).stdout)
     states = [(each["class"], each["state"] != "absent", each["state"] == "present", each.get("result", 0), tuple(each["offers"]))
               for each in found["controllers"]]  # fmt: skip
-    assert play("refuses.toml", "print([tuple(each) for each in morwick.controllers()])") == f"{states}\n"
+    assert play("refuses.toml", "print([(c.name, c.present, c.opened, c.result, c.offers) for c in morwick.controllers()])") == f"{states}\n"
+    assert "snapshot_header: reading failed" in play(folder, "morwick.Controller().snapshot()")
     for line, cause in (refused[0], "VeltoQRN3NVMeController: the connection was refused"), (unread[0], "VeltoQRN3NVMeController: msp: reading failed"):
         words, hexadecimal, result = line.rsplit(maxsplit=2)
         assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
     for closing in "c.close()", "with c: pass":
         assert play("fails.toml", f"c = morwick.Controller()\ntry:\n  {closing}\nexcept Exception as error: print(error, error.result)") == (
             f"VeltoEmbeddedNVMeController: closing the connection failed, result 0xe0000104 {0xe0000104}\n")
-    assert "ZeroDivisionError: division" in play("fails.toml", "with morwick.Controller(): 1 / 0").splitlines()[-1]
+    raising = "c = morwick.Controller()\ntry:\n  with c: 1 / 0\nexcept ZeroDivisionError: c.read('kvr')"
+    assert play("fails.toml", raising).splitlines()[-1] == "ValueError: the controller is closed"
 
 
 def test_a_call_waits_without_the_interpreter(tmp_path):

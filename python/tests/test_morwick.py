@@ -257,7 +257,7 @@ OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
     (ValueError, "jobs must be at least 1, not 0", [lambda: morwick.table([], jobs=0)]),
     (TypeError, "progress must be callable, not int", [lambda: morwick.table([], progress=0)]),
     (TypeError, "name must be a str, not int", [lambda: morwick.Controller(7)]),
-    (ValueError, "name: there is no controller class 'None'", [lambda: morwick.Controller("None")]),
+    (ValueError, "name: there is no controller class ''", [lambda: morwick.Controller("")]),
 ])  # fmt: skip
 def test_wrong_arguments_are_named(error, words, calls):
     for call in calls:
