@@ -15,7 +15,7 @@ def play(scenario, code):
 def test_controllers_are_read_and_given_back(tmp_path):
     assert play("statistics.toml", """
         with morwick.Controller() as c:
-            print(c.name, c.read("statistics") == open("kvr.bin", "rb").read(), c.statistics("ftl")["version"])
+            print(c.name, c.read("statistics") == open("kvr.bin", "rb").read(), c.statistics("ftl")["version"], str(c.statistics()).split()[2])
             print(c.snapshot().dtype.names[0], len(c.snapshot()), c.statistics("msp").fault)
             with concurrent.futures.ThreadPoolExecutor() as pool: print({*pool.map(c.read, ["msp"] * 999)} == {c.read("msp")})
         c.close()
@@ -24,7 +24,7 @@ def test_controllers_are_read_and_given_back(tmp_path):
             try: call()
             except (ValueError, TypeError) as error: print(error)
         """.replace('"kvr.bin"', repr(str(SOURCE / "examples/kvr.bin")))) == textwrap.dedent("""\
-        VeltoQRN3NVMeController True 5
+        VeltoQRN3NVMeController True 5 kvr:
         T 120 None
         True
         the controller is closed
