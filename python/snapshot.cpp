@@ -3,6 +3,7 @@
 #include <pybind11/numpy.h>
 
 #include <algorithm>
+#include <new>
 #include <string>
 
 #include "fleet/snapshot_header.h"
@@ -86,7 +87,15 @@ py::object DescribedType(const Layout &layout) {
       types.append(number);
     }
   }
-  return py::dtype(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
+  const py::dtype type(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
+  // Where NumPy is refused memory while it looks for the offsets or the size, it makes up its own.
+  const py::object fields = type.attr("fields");
+  for (size_t i = 0; i < names.size(); ++i) {
+    const py::object offset = fields[names[i]][py::int_(1)];
+    if (!offset.equal(offsets[i])) throw std::bad_alloc();
+  }
+  if (static_cast<uint64_t>(type.itemsize()) != layout.recordSize) throw std::bad_alloc();
+  return type;
 }
 
 // An array of the records over the buffer itself.

@@ -25,11 +25,13 @@ for call in calls * 3: call()
 REFUSE = """
 refuse = ctypes.CDLL(None).RefuseAllocation
 for call in calls:
+    good = repr(call())
     for number in range(1, 100000):
-        try: refuse(number); call(); error = None
+        try: refuse(number); result = call(); error = None
         except (MemoryError, morwick.ControllerError) as raised: error = raised  # the driver's own
         except ValueError as raised: error = raised; assert "tuple" in str(raised)  # NumPy's own, of a type
         if refuse(0) < number: break
+        assert error or repr(result) == good or "result=262" in repr(result), (call, number)  # the driver was refused
     assert error is None and number > 3, (call, number)
     call()
 """

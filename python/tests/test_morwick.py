@@ -57,6 +57,7 @@ def dumps(tmp_path_factory):
         for file in [*(SOURCE / "fuzz/seeds").glob("*/*"), *(SOURCE / "examples").glob("*.bin")]:
             if file.name != "gzip":  # which the command unpacks
                 (folder / f"{stream}-{file.name}").write_bytes(file.read_bytes()[file.suffix != ".bin" :])
+    (folder / "kvr-unwritten").write_bytes(struct.pack("<IIQIIQ", 4, 1, 5, 18, 1, 0))  # hostWrites, nandWrites
     return folder
 
 
