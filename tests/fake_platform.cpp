@@ -101,19 +101,17 @@ std::string Play(const Script &script, const std::function<void()> &body) {
 }
 
 void PlayCases(const std::string &file, const std::function<void(Script &)> &body) {
-  CaseFile cases(file);
-  for (std::string line; cases.Next(&line);) {
-    SCOPED_TRACE(cases.where() + " " + line);
+  ForEachCase(file, [&](std::istringstream &lines) {
     Script script;
-    while (cases.NextRaw(&line) && line != "->") {
+    std::string line, expected;
+    for (std::getline(lines, line); std::getline(lines, line) && line != "->";) {
       const size_t colon = line.find(": ");
       ASSERT_NE(colon, line.npos) << "no key: " << line;
       script[line.substr(0, colon)] = line.substr(colon + 2);
     }
-    std::string expected;
-    while (cases.Peek() != '=' && cases.NextRaw(&line)) expected += line + "\n";
+    while (std::getline(lines, line)) expected += line + "\n";
     EXPECT_EQ(Play(script, [&] { body(script); }), expected);
-  }
+  });
 }
 
 std::vector<std::string> PlayEveryFailure(Script script, const std::function<void()> &body) {

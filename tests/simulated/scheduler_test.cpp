@@ -4,8 +4,8 @@
 #include <chrono>
 #include <cstdio>
 
+#include "tests/case_file.h"
 #include "tests/simulated/platform.h"
-#include "tests/stream_notation.h"
 
 namespace {
 
