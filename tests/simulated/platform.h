@@ -17,7 +17,6 @@ constexpr int32_t kBadHandle = 0x101;
 constexpr int32_t kBadArgument = 0x102;
 constexpr int32_t kRefused = 0x103;
 constexpr int32_t kDeviceError = 0x104;
-constexpr int32_t kNotOffered = 0x105;
 
 // Makes a file in memory, and returns its name in the folder of the scenario, /proc/self/fd.
 inline std::string File(const std::string &text) {
