@@ -72,11 +72,10 @@ uint32_t Issue(const std::string &what) {
 }
 
 std::string NameOf(uint32_t handle) {
-  const uint32_t number = handle & ~kHandleBit;
-  if (handle == kLeftover) return "leftover";
-  if (handle == 0) return "0";
-  return handle != number && number % kHandleStep == 0 ? std::to_string(number / kHandleStep)
-                                                       : "no handle, " + std::to_string(handle);
+  const uint32_t number = (handle & ~kHandleBit) / kHandleStep;
+  if (handle == (number == 0 ? 0 : kHandleBit | number * kHandleStep))
+    return std::to_string(number);
+  return handle == kLeftover ? "leftover" : "no handle, " + std::to_string(handle);
 }
 
 void Return(uint32_t handle, const std::string &what) {
@@ -145,9 +144,8 @@ uint32_t GetMatchingService(MatchingRequest *request) {
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   EXPECT_EQ(platform.openHandles[service], "service");
   const bool fails = Fails("open");
-  *connection = fails                         ? (Lists("failing", "leftover") ? kLeftover : 0)
-                : Lists("failing", "handle0") ? 0
-                                              : Issue("connection");
+  *connection = fails && Lists("failing", "leftover") ? kLeftover : 0;
+  if (!fails && !Lists("failing", "handle0")) *connection = Issue("connection");
   Write("open ", NameOf(service), " type ", type, " = ", NameOf(*connection));
   return Result(fails);
 }

@@ -43,14 +43,4 @@ inline uint32_t Connect(const char *className = "KVRStorage") {
   return connection;
 }
 
-inline std::string Read(uint32_t connection, uint32_t method, uint32_t command,
-                        uint32_t argument = 0) {
-  const uint32_t request[6] = {command, argument};
-  std::string reply(1 << 20, '\0');
-  size_t size = reply.size();
-  EXPECT_EQ(CallStructMethod(connection, method, request, sizeof request, reply.data(), &size), 0);
-  reply.resize(size);
-  return reply;
-}
-
 #endif
