@@ -28,6 +28,7 @@ void Use(const std::string &way, uint32_t held = 0) {
     const NandExporter before = *row;
     ReleaseIOInterfaces(row);
     EXPECT_TRUE(row->service == before.service && row->connection == before.connection);
+    row->service = row->connection = 0;
   } else if (way == "connect") {
     const uint32_t connection = TolkConnect(&row);
     good = connection != 0;
@@ -51,12 +52,9 @@ void Use(const std::string &way, uint32_t held = 0) {
     ReleaseIOInterfaces(nullptr);
     closeKVRConnection(nullptr);
   }
-  for (NandExporter *each = nand_exporters; each->className != nullptr; ++each) {
-    each->service = each->connection = 0;
-  }
-  const char *found = row->className;
-  std::cout << (good ? "good, " : "failed, ") << (found == nullptr ? "no " : "row ")
-            << (found == nullptr ? "row" : found) << "\n";
+  const std::string found = row->className == nullptr ? "" : row->className;
+  std::cout << (good ? "good, " : "failed, ") << (found.empty() ? "no row" : "row " + found)
+            << "\n";
 }
 
 TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {

@@ -15,19 +15,15 @@ bool endsTransactions = true;
 // questions, and which states it may be set to.
 void Journal(Activity *activity) {
   const int state = GetActivityState(activity);
-  std::fprintf(stderr, "state %d ", state);
-  bool yield = false;
-  for (int question = 0; question < 4; ++question) {
-    const bool answer = ActivityShouldDefer(activity);
-    std::fputc(answer ? 'y' : 'n', stderr);
-    yield = yield || answer;
-  }
-  if (SetActivityState(activity, kActivityStateRun)) std::fputs(" set to run", stderr);
+  std::string seen = "state " + std::to_string(state) + " ";
+  for (int question = 0; question < 4; ++question)
+    seen += ActivityShouldDefer(activity) ? 'y' : 'n';
+  const bool yield = seen.ends_with('y');  // once true, the answer stays true
+  if (SetActivityState(activity, kActivityStateRun)) seen += " set to run";
   if (yield || state != kActivityStateRun) {
-    std::fputs(SetActivityState(activity, kActivityStateDefer) ? " deferred" : " not deferred",
-               stderr);
+    seen += SetActivityState(activity, kActivityStateDefer) ? " deferred" : " not deferred";
   }
-  std::fputs(", ", stderr);
+  std::fputs((seen + ", ").c_str(), stderr);
   if (endsTransactions) ExitTransactionClean();
 }
 
