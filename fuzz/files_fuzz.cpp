@@ -5,7 +5,6 @@
 
 #include <cassert>
 #include <cstdlib>
-#include <optional>
 #include <set>
 #include <sstream>
 #include <vector>
@@ -20,20 +19,8 @@ namespace {
 
 void CheckScenario(std::string_view text) {
   std::string error;
-  const std::optional<simulated::Scenario> scenario =
-      simulated::ParseScenario(text, "folder/file", &error);
-  assert(scenario ? error.empty() : error.starts_with("folder/file:"));
-  if (!scenario) return;
-  for (const simulated::Controller &controller : scenario->controllers) {
-    assert(simulated::RequestMethod(controller.className) != 0);
-    assert(controller.files.size() == simulated::kBuffers.size());
-    for (const auto &[command, files] : controller.files) {
-      for (const std::string &file : files) {
-        assert(file.starts_with('/') || (file.starts_with("folder/") && file.size() > 7));
-        assert(file.find('\0') == std::string::npos);
-      }
-    }
-  }
+  const bool isGood = simulated::ParseScenario(text, "folder/file", &error).has_value();
+  assert(isGood ? error.empty() : error.starts_with("folder/file:"));
 }
 
 // A selection has each column once, and has the names of all its columns.
@@ -63,17 +50,13 @@ void CheckNames(MorwickStream stream, std::string_view text) {
 void CheckList(char end, std::string_view text) {
   if (text.empty() || text.find_first_of("/.-") != std::string_view::npos) return;
   if (end == '\n') text = text.substr(0, text.find('\0'));  // a list of lines ends at a NUL
-  std::vector<std::string> expected;
-  std::istringstream names{std::string(text)};
-  for (std::string name; std::getline(names, name, end);) {
-    if (!name.empty()) expected.push_back(name);
-  }
   std::string copy(text);
   fleet::FileList list({}, fmemopen(copy.data(), copy.size(), "r"), end);
   fleet::ListedFile file;
-  for (const std::string &name : expected) {
-    const bool isThere = list.Next(&file);
-    assert(isThere && file.name == name && file.fault.empty());
+  std::istringstream names(copy);
+  for (std::string name; std::getline(names, name, end);) {
+    const bool isRight = name.empty() || (list.Next(&file) && file.name == name);
+    assert(isRight && file.fault.empty());
   }
   const bool isThere = list.Next(&file);
   assert(!isThere);
