@@ -73,8 +73,8 @@ uint32_t Issue(const std::string &what) {
 
 std::string NameOf(uint32_t handle) {
   const uint32_t number = (handle & ~kHandleBit) / kHandleStep;
-  if (handle == (number == 0 ? 0 : kHandleBit | number * kHandleStep))
-    return std::to_string(number);
+  const bool isIssued = number > 0 && handle == (kHandleBit | number * kHandleStep);
+  if (handle == 0 || isIssued) return std::to_string(number);
   return handle == kLeftover ? "leftover" : "no handle, " + std::to_string(handle);
 }
 

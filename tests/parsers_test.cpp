@@ -55,7 +55,7 @@ TEST(ParsersTest, ReadGoodAndBadStreams) {
     const std::string stream = TakeColumn(columns);
     const std::string seen = "validLbas=1 " + TakeColumn(columns);
     std::vector<size_t> refused = {0};
-    if (const size_t mark = how.find('!'); mark != how.npos) {
+    if (const size_t mark = how.find('!'); mark != std::string::npos) {
       // A message takes one allocation. An entry takes two, for its value and for its name; each is
       // refused once.
       const size_t entry = Number(how.substr(mark + 1));

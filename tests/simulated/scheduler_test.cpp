@@ -36,7 +36,8 @@ TEST(SimulatedSchedulerDeathTest, EndsForABadScenarioOnlyWhereItMay) {
   EXPECT_EXIT(std::exit(static_cast<int>(find())), testing::ExitedWithCode(0), complaint);
   const auto log = [] { SystemLog("%s", "never"); };
   const auto add = [] { RegisterActivity("never", kActivityCheckIn, Journal); };
-  for (void (*const call)() : {+log, +add, RunMainQueue}) {
+  const auto run = [] { RunMainQueue(); };
+  for (void (*const call)() : {+log, +add, +run}) {
     EXPECT_EXIT((call(), std::exit(0)), testing::ExitedWithCode(2), complaint);
     EXPECT_EXIT((find(), call()), testing::ExitedWithCode(2), complaint);
   }

@@ -176,8 +176,7 @@ TEST_P(FullLogTest, NeverWaits) {
   Play("");
   static const int standardError = dup(STDERR_FILENO);
   // NOLINTNEXTLINE(cert-env33-c): the command is a constant
-  static FILE *reader =
-      popen("sleep 0.25; timeout 9 sed -n '2600{p;q}' >&2; kill -ALRM $PPID", "w");
+  static FILE *reader = popen("sleep .25; timeout 9 sed -n '2600{p;q}' >&2; kill -ALRM $PPID", "w");
   dup2(fileno(reader), STDERR_FILENO);
   std::signal(SIGALRM, [](int) { systemLogError = 0; });
   std::atexit([] {  // after the log's own end
