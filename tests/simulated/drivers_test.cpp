@@ -1,6 +1,7 @@
 // The simulated drivers: handles are checked, and only the right requests are answered.
 
 #include <algorithm>
+#include <csignal>
 #include <filesystem>
 
 #include "morwick/morwick.h"
@@ -117,6 +118,18 @@ TEST(SimulatedDriversDeathTest, RefusesAndReportsBadHandles) {
       "connection 2 is already released\nservice 1 is already released\n");
   EXPECT_EXIT(std::exit(Find() == 5 ? 0 : 1), testing::ExitedWithCode(0),
               "service 5 of KVRStorage is still open");
+}
+
+TEST(SimulatedDriversTest, LeavesSignalsToATool) {
+  Play("[[controller]]\nclass = 'KVRStorage'\n");
+  CloseService(Connect());
+  sigset_t blocked;
+  pthread_sigmask(SIG_BLOCK, nullptr, &blocked);
+  for (const int signal : {SIGHUP, SIGINT, SIGTERM, SIGUSR1, SIGPIPE, SIGXFSZ}) {
+    struct sigaction action = {};
+    sigaction(signal, nullptr, &action);
+    EXPECT_TRUE(action.sa_handler == SIG_DFL && sigismember(&blocked, signal) == 0) << signal;
+  }
 }
 
 TEST(SimulatedDriversTest, GivesBuffersToTheCaller) {
