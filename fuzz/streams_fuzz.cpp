@@ -14,16 +14,7 @@ std::string Parse(Kind kind, const char *data, size_t size) {
   const uint64_t result = ParseInto(&contexts, kind, data, size);
   const Entries entries = EntriesOf(contexts, kind);
   assert(entries.sound);
-  if (kind == kKVR) {
-    assert(result <= 1 && contexts.kvr.parseMarker == -1);
-    assert(result == 1 || size < 8 || contexts.kvr.exportVersion == 0);
-  } else if (kind == kArray) {
-    const auto width = static_cast<unsigned char>(data[0]);
-    assert(result == (width <= 8 || size <= width ? 1 : 0));
-    assert(entries.count == (width == 0 || width > 8 ? 0 : (size - 1) / width));
-  } else {
-    assert(result == entries.count);  // memory is never refused here
-  }
+  assert(kind == kKVR || kind == kArray ? result <= 1 : result == entries.count);
   KVRReleaseContext(&contexts.kvr);
   ReleaseGenericParserCxt(&contexts.generic);
   return entries.text + std::to_string(result);

@@ -28,6 +28,7 @@ void Use(const std::string &way, uint32_t held = 0) {
     const NandExporter before = *row;
     ReleaseIOInterfaces(row);
     EXPECT_TRUE(row->service == before.service && row->connection == before.connection);
+    row->service = row->connection = 0;
   } else if (way == "connect") {
     const uint32_t connection = TolkConnect(&row);
     good = connection != 0;
@@ -45,18 +46,15 @@ void Use(const std::string &way, uint32_t held = 0) {
     const fleet::Presence presence = fleet::Probe(*row);
     good = presence.opened;
     std::cout << (presence.present ? "present, " : "absent, ") << presence.result << ", ";
-  } else {
-    FAIL() << "there is no way '" << way << "'";
+  } else if (way == "null") {
+    good = findNandExporter(nullptr) + TolkConnect(nullptr) != 0 ||
+           findNandExporterNew(nullptr) + openKVRConnection(nullptr) != 0;
+    ReleaseIOInterfaces(nullptr);
+    closeKVRConnection(nullptr);
   }
-  for (NandExporter *each = nand_exporters; each->className != nullptr; ++each) {
-    each->service = each->connection = 0;
-  }
-  std::cout << (good ? "good, " : "failed, ");
-  if (row->className == nullptr) {
-    std::cout << "no row\n";
-  } else {
-    std::cout << "row " << row->className << "\n";
-  }
+  const std::string found = row->className == nullptr ? "" : row->className;
+  std::cout << (good ? "good, " : "failed, ") << (found.empty() ? "no row" : "row " + found)
+            << "\n";
 }
 
 TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {
@@ -73,16 +71,6 @@ TEST(ConnectionTest, GivesBackWhatItObtainedWhateverFails) {
   for (const char *way : {"find", "find new", "connect", "open", "probe"}) {
     PlayEveryFailure({{"present", "VeltoQRN3NVMeController KVRStorage"}}, [&] { Use(way); });
   }
-}
-
-TEST(ConnectionTest, PassesOverNullPointers) {
-  const std::string outcome = Play({}, [] {
-    EXPECT_EQ(findNandExporter(nullptr) + TolkConnect(nullptr), 0U);
-    EXPECT_EQ(findNandExporterNew(nullptr) + openKVRConnection(nullptr), 0);
-    ReleaseIOInterfaces(nullptr);
-    closeKVRConnection(nullptr);
-  });
-  EXPECT_EQ(outcome, "");
 }
 
 }  // namespace

@@ -9,34 +9,24 @@
 #include <thread>
 #include <vector>
 
-#include "tests/heap.h"
-#include "tests/stream_notation.h"
+#include "tests/case_file.h"
 
 namespace {
 
 TEST(ErrorMessageTest, KeepsTheFirstWholeMessage) {
-  RefuseAllocation(1);
-  SetAPIErrorMessage("no memory");
-  RefuseAllocation(0);
   const char *none = nullptr;
   SetAPIErrorMessage(none, 7);
-  EXPECT_EQ(TakeMessage(), "NA");
   SetAPIErrorMessage("%s %d", "100%d", 7);
   SetAPIErrorMessage("second");
-  EXPECT_EQ(TakeMessage(), "100%d 7");
-  SetAPIErrorMessage("kept");
   SetAPIErrorMessage(none, 7);
-  EXPECT_EQ(TakeMessage(), "kept");
+  EXPECT_EQ(TakeMessage(), "100%d 7");
   const wchar_t noCharacter[] = {0xd800, 0};
   SetAPIErrorMessage("what came before %ls is there", noCharacter);
   EXPECT_EQ(TakeMessage(), "what came before ");
-  const char *empty = "";
-  SetAPIErrorMessage(empty, 7);
-  SetAPIErrorMessage("an empty message is one, too");
-  EXPECT_EQ(TakeMessage(), "");
-  for (const size_t length : {1022U, 1023U, 1024U, 5000U}) {
+  for (const size_t length : {0U, 1022U, 1023U, 1024U, 5000U}) {
     SetAPIErrorMessage("%s", std::string(length, 'x').c_str());
-    EXPECT_EQ(TakeMessage().size(), length < 1023 ? length : 1023U);
+    SetAPIErrorMessage("an empty message is one, too");
+    EXPECT_EQ(TakeMessage(), std::string(std::min<size_t>(length, 1023), 'x'));
   }
 }
 

@@ -72,11 +72,10 @@ uint32_t Issue(const std::string &what) {
 }
 
 std::string NameOf(uint32_t handle) {
-  const uint32_t number = handle & ~kHandleBit;
-  if (handle == kLeftover) return "leftover";
-  if (handle == 0) return "0";
-  return handle != number && number % kHandleStep == 0 ? std::to_string(number / kHandleStep)
-                                                       : "no handle, " + std::to_string(handle);
+  const uint32_t number = (handle & ~kHandleBit) / kHandleStep;
+  const bool isIssued = number > 0 && handle == (kHandleBit | number * kHandleStep);
+  if (handle == 0 || isIssued) return std::to_string(number);
+  return handle == kLeftover ? "leftover" : "no handle, " + std::to_string(handle);
 }
 
 void Return(uint32_t handle, const std::string &what) {
@@ -101,19 +100,17 @@ std::string Play(const Script &script, const std::function<void()> &body) {
 }
 
 void PlayCases(const std::string &file, const std::function<void(Script &)> &body) {
-  CaseFile cases(file);
-  for (std::string line; cases.Next(&line);) {
-    SCOPED_TRACE(cases.where() + " " + line);
+  ForEachCase(file, [&](std::istringstream &lines) {
     Script script;
-    while (cases.NextRaw(&line) && line != "->") {
+    std::string line, expected;
+    for (std::getline(lines, line); std::getline(lines, line) && line != "->";) {
       const size_t colon = line.find(": ");
       ASSERT_NE(colon, line.npos) << "no key: " << line;
       script[line.substr(0, colon)] = line.substr(colon + 2);
     }
-    std::string expected;
-    while (cases.Peek() != '=' && cases.NextRaw(&line)) expected += line + "\n";
+    while (std::getline(lines, line)) expected += line + "\n";
     EXPECT_EQ(Play(script, [&] { body(script); }), expected);
-  }
+  });
 }
 
 std::vector<std::string> PlayEveryFailure(Script script, const std::function<void()> &body) {
@@ -147,9 +144,8 @@ uint32_t GetMatchingService(MatchingRequest *request) {
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   EXPECT_EQ(platform.openHandles[service], "service");
   const bool fails = Fails("open");
-  *connection = fails                         ? (Lists("failing", "leftover") ? kLeftover : 0)
-                : Lists("failing", "handle0") ? 0
-                                              : Issue("connection");
+  *connection = fails && Lists("failing", "leftover") ? kLeftover : 0;
+  if (!fails && !Lists("failing", "handle0")) *connection = Issue("connection");
   Write("open ", NameOf(service), " type ", type, " = ", NameOf(*connection));
   return Result(fails);
 }

@@ -42,10 +42,8 @@ struct Entries {
 
   template <typename Context>
   explicit Entries(const Context &context) {
-    const ContextNode *name = context.namesHead;
-    const ContextNode *value = context.valuesHead;
-    const ContextNode *lastName = nullptr;
-    const ContextNode *lastValue = nullptr;
+    const ContextNode *name = context.namesHead, *lastName = nullptr;
+    const ContextNode *value = context.valuesHead, *lastValue = nullptr;
     for (; name != nullptr && value != nullptr; name = name->next, value = value->next, ++count) {
       sound = sound && value->text == std::to_string(value->value) && name->value == 0;
       text.append(name->text).append("=").append(value->text).append(" ");

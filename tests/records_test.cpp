@@ -1,12 +1,12 @@
-// The walk over records, the key tables, the summary fields and the check of snapshot headers: what
-// tools ask the library beside its parsers.
+// The walk over records, the key tables, the summary fields, the rounding of capacities and the
+// check of snapshot headers: what tools ask the library beside its parsers.
 
 #include <gtest/gtest.h>
 
 #include <cstring>
 
+#include "tests/case_file.h"
 #include "tests/heap.h"
-#include "tests/stream_notation.h"
 
 namespace {
 
@@ -66,9 +66,12 @@ TEST(RecordsTest, TakesNullPointersAndUnknownStreams) {
   MorwickRecord record = {};
   MorwickStartRecords(nullptr, kMorwickKVR, bytes.data(), bytes.size());
   EXPECT_EQ(MorwickNextRecord(nullptr, &record) + MorwickNextRecord(&reader, nullptr), 0);
-  MorwickStartRecords(&reader, kMorwickMSP, nullptr, 16);
-  EXPECT_EQ(MorwickNextRecord(&reader, &record), 0);
-  EXPECT_TRUE(record.step == kMorwickEndOfBuffer && record.offset == 0);
+  const char *none = nullptr;
+  for (const auto &[stream, buffer] : {std::pair(kMorwickMSP, none), {unknown, bytes.data()}}) {
+    MorwickStartRecords(&reader, stream, buffer, bytes.size());
+    EXPECT_EQ(MorwickNextRecord(&reader, &record), 0);
+    EXPECT_TRUE(record.step == kMorwickEndOfBuffer && record.offset == 0);
+  }
   MorwickStartRecords(&reader, kMorwickKVR, bytes.data(), bytes.size());
   EXPECT_EQ(MorwickNextRecord(&reader, &record), 1);
   EXPECT_EQ(MorwickValue(&record, 0), 9U);
@@ -77,43 +80,43 @@ TEST(RecordsTest, TakesNullPointersAndUnknownStreams) {
   EXPECT_EQ(MorwickValueName(kMorwickKVR, nullptr, 1, 0, name), 0U);
   EXPECT_STREQ(name, "");
   EXPECT_EQ(MorwickValueName(kMorwickKVR, record.key, 1, 0, nullptr), 0U);
-  MorwickStartRecords(&reader, unknown, bytes.data(), bytes.size());
-  EXPECT_EQ(MorwickNextRecord(&reader, &record), 0);
-  EXPECT_TRUE(record.step == kMorwickEndOfBuffer && record.offset == 0);
-  EXPECT_EQ(MorwickKeyCount(unknown), 0U);
-  EXPECT_EQ(MorwickKeyAt(unknown, 0), nullptr);
-  EXPECT_EQ(MorwickFindKey(unknown, "version"), nullptr);
-  EXPECT_EQ(MorwickFindKey(kMorwickKVR, nullptr), nullptr);
 }
 
 TEST(RecordsTest, ListsAndFindsEveryKey) {
-  for (const MorwickStream stream : {kMorwickKVR, kMorwickFTL, kMorwickMSP}) {
+  EXPECT_EQ(MorwickFindKey(kMorwickKVR, nullptr), nullptr);
+  for (int number = kMorwickKVR; number <= kMorwickMSP + 1; ++number) {
+    const auto stream = static_cast<MorwickStream>(number);  // the last one is unknown
     const uint32_t count = MorwickKeyCount(stream);
+    EXPECT_EQ(count == 0, number > kMorwickMSP);
     for (uint32_t i = 0; i < count; ++i) {
-      const MorwickKey *key = MorwickKeyAt(stream, i);
-      EXPECT_EQ(MorwickFindKey(stream, key->name), key);
-      EXPECT_EQ(key->nameLength, std::strlen(key->name));
+      EXPECT_EQ(MorwickFindKey(stream, MorwickKeyAt(stream, i)->name), MorwickKeyAt(stream, i));
     }
     EXPECT_EQ(MorwickKeyAt(stream, count), nullptr);
-    EXPECT_EQ(MorwickFindKey(stream, "versio"), nullptr);
-    EXPECT_EQ(MorwickFindKey(stream, ""), nullptr);
+    for (const char *none : {"", "versio"}) EXPECT_EQ(MorwickFindKey(stream, none), nullptr);
   }
 }
 
 TEST(SummaryTest, ReadsNothingOutsideTheContextAndGoesByTheKey) {
   KVRStatsCxt context;
   std::memset(&context, 0xff, sizeof context);
-  const uint32_t count = MorwickSummaryFieldCount();
-  EXPECT_EQ(MorwickSummaryFieldAt(count), nullptr);
-  for (uint32_t i = 0; i < count; ++i) {
-    const MorwickSummaryField *field = MorwickSummaryFieldAt(i);
+  uint32_t count = 0;
+  while (const MorwickSummaryField *field = MorwickSummaryFieldAt(count++)) {
     EXPECT_NE(MorwickSummaryValue(&context, field, field->valueCount - 1), 0U);
     EXPECT_EQ(MorwickSummaryValue(&context, field, field->valueCount), 0U);
     EXPECT_EQ(MorwickSummaryValue(nullptr, field, 0), 0U);
     const MorwickKey *key = MorwickFindKey(kMorwickKVR, field->name);
     EXPECT_TRUE(key != nullptr && key->id == field->id) << field->name;
   }
+  EXPECT_EQ(MorwickSummaryFieldCount(), count - 1);
   EXPECT_EQ(MorwickSummaryValue(&context, nullptr, 0), 0U);
+}
+
+TEST(CapacityTest, RoundsToSignificantDigits) {
+  ForEachCase("rounding.txt", [](std::istringstream &columns) {
+    uint64_t value, digits, rounded;
+    EXPECT_TRUE(columns >> value >> digits >> rounded);
+    EXPECT_EQ(roundSig(value, digits), rounded);
+  });
 }
 
 // Buffers end where the header ends.

@@ -18,20 +18,8 @@ namespace {
 constexpr auto kFixed = KVRParseSnapshotBuffer;
 constexpr auto kDescribed = KVRParseSnapshotBufferWithInplaceParser;
 
-// The result of a call.
-struct Rendered {
-  uint64_t result;
-  uint64_t size;  // as the call set it
-  std::string text;
-  uint32_t state = 0;
-
-  bool operator==(const Rendered &) const = default;
-};
-
-std::ostream &operator<<(std::ostream &stream, const Rendered &rendered) {
-  return stream << rendered.result << ", size " << rendered.size << ", state " << rendered.state
-                << ", " << rendered.text;
-}
+// The result of a call, the size that it set, the text and the state.
+using Rendered = std::tuple<uint64_t, uint64_t, std::string, uint32_t>;
 
 // One call, with the ends of its buffers watched and the heap counted. In the fixed layout unless
 // there is a header.
@@ -51,18 +39,20 @@ Rendered Render(const std::string &snapshot, uint64_t capacity, const std::strin
   return {result, size, capacity == 0 ? "" : output, state};
 }
 
+std::string TextOf(const Rendered &rendered) { return std::get<std::string>(rendered); }
+
 std::string Bytes(const std::vector<uint32_t> &words) {
   return {reinterpret_cast<const char *>(words.data()), words.size() * 4};
 }
 
 TEST(FixedSnapshotTest, CutsTheTextAtAnyCapacity) {
   const std::string snapshot = Bytes(std::vector<uint32_t>(126, 123456)) + "part of a record";
-  const std::string whole = Render(snapshot, 10000).text;
+  const std::string whole = TextOf(Render(snapshot, 10000));
   EXPECT_TRUE(whole.starts_with("Key: \nT   - Timestamp\n") && whole.ends_with("\n\n"));
   for (uint64_t capacity = 0; capacity <= whole.size() + 1; ++capacity) {
     const bool fits = capacity > whole.size();
     const Rendered expected = {fits ? 1U : 0U, fits ? whole.size() : capacity,
-                               whole.substr(0, std::max<uint64_t>(capacity, 1) - 1)};
+                               whole.substr(0, std::max<uint64_t>(capacity, 1) - 1), 0};
     ASSERT_EQ(Render(snapshot, capacity), expected);
   }
 }
@@ -82,14 +72,11 @@ std::string Header(uint32_t version, uint32_t recordSize, uint32_t recordCount,
 
 const std::string kBanner = "- KVR Snapshot - \nheader text\n";
 
-// Renders one record through the fields, each followed by a line end.
-std::string RenderFields(const std::vector<uint32_t> &record, const Fields &fields) {
-  Fields lines = {{4, 9, 0, 0, ""}};
-  for (const auto &field : fields) lines.insert(lines.end(), {field, {0, 9, 0, 0, "\n"}});
-  const std::string header = Header(6, static_cast<uint32_t>(record.size() * 4), 2, lines);
-  const std::string text = Render(Bytes(record), 5000, header).text;
-  EXPECT_TRUE(text.starts_with(kBanner));
-  return text.substr(kBanner.size());
+// Renders one record through a field and a line end.
+std::string RenderField(const std::vector<uint32_t> &record, const SnapshotFieldDescriptor &field) {
+  const std::string header = Header(6, static_cast<uint32_t>(record.size() * 4), 2,
+                                    {{4, 9, 0, 0, ""}, field, {0, 9, 0, 0, "\n"}});
+  return TextOf(Render(Bytes(record), 5000, header)).substr(kBanner.size());
 }
 
 // Reads a descriptor as cases write it, up to the arrow.
@@ -107,7 +94,7 @@ TEST(DescribedSnapshotTest, PrintsWhatDescriptorsAskFor) {
     std::string text;
     const SnapshotFieldDescriptor field = ReadDescriptor(columns);
     EXPECT_TRUE(columns >> std::quoted(text));
-    EXPECT_EQ(RenderFields({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, {field}), text + "\n\n");
+    EXPECT_EQ(RenderField({1, 23456, 30, 31, 32, 40, 41, 42, 0xffffffff}, field), text + "\n\n");
   });
 }
 
@@ -126,7 +113,7 @@ TEST(DescribedSnapshotTest, PrintsNumbersAsPrintfDoes) {
     format.copy(field.format, sizeof field.format);
     char expected[100];
     std::snprintf(expected, sizeof expected, format.c_str(), value);
-    ASSERT_EQ(RenderFields({1, value}, {field}), std::string(expected) + "\n\n") << format;
+    ASSERT_EQ(RenderField({1, value}, field), std::string(expected) + "\n\n") << format;
   }
 }
 
@@ -162,7 +149,7 @@ Rendered Expected(uint32_t recordSize, uint32_t recordCount, const std::string &
 
 TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
   const std::string records(reinterpret_cast<const char *>(kWords), kSize);
-  const std::string legend = Render("", 1338).text;  // no room for the line end after it
+  const std::string legend = TextOf(Render("", 1338));  // no room for the line end after it
   // A header without its descriptor table, which must not be read when no record is printed.
   const auto bare = [](std::string header) {
     constexpr uint32_t kNowhere = 0xfffffff0;
@@ -178,11 +165,12 @@ TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
         for (uint64_t capacity = first; capacity < first + 150; ++capacity) {
           for (uint32_t call = 0, state = 0; call < 10; ++call) {
             const Rendered expected = Expected(recordSize, recordCount, banner, capacity, state);
-            const bool printsNone = expected.state == state || recordSize < 4;
+            const uint32_t newState = std::get<uint32_t>(expected);
+            const bool printsNone = newState == state || recordSize < 4;
             ASSERT_EQ(Render(records, capacity, printsNone ? bare(header) : header, state),
                       expected)
                 << capacity;
-            state = expected.state;
+            state = newState;
           }
         }
       }
@@ -236,7 +224,7 @@ TEST(DescribedSnapshotTest, ReadsNoDescriptorThatIsNotNeeded) {
   // The 32 bits that tell an empty record must lie in it whole.
   for (const uint32_t offset : {4U, 5U, 7U, 8U}) {
     const std::string header = Header(6, 8, 3, {{4, 9, offset, 0, ""}});
-    EXPECT_EQ(Render("sixteen bytes...", 500, header).text, offset == 4 ? kBanner + "\n\n" : "");
+    EXPECT_EQ(TextOf(Render("sixteen bytes...", 500, header)), offset == 4 ? kBanner + "\n\n" : "");
   }
   // When no record is printed, only the first descriptor is read.
   bare[52] = 9;
@@ -263,21 +251,17 @@ std::string FieldsOf(const std::string &header) {
 }
 
 TEST(SnapshotFieldsTest, ReadsDescriptorsAndGivesNamesThatDiffer) {
-  CaseFile cases("fields.txt");
-  for (std::string line, field; cases.Next(&line);) {
-    SCOPED_TRACE(cases.where());
+  ForEachCase("fields.txt", [](std::istringstream &lines) {
+    std::string line, expected;
+    std::getline(lines, line);
     const auto recordSize = static_cast<uint32_t>(Number(line.substr(line.rfind(' ') + 1)));
     Fields fields;
-    std::string expected;
-    while (cases.Peek() != '=' && cases.NextRaw(&line)) {
-      std::istringstream columns(line);
-      columns.unsetf(std::ios::dec);  // hexadecimal numbers too
-      fields.push_back(ReadDescriptor(columns));
-      std::getline(columns >> std::ws, field);
-      expected += field + "\n";
+    for (; lines.peek() != EOF; expected += line + "\n") {
+      fields.push_back(ReadDescriptor(lines));
+      std::getline(lines >> std::ws, line);
     }
     EXPECT_EQ(FieldsOf(Header(6, recordSize, 9, fields)), expected);
-  }
+  });
 }
 
 }  // namespace

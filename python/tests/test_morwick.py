@@ -138,6 +138,8 @@ def test_table_takes_what_the_command_takes(tmp_path):
         assert table.files == [f"{tmp_path}/a\udcff", f"{tmp_path}/b"]
         assert [table[name].tolist() for name in table] == [[123456789, None], [918273645, None]]
         assert table.faults[0] is None and "offset 16" in table.faults[1]
+    code = "import morwick, os; print(morwick.table('-', names='hostReads')['hostReads'], os.path.sameopenfile(0, 3))"
+    assert run("bash", "-c", f"exec 3< {SOURCE}/examples/kvr.bin; {sys.executable} -c \"{code}\" <&3 2>&1").stdout == "[918273645] True\n"
     assert morwick.table([]).files == []
     assert "No such file" in morwick.table("missing").faults[0]
 
@@ -150,7 +152,8 @@ CSV_ORDER = """timestamp erasedBands hostReads hostWrites nandReads nandWrites h
 
 def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
     draw = random.Random(3)
-    odd = HEADER.replace(b" E=", b"\xff\xc3=")  # no UTF-8, and three priorities
+    # No UTF-8, a field of text alone, and three priorities.
+    odd = HEADER.replace(b" E=", b"\xff\xc3=").replace(b" P=%2u", b" P=-2u")
     odd = odd.replace(struct.pack("<II", 56, 48), struct.pack("<II", 56, 36))
     (tmp_path / "header").write_bytes(odd)
     for number in range(2 if SANITIZED else 20):
@@ -305,6 +308,7 @@ def test_progress_and_an_interrupt_end_the_reading(tmp_path):
     with pytest.raises(ZeroDivisionError):
         morwick.table([SOURCE / "examples"] * 50, progress=lambda dumps, faults: 1 / 0)
     os.mkfifo(tmp_path / "pipe")
+    signal.signal(signal.SIGINT, signal.default_int_handler)  # a job in the background ignores it
     signal.alarm(60)  # ends what no interrupt ends
     seen, threads = [], lambda: len(os.listdir("/proc/self/task"))
     for progress in None, lambda *now: seen.append((*now, threads() - before)):

@@ -17,7 +17,6 @@ constexpr int32_t kBadHandle = 0x101;
 constexpr int32_t kBadArgument = 0x102;
 constexpr int32_t kRefused = static_cast<int32_t>(0xE0000103);
 constexpr int32_t kDeviceError = static_cast<int32_t>(0xE0000104);
-constexpr int32_t kNotOffered = 0x105;
 
 // Makes a file in memory, and returns its name in the folder of the scenario, /proc/self/fd.
 inline std::string File(const std::string &text) {
@@ -42,16 +41,6 @@ inline uint32_t Connect(const char *className = "KVRStorage") {
   EXPECT_EQ(OpenService(service, 0, &connection), 0);
   EXPECT_EQ(ReleaseObject(service), 0);
   return connection;
-}
-
-inline std::string Read(uint32_t connection, uint32_t method, uint32_t command,
-                        uint32_t argument = 0) {
-  const uint32_t request[6] = {command, argument};
-  std::string reply(1 << 20, '\0');
-  size_t size = reply.size();
-  EXPECT_EQ(CallStructMethod(connection, method, request, sizeof request, reply.data(), &size), 0);
-  reply.resize(size);
-  return reply;
 }
 
 #endif
