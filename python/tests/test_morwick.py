@@ -305,12 +305,15 @@ def test_long_work_lets_other_threads_run():
 
 
 def test_progress_and_an_interrupt_end_the_reading(tmp_path):
+    seen, threads = [], lambda: len(os.listdir("/proc/self/task"))
+    signal.alarm(60)  # ends what no interrupt ends
+    before = threads()
     with pytest.raises(ZeroDivisionError):
-        morwick.table([SOURCE / "examples"] * 50, progress=lambda dumps, faults: 1 / 0)
+        morwick.table([SOURCE / "examples"] * 500, progress=lambda dumps, faults: 1 / 0)
+    while threads() > before:
+        os.sched_yield()
     os.mkfifo(tmp_path / "pipe")
     signal.signal(signal.SIGINT, signal.default_int_handler)  # a job in the background ignores it
-    signal.alarm(60)  # ends what no interrupt ends
-    seen, threads = [], lambda: len(os.listdir("/proc/self/task"))
     for progress in None, lambda *now: seen.append((*now, threads() - before)):
         before = threads()
         threading.Timer(0.5, lambda: os.kill(os.getpid(), signal.SIGINT)).start()
