@@ -38,14 +38,10 @@ abidiff "$tests/morwick.abi" "$work/now.abi" || {
   exit 1
 }
 
-breaks=0
 while IFS='|' read -r header edit; do
-  [[ $header == [a-z]* ]] || continue
-  rm -rf "$work/include"
-  cp -r "$1" "$work/include"
+  cp -rT "$1" "$work/include"
   sed -i -E "$edit" "$work/include/morwick/${header% }"
   describe "$work/include" "$work/broken.abi"
   ! abidiff "$tests/morwick.abi" "$work/broken.abi" >/dev/null || { echo "not noticed, or changes nothing: $edit"; exit 1; }
-  breaks=$((breaks + 1))
-done <"$tests/cases/abi_breaks.txt"
-echo "the interface is as it was, and $breaks breaks of it were noticed"
+done < <(grep '^[a-z]' "$tests/cases/abi_breaks.txt")
+echo "the interface is as it was, and every break of it was noticed"

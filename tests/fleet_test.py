@@ -44,21 +44,15 @@ def wait_for(condition):
     raise TimeoutError
 
 
-def write_to(pipe, data):
-    try:
-        writer = os.open(pipe, os.O_WRONLY | os.O_NONBLOCK)
-    except OSError:  # nobody reads there yet
-        return False
-    with open(writer, "wb") as file:
-        return file.write(data)
-
-
 def start(*words):
     words += "--host", "127.0.0.1", "--dashboard-address", "127.0.0.1:0", "--scheduler-file", "scheduler.json"
-    return subprocess.Popen([sys.executable, "-m", "dask", *words], cwd="cluster", stdout=log, stderr=log)
+    process = subprocess.Popen([sys.executable, "-m", "dask", *words], cwd="cluster", stdout=sys.stderr)
+    at_end.callback(process.wait)
+    at_end.callback(process.kill)  # first
+    return process
 
 
-with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, open(work + "/log", "w+") as log:
+with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, contextlib.ExitStack() as at_end:
     os.chdir(work)
     os.mkdir("cluster")  # from which nobody can import what is here
     subprocess.run([sys.executable, source + "/examples/make_fleet.py", "fleet"], check=True)
@@ -70,60 +64,51 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, ope
                            capture_output=True, text=True).stdout
     rows = list(csv.reader(io.StringIO(table)))[1:]
     assert [row[0] for row in rows] == files and sum(row[1] != "" for row in rows) == 3
-    processes = [start("scheduler", "--port", "0")]
-    try:
-        processes += [start("worker", "--no-nanny", "--nthreads", "1") for _ in range(2)]
-        with Client(scheduler_file="cluster/scheduler.json") as client:
-            client.wait_for_workers(2, timeout=60)
-            scheduler = client.scheduler.address
+    start("scheduler", "--port", "0")
+    workers = [start("worker", "--no-nanny", "--nthreads", "1") for _ in range(2)]
+    with Client(scheduler_file="cluster/scheduler.json") as client:
+        client.wait_for_workers(2, timeout=60)
+        scheduler = client.scheduler.address
 
-            screen = subprocess.run(
-                [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # may be silent for 60 s
-                 sys.executable, source + "/examples/fleet.py", work + "/fleet", "--scheduler", scheduler],
-                capture_output=True, text=True).stdout.splitlines()
-            assert screen[0].startswith("reading: 100%|█") and "10/10" in screen[0], screen
-            assert screen[1:4] == [f"fleet.py: {row[0]}: {row[1]}" for row in rows if row[1]], screen
-            assert [line.split() for line in screen[5:16]] == [
-                [file, f"{amplification:.3f}", str(bad)] for file, amplification, bad in ten_of(rows)
-            ] + [[]], screen
-            assert screen[-1].endswith("status 1"), screen
-            assert pathlib.Path("fleet.png").read_bytes().startswith(b"\x89PNG")
+        screen = subprocess.run(
+            [sys.executable, source + "/tests/terminal.py", "30", "250", "CONT@60",  # may be silent for 60 s
+             sys.executable, source + "/examples/fleet.py", work + "/fleet", "--scheduler", scheduler],
+            capture_output=True, text=True).stdout.splitlines()
+        assert screen[0].startswith("reading: 100%|█") and "10/10" in screen[0], screen
+        assert screen[1:4] == [f"fleet.py: {row[0]}: {row[1]}" for row in rows if row[1]], screen
+        assert [line.split() for line in screen[5:16]] == [
+            [file, f"{amplification:.3f}", str(bad)] for file, amplification, bad in ten_of(rows)
+        ] + [[]], screen
+        assert screen[-1].endswith("status 1"), screen
+        assert pathlib.Path("fleet.png").read_bytes().startswith(b"\x89PNG")
 
-            # The script that docs/archive.md shows, without the cluster and on it.
-            page = pathlib.Path(source + "/docs/archive.md").read_text()
-            lines = textwrap.dedent(re.search("    import glob.*?\n(?=[^ \n])", page, re.DOTALL)[0])
-            lines = lines.replace("/var/lib/dumps", work + "/fleet")
-            highest = sorted((row for row in rows if not row[1] and row[3] and row[2].strip("0")),
-                             key=lambda row: -int(row[3]) / int(row[2]))[:10]
-            for script in lines, lines.replace("processes=False", repr(scheduler)):
-                with contextlib.redirect_stdout(io.StringIO()) as printed:
-                    exec(script, names := {})
-                names["client"].close()
-                shown = [line.split()[0] for line in printed.getvalue().splitlines()[1:]]
-                assert shown == [row[0] for row in highest], shown
+        # The script that docs/archive.md shows, without the cluster and on it.
+        page = pathlib.Path(source + "/docs/archive.md").read_text()
+        lines = textwrap.dedent(re.search("    import glob.*?\n(?=[^ \n])", page, re.DOTALL)[0])
+        lines = lines.replace("/var/lib/dumps", work + "/fleet")
+        highest = sorted((row for row in rows if not row[1] and row[3] and row[2].strip("0")),
+                         key=lambda row: -int(row[3]) / int(row[2]))[:10]
+        for script in lines, lines.replace("processes=False", repr(scheduler)):
+            with contextlib.redirect_stdout(io.StringIO()) as printed:
+                exec(script, names := {})
+            names["client"].close()
+            shown = [line.split()[0] for line in printed.getvalue().splitlines()[1:]]
+            assert shown == [row[0] for row in highest], shown
 
-            # One dump is a pipe. The worker that comes to it waits there, and is killed.
-            pipe = work + "/pipe"
-            os.mkfifo(pipe)
-            wait_for(lambda: not any(client.has_what().values()))  # no results of earlier scripts
-            read = threads.submit(fleet.read, files[:1100] + [pipe] + files[1100:], scheduler)
-            wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
-            [waiting] = [worker for worker, parts in client.processing().items() if parts]
-            assert client.has_what()[waiting], "no part that it has read would be lost with it"
-            pid = client.run(os.getpid, workers=[waiting])[waiting]
-            [process] = [process for process in processes if process.pid == pid]
-            process.kill()
-            process.wait()
-            wait_for(lambda: write_to(pipe, strange_dumps[1111]))
-            assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
-            assert len(client.scheduler_info()["workers"]) == 1
-        assert as_rows(fleet.read(files)) == rows, "without a cluster"
-    except BaseException:
-        log.seek(0)
-        print(log.read(), file=sys.stderr)
-        raise
-    finally:
-        for process in processes:
-            process.kill()
-            process.wait()
+        # One dump is a pipe. The worker that comes to it waits there, and is killed.
+        pipe = work + "/pipe"
+        os.mkfifo(pipe)
+        wait_for(lambda: not any(client.has_what().values()))  # no results of earlier scripts
+        read = threads.submit(fleet.read, files[:1100] + [pipe] + files[1100:], scheduler)
+        wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
+        [waiting] = [worker for worker, parts in client.processing().items() if parts]
+        assert client.has_what()[waiting], "no part that it has read would be lost with it"
+        pid = client.run(os.getpid, workers=[waiting])[waiting]
+        [process] = [process for process in workers if process.pid == pid]
+        process.kill()
+        process.wait()
+        threads.submit(pathlib.Path(pipe).write_bytes, strange_dumps[1111])  # waits for a reader
+        assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
+        assert len(client.scheduler_info()["workers"]) == 1
+    assert as_rows(fleet.read(files)) == rows, "without a cluster"
 print("2,000 dumps agree")

@@ -1,6 +1,6 @@
 """Plays each fault of tests/cases/outcomes.txt with each command, compares the outcomes with those in the file,
 whose top explains them, and fails with the difference. SESSION_UPDATE=yes in the environment updates the file."""
-import difflib, json, jsonschema, os, re, struct, subprocess, sys, tempfile
+import difflib, json, jsonschema, os, re, shutil, struct, subprocess, sys, tempfile
 from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
 
@@ -17,14 +17,13 @@ def run(kind, fault, command):
     shell = ["bash", "-o", "pipefail", "-c", fault if kind == "output" else '"$@"', "bash", os.environ["MORWICK"]]
     done = subprocess.run(shell + command.replace("FILE", fault).split(), capture_output=True,
                           errors="replace", env=ENVIRONMENT, timeout=60)
-    status = done.returncode if done.returncode >= 0 else 128 - done.returncode
     said = re.sub("^Morwick: .*\n|^morwick: ", "", done.stderr, flags=re.M).splitlines()
     if command.endswith("json") and kind != "output":
         objects = [json.loads(line) for line in done.stdout.splitlines()]
         assert all(map(SCHEMA.is_valid, objects)), done.stdout
         assert said == [each["text"] for one in objects for each in one["messages"]], (command, said)
-        assert status == max(one["status"] for one in objects), (command, status)
-    return status, said, " ".join(map("".join, EXPOSED.findall(done.stdout)))
+        assert done.returncode == max(one["status"] for one in objects), (command, done.returncode)
+    return done.returncode, said, " ".join(map("".join, EXPOSED.findall(done.stdout)))
 
 
 def outcome(kind, fault, commands):
@@ -49,8 +48,7 @@ expected = CASES.read_text().splitlines()
 played = []
 with tempfile.TemporaryDirectory() as folder:
     os.chdir(folder)
-    for each in SOURCE.glob("examples/*.bin"):
-        Path(each.name).write_bytes(each.read_bytes())
+    shutil.copytree(SOURCE / "examples", ".", dirs_exist_ok=True)
     ftl = Path("ftl.bin").read_bytes()
     for name, content in {"empty": b"", "cut": ftl[:20], "mismatched": struct.pack("<4I", 14, 1, 5, 0),
                           "surplus": ftl + struct.pack("<4I", 0xffff, 1, 0, 0) + b"\n",

@@ -30,27 +30,17 @@ morwick() {
   case " $* " in *" json "*) ;; *) "$MORWICK" "$@"; return ;; esac
   "$MORWICK" "$@" >object 2>errors
   local status=$?
-  cat object >>objects
-  cat errors >>complaints
-  cat errors >&2
-  cat object
+  tee -a complaints <errors >&2
+  tee -a objects <object
   return $status
 }
 grellon() { "$GRELLON" "$@"; }
 scenario() { printf %b "$1" >scenario.toml && export GRELLON_SCENARIO=scenario.toml; }
 # The 32-bit little-endian numbers, one after the other.
-le32() {
-  for n; do
-    printf %b "$(printf '\\x%02x' $((n & 255)) $((n >> 8 & 255)) $((n >> 16 & 255)) $((n >> 24 & 255)))"
-  done
-}
+le32() { perl -e 'print pack "V*", map { /^0x/ ? hex : $_ } @ARGV' -- "$@"; }
 # A snapshot header: record size, number of fields. Then each of its fields: kind, offset, size, text.
 layout() { le32 0 6 "$1" 5 0 0 40 0 0 0 "$2" 0; }
-field() {
-  le32 "$1" "$2" "$3"
-  printf %s "$4"
-  head -c $((16 - ${#4})) /dev/zero
-}
+field() { perl -e 'print pack "V3 a16", @ARGV' -- "$@"; }
 
 # Waits, for 20 seconds at most, until a command succeeds.
 await() {
@@ -92,10 +82,6 @@ command=
 [ "${SESSION_UPDATE:-}" = yes ] && cp played "$session"
 diff -U6 -F '^\$ ' --label expected --label played "$session" played || exit 1
 ! grep -s -e "still open" -e "already released" complaints || exit 1
-[ ! -s objects ] || /usr/bin/python3 - "$SOURCE/docs/morwick.schema.json" objects <<END || exit 1
-import json, jsonschema, sys
-validator = jsonschema.Draft202012Validator(json.load(open(sys.argv[1])))
-for line in open(sys.argv[2]):
-    validator.validate(json.loads(line))
-END
+[ ! -s objects ] || { split -a 5 -l 1 objects object. && printf -- '-i%s\n' object.* |
+  xargs /usr/bin/python3 -m jsonschema "$SOURCE/docs/morwick.schema.json"; } || exit 1
 echo "as expected"

@@ -11,14 +11,12 @@ assert [row[0] for row in rows] == files, "a row for each file, in their order"
 errors = []
 for row in rows:
     stats = run("stats", "-s", stream, "-o", "csv", "--", row[0])
-    values = dict(csv.reader(io.StringIO(stats.stdout)))  # the last one of a name
-    values.pop("name", None)
+    values = dict([*csv.reader(io.StringIO(stats.stdout))][1:])  # the last one of a name
     expected = [values.pop(name, "") for name in heading[2:]]
     assert expected == row[2:], [(n, e, v) for n, e, v in zip(heading[2:], expected, row[2:]) if e != v]
     # One value of an array is named like the array, and has no column; the fault tells.
     assert not values or (row[1] and all(name + "0" in heading for name in values)), values
-    faults = [line.removeprefix(f"morwick: {row[0]}: ") for line in stats.stderr.splitlines()]
-    faults = [fault for fault in faults if "the end record" not in fault]
+    faults = [line.removeprefix(f"morwick: {row[0]}: ") for line in stats.stderr.splitlines() if "the end record" not in line]
     assert row[1] == "; ".join(faults), (row[1], faults)
     assert (stats.returncode == 0) == (row[1] == "")
     errors += [f"morwick: {row[0]}: {row[1]}"] if row[1] else []

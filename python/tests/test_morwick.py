@@ -120,14 +120,11 @@ def test_table_is_that_of_the_command(dumps, stream, names):
     assert table.faults == [morwick.parse(pathlib.Path(file).read_bytes(), stream).fault for file in table.files]
     assert seen[-1] == (len(rows), sum(fault is not None for fault in table.faults))
     again = pickle.loads(pickle.dumps(table))
-    assert all((again[name].filled(7) == table[name].filled(7)).all() for name in list(table)[:9])
+    assert all(again[name].dtype == np.uint64 and (again[name].filled(7) == table[name].filled(7)).all() for name in table)
     assert repr(table) == f"<morwick.Table of {len(rows)} files: {len(heading) - 2} columns>"
     frame = table.to_pandas()
-    assert list(frame) == ["file", "fault", *table]
-    assert frame["file"].tolist() == table.files and frame["fault"].tolist() == table.faults
-    for name in [*table][-9:]:
-        assert str(frame[name].dtype) == "UInt64" and table[name].dtype == np.uint64
-        assert frame[name].astype(object).where(frame[name].notna(), None).tolist() == table[name].tolist()
+    assert frame["fault"].tolist() == table.faults and {*map(str, frame.dtypes[2:])} == {"UInt64"}
+    assert frame.to_csv(index=False).splitlines() == lines.decode().splitlines()
 
 
 def test_table_takes_what_the_command_takes(tmp_path):
