@@ -66,11 +66,43 @@ struct FixedTypes {
   }
 };
 
+py::dtype MakeType(const py::list &names, const py::list &types, const py::list &offsets,
+                   uint64_t size) {
+  py::dtype type(names, types, offsets, static_cast<py::ssize_t>(size));
+  // Where NumPy is refused memory while it looks for the offsets or the size, it makes up its own.
+  const py::object fields = type.attr("fields");
+  for (size_t i = 0; i < names.size(); ++i) {
+    const py::object offset = fields[names[i]][py::int_(1)];
+    if (!offset.equal(offsets[i])) throw std::bad_alloc();
+  }
+  if (static_cast<uint64_t>(type.itemsize()) != size) throw std::bad_alloc();
+  return type;
+}
+
+// A type of records for a caller, who may give the fields other names.
+py::dtype CopyOf(const py::object &type) {
+  const py::list names(type.attr("names"));
+  py::list types;
+  py::list offsets;
+  for (const py::handle name : names) {
+    const py::tuple field = type.attr("fields")[name];
+    const py::object array = field[0].attr("subdtype");
+    if (array.is_none()) {
+      types.append(field[0]);
+    } else {
+      const py::tuple parts = array;
+      types.append(py::make_tuple(CopyOf(parts[0]), parts[1]));
+    }
+    offsets.append(field[1]);
+  }
+  return MakeType(names, types, offsets, type.attr("itemsize").cast<uint64_t>());
+}
+
 // NumPy's type of the records that a header describes. The priorities of a field are a sub-array,
 // which is named by the label of their counts.
 py::object DescribedType(const Layout &layout) {
   const py::object number = py::dtype("<u4");
-  const py::object &operations = FixedTypes::Get().operations;
+  const py::object operations = CopyOf(FixedTypes::Get().operations);
   py::list names;
   py::list types;
   py::list offsets;
@@ -87,22 +119,15 @@ py::object DescribedType(const Layout &layout) {
       types.append(number);
     }
   }
-  const py::dtype type(names, types, offsets, static_cast<py::ssize_t>(layout.recordSize));
-  // Where NumPy is refused memory while it looks for the offsets or the size, it makes up its own.
-  const py::object fields = type.attr("fields");
-  for (size_t i = 0; i < names.size(); ++i) {
-    const py::object offset = fields[names[i]][py::int_(1)];
-    if (!offset.equal(offsets[i])) throw std::bad_alloc();
-  }
-  if (static_cast<uint64_t>(type.itemsize()) != layout.recordSize) throw std::bad_alloc();
-  return type;
+  return MakeType(names, types, offsets, layout.recordSize);
 }
 
 // An array of the records over the buffer itself.
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
   const size_t count = layout.RecordsOf(Buffer(data, "data").bytes()).size() / layout.recordSize;
-  const py::object type = layout.isFixed ? FixedTypes::Get().record : DescribedType(layout);
+  const py::object type =
+      layout.isFixed ? CopyOf(FixedTypes::Get().record) : DescribedType(layout);
   return py::module_::import("numpy").attr("frombuffer")(data, type, count);
 }
 

@@ -5,9 +5,17 @@ import json, os, sys, textwrap
 from test_morwick import COMMAND, SOURCE, run
 
 
+PREFACE = """
+import concurrent.futures, mmap, morwick, pickle, threading
+try: mmap.mmap(-1, 1 << 62)
+except OSError: pass
+"""
+
+
 def play(scenario, code):
-    """What the code prints in a fresh interpreter, with the platform's complaints about open handles."""
-    played = run("timeout", "60", sys.executable, "-c", "import concurrent.futures, morwick, pickle, threading\n" + textwrap.dedent(code),
+    """What the code prints in a fresh interpreter, with the platform's complaints about open handles. Something
+    else was refused memory before, which errno still tells."""
+    played = run("timeout", "60", sys.executable, "-c", PREFACE + textwrap.dedent(code),
                  GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios" / scenario))  # fmt: skip
     return played.stdout + played.stderr
 
@@ -38,8 +46,8 @@ def test_controllers_are_read_and_given_back(tmp_path):
             except morwick.ControllerError as error: print(same := pickle.loads(pickle.dumps(error)), same.result)
         """
     (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\nsnapshot_header = '/'\n")
-    refused, unread = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder)]
-    assert refused[1:] == ["KVRStorage: the controller is not present None",
+    refused, unread, none = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder, "empty.toml")]
+    assert [none[0], *refused[1:]] == ["no controller is present None", "KVRStorage: the controller is not present None",
                            "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
     absent = "VeltoQRN3NVMeController"  # although a later class is present
     assert f"{absent}: the controller is not present" in play("fails.toml", f"morwick.Controller('{absent}')")

@@ -7,9 +7,10 @@ import pytest
 from test_morwick import SANITIZED, SOURCE, run
 
 WORK = """
-import ctypes, os, sys, morwick
+import ctypes, os, sys, numpy, morwick
 examples = sys.argv[1] + "/examples/"
 data, header, kvr = [open(examples + name + ".bin", "rb").read() for name in ("snapshot", "snapshot_header", "kvr")]
+words = numpy.frombuffer(data, "u4")
 def read():
     with morwick.Controller() as c: return c.read("snapshot")
 def table():
@@ -19,7 +20,7 @@ calls = [lambda: dict(morwick.parse(bytearray(kvr)).items()), lambda: morwick.pa
          lambda: morwick.parse(kvr).summary, lambda: morwick.parse(kvr[:100] + b"1").fault,
          lambda: morwick.parse(kvr)["readCountHisto"], lambda: morwick.keys("msp"),
          lambda: morwick.snapshot(data), lambda: morwick.snapshot(data, header),
-         lambda: morwick.render(data), lambda: morwick.render(data, header), morwick.controllers, read, table]
+         lambda: morwick.render(words), lambda: morwick.render(data, header), morwick.controllers, read, table]
 for call in calls * 3: call()
 """
 REFUSE = """
@@ -28,7 +29,7 @@ for call in calls:
     good = repr(call())
     for number in range(1, 100000):
         try: refuse(number); result = call(); error = None
-        except (MemoryError, morwick.ControllerError) as raised: error = raised  # the driver's own
+        except (MemoryError, morwick.ControllerError) as raised: error = raised; assert getattr(error, "result", 0) is not None  # the driver's own
         except ValueError as raised: error = raised; assert "tuple" in str(raised)  # NumPy's own, of a type
         if refuse(0) < number: break
         assert error or repr(result) == good or "result=262" in repr(result), (call, number)  # the driver was refused
@@ -40,9 +41,9 @@ class Heap(ctypes.Structure): _fields_ = [(name, ctypes.c_size_t) for name in "a
 heap = ctypes.CDLL(None).mallinfo2; heap.restype = Heap  # e (hblkhd) and h (uordblks) are the bytes in use
 def grow():
     before = heap()
-    for call in calls * 100: call()
+    for call in calls * 100: call(); morwick.parse(b"").get("x" * len(kvr))
     now = heap(); return now.h + now.e - before.h - before.e
-grow(); grown = grow(); assert grown < 40000, grown  # the first call fills caches
+grow(); grow(); grown = grow(); assert grown < 40000, grown  # the first calls fill caches
 """
 
 

@@ -62,8 +62,9 @@ def dumps(tmp_path_factory):
 
 
 def plain(items):
-    """Arrays as lists; one of another type than uint64 stays, and can be equal to no list."""
-    return [(name, value.tolist() if isinstance(value, np.ndarray) and value.dtype == np.uint64 else value)
+    """Arrays as lists; one of another type than uint64 stays, and can be equal to no list. The arrays
+    are filled with another number, which nobody else sees."""
+    return [(name, (value.tolist(), value.fill(7))[0] if isinstance(value, np.ndarray) and value.dtype == np.uint64 else value)
             for name, value in items]  # fmt: skip
 
 
@@ -138,8 +139,8 @@ def test_table_takes_what_the_command_takes(tmp_path):
         assert table.files == [f"{tmp_path}/a\udcff", f"{tmp_path}/b"]
         assert [table[name].tolist() for name in table] == [[123456789, None], [918273645, None]]
         assert table.faults[0] is None and "offset 16" in table.faults[1]
-    code = "import morwick, os; print(morwick.table('-', names='hostReads')['hostReads'], os.path.sameopenfile(0, 3))"
-    assert run("bash", "-c", f"exec 3< {SOURCE}/examples/kvr.bin; {sys.executable} -c \"{code}\" <&3 2>&1").stdout == "[918273645] True\n"
+    code = "import morwick, os, sys; print(morwick.table('-', names='readCountHisto')['readCountHisto1'], os.path.sameopenfile(0, 3), 'pandas' in sys.modules)"
+    assert run("bash", "-c", f"exec 3< {SOURCE}/examples/kvr.bin; {sys.executable} -c \"{code}\" <&3 2>&1").stdout == "[80] True False\n"
     assert morwick.table([]).files == []
     assert "No such file" in morwick.table("missing").faults[0]
 
@@ -163,6 +164,8 @@ def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
         for header, words in (None, []), (odd, ["--header", tmp_path / "header"]):
             assert os.fsencode(morwick.render(data, header)) == command("snapshot", *words, tmp_path / "data")
             heading, *rows = os.fsdecode(command("snapshot", "-o", "csv", *words, tmp_path / "data")).splitlines()
+            other = morwick.snapshot(data, header).dtype  # whose names are the caller's own
+            other["RO" if header else "reads"].base.names, other.names = [*"cba"], [*map(str, range(len(other)))]
             records = morwick.snapshot(data, header)
             names = CSV_ORDER if header is None else records.dtype.names
             columns = []
@@ -187,7 +190,7 @@ def test_any_header_is_refused_or_describes_what_is_there(changes, tail):
         header[place] = value
     data = SNAPSHOT[:2000] + tail
     try:
-        records = morwick.snapshot(data, header)
+        records = morwick.snapshot(data, memoryview(header[::-1])[::-1])
     except ValueError as error:
         with pytest.raises(ValueError, match="^header: ") as refused:
             morwick.render(data, header)
@@ -210,9 +213,9 @@ def test_views_keep_their_buffers():
         resize(data)
     assert not morwick.snapshot(SNAPSHOT).flags.writeable
     changed = bytearray(KVR)
-    statistics = morwick.parse(changed)
+    statistics = morwick.Statistics(changed)
     changed.clear()
-    assert statistics["hostReads"] == 918273645 and statistics.entries[0] == ("exportVersion", 7)
+    assert statistics.summary["hostReads"] == 918273645 and statistics.entries[0] == ("exportVersion", 7)
     assert statistics == statistics and len({statistics, morwick.parse(KVR), morwick.table([])}) == 3
     number = struct.unpack_from("<I", KVR, KVR.index(struct.pack("<Q", 918273645)) - 8)[0]
     assert (number, "hostReads", 1) in morwick.keys("kvr") == sorted(morwick.keys("kvr"))
@@ -220,7 +223,8 @@ def test_views_keep_their_buffers():
 
 def test_buffers_of_any_shape_are_read():
     words, Record = np.frombuffer(KVR, "u4").reshape(4, -1), type("R", (ctypes.Structure,), {"_fields_": [("z", ctypes.c_int)]})
-    for data in np.frombuffer(KVR, bool), words, np.asfortranarray(words), (Record * words.size).from_buffer_copy(KVR):
+    mixed = memoryview(np.frombuffer(KVR, "?,b,B,>h,H,i,I,q,Q,e,f,d,g,S1,(2,3)<u2,V182"))
+    for data in mixed, memoryview(KVR).cast("c"), words, np.asfortranarray(words), (Record * words.size).from_buffer_copy(KVR):
         assert morwick.parse(data).entries == morwick.parse(KVR).entries
     assert len(morwick.snapshot(SNAPSHOT, HEADER.ljust(1 << 20))) == 120
     assert len(morwick.snapshot(SNAPSHOT, HEADER[:12] + bytes(4) + HEADER[16:])) == 0  # the last record that a header counts is not printed
@@ -232,18 +236,19 @@ def test_buffers_of_any_shape_are_read():
 
 HUGE = np.lib.stride_tricks.as_strided(np.zeros(1, np.uint64), (1 << 29,), (0,))  # 4 GiB that take 8 bytes
 WIDE = struct.pack("<9IQ", 0, 6, 252, 9, 0, 0, 36, 0, 0, 1025) + struct.pack("<4sII16s", b"", 0, 4, b"%u") * 1025
+POINTERS = ctypes.c_char_p, ctypes.c_void_p, ctypes.POINTER(ctypes.c_int), ctypes.CFUNCTYPE(None)
 OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
 
 
 @pytest.mark.parametrize("error, words, calls", [
-    (TypeError, "data must be an object with a buffer, not ",
-     [lambda: morwick.parse("text"), lambda: morwick.snapshot(7), lambda: morwick.render([])]),
-    (TypeError, "header must be an object with", [lambda: morwick.snapshot(b"", 7), lambda: morwick.render(b"", "")]),
+    (TypeError, "data must be an object with a buffer, not str",
+     [lambda: morwick.parse("text"), lambda: morwick.snapshot("7"), lambda: morwick.render("")]),
+    (TypeError, "header must be an object with a buffer, not int", [lambda: morwick.snapshot(b"", 7), lambda: morwick.render(b"", 0)]),
     (TypeError, "data must hold numbers or bytes, not items of the format O",
      [lambda: morwick.parse(OBJECTS), lambda: morwick.snapshot(OBJECTS), lambda: morwick.render(OBJECTS)]),
-    (TypeError, "data must hold", [lambda: morwick.snapshot(MIXED), lambda: morwick.parse((ctypes.c_char_p * 8)())]),
+    (TypeError, "data must hold", [lambda: morwick.snapshot(MIXED), *(lambda kind=kind: morwick.parse((kind * 8)()) for kind in POINTERS)]),
     (TypeError, "header must hold", [lambda: morwick.snapshot(b"", OBJECTS)]),
-    (BufferError, "data: ndarray is not C-contiguous", [lambda: morwick.snapshot(np.zeros((9, 9), np.uint8)[:, ::2])]),
+    (BufferError, "data: ndarray is not C-contiguous", [lambda: morwick.snapshot(HUGE), lambda: morwick.render(np.zeros((9, 9))[:, ::2])]),
     (BufferError, "data: ", [lambda: morwick.parse(np.zeros(1, "M8[s]"))]),
     (ValueError, "data is larger than 4294967295 bytes", [lambda: morwick.parse(HUGE)]),
     (ValueError, "header is larger than 1048576 bytes", [lambda: morwick.snapshot(b"", HEADER.ljust((1 << 20) + 1))]),
@@ -275,7 +280,7 @@ def test_wrong_arguments_are_named(error, words, calls):
 
 def test_threads_find_the_same(dumps):
     def work(_):
-        table = morwick.table(dumps, names="host*", jobs=3)
+        table = morwick.table(dumps, "kvr", "host*", 3, None)
         return [table[name].filled(1).tolist() for name in table], table.faults, plain(morwick.parse(LARGE).items())
 
     with ThreadPoolExecutor(4) as pool:
@@ -311,12 +316,13 @@ def test_progress_and_an_interrupt_end_the_reading(tmp_path):
     signal.signal(signal.SIGINT, signal.default_int_handler)  # a job in the background ignores it
     signal.alarm(60)  # ends what no interrupt ends
     seen, threads = [], lambda: len(os.listdir("/proc/self/task"))
-    for progress in None, lambda *now: seen.append((*now, threads() - before)):
+    watch = lambda *now: seen.append((*now, threads() - before))
+    for jobs, progress in (5, None), (5, watch), (None, watch):
         before = threads()
         threading.Timer(0.5, lambda: os.kill(os.getpid(), signal.SIGINT)).start()
         with pytest.raises(KeyboardInterrupt):
-            morwick.table([tmp_path / "pipe"] * 2000, jobs=5, progress=progress)
-    assert {*seen} == {(0, 0, 1 + 5)} and 1 < len(seen) < 8  # now and then, also while nothing comes
+            morwick.table([tmp_path / "pipe"] * 2000, jobs=jobs, progress=progress)
+    assert {*seen} == {(0, 0, 1 + 5), (0, 0, 1 + len(os.sched_getaffinity(0)))} and 2 < len(seen) < 16  # now and then, also while nothing comes
     signal.alarm(0)
     os.close(os.open(tmp_path / "pipe", os.O_WRONLY))  # the thread that waited goes
 
@@ -334,4 +340,5 @@ def test_everything_public_is_described_and_nothing_else_exported():
     assert all(f"morwick.{name}(" in called for name in own if name[0].islower())
     stub = re.findall(r"^def (\w+)", (SOURCE / "python/morwick/_native.pyi").read_text(), re.M)
     assert stub and all(hasattr(morwick._native, name) for name in stub)
+    assert command("--version").decode() == f"morwick {morwick.__version__} (platform {morwick.platform})\n"
     assert run("nm", "-D", "--defined-only", morwick._native.__file__).stdout.split()[2:] == ["PyInit__native"]
