@@ -126,8 +126,7 @@ py::object DescribedType(const Layout &layout) {
 py::object Snapshot(const py::object &data, py::handle header) {
   const Layout layout(header);
   const size_t count = layout.RecordsOf(Buffer(data, "data").bytes()).size() / layout.recordSize;
-  const py::object type =
-      layout.isFixed ? CopyOf(FixedTypes::Get().record) : DescribedType(layout);
+  const py::object type = layout.isFixed ? CopyOf(FixedTypes::Get().record) : DescribedType(layout);
   return py::module_::import("numpy").attr("frombuffer")(data, type, count);
 }
 
