@@ -3,6 +3,7 @@
 #include "fleet/dump.h"
 
 #include <fcntl.h>
+#include <poll.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -36,7 +37,10 @@ DumpReader::Dump DumpReader::Read(const char *name, bool onlyFiles) {
     for (;;) {
       const ssize_t count = read(file.number(), bytes, room);
       if (count >= 0) return {static_cast<size_t>(count), ""};
-      if (errno != EINTR) return {0, std::strerror(errno)};
+      // A named file may be waited for, but not a pipe that has taken a file's place.
+      if (onlyFiles ? errno != EINTR : !CanTryAgain(file.number(), POLLIN)) {
+        return {0, std::strerror(errno)};
+      }
     }
   });
   size_t size = 0;

@@ -29,7 +29,7 @@ for call in calls:
     good = repr(call())
     for number in range(1, 100000):
         try: refuse(number); result = call(); error = None
-        except (MemoryError, morwick.ControllerError) as raised: error = raised; assert getattr(error, "result", 0) is not None  # the driver's own
+        except (MemoryError, morwick.ControllerError) as raised: error = raised; assert getattr(error, "result", 1), error  # the driver's own
         except ValueError as raised: error = raised; assert "tuple" in str(raised)  # NumPy's own, of a type
         if refuse(0) < number: break
         assert error or repr(result) == good or "result=262" in repr(result), (call, number)  # the driver was refused
