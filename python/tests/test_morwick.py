@@ -123,8 +123,10 @@ def test_table_is_that_of_the_command(dumps, stream, names):
     assert all(again[name].dtype == np.uint64 and (again[name].filled(7) == table[name].filled(7)).all() for name in table)
     assert repr(table) == f"<morwick.Table of {len(rows)} files: {len(heading) - 2} columns>"
     frame = table.to_pandas()
-    assert frame["fault"].tolist() == table.faults and {*map(str, frame.dtypes[2:])} == {"UInt64"}
-    assert frame.to_csv(index=False).splitlines() == lines.decode().splitlines()
+    assert list(frame) == heading and {*map(str, frame.dtypes[2:])} == {"UInt64"}
+    assert frame["file"].tolist() == table.files and frame["fault"].tolist() == table.faults
+    for name in [*table][-9:]:
+        assert frame[name].astype(object).where(frame[name].notna(), None).tolist() == table[name].tolist()
 
 
 def test_table_takes_what_the_command_takes(tmp_path):
