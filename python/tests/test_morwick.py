@@ -244,7 +244,7 @@ OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
      [lambda: morwick.parse("text"), lambda: morwick.snapshot("7"), lambda: morwick.render("")]),
     (TypeError, "header must be an object with a buffer, not int", [lambda: morwick.snapshot(b"", 7), lambda: morwick.render(b"", 0)]),
     (TypeError, "data must hold numbers or bytes, not items of the format O",
-     [lambda: morwick.parse(OBJECTS), lambda: morwick.snapshot(OBJECTS), lambda: morwick.render(OBJECTS)]),
+     [lambda: morwick.parse(memoryview(OBJECTS)), lambda: morwick.snapshot(OBJECTS), lambda: morwick.render(OBJECTS)]),
     (TypeError, "data must hold", [lambda: morwick.snapshot(MIXED), *(lambda kind=kind: morwick.parse((kind * 8)()) for kind in POINTERS)]),
     (TypeError, "header must hold", [lambda: morwick.snapshot(b"", OBJECTS)]),
     (BufferError, "data: ndarray is not C-contiguous", [lambda: morwick.snapshot(HUGE), lambda: morwick.render(np.zeros((9, 9))[:, ::2])]),

@@ -34,10 +34,10 @@ TEST(SimulatedSchedulerDeathTest, EndsForABadScenarioOnlyWhereItMay) {
   const auto find = [] { return Find() + Find("VeltoQRN3NVMeController"); };
   const std::string complaint = "^platform_tests: /no/such: No such file or directory\n$";
   EXPECT_EXIT(std::exit(static_cast<int>(find())), testing::ExitedWithCode(0), complaint);
-  const auto log = [] { SystemLog("%s", "never"); };
-  const auto add = [] { RegisterActivity("never", kActivityCheckIn, Journal); };
-  const auto run = [] { RunMainQueue(); };
-  for (void (*const call)() : {+log, +add, +run}) {
+  void (*const calls[])() = {[] { SystemLog("%s", "never"); },
+                             [] { RegisterActivity("never", kActivityCheckIn, Journal); },
+                             [] { RunMainQueue(); }};
+  for (const auto call : calls) {
     EXPECT_EXIT((call(), std::exit(0)), testing::ExitedWithCode(2), complaint);
     EXPECT_EXIT((find(), call()), testing::ExitedWithCode(2), complaint);
   }
