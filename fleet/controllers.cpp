@@ -67,7 +67,7 @@ int32_t Open(uint32_t service, uint32_t *connection) {
   *connection = 0;
   const int32_t result = OpenService(service, kNandConnectionType, connection);
   ReleaseObject(service);
-  // A driver that fails may still have stored a handle.
+  // Against the contract, a driver that fails may still have stored a handle.
   if (result != 0 && *connection != 0) CloseService(std::exchange(*connection, 0));
   return result;
 }

@@ -41,7 +41,8 @@ struct Presence {
   bool opened = false;  // the connection is closed again
   int32_t result = 0;   // the driver's code for opening
 };
-// Throws std::bad_alloc when the platform has no memory.
+// Throws std::bad_alloc when the look-up is refused memory. A driver that is refused memory when it
+// opens the connection says so by its result.
 Presence Probe(const NandExporter &row);
 
 // Connects, and releases the service, which an open connection does not need. Returns the driver's
@@ -55,7 +56,8 @@ struct Reply {
   std::optional<int32_t> result = {};
 };
 
-// Reads a buffer through a connection to the row's driver. Throws std::bad_alloc.
+// Reads a buffer through a connection to the row's driver. Throws std::bad_alloc; a driver that is
+// refused memory says so by its result.
 Reply ReadBuffer(uint32_t connection, const NandExporter &row, const BufferKind &kind);
 
 }  // namespace fleet

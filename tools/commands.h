@@ -1,4 +1,5 @@
-// The sub-commands of morwick. Each has one line here and a file of its own.
+// The sub-commands of morwick, but for help, which main.cpp adds. Each has one line here and a file
+// of its own.
 #ifndef TOOLS_COMMANDS_H
 #define TOOLS_COMMANDS_H
 
@@ -13,7 +14,8 @@ namespace tools {
 using Action = std::function<Status()>;
 
 // The sub-commands, in the order of the help. Each has a function (AddFind, AddStats, ...) that
-// adds it to the program. `*action` is set when the user calls the sub-command.
+// adds it to the program. Where the user calls the sub-command, `*action` is set while the command
+// line is parsed, and main carries it out afterwards.
 #define FOR_EACH_COMMAND(COMMAND) \
   COMMAND(Find)                   \
   COMMAND(Stats)                  \

@@ -1,4 +1,4 @@
-// The buffers of a simulated controller for which its scenario names no files.
+// Buffers that a simulated controller makes up where its scenario names no files.
 #ifndef PLATFORM_SIMULATED_OWN_BUFFERS_H
 #define PLATFORM_SIMULATED_OWN_BUFFERS_H
 
@@ -7,7 +7,7 @@
 
 namespace simulated {
 
-// The buffer with that key in a scenario, as of now by the wall clock; empty when the made-up
+// The buffer with that key in a scenario, with the values of this moment. Empty when the made-up
 // controller has no such buffer.
 std::string MakeOwnBuffer(std::string_view key);
 
