@@ -98,6 +98,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, con
         # One dump is a pipe. The worker that comes to it waits there, and is killed.
         pipe = work + "/pipe"
         os.mkfifo(pipe)
+        at_end.callback(os.open, pipe, os.O_RDONLY | os.O_NONBLOCK)  # a thread that still waits for a reader goes on
         wait_for(lambda: not any(client.has_what().values()))  # no results of earlier scripts
         read = threads.submit(fleet.read, files[:1100] + [pipe] + files[1100:], scheduler)
         wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts

@@ -80,7 +80,7 @@ END_OF_PROJECT
 cmake --install "$build" --prefix "$work/installed" >/dev/null
 DESTDIR=$work/root cmake --install "$build" --prefix /usr >/dev/null
 for root in "" "$work/root"; do
-  for service in morwick-metrics grellon; do
+  for service in morwick-metrics grellon; do  # the unit of the last one is looked into below
     unit=$(find "${root:-$work/installed}" -name $service.service)
     program=$root$(sed -n 's/^ExecStart=\([^ ]*\).*/\1/p' "$unit")
     [[ -x $program && -f ${unit%service}timer ]] || { echo "$unit starts nothing"; exit 1; }
