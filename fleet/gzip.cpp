@@ -21,8 +21,9 @@ constexpr int kGzipOnly = MAX_WBITS + 16;  // for zlib: this format and no other
 struct GzipReader::Inflation {
   std::array<unsigned char, kBlock> packed;
   z_stream stream = {};
-  bool inMember = true;  // false after the end of a member, where another may begin
-  bool damaged = false;  // told when the bytes before the damage have been returned
+  bool inMember = true;       // false after the end of a member, where another may begin
+  bool damaged = false;       // told when the bytes before the damage have been returned
+  bool mayHoldBytes = false;  // the caller's room was full: zlib may hold the rest of a repetition
 
   Inflation() {
     if (inflateInit2(&stream, kGzipOnly) != Z_OK) throw std::bad_alloc();
@@ -67,7 +68,7 @@ ReadResult GzipReader::Inflate(char *bytes, size_t room) {
   stream.avail_out = static_cast<uInt>(room);
   while (stream.avail_out == room) {
     if (inflation.damaged) return {0, "the gzip data is damaged"};
-    if (stream.avail_in == 0) {
+    if (stream.avail_in == 0 && !inflation.mayHoldBytes) {
       ReadResult more = read_(reinterpret_cast<char *>(inflation.packed.data()), kBlock);
       if (!more.fault.empty()) return more;
       if (more.count == 0) {
@@ -91,7 +92,9 @@ ReadResult GzipReader::Inflate(char *bytes, size_t room) {
     const int result = inflate(&stream, Z_NO_FLUSH);
     if (result == Z_MEM_ERROR) throw std::bad_alloc();
     if (result == Z_STREAM_END) inflation.inMember = false;
-    inflation.damaged = result != Z_OK && result != Z_STREAM_END;
+    // Z_BUF_ERROR only says that zlib held no bytes and needs more packed ones.
+    inflation.damaged = result != Z_OK && result != Z_STREAM_END && result != Z_BUF_ERROR;
+    inflation.mayHoldBytes = inflation.inMember && stream.avail_out == 0;
   }
   return {room - stream.avail_out, ""};
 }
