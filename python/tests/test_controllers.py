@@ -45,7 +45,7 @@ def test_controllers_are_read_and_given_back(tmp_path):
             try: morwick.Controller(name).read("msp")
             except morwick.ControllerError as error: print(same := pickle.loads(pickle.dumps(error)), same.result)
         """
-    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\nsnapshot_header = '/'\n")
+    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\nsnapshot_header = '/'\ndefects = '/dev/null'\n")
     refused, unread, none = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder, "empty.toml")]
     assert [none[0], *refused[1:]] == ["no controller is present None", "KVRStorage: the controller is not present None",
                            "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
@@ -55,7 +55,8 @@ def test_controllers_are_read_and_given_back(tmp_path):
     states = [(each["class"], each["state"] != "absent", each["state"] == "present", each.get("result", 0), tuple(each["offers"]))
               for each in found["controllers"]]  # fmt: skip
     assert play("refuses.toml", "print([(c.name, c.present, c.opened, c.result, c.offers) for c in morwick.controllers()])") == f"{states}\n"
-    assert "snapshot_header: reading failed" in play(folder, "morwick.Controller().snapshot()")
+    empty_and_failing = play(folder, "c = morwick.Controller()\nprint(c.read('defects'))\nc.snapshot()")
+    assert empty_and_failing.startswith("b''\n") and "snapshot_header: reading failed" in empty_and_failing
     for line, cause in (refused[0], "VeltoQRN3NVMeController: the connection was refused"), (unread[0], "VeltoQRN3NVMeController: msp: reading failed"):
         words, hexadecimal, result = line.rsplit(maxsplit=2)
         assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
