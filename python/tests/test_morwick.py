@@ -153,9 +153,9 @@ CSV_ORDER = """timestamp erasedBands hostReads hostWrites nandReads nandWrites h
 
 def test_snapshots_and_texts_are_those_of_the_command(tmp_path):
     draw = random.Random(3)
-    # No UTF-8, a field of text alone, and three priorities.
+    # No UTF-8, a field of text alone, three priorities, and one.
     odd = HEADER.replace(b" E=", b"\xff\xc3=").replace(b" P=%2u", b" P=-2u")
-    odd = odd.replace(struct.pack("<II", 56, 48), struct.pack("<II", 56, 36))
+    odd = odd.replace(struct.pack("<II", 56, 48), struct.pack("<II", 56, 36)).replace(struct.pack("<II", 8, 48), struct.pack("<II", 8, 12))
     (tmp_path / "header").write_bytes(odd)
     for number in range(2 if SANITIZED else 20):
         # The first data has more records than the header promises, and its last one is cut.
