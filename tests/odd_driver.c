@@ -1,16 +1,28 @@
 // Preloaded into a process under test: drivers that break the contract. They refuse a connection
-// and leave a handle, or with ODD=empty open one without a handle.
+// and leave a handle, or with ODD=HANDLE open one of that number, which may be 0. They keep no
+// lock, and answer a request when a byte comes on standard input.
 
 #include <stdio.h>
 #include <stdlib.h>
+#include <unistd.h>
 
 #include "morwick/platform.h"
 
 int32_t OpenService(uint32_t service, uint32_t type, uint32_t *connection) {
   (void)service, (void)type;
-  const int isEmpty = getenv("ODD") != NULL;
-  *connection = isEmpty ? 0 : 77;
-  return isEmpty ? 0 : -7;
+  const char *handle = getenv("ODD");
+  *connection = handle != NULL ? (uint32_t)atoi(handle) : 77;
+  return handle != NULL ? 0 : -7;
+}
+
+int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *input,
+                         size_t inputSize, void *reply, size_t *replySize) {
+  (void)connection, (void)selector, (void)input, (void)inputSize, (void)reply;
+  char byte = '?';
+  *replySize = 0;
+  const int isAnswered = write(STDIN_FILENO, &byte, 1) == 1 && read(STDIN_FILENO, &byte, 1) == 1;
+  fprintf(stderr, "answered\n");
+  return isAnswered ? -8 : -9;
 }
 
 int32_t CloseService(uint32_t connection) {

@@ -12,11 +12,11 @@ except OSError: pass
 """
 
 
-def play(scenario, code):
+def play(scenario, code, **environment):
     """What the code prints in a fresh interpreter, with the platform's complaints about open handles. Something
     else was refused memory before, which errno still tells."""
     played = run("timeout", "60", sys.executable, "-c", PREFACE + textwrap.dedent(code),
-                 GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios" / scenario))  # fmt: skip
+                 GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios" / scenario), **environment)  # fmt: skip
     return played.stdout + played.stderr
 
 
@@ -68,20 +68,24 @@ def test_controllers_are_read_and_given_back(tmp_path):
 
 
 def test_a_call_waits_without_the_interpreter(tmp_path):
-    """Pipes in the place of files make the platform wait until another thread has written."""
-    for first in "controllers", "Controller":
-        for name in "scenario", "msp":
-            (tmp_path / name).unlink(missing_ok=True)
-            os.mkfifo(tmp_path / name)
+    for first in "controllers", "Controller":  # a pipe in the place of the scenario makes them wait for another thread
+        (tmp_path / "scenario").unlink(missing_ok=True)
+        os.mkfifo(tmp_path / "scenario")
         assert play(tmp_path / "scenario", f"""
-            def write(): open("{tmp_path}/scenario", "w").write("[[controller]]\\nclass = 'VeltoQRN3NVMeController'\\nmsp = 'msp'\\n")
+            def write(): open("{tmp_path}/scenario", "w").write("[[controller]]\\nclass = 'VeltoQRN3NVMeController'\\n")
             threading.Thread(target=write).start()
             morwick.{first}()
-            with concurrent.futures.ThreadPoolExecutor() as pool, morwick.Controller() as c:
-                data = pool.submit(c.read, "msp")
-                with open("{tmp_path}/msp", "wb") as pipe:
-                    closed = pool.submit(c.close)
-                    print(*concurrent.futures.wait([data, closed], 0.3).done)
-                    pipe.write(b"bytes")
-                print(data.result(), closed.result())
-            """) == "\nb'bytes' None\n"  # fmt: skip
+            """) == ""  # fmt: skip
+    driver = f"{os.environ.get('LD_PRELOAD', '')}:{os.environ['ODD_DRIVER']}"
+    assert play("statistics.toml", """
+        import os, socket
+        driver, here = socket.socketpair()
+        os.dup2(driver.fileno(), 0)
+        with concurrent.futures.ThreadPoolExecutor() as pool, morwick.Controller() as c:
+            read = pool.submit(c.read, "msp")
+            here.recv(1)  # it asks
+            closed = pool.submit(c.close)
+            print(*concurrent.futures.wait([read, closed], 0.3).done)
+            here.send(b"!")
+            print(read.exception().result, closed.result())
+        """, ODD="77", LD_PRELOAD=driver) == f"\n{2**32 - 8} None\nanswered\nclosed 77\n"  # fmt: skip

@@ -15,7 +15,7 @@ SANITIZED = bool(os.environ.get("SANITIZED"))
 COUNT = 25 if SANITIZED else 500  # random dumps of a stream; a sanitized command is slow
 STREAMS = ["kvr", "ftl", "msp"]
 SNAPSHOT, HEADER, KVR = [(SOURCE / f"examples/{name}.bin").read_bytes() for name in ("snapshot", "snapshot_header", "kvr")]
-LARGE = KVR * 9000  # two megabytes
+LARGE = KVR.replace(struct.pack("<Q", 123456789), bytes(8)) * 9000 + KVR  # two megabytes
 
 
 def run(*words, text=True, **environment):
@@ -212,7 +212,7 @@ def test_views_keep_their_buffers():
             assert records.pop()["timestamp"][0] == 77
         resize(data)
     assert not morwick.snapshot(SNAPSHOT).flags.writeable
-    changed = bytearray(KVR)
+    changed = bytearray(LARGE)
     statistics = morwick.Statistics(changed)
     changed.clear()
     assert statistics.summary["writeAmplification"] == 234567891 / 123456789 and statistics.entries[0] == ("exportVersion", 7)
@@ -269,7 +269,7 @@ OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
     (ValueError, "jobs must be at least 1, not 0", [lambda: morwick.table([], jobs=0)]),
     (TypeError, "progress must be callable, not int", [lambda: morwick.table([], progress=0)]),
     (TypeError, "name must be a str, not int", [lambda: morwick.Controller(7)]),
-    (ValueError, "name: there is no controller class ''", [lambda: morwick.Controller("")]),
+    (ValueError, "name: there is no controller class '", [lambda: morwick.Controller(""), lambda: morwick.Controller("KVRStorage\0")]),
 ])  # fmt: skip
 def test_wrong_arguments_are_named(error, words, calls):
     for call in calls:
