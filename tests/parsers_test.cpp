@@ -6,7 +6,6 @@
 #include <random>
 
 #include "tests/case_file.h"
-#include "tests/heap.h"
 
 namespace {
 

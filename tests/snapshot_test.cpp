@@ -11,7 +11,6 @@
 
 #include "morwick/morwick.h"
 #include "tests/case_file.h"
-#include "tests/heap.h"
 
 namespace {
 

@@ -2,12 +2,12 @@
 
 #include <fcntl.h>
 #include <poll.h>
+#include <pty.h>
 #include <sys/ioctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
@@ -115,12 +115,7 @@ void CheckOneGap(const std::string &log, unsigned long lines, unsigned long leas
 // Each opens what standard error may be, and stores the reader's end and the writer's.
 constexpr int (*kOpen[])(int *ends) = {
     pipe, [](int *ends) { return socketpair(AF_UNIX, SOCK_STREAM, 0, ends); },
-    [](int *ends) {
-      ends[0] = posix_openpt(O_RDWR | O_NOCTTY);
-      const int failed = grantpt(ends[0]) | unlockpt(ends[0]);
-      ends[1] = open(ptsname(ends[0]), O_RDWR | O_NOCTTY);
-      return failed;
-    }};
+    [](int *ends) { return openpty(&ends[0], &ends[1], nullptr, nullptr, nullptr); }};
 
 using FullLogTest = testing::TestWithParam<int>;
 INSTANTIATE_TEST_SUITE_P(PipeSocketTerminal, FullLogTest, testing::Range(0, 3));
@@ -159,9 +154,9 @@ TEST_P(FullLogTest, NeverWaits) {
   pollfd more = {.fd = reader, .events = POLLIN, .revents = 0};
   for (const unsigned last = line + 99; line < last || poll(&more, 1, 200) > 0;) {
     if (line < last) SystemLog(kLine, ++line);
-    std::array<char, 5000> some;
-    const ssize_t size = read(reader, some.data(), some.size());
-    if (size > 0) log.append(some.data(), static_cast<size_t>(size));
+    char some[5000];
+    const ssize_t size = read(reader, some, sizeof some);
+    if (size > 0) log.append(some, static_cast<size_t>(size));
     usleep(1000);
   }
   alarm(0);
