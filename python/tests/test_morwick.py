@@ -55,7 +55,7 @@ def dumps(tmp_path_factory):
         for seed in range(COUNT):
             (folder / f"{stream}-{seed}").write_bytes(random_dump(stream, seed))
         for file in [*(SOURCE / "fuzz/seeds").glob("*/*"), *(SOURCE / "examples").glob("*.bin")]:
-            if file.name != "gzip":  # which the command unpacks
+            if not file.name.startswith("gzip"):  # which the command unpacks
                 (folder / f"{stream}-{file.name}").write_bytes(file.read_bytes()[file.suffix != ".bin" :])
     (folder / "kvr-unwritten").write_bytes(struct.pack("<IIQIIQ", 4, 1, 5, 18, 1, 0))  # hostWrites, nandWrites
     return folder
