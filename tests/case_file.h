@@ -1,5 +1,5 @@
 // Reads a file under tests/cases, and what cases write down. Tests name a failing case by its file
-// and line. Then the heap as tests need it.
+// and line. Then the heap as tests need it. Includes the headers that most tests use.
 #ifndef TESTS_CASE_FILE_H
 #define TESTS_CASE_FILE_H
 

@@ -1,12 +1,8 @@
 #include "tests/fake_platform.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <cstdarg>
 #include <cstdio>
 #include <memory>
-#include <sstream>
 
 #include "morwick/exporter.h"
 #include "morwick/platform.h"

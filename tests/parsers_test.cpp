@@ -1,8 +1,5 @@
 // The three statistics parsers and the generic context.
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <random>
 
 #include "tests/case_file.h"

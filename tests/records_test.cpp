@@ -1,8 +1,6 @@
 // The walk over records, the key tables, the summary fields, the rounding of capacities and the
 // check of snapshot headers: what tools ask the library beside its parsers.
 
-#include <gtest/gtest.h>
-
 #include <cstring>
 
 #include "tests/case_file.h"

@@ -20,25 +20,8 @@
 
 namespace {
 
-std::string systemLog;
+std::string systemLog;  // what sendto, below, was given
 volatile int systemLogError = 0;
-
-}  // namespace
-
-// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
-// Takes the place of the system's log.
-extern "C" MORWICK_EXPORT ssize_t sendto(int, const void *text, size_t size, int flags,
-                                         const sockaddr *log, socklen_t) {
-  EXPECT_STREQ(reinterpret_cast<const sockaddr_un *>(log)->sun_path, "/dev/log");
-  EXPECT_NE(flags & MSG_DONTWAIT, 0);
-  errno = systemLogError;
-  if (errno != 0) return -1;
-  systemLog.append(static_cast<const char *>(text), size).push_back('\n');
-  return static_cast<ssize_t>(size);
-}
-// NOLINTEND(readability-inconsistent-declaration-parameter-name)
-
-namespace {
 
 // What each line says after the name of the daemon.
 std::vector<std::string> Texts(const std::string &log) {
@@ -140,11 +123,10 @@ TEST_P(FullLogTest, NeverWaits) {
   // A complaint is given up, too.
   const uint32_t request[6] = {13};
   char reply[4];
-  size_t replySize = sizeof reply;
-  EXPECT_EQ(CallStructMethod(Connect(), 8, request, sizeof request, reply, &replySize),
-            kDeviceError);
-  const unsigned lineSize =
-      isatty(STDERR_FILENO) != 0 ? 29 : 28;  // a terminal's line end is longer
+  size_t size = sizeof reply;
+  EXPECT_EQ(CallStructMethod(Connect(), 8, request, sizeof request, reply, &size), kDeviceError);
+  // A terminal's line end is longer.
+  const unsigned lineSize = isatty(STDERR_FILENO) != 0 ? 29 : 28;
   int unread = 0;
   ioctl(reader, FIONREAD, &unread);
   systemLogError = ECONNREFUSED;
@@ -155,8 +137,8 @@ TEST_P(FullLogTest, NeverWaits) {
   for (const unsigned last = line + 99; line < last || poll(&more, 1, 200) > 0;) {
     if (line < last) SystemLog(kLine, ++line);
     char some[5000];
-    const ssize_t size = read(reader, some, sizeof some);
-    if (size > 0) log.append(some, static_cast<size_t>(size));
+    const ssize_t count = read(reader, some, sizeof some);
+    if (count > 0) log.append(some, static_cast<size_t>(count));
     usleep(1000);
   }
   alarm(0);
@@ -191,9 +173,22 @@ TEST_P(FullLogTest, NeverWaits) {
 
 TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsSomeTimeAtTheEnd) {
   GTEST_FLAG_SET(death_test_style, "threadsafe");
-  EXPECT_EXIT(EndWhileBothAreFull(), testing::ExitedWithCode(0),
+  EXPECT_EXIT(EndWhileBothAreFull(), kEndsWell,
               "line 0000000002600\n<29>[^\n]*: 1 lines of the log were dropped\n<29>.*: line "
               "0000000000002\n.*: [0-9]+ lines of the log were dropped\n$");
 }
 
 }  // namespace
+
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
+// Takes the place of the system's log.
+extern "C" MORWICK_EXPORT ssize_t sendto(int, const void *text, size_t size, int flags,
+                                         const sockaddr *log, socklen_t) {
+  EXPECT_STREQ(reinterpret_cast<const sockaddr_un *>(log)->sun_path, "/dev/log");
+  EXPECT_NE(flags & MSG_DONTWAIT, 0);
+  errno = systemLogError;
+  if (errno != 0) return -1;
+  systemLog.append(static_cast<const char *>(text), size).push_back('\n');
+  return static_cast<ssize_t>(size);
+}
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
