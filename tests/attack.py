@@ -39,10 +39,8 @@ GOOD["long.bin"] = (GOOD["snapshot.bin"] * 2)[:252 * 500 + 9]
 PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
 calls = Path("tests/cases/attack.txt").read_text().replace("\\xff", "\udcff")  # a byte that is not UTF-8
 for kind, words in re.findall("^([^#\n]*?): (.*)$", calls, re.M):
-    if kind == "plain":
-        PROGRAMS.append(([MORWICK, *words.split()], "live"))
-    else:
-        PROGRAMS += [([MORWICK, *words.split(), "-o", form], "live") for form in kind.split()]
+    PROGRAMS += [([MORWICK, *words.split(), *(["-o", form] if form != "plain" else [])], "live")
+                 for form in kind.split()]
 
 thread = threading.local()
 

@@ -171,8 +171,7 @@ TEST(DescribedSnapshotTest, KeepsTheRulesCallAfterCall) {
 TEST(SnapshotTest, TakesNullPointersAndHugeSizes) {
   char output[2000] = "untouched";
   const std::string header = Header(6, 12, 3, kCounting);
-  uint64_t size = sizeof output;
-  uint64_t none = 0;
+  uint64_t size = sizeof output, none = 0;
   uint32_t state = 7;
   EXPECT_EQ(kFixed(nullptr, 252, output, &size), 0U);
   EXPECT_EQ(kFixed(output, 0, nullptr, &size) + kFixed(output, 0, output, nullptr), 0U);

@@ -63,13 +63,10 @@ TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
   Play(scenario);
   for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
     SCOPED_TRACE(row->className);
-    const MorwickRequest request = MorwickMakeRequest(row->getTaskSchedulerSelectors(), 1025);
-    uint32_t reply = 0;
-    size_t size = sizeof reply;
-    EXPECT_EQ(CallStructMethod(Connect(row->className), row->methodSelector, &request,
-                               sizeof request, &reply, &size),
-              0);
-    EXPECT_EQ(LittleEndian32(reply), 1U) << "two units of work, unless the scenario has others";
+    const SelectorPair *pair = row->getSnapshotSelectors();
+    MorwickBuffer buffer;
+    EXPECT_EQ(MorwickReadBuffer(Connect(row->className), row, pair, &buffer), kMorwickRead);
+    MorwickFreeBuffer(&buffer);
     for (const SelectorGetter get :
          {row->getStatsSelectors, row->getMSPStatsSelectors, row->getDefectsListSelectors,
           row->getTelemetryListSelectors, row->getTaskSchedulerSelectors, row->getSnapshotSelectors,
@@ -84,8 +81,7 @@ TEST(SimulatedDriversDeathTest, RefusesAndReportsBadHandles) {
   EXPECT_EQ(ServiceMatching(nullptr), nullptr);
   EXPECT_EQ(GetMatchingService(nullptr), 0U);
   const uint32_t service = Find();
-  uint32_t connection = 0;
-  uint32_t second = 1;
+  uint32_t connection = 0, second = 1;
   size_t size = 99;
   EXPECT_EQ(OpenService(service, 0, &connection), 0);
   EXPECT_EQ(OpenService(service, 0, &second), kRefused);
