@@ -60,11 +60,10 @@ def fill(files):
 
 def take(name):
     """Removes a file and returns its content; None without a file."""
-    if not os.path.exists(f"{folder()}/{name}"):
-        return None
-    with open(f"{folder()}/{name}", "rb") as source:
-        os.remove(source.name)
-        return source.read()
+    file = Path(folder(), name)
+    content = file.read_bytes() if file.exists() else None
+    file.unlink(missing_ok=True)
+    return content
 
 
 def run(program, scenario, draw=None, sent=(), ends=(), **environment):
@@ -185,11 +184,10 @@ def exchange(number):
                     os.symlink(target, here + "/next")
                     os.rename(here + "/next", here + "/link")
 
-    exchanger = threading.Thread(target=exchange_it)
-    exchanger.start()
-    result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
-    done.set()
-    exchanger.join()
+    with ThreadPoolExecutor() as exchanger:
+        exchanger.submit(exchange_it)
+        result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
+        done.set()
     good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (b"old", GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good

@@ -17,9 +17,8 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
       "fail_read = [5]\nshort_read = [8, 19]\nmsp = '" +
       File("msp") + "'\nstatistics = ['" + File("first") + "', '/proc/self/fd/" + File("2nd") +
       "', '" + File("third") + "']\nsnapshot = ['" + File("") +
-      "', '/']\n"
-      "defects = [\"/no ~\\n\\u007f\", '" +
-      File("never") + "']\ntelemetry = '" + std::to_string(fifo[0]) + "'\n");
+      "', '/']\ndefects = [\"/no ~\\n\\u007f\", '" + File("never") + "']\ntelemetry = '" +
+      std::to_string(fifo[0]) + "'\n");
   const uint32_t connection = Connect();
   testing::internal::CaptureStderr();
   ForEachCase("requests.txt", [&](std::istringstream &columns) {

@@ -61,8 +61,8 @@ TEST(SimulatedSchedulerDeathTest, RunsAndResumesOnSchedule) {
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
     EXPECT_TRUE(least <= elapsed.count() && elapsed.count() < least + 1);
   });
-  EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), kEndsWell, "^$")
-      << "no activity";
+  // Without an activity.
+  EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), kEndsWell, "^$");
   EXPECT_EXIT((endsTransactions = false, PlaySchedule("first_run_after = 0")), kEndsWell,
               checkIn + "state 2 nnnn, the run did not end its transaction\n$");
 }

@@ -164,10 +164,9 @@ TEST_P(FullLogTest, NeverWaits) {
     std::fputs(systemLog.c_str(), stderr);
   });
   systemLogError = ECONNREFUSED;
-  unsigned line = 0;
-  SystemLog(kLine, ++line);
+  SystemLog(kLine, 1U);
   systemLogError = EAGAIN;
-  while (line < 2600) SystemLog(kLine, ++line);
+  for (unsigned line = 2; line <= 2600; ++line) SystemLog(kLine, line);
   std::exit(0);
 }
 
