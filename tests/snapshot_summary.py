@@ -43,8 +43,7 @@ for name, line in zip(sys.argv[1:], sys.stdin, strict=True):
     for kind, base, host, nand in ("reads", 14, 27, 29), ("writes", 2, 28, 30):  # words of a record
         counts = [sum(record[base:base + 12:3]) for record in records]
         totals = [sum(record[base + 1:base + 12:3]) for record in records]
-        means = sorted((total / count, -i)
-                       for i, (total, count) in enumerate(zip(totals, counts)) if count)
+        means = sorted((total / n, -i) for i, (total, n) in enumerate(zip(totals, counts)) if n)
         groups = [record[at:at + 3] for record in records for at in range(base, base + 12, 3)]
         bounds = [bound for percent in (50, 95, 99) for bound in span(groups, percent)]
         most, place = max((max(record[base + 2:base + 12:3]), -i) for i, record in enumerate(records))

@@ -6,7 +6,6 @@
 #include <iomanip>
 #include <random>
 
-#include "morwick/morwick.h"
 #include "tests/case_file.h"
 
 namespace {

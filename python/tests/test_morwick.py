@@ -284,7 +284,7 @@ def test_threads_find_the_same(dumps):
     assert all(other == first for other in others) and first[2] == plain(morwick.parse(KVR).items())
 
 
-def test_long_work_lets_other_threads_run():
+def test_long_work_lets_other_threads_run(request):
     def lets_run(call):
         gate = threading.Lock()
         with ThreadPoolExecutor() as pool:
@@ -294,12 +294,10 @@ def test_long_work_lets_other_threads_run():
             return other.done()
 
     before = sys.getswitchinterval()
+    request.addfinalizer(lambda: sys.setswitchinterval(before))
     sys.setswitchinterval(1000)  # a thread runs only while another gives the interpreter's lock back
-    try:
-        for call in lambda: morwick.render(SNAPSHOT * 99), lambda: morwick.parse(LARGE):
-            assert any(lets_run(call) for _ in range(50))
-    finally:
-        sys.setswitchinterval(before)
+    for call in lambda: morwick.render(SNAPSHOT * 99), lambda: morwick.parse(LARGE):
+        assert any(lets_run(call) for _ in range(50))
 
 
 def test_progress_and_an_interrupt_end_the_reading(tmp_path):

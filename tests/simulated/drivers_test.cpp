@@ -2,7 +2,6 @@
 
 #include <csignal>
 
-#include "morwick/morwick.h"
 #include "tests/case_file.h"
 #include "tests/simulated/platform.h"
 
@@ -56,9 +55,8 @@ TEST(SimulatedDriversTest, AnswersTheRightRequestsOnly) {
 // The library's table and the simulated drivers' own list know the same classes and methods.
 TEST(SimulatedDriversTest, KnowsEachClassOfTheTable) {
   std::string scenario;
-  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
+  for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row)
     scenario += std::string("[[controller]]\nclass = '") + row->className + "'\n";
-  }
   Play(scenario);
   for (const NandExporter *row = nand_exporters; row->className != nullptr; ++row) {
     SCOPED_TRACE(row->className);
