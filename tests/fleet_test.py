@@ -1,8 +1,9 @@
 """Runs examples/fleet.py and the script of docs/archive.md on 2,000 dumps, and holds their results against
 those of `morwick table`: on a cluster of three processes at a terminal, after a worker is killed, and without.
 Usage: fleet_test.py MORWICK SOURCE"""
-import bisect, contextlib, csv, io, os, pathlib, re, signal, subprocess, sys, tempfile, textwrap, time
+import bisect, contextlib, csv, io, os, pathlib, re, subprocess, sys, tempfile, textwrap, time
 from concurrent.futures import ThreadPoolExecutor
+from signal import SIGKILL
 
 morwick, source = sys.argv[1:]
 sys.path.append(source + "/examples")  # workers do not look there: none of their work may need fleet.py
@@ -104,7 +105,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, con
         wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
         [waiting] = [worker for worker, parts in client.processing().items() if parts]
         assert client.has_what()[waiting], "no part that it has read would be lost with it"
-        os.kill(client.run(os.getpid, workers=[waiting])[waiting], signal.SIGKILL)
+        os.kill(client.run(os.getpid, workers=[waiting])[waiting], SIGKILL)
         threads.submit(pathlib.Path(pipe).write_bytes, strange_dumps[1111])  # waits for a reader
         assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
         assert len(client.scheduler_info()["workers"]) == 1
