@@ -1,6 +1,6 @@
 // Fuzzes both snapshot renderings and the columns. Checks that the text holds each number of each
-// column. The input: a capacity, the number of descriptors, a header with that many descriptors,
-// and the snapshot, which is taken for a header too.
+// column. The input: the room for text, the number of descriptors, a header with that many
+// descriptors, and the snapshot, which is taken for a header too.
 
 #include <cassert>
 #include <cstddef>
@@ -37,16 +37,15 @@ std::string TextIn(const std::vector<char> &output, uint64_t length) {
   return {output.data(), length};
 }
 
-std::string RenderDescribed(const std::vector<char> &header, std::string_view snapshot,
-                            size_t capacity) {
+std::string RenderDescribed(const std::vector<char> &header, std::string_view input, size_t room) {
   std::string whole;
   uint32_t state = 0;
   for (int call = 0; call < 50; ++call) {
-    std::vector<char> output(capacity, 'x');
+    std::vector<char> output(room, 'x');
     const uint32_t before = state;
-    uint64_t size = capacity;
+    uint64_t size = room;
     const uint64_t result = KVRParseSnapshotBufferWithInplaceParser(
-        snapshot.data(), snapshot.size(), output.data(), &size, header.data(), &state);
+        input.data(), input.size(), output.data(), &size, header.data(), &state);
     assert(state >= before);
     whole += TextIn(output, size - 1);
     if (result == 1) break;
@@ -56,22 +55,21 @@ std::string RenderDescribed(const std::vector<char> &header, std::string_view sn
   return whole;
 }
 
-std::string RenderFixed(std::string_view snapshot, size_t capacity) {
-  std::vector<char> output(capacity, 'x');
-  uint64_t size = capacity;
-  const bool fits =
-      KVRParseSnapshotBuffer(snapshot.data(), snapshot.size(), output.data(), &size) == 1;
-  return TextIn(output, fits ? size : capacity - 1);
+std::string RenderFixed(std::string_view input, size_t room) {
+  std::vector<char> output(room, 'x');
+  uint64_t size = room;
+  const bool fits = KVRParseSnapshotBuffer(input.data(), input.size(), output.data(), &size) == 1;
+  return TextIn(output, fits ? size : room - 1);
 }
 
 // Checks a header as it comes from outside and its columns: names differ, numbers lie in the
 // record, and a line shows each of them.
-void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t capacity) {
+void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t room) {
   if (header.size() < sizeof(SnapshotHeader)) return;
   const uint32_t count = 3;  // one more than there are: the last one counted is never printed
   std::memcpy(&header[offsetof(SnapshotHeader, recordCount)], &count, sizeof count);
   if (!fleet::CheckSnapshotHeader({header.data(), header.size()}).empty()) return;
-  RenderDescribed(header, snapshot, capacity);
+  RenderDescribed(header, snapshot, room);
   const tools::SnapshotColumns columns(header.data());
   assert(columns.fault().empty() != columns.all().empty());
   std::set<std::string> names;
@@ -84,9 +82,9 @@ void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t ca
   // state 1 no banner is printed.
   const auto lineOf = [&](const std::string &record) {
     const std::string two = std::string(recordSize, '\0') + record;
-    std::vector<char> output(capacity);
+    std::vector<char> output(room);
     uint32_t state = 1;
-    uint64_t size = capacity;
+    uint64_t size = room;
     const bool fits = KVRParseSnapshotBufferWithInplaceParser(two.data(), two.size(), output.data(),
                                                               &size, header.data(), &state) == 1;
     return fits ? std::optional<std::string>(output.data()) : std::nullopt;
@@ -108,13 +106,13 @@ void CheckColumns(std::vector<char> header, std::string_view snapshot, size_t ca
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   if (size < 3) return 0;
-  const size_t capacity = size_t{1} + data[0] + size_t{16} * data[1];
+  const size_t room = size_t{1} + data[0] + size_t{16} * data[1];
   std::string_view input(reinterpret_cast<const char *>(data) + 3, size - 3);
   const std::vector<char> header = HeaderFrom(input, data[2] % 40);
   // The same input gives the same text: nothing uninitialised is printed.
-  assert(RenderDescribed(header, input, capacity) == RenderDescribed(header, input, capacity));
-  CheckColumns(header, input, capacity);
-  CheckColumns({input.begin(), input.end()}, input, capacity);  // its table may lie anywhere
-  assert(RenderFixed(input, capacity) == RenderFixed(input, capacity));
+  assert(RenderDescribed(header, input, room) == RenderDescribed(header, input, room));
+  CheckColumns(header, input, room);
+  CheckColumns({input.begin(), input.end()}, input, room);  // its table may lie anywhere
+  assert(RenderFixed(input, room) == RenderFixed(input, room));
   return 0;
 }

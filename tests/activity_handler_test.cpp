@@ -30,10 +30,9 @@ TEST(ActivityHandlerTest, EndsEachRunAsItShould) {
 }
 
 TEST(ActivityHandlerTest, EndsEveryRunWhateverFails) {
+  Script script = {{"present", "VeltoQRN3NVMeController KVRStorage"}, {"replies", "3 2 1 0"}};
   for (const char *defers : {"", "no yes yes", "yes"}) {
-    const Script script = {{"present", "VeltoQRN3NVMeController KVRStorage"},
-                           {"replies", "3 2 1 0"},
-                           {"defers", defers}};
+    script["defers"] = defers;
     for (const std::string &outcome : PlayEveryFailure(script, Handle)) {
       EXPECT_TRUE(outcome.ends_with("log stopping grellon daemon\n\nexit clean\n") ||
                   outcome.ends_with("log deferring grellon daemon\n\nset state 3\nexit clean\n"))

@@ -1,7 +1,7 @@
 """Attacks the programs of the release build, as scripts/attack says, and ends with a table. A
 finding is printed with the command that repeats it; the status is 1 then."""
-import gzip, itertools, json, os, random, re, resource, select, shlex, shutil, signal, struct, subprocess
-import sys, tempfile, threading, time
+import gzip, itertools, json, os, random, re, select, shlex, shutil, signal, struct, subprocess, sys
+import tempfile, threading, time
 from concurrent.futures import ThreadPoolExecutor
 from functools import partial
 from pathlib import Path
@@ -39,12 +39,9 @@ GOOD["long.bin"] = (GOOD["snapshot.bin"] * 2)[:252 * 500 + 9]
 PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
 calls = Path("tests/cases/attack.txt").read_text().replace("\\xff", "\udcff")  # a byte that is not UTF-8
 for kind, words in re.findall("^([^#\n]*?): (.*)$", calls, re.M):
-    if kind == "plain":
-        PROGRAMS.append(([MORWICK, *words.split()], "live"))
-    else:
-        PROGRAMS += [([MORWICK, *words.split(), "-o", form], "live") for form in kind.split()]
+    PROGRAMS += [([MORWICK, *words.split(), *(["-o", form] if form != "plain" else [])], "live")
+                 for form in kind.split()]
 
-most_memory = 1 << 20  # KiB that no process has exceeded: 1 GiB at first
 thread = threading.local()
 
 
@@ -63,18 +60,16 @@ def fill(files):
 
 def take(name):
     """Removes a file and returns its content; None without a file."""
-    if not os.path.exists(f"{folder()}/{name}"):
-        return None
-    with open(f"{folder()}/{name}", "rb") as source:
-        os.remove(source.name)
-        return source.read()
+    file = Path(folder(), name)
+    content = file.read_bytes() if file.exists() else None
+    file.unlink(missing_ok=True)
+    return content
 
 
 def run(program, scenario, draw=None, sent=(), ends=(), **environment):
     """Runs a program to its end and sends it the signals in `sent` at random moments. A signal may end it
     before it says that it has started, and one in `ends` at any time. The result's `fault` is what no
     program may do."""
-    global most_memory
     preload = f"{PRELOAD} {BUILD}/tests/libfast_watch.so" if "watch" in program else PRELOAD
     environment |= {"GRELLON_SCENARIO": scenario + ".toml", "LD_PRELOAD": preload}
     result = SimpleNamespace(fault=None, deaths=[-each for each in ends])
@@ -93,14 +88,14 @@ def run(program, scenario, draw=None, sent=(), ends=(), **environment):
             result.fault = "hangs"
             process.kill()
         os.close(handle)
-        result.status, result.took = process.wait(), time.monotonic() - begin
-        output.seek(0)
-        errors.seek(0)
-        result.output, result.errors = output.read(MOST_OUTPUT), errors.read()
+        _, status, used = os.wait4(process.pid, 0)
+        process.returncode = result.status = os.waitstatus_to_exitcode(status)
+        result.took = time.monotonic() - begin
+        result.output, result.errors = (
+            os.pread(file.fileno(), MOST_OUTPUT, 0) for file in (output, errors))
     result.file = take("out")
-    memory = resource.getrusage(resource.RUSAGE_CHILDREN).ru_maxrss
-    if memory > most_memory:
-        most_memory, result.fault = memory, f"takes {memory} KiB"
+    if used.ru_maxrss > 1 << 20:  # KiB
+        result.fault = f"takes {used.ru_maxrss} KiB"
     if not 0 <= result.status < 128 and result.status not in result.deaths:
         result.fault = result.fault or "is killed"
     if MISUSE.search(result.errors):
@@ -179,22 +174,20 @@ def exchange(number):
     fill({"there/old": b"old"})
     os.symlink("old", here + "/link")
 
-    def exchange_link():
+    def exchange_it():
         while not done.is_set():
-            for target in ("/dev/null", "old"):
-                os.symlink(target, here + "/next")
-                os.rename(here + "/next", here + "/link")
+            if name == "old":
+                os.rename(here, here + ".moved")
+                os.rename(here + ".moved", here)
+            else:
+                for target in ("/dev/null", "old"):
+                    os.symlink(target, here + "/next")
+                    os.rename(here + "/next", here + "/link")
 
-    def exchange_folder():
-        while not done.is_set():
-            os.rename(here, here + ".moved")
-            os.rename(here + ".moved", here)
-
-    exchanger = threading.Thread(target=(exchange_link, exchange_folder)[number % 2])
-    exchanger.start()
-    result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
-    done.set()
-    exchanger.join()
+    with ThreadPoolExecutor() as exchanger:
+        exchanger.submit(exchange_it)
+        result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
+        done.set()
     good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (b"old", GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good

@@ -1,5 +1,5 @@
 // Reads a file under tests/cases, and what cases write down. Tests name a failing case by its file
-// and line.
+// and line. Then the heap as tests need it. Includes the headers that most tests use.
 #ifndef TESTS_CASE_FILE_H
 #define TESTS_CASE_FILE_H
 
@@ -10,6 +10,7 @@
 #include <fstream>
 #include <sstream>
 #include <string>
+#include <vector>
 
 #include "tests/parsing.h"
 
@@ -85,5 +86,16 @@ inline std::string TakeColumn(std::istringstream &columns) {
   const size_t first = std::min(column.find_first_not_of(' '), column.size());
   return column.substr(first, column.find_last_not_of(' ') + 1 - first);
 }
+
+// A copy of the bytes that begins at index 1, so that it is never aligned. It ends with the
+// allocation, so that AddressSanitizer sees one byte too many.
+inline std::vector<char> Unaligned(const std::string &bytes) {
+  const std::string shifted = "x" + bytes;
+  return {shifted.begin(), shifted.end()};
+}
+
+// Refuses the n-th allocation from now, counted from 1; 0 refuses none. Returns how many there were
+// since the last call, those with new included. Tests of a platform do not have it.
+extern "C" unsigned long RefuseAllocation(unsigned long number);
 
 #endif

@@ -52,9 +52,8 @@ void Use(const std::string &way, uint32_t held = 0) {
     ReleaseIOInterfaces(nullptr);
     closeKVRConnection(nullptr);
   }
-  const std::string found = row->className == nullptr ? "" : row->className;
-  std::cout << (good ? "good, " : "failed, ") << (found.empty() ? "no row" : "row " + found)
-            << "\n";
+  const char *found = row->className == nullptr ? "none" : row->className;
+  std::cout << (good ? "good, " : "failed, ") << "row " << found << "\n";
 }
 
 TEST(ConnectionTest, EachWayInFindsOpensAndGivesBack) {

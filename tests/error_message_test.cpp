@@ -2,12 +2,9 @@
 
 #include "morwick/error_message.h"
 
-#include <gtest/gtest.h>
-
 #include <barrier>
 #include <set>
 #include <thread>
-#include <vector>
 
 #include "tests/case_file.h"
 

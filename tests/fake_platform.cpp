@@ -1,12 +1,8 @@
 #include "tests/fake_platform.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <cstdarg>
 #include <cstdio>
 #include <memory>
-#include <sstream>
 
 #include "morwick/exporter.h"
 #include "morwick/platform.h"
@@ -93,9 +89,7 @@ std::string Play(const Script &script, const std::function<void()> &body) {
   body();
   std::string printed = testing::internal::GetCapturedStdout();
   printed += testing::internal::GetCapturedStderr();
-  for (const auto &[handle, what] : platform.openHandles) {
-    ADD_FAILURE() << what << " " << NameOf(handle) << " was left open";
-  }
+  EXPECT_EQ(platform.openHandles, decltype(platform.openHandles)()) << "left open";
   return (printed.empty() ? "" : printed + "\n") + platform.journal.str();
 }
 

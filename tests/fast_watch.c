@@ -30,8 +30,7 @@ int ppoll(struct pollfd *files, nfds_t count, const struct timespec *time, const
     shorter.tv_sec = time->tv_sec / kFaster;
     shorter.tv_nsec = time->tv_sec % kFaster * (1000000000 / kFaster) + time->tv_nsec / kFaster;
   }
-  return (int)syscall(SYS_ppoll, files, count, time == NULL ? NULL : &shorter, mask,
-                      (size_t)(_NSIG / 8));
+  return (int)syscall(SYS_ppoll, files, count, time == NULL ? NULL : &shorter, mask, _NSIG / 8L);
 }
 
 // The name that calls have where the compiler checks the array's size.

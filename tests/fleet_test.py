@@ -3,6 +3,7 @@ those of `morwick table`: on a cluster of three processes at a terminal, after a
 Usage: fleet_test.py MORWICK SOURCE"""
 import bisect, contextlib, csv, io, os, pathlib, re, subprocess, sys, tempfile, textwrap, time
 from concurrent.futures import ThreadPoolExecutor
+from signal import SIGKILL
 
 morwick, source = sys.argv[1:]
 sys.path.append(source + "/examples")  # workers do not look there: none of their work may need fleet.py
@@ -49,7 +50,6 @@ def start(*words):
     process = subprocess.Popen([sys.executable, "-m", "dask", *words], cwd="cluster", stdout=sys.stderr)
     at_end.callback(process.wait)
     at_end.callback(process.kill)  # first
-    return process
 
 
 with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, contextlib.ExitStack() as at_end:
@@ -65,7 +65,8 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, con
     rows = list(csv.reader(io.StringIO(table)))[1:]
     assert [row[0] for row in rows] == files and sum(row[1] != "" for row in rows) == 3
     start("scheduler", "--port", "0")
-    workers = [start("worker", "--no-nanny", "--nthreads", "1") for _ in range(2)]
+    for _ in range(2):
+        start("worker", "--no-nanny", "--nthreads", "1")
     with Client(scheduler_file="cluster/scheduler.json") as client:
         client.wait_for_workers(2, timeout=60)
         scheduler = client.scheduler.address
@@ -104,10 +105,7 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, con
         wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
         [waiting] = [worker for worker, parts in client.processing().items() if parts]
         assert client.has_what()[waiting], "no part that it has read would be lost with it"
-        pid = client.run(os.getpid, workers=[waiting])[waiting]
-        [process] = [process for process in workers if process.pid == pid]
-        process.kill()
-        process.wait()
+        os.kill(client.run(os.getpid, workers=[waiting])[waiting], SIGKILL)
         threads.submit(pathlib.Path(pipe).write_bytes, strange_dumps[1111])  # waits for a reader
         assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
         assert len(client.scheduler_info()["workers"]) == 1

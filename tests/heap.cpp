@@ -1,9 +1,9 @@
-#include "tests/heap.h"
+// Each `new`, also those in the standard library, goes by malloc here, so that RefuseAllocation
+// counts it.
 
 #include <cstdlib>
 #include <new>
 
-// These go by malloc, so that it counts each `new`, also those in the standard library.
 void *operator new(size_t size) {
   void *block = std::malloc(size);
   if (block == nullptr) throw std::bad_alloc();
@@ -13,8 +13,3 @@ void *operator new(size_t size) {
 void operator delete(void *block) noexcept { std::free(block); }
 
 void operator delete(void *block, size_t) noexcept { std::free(block); }
-
-std::vector<char> Unaligned(const std::string &bytes) {
-  const std::string shifted = "x" + bytes;
-  return {shifted.begin(), shifted.end()};
-}

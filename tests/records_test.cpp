@@ -1,12 +1,9 @@
 // The walk over records, the key tables, the summary fields, the rounding of capacities and the
 // check of snapshot headers: what tools ask the library beside its parsers.
 
-#include <gtest/gtest.h>
-
 #include <cstring>
 
 #include "tests/case_file.h"
-#include "tests/heap.h"
 
 namespace {
 

@@ -100,9 +100,6 @@ def test_statistics_are_those_of_the_command(dumps, stream):
         named = re.search(r"(?:statistics end|end record) at offset (\d+)", str(report["messages"]))
         left = len(data) - statistics.end  # no more than an end record, where no message says so
         assert left == len(data) - int(named[1]) if named else left in (0, 4, 8)
-        bytewise = np.frombuffer(data, np.uint8)
-        for same in bytearray(data), bytewise, np.repeat(bytewise, 2)[::2], memoryview(data)[::-1][::-1]:
-            assert morwick.parse(same, stream).entries == entries
         assert pickle.loads(pickle.dumps(statistics)).entries == entries
     assert 0 < sum(report["status"] != 0 for report in reports) < len(files)
 
@@ -288,25 +285,20 @@ def test_threads_find_the_same(dumps):
     assert all(other == first for other in others) and first[2] == plain(morwick.parse(KVR).items())
 
 
-def test_long_work_lets_other_threads_run():
+def test_long_work_lets_other_threads_run(request):
     def lets_run(call):
-        (gate := threading.Lock()).acquire()
-        other = threading.Thread(target=lambda: (gate.acquire(), ran.append(1)))
-        ran = []
-        other.start()
-        gate.release()
-        call()
-        did = bool(ran)
-        other.join()
-        return did
+        gate = threading.Lock()
+        with ThreadPoolExecutor() as pool:
+            with gate:
+                other = pool.submit(gate.acquire)
+            call()
+            return other.done()
 
     before = sys.getswitchinterval()
+    request.addfinalizer(lambda: sys.setswitchinterval(before))
     sys.setswitchinterval(1000)  # a thread runs only while another gives the interpreter's lock back
-    try:
-        for call in lambda: morwick.render(SNAPSHOT * 99), lambda: morwick.parse(LARGE):
-            assert any(lets_run(call) for _ in range(50))
-    finally:
-        sys.setswitchinterval(before)
+    for call in lambda: morwick.render(SNAPSHOT * 99), lambda: morwick.parse(LARGE):
+        assert any(lets_run(call) for _ in range(50))
 
 
 def test_progress_and_an_interrupt_end_the_reading(tmp_path):

@@ -18,6 +18,8 @@ constexpr int32_t kBadArgument = 0x102;
 constexpr int32_t kRefused = static_cast<int32_t>(0xE0000103);
 constexpr int32_t kDeviceError = static_cast<int32_t>(0xE0000104);
 
+const testing::ExitedWithCode kEndsWell(0);
+
 // Makes a file in memory, and returns its name in the folder of the scenario, /proc/self/fd.
 inline std::string File(const std::string &text) {
   const int file = memfd_create("file", 0);

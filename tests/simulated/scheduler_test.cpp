@@ -1,6 +1,5 @@
 // The simulated scheduler, and which of its calls end a process.
 
-#include <algorithm>
 #include <chrono>
 #include <cstdio>
 
@@ -33,7 +32,7 @@ TEST(SimulatedSchedulerDeathTest, EndsForABadScenarioOnlyWhereItMay) {
   setenv("GRELLON_SCENARIO", "/no/such", 1);
   const auto find = [] { return Find() + Find("VeltoQRN3NVMeController"); };
   const std::string complaint = "^platform_tests: /no/such: No such file or directory\n$";
-  EXPECT_EXIT(std::exit(static_cast<int>(find())), testing::ExitedWithCode(0), complaint);
+  EXPECT_EXIT(std::exit(static_cast<int>(find())), kEndsWell, complaint);
   void (*const calls[])() = {[] { SystemLog("%s", "never"); },
                              [] { RegisterActivity("never", kActivityCheckIn, Journal); },
                              [] { RunMainQueue(); }};
@@ -58,15 +57,13 @@ TEST(SimulatedSchedulerDeathTest, RunsAndResumesOnSchedule) {
     std::string schedule = TakeColumn(columns);
     std::ranges::replace(schedule, ';', '\n');
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_EXIT(PlaySchedule(schedule), testing::ExitedWithCode(0), journal);
+    EXPECT_EXIT(PlaySchedule(schedule), kEndsWell, journal);
     const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
     EXPECT_TRUE(least <= elapsed.count() && elapsed.count() < least + 1);
   });
-  EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), testing::ExitedWithCode(0),
-              "^$")
-      << "no activity";
-  EXPECT_EXIT((endsTransactions = false, PlaySchedule("first_run_after = 0")),
-              testing::ExitedWithCode(0),
+  // Without an activity.
+  EXPECT_EXIT((Play("schedule.first_run_after = 1000"), RunMainQueue()), kEndsWell, "^$");
+  EXPECT_EXIT((endsTransactions = false, PlaySchedule("first_run_after = 0")), kEndsWell,
               checkIn + "state 2 nnnn, the run did not end its transaction\n$");
 }
 

@@ -2,12 +2,12 @@
 
 #include <fcntl.h>
 #include <poll.h>
+#include <pty.h>
 #include <sys/ioctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
@@ -20,25 +20,8 @@
 
 namespace {
 
-std::string systemLog;
+std::string systemLog;  // what sendto, below, was given
 volatile int systemLogError = 0;
-
-}  // namespace
-
-// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
-// Takes the place of the system's log.
-extern "C" MORWICK_EXPORT ssize_t sendto(int, const void *text, size_t size, int flags,
-                                         const sockaddr *log, socklen_t) {
-  EXPECT_STREQ(reinterpret_cast<const sockaddr_un *>(log)->sun_path, "/dev/log");
-  EXPECT_NE(flags & MSG_DONTWAIT, 0);
-  errno = systemLogError;
-  if (errno != 0) return -1;
-  systemLog.append(static_cast<const char *>(text), size).push_back('\n');
-  return static_cast<ssize_t>(size);
-}
-// NOLINTEND(readability-inconsistent-declaration-parameter-name)
-
-namespace {
 
 // What each line says after the name of the daemon.
 std::vector<std::string> Texts(const std::string &log) {
@@ -115,12 +98,7 @@ void CheckOneGap(const std::string &log, unsigned long lines, unsigned long leas
 // Each opens what standard error may be, and stores the reader's end and the writer's.
 constexpr int (*kOpen[])(int *ends) = {
     pipe, [](int *ends) { return socketpair(AF_UNIX, SOCK_STREAM, 0, ends); },
-    [](int *ends) {
-      ends[0] = posix_openpt(O_RDWR | O_NOCTTY);
-      const int failed = grantpt(ends[0]) | unlockpt(ends[0]);
-      ends[1] = open(ptsname(ends[0]), O_RDWR | O_NOCTTY);
-      return failed;
-    }};
+    [](int *ends) { return openpty(&ends[0], &ends[1], nullptr, nullptr, nullptr); }};
 
 using FullLogTest = testing::TestWithParam<int>;
 INSTANTIATE_TEST_SUITE_P(PipeSocketTerminal, FullLogTest, testing::Range(0, 3));
@@ -145,11 +123,10 @@ TEST_P(FullLogTest, NeverWaits) {
   // A complaint is given up, too.
   const uint32_t request[6] = {13};
   char reply[4];
-  size_t replySize = sizeof reply;
-  EXPECT_EQ(CallStructMethod(Connect(), 8, request, sizeof request, reply, &replySize),
-            kDeviceError);
-  const unsigned lineSize =
-      isatty(STDERR_FILENO) != 0 ? 29 : 28;  // a terminal's line end is longer
+  size_t size = sizeof reply;
+  EXPECT_EQ(CallStructMethod(Connect(), 8, request, sizeof request, reply, &size), kDeviceError);
+  // A terminal's line end is longer.
+  const unsigned lineSize = isatty(STDERR_FILENO) != 0 ? 29 : 28;
   int unread = 0;
   ioctl(reader, FIONREAD, &unread);
   systemLogError = ECONNREFUSED;
@@ -159,9 +136,9 @@ TEST_P(FullLogTest, NeverWaits) {
   pollfd more = {.fd = reader, .events = POLLIN, .revents = 0};
   for (const unsigned last = line + 99; line < last || poll(&more, 1, 200) > 0;) {
     if (line < last) SystemLog(kLine, ++line);
-    std::array<char, 5000> some;
-    const ssize_t size = read(reader, some.data(), some.size());
-    if (size > 0) log.append(some.data(), static_cast<size_t>(size));
+    char some[5000];
+    const ssize_t count = read(reader, some, sizeof some);
+    if (count > 0) log.append(some, static_cast<size_t>(count));
     usleep(1000);
   }
   alarm(0);
@@ -187,18 +164,30 @@ TEST_P(FullLogTest, NeverWaits) {
     std::fputs(systemLog.c_str(), stderr);
   });
   systemLogError = ECONNREFUSED;
-  unsigned line = 0;
-  SystemLog(kLine, ++line);
+  SystemLog(kLine, 1U);
   systemLogError = EAGAIN;
-  while (line < 2600) SystemLog(kLine, ++line);
+  for (unsigned line = 2; line <= 2600; ++line) SystemLog(kLine, line);
   std::exit(0);
 }
 
 TEST(SimulatedSystemLogDeathTest, GivesWhatWaitsSomeTimeAtTheEnd) {
   GTEST_FLAG_SET(death_test_style, "threadsafe");
-  EXPECT_EXIT(EndWhileBothAreFull(), testing::ExitedWithCode(0),
+  EXPECT_EXIT(EndWhileBothAreFull(), kEndsWell,
               "line 0000000002600\n<29>[^\n]*: 1 lines of the log were dropped\n<29>.*: line "
               "0000000000002\n.*: [0-9]+ lines of the log were dropped\n$");
 }
 
 }  // namespace
+
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library's are reserved
+// Takes the place of the system's log.
+extern "C" MORWICK_EXPORT ssize_t sendto(int, const void *text, size_t size, int flags,
+                                         const sockaddr *log, socklen_t) {
+  EXPECT_STREQ(reinterpret_cast<const sockaddr_un *>(log)->sun_path, "/dev/log");
+  EXPECT_NE(flags & MSG_DONTWAIT, 0);
+  errno = systemLogError;
+  if (errno != 0) return -1;
+  systemLog.append(static_cast<const char *>(text), size).push_back('\n');
+  return static_cast<ssize_t>(size);
+}
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
