@@ -43,7 +43,7 @@ def grow():
     before = heap()
     for call in calls * 100: call(); morwick.parse(b"").get("x" * len(kvr))
     now = heap(); return now.h + now.e - before.h - before.e
-grow(); grow(); grown = grow(); assert grown < 40000, grown  # the first calls fill caches
+grown = [grow() for _ in range(6)]; assert min(grown) < 20000, grown  # the first calls fill caches
 """
 
 
