@@ -6,7 +6,7 @@
 #include <set>
 #include <thread>
 
-#include "tests/case_file.h"
+#include "tests/unit_test.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 
 #include "morwick/exporter.h"
 #include "morwick/platform.h"
-#include "tests/case_file.h"
+#include "tests/unit_test.h"
 
 struct MatchingRequest {
   std::string className;

@@ -2,7 +2,7 @@
 
 #include <random>
 
-#include "tests/case_file.h"
+#include "tests/unit_test.h"
 
 namespace {
 

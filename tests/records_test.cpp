@@ -3,7 +3,7 @@
 
 #include <cstring>
 
-#include "tests/case_file.h"
+#include "tests/unit_test.h"
 
 namespace {
 

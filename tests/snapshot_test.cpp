@@ -6,7 +6,7 @@
 #include <iomanip>
 #include <random>
 
-#include "tests/case_file.h"
+#include "tests/unit_test.h"
 
 namespace {
 

@@ -2,8 +2,8 @@
 
 #include <csignal>
 
-#include "tests/case_file.h"
 #include "tests/simulated/platform.h"
+#include "tests/unit_test.h"
 
 namespace {
 

@@ -3,8 +3,8 @@
 #include <chrono>
 #include <cstdio>
 
-#include "tests/case_file.h"
 #include "tests/simulated/platform.h"
+#include "tests/unit_test.h"
 
 namespace {
 

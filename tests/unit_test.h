@@ -1,7 +1,7 @@
-// Reads a file under tests/cases, and what cases write down. Tests name a failing case by its file
-// and line. Then the heap as tests need it. Includes the headers that most tests use.
-#ifndef TESTS_CASE_FILE_H
-#define TESTS_CASE_FILE_H
+// What unit tests share: cases from files under tests/cases, which a failing test names by file and
+// line, bytes that are never aligned, refused memory, and the headers that most tests use.
+#ifndef TESTS_UNIT_TEST_H
+#define TESTS_UNIT_TEST_H
 
 #include <gtest/gtest.h>
 
