@@ -223,7 +223,8 @@ def test_buffers_of_any_shape_are_read():
     mixed = memoryview(np.frombuffer(KVR, "?,b,B,>h,H,i,I,q,Q,e,f,d,g,S1,(2,3)<u2,V10,V172"))
     for data in mixed, memoryview(KVR).cast("c"), words, np.asfortranarray(words), (Record * words.size).from_buffer_copy(KVR):
         assert morwick.parse(data).entries == morwick.parse(KVR, "kvr").entries
-    assert len(morwick.snapshot(SNAPSHOT, HEADER.ljust(1 << 20))) == 120
+    small = HEADER[:8] + struct.pack("<2I", 126, 999) + HEADER[16:]  # records of half the size
+    assert len(morwick.snapshot(SNAPSHOT, small.ljust(1 << 20))) == 240
     assert len(morwick.snapshot(SNAPSHOT, HEADER[:12] + bytes(4) + HEADER[16:])) == 0  # the last record that a header counts is not printed
     (released := memoryview(KVR)).release()
     with pytest.raises(BufferError) as raised:
@@ -290,15 +291,16 @@ def test_long_work_lets_other_threads_run(request):
         gate = threading.Lock()
         with ThreadPoolExecutor() as pool:
             with gate:
-                other = pool.submit(gate.acquire)
+                other = pool.submit(lambda: (gate.acquire(), data.append(1)))
             call()
-            return other.done()
+            return other.done() and type(other.exception())
 
     before = sys.getswitchinterval()
     request.addfinalizer(lambda: sys.setswitchinterval(before))
     sys.setswitchinterval(1000)  # a thread runs only while another gives the interpreter's lock back
-    for call in lambda: morwick.render(SNAPSHOT * 99), lambda: morwick.parse(LARGE):
-        assert any(lets_run(call) for _ in range(50))
+    data = bytearray(SNAPSHOT * 99)  # which keeps its size while it is read
+    for call, error in (lambda: morwick.render(data), BufferError), (lambda: morwick.parse(LARGE), type(None)):
+        assert any(lets_run(call) is error for _ in range(50))
 
 
 def test_progress_and_an_interrupt_end_the_reading(tmp_path):
