@@ -105,7 +105,9 @@ with tempfile.TemporaryDirectory() as work, ThreadPoolExecutor() as threads, con
         wait_for(lambda: sum(map(len, client.has_what().values())) == 10)  # of eleven parts
         [waiting] = [worker for worker, parts in client.processing().items() if parts]
         assert client.has_what()[waiting], "no part that it has read would be lost with it"
-        os.kill(client.run(os.getpid, workers=[waiting])[waiting], SIGKILL)
+        pid = client.run(os.getpid, workers=[waiting])[waiting]
+        os.kill(pid, SIGKILL)
+        os.waitpid(pid, 0)  # only now its end of the pipe is closed
         threads.submit(pathlib.Path(pipe).write_bytes, strange_dumps[1111])  # waits for a reader
         assert as_rows(read.result(60)) == rows[:1100] + [[pipe, *rows[1111][1:]]] + rows[1100:]
         assert len(client.scheduler_info()["workers"]) == 1
