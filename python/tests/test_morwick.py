@@ -13,7 +13,8 @@ SOURCE = pathlib.Path(os.environ["SOURCE"])
 COMMAND = os.environ["MORWICK"]
 SANITIZED = bool(os.environ.get("SANITIZED"))
 COUNT = 25 if SANITIZED else 500  # random dumps of a stream; a sanitized command is slow
-STREAMS = ["kvr", "ftl", "msp"]
+ENDS = {"kvr": b"no end record", "ftl": b"\xff\xff\0\0", "msp": b"\xff\x2f"}
+STREAMS = [*ENDS]
 SNAPSHOT, HEADER, KVR = [(SOURCE / f"examples/{name}.bin").read_bytes() for name in ("snapshot", "snapshot_header", "kvr")]
 LARGE = KVR.replace(struct.pack("<Q", 123456789), bytes(8)) * 9000 + KVR  # two megabytes
 
@@ -37,7 +38,7 @@ def random_dump(stream, seed):
     for _ in range(draw.randrange(40)):
         key = draw.choice(keys)
         size = draw.choice([key.size] * 5 + [0, 1, key.size // 2, key.size + 1])
-        number = draw.choice([key.id] * 9 + [draw.randrange(0x2FFE)])  # below the end keys
+        number = draw.choice([key.id] * 36 + [draw.randrange(0x2FFE)] * 4 + [0x2FFF, 0xFFFF])  # which end msp and ftl
         values = [draw.getrandbits(draw.randrange(bits)) for _ in range(size)]
         part = draw.choice([0, 0, 0, 2]) if stream == "msp" else 0  # of a value, in bytes
         dump += struct.pack(f"<{header}{size}{value}{part}x", number, length * size + part, *values)
@@ -98,8 +99,8 @@ def test_statistics_are_those_of_the_command(dumps, stream):
         assert repr(statistics) == f"<morwick.Statistics of {stream}: {len(last)} names, fault: {fault}>"
         assert statistics.fault == fault
         named = re.search(r"(?:statistics end|end record) at offset (\d+)", str(report["messages"]))
-        left = len(data) - statistics.end  # no more than an end record, where no message says so
-        assert left == len(data) - int(named[1]) if named else left in (0, 4, 8)
+        left = data[statistics.end :]  # without a message nothing, or an end record
+        assert len(data) - len(left) == int(named[1]) if named else left == b"" or left.startswith(ENDS[stream])
         assert pickle.loads(pickle.dumps(statistics)).entries == entries
     assert 0 < sum(report["status"] != 0 for report in reports) < len(files)
 
@@ -258,6 +259,7 @@ OBJECTS, MIXED = np.array([None] * 99), np.zeros(99, [("I", "u4"), ("b", "O")])
     (TypeError, "unhashable", [lambda: morwick.parse(KVR)[[]], lambda: [] in morwick.parse(KVR)]),
     (TypeError, "files must be a path or an iterable of paths, not int", [lambda: morwick.table(7)]),
     (TypeError, "files: expected str, bytes or os.PathLike object, not int", [lambda: morwick.table([7])]),
+    (TypeError, "after *", [lambda: morwick.table([*7] for _ in "1")]),  # the caller's own
     (ValueError, "files: ", [lambda: morwick.table(["a", "b\0"]), lambda: morwick.table("\ud800")]),
     (TypeError, "names must ", [lambda: morwick.table([], names=[7]), lambda: morwick.table([], names=7)]),
     (ValueError, "names is empty", [lambda: morwick.table([], names=iter([]))]),
