@@ -75,7 +75,8 @@ def test_a_call_waits_without_the_interpreter(tmp_path):
             def write(): open("{tmp_path}/scenario", "w").write("[[controller]]\\nclass = 'VeltoQRN3NVMeController'\\n")
             threading.Thread(target=write).start()
             morwick.{first}()
-            """) == ""  # fmt: skip
+            print("found")
+            """) == "found\n"  # fmt: skip
     driver = f"{os.environ.get('LD_PRELOAD', '')}:{os.environ['ODD_DRIVER']}"
     assert play("statistics.toml", """
         import os, socket
