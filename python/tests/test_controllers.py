@@ -1,6 +1,6 @@
 """Reads controllers of the simulated platform, each time in a fresh interpreter."""
 
-import json, os, sys, textwrap
+import json, os, re, sys, textwrap
 
 from test_morwick import COMMAND, SOURCE, run
 
@@ -45,7 +45,8 @@ def test_controllers_are_read_and_given_back(tmp_path):
             try: morwick.Controller(name).read("msp")
             except morwick.ControllerError as error: print(same := pickle.loads(pickle.dumps(error)), same.result)
         """
-    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\nsnapshot_header = '/'\ndefects = '/dev/null'\n")
+    (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\n"
+                                                   f"snapshot_header = ['/dev/null', '/']\ndefects = '/dev/null'\ntelemetry = '{COMMAND}'\n")
     refused, unread, none = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder, "empty.toml")]
     assert [none[0], *refused[1:]] == ["no controller is present None", "KVRStorage: the controller is not present None",
                            "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
@@ -55,16 +56,23 @@ def test_controllers_are_read_and_given_back(tmp_path):
     states = [(each["class"], each["state"] != "absent", each["state"] == "present", each.get("result", 0), tuple(each["offers"]))
               for each in found["controllers"]]  # fmt: skip
     assert play("refuses.toml", "print([(c.name, c.present, c.opened, c.result, c.offers) for c in morwick.controllers()])") == f"{states}\n"
-    empty_and_failing = play(folder, "c = morwick.Controller()\nprint(c.read('defects'))\nc.snapshot()")
-    assert empty_and_failing.startswith("b''\n") and "snapshot_header: reading failed" in empty_and_failing
+    played = play(folder, f"""
+        c = morwick.Controller()
+        print(c.read("defects"), c.read("telemetry") == open("{COMMAND}", "rb").read())
+        for _ in "12":
+            try: c.snapshot()
+            except (ValueError, morwick.ControllerError) as error: print(error)
+        """)
+    assert re.match(r"b'' True\nheader: .*\n.*: snapshot_header: reading failed", played), played
     for line, cause in (refused[0], "VeltoQRN3NVMeController: the connection was refused"), (unread[0], "VeltoQRN3NVMeController: msp: reading failed"):
         words, hexadecimal, result = line.rsplit(maxsplit=2)
         assert words == cause + ", result" and int(result) == int(hexadecimal, 16) != 0
     for closing in "c.close()", "with c: pass":
         assert play("fails.toml", f"c = morwick.Controller()\ntry:\n  {closing}\nexcept Exception as error: print(error, error.result)") == (
             f"VeltoEmbeddedNVMeController: closing the connection failed, result 0xe0000104 {0xe0000104}\n")
-    raising = "c = morwick.Controller()\ntry:\n  with c: raise KeyboardInterrupt\nexcept KeyboardInterrupt: c.read('kvr')"
-    assert play("fails.toml", raising).splitlines()[-1] == "ValueError: the controller is closed"
+    for error in "KeyboardInterrupt('own')", "morwick.ControllerError('own')":
+        played = play("fails.toml", f"c = morwick.Controller()\ntry:\n  with c: raise {error}\nexcept BaseException as raised: print(raised); c.read('kvr')")
+        assert played.splitlines()[:: len(played.splitlines()) - 1] == ["own", "ValueError: the controller is closed"]
 
 
 def test_a_call_waits_without_the_interpreter(tmp_path):

@@ -113,6 +113,7 @@ def test_table_is_that_of_the_command(dumps, stream, names):
     seen = []
     table = morwick.table(dumps, stream, names, progress=lambda *now: seen.append(now))
     assert list(table) == heading[2:] and table.files == [row[0] for row in rows]
+    assert names or len(table) == sum(key.size for key in morwick.keys(stream))
     cells = [["" if cell is np.ma.masked else str(cell) for cell in table[name]] for name in table]
     assert [row[-len(table) :] for row in rows] == [list(row) for row in zip(*cells)]
     assert table.faults == [morwick.parse(pathlib.Path(file).read_bytes(), stream).fault for file in table.files]
