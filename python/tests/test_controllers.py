@@ -6,7 +6,7 @@ from test_morwick import COMMAND, SOURCE, run
 
 
 PREFACE = """
-import concurrent.futures, mmap, morwick, pickle, threading
+import concurrent.futures, mmap, morwick, pickle, sys, threading
 try: mmap.mmap(-1, 1 << 62)
 except OSError: pass
 """
@@ -46,7 +46,7 @@ def test_controllers_are_read_and_given_back(tmp_path):
             except morwick.ControllerError as error: print(same := pickle.loads(pickle.dumps(error)), same.result)
         """
     (folder := tmp_path / "folder.toml").write_text("[[controller]]\nclass = 'VeltoQRN3NVMeController'\nmsp = '/'\n"
-                                                   f"snapshot_header = ['/dev/null', '/']\ndefects = '/dev/null'\ntelemetry = '{COMMAND}'\n")
+                                                   f"snapshot_header = ['/dev/null', '/']\ndefects = '/dev/null'\ntelemetry = '{sys.executable}'\n")
     refused, unread, none = [play(scenario, failing).splitlines() for scenario in ("refuses.toml", folder, "empty.toml")]
     assert [none[0], *refused[1:]] == ["no controller is present None", "KVRStorage: the controller is not present None",
                            "VeltoEmbeddedNVMeController: msp: this controller does not offer it None"]  # fmt: skip
@@ -58,7 +58,7 @@ def test_controllers_are_read_and_given_back(tmp_path):
     assert play("refuses.toml", "print([(c.name, c.present, c.opened, c.result, c.offers) for c in morwick.controllers()])") == f"{states}\n"
     played = play(folder, f"""
         c = morwick.Controller()
-        print(c.read("defects"), c.read("telemetry") == open("{COMMAND}", "rb").read())
+        print(c.read("defects"), c.read("telemetry") == open(sys.executable, "rb").read())
         for _ in "12":
             try: c.snapshot()
             except (ValueError, morwick.ControllerError) as error: print(error)
