@@ -24,7 +24,8 @@ class GzipReader {
   explicit GzipReader(ReadBytes read);
   ~GzipReader();
 
-  // The bytes before a fault are returned first, and the fault by a later call.
+  // Reads up to `room` bytes, which is at least 1. The bytes before a fault are returned first, and
+  // the fault by a later call.
   ReadResult Read(char *bytes, size_t room);
 
  private:
