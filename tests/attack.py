@@ -34,6 +34,8 @@ for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_heade
 many = [b"".join(struct.pack("<IIQ", 4, 1, start << 54 | n) for n in range(2000)) for start in (1, 2)]
 GOOD |= {"many.bin": many[0], "more.bin": many[1], "odd\udcff.bin": many[0][:-4]}
 GOOD |= {name + ".gz": gzip.compress(GOOD[name + ".bin"], mtime=0) for name in ("kvr", "snapshot")}
+GOOD |= {"long.gz": gzip.compress(GOOD["kvr.bin"] * 2000, mtime=0),
+         "few": b"\n".join([b"long.gz", *[b"kvr.bin"] * 20, b"ftl.bin"])}  # more than a thread takes at once
 GOOD["long.bin"] = (GOOD["snapshot.bin"] * 2)[:252 * 500 + 9]
 
 PROGRAMS = [([GRELLON], scenario) for scenario in ("works", "bad", "faults-5")]
@@ -145,7 +147,8 @@ def refuse(program, scenario, number, good):
     if result.status == good.status and same(program, result.output, good.output):
         return result, same(program, result.file, good.file)
     return result, result.status == 1 and named and whole_json(program, result.output, 1) and (
-        result.file is None or b"read_success" in result.file)
+        result.file is None or b"read_success" in result.file) and (
+        "few" not in program or good.output.startswith(result.output))  # no file is blamed
 
 
 def interrupt(number):

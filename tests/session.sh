@@ -3,9 +3,8 @@
 # what they print, indented by four, with the exit status in brackets when it is not 0; fails with the
 # difference. In a document, a file of Markdown, the commands are indented too, and what is indented
 # without one before it is not played.
-# GRELLON, MORWICK and SOURCE name the programs and the tree, FAST_SLEEP, FAST_WATCH, ODD_DRIVER and
-# REFUSE_MEMORY libraries to preload; ctest sets them. SANITIZED is set for sanitizers, which cannot run
-# with little memory.
+# GRELLON, MORWICK and SOURCE name the programs and the tree, FAST_SLEEP, FAST_WATCH and ODD_DRIVER
+# libraries to preload; ctest sets them. SANITIZED is set for sanitizers, which cannot run with little memory.
 # Usage: session.sh SESSION; with SESSION_UPDATE=yes what is printed now is written into the session, but not
 # into a document.
 set -uo pipefail
