@@ -1,6 +1,6 @@
 // Preloaded into a process under test: drivers that break the contract. They refuse a connection
 // and leave a handle, or with ODD=HANDLE open one of that number, which may be 0. They keep no
-// lock, and answer a request when a byte comes on standard input.
+// lock, answer a request when a byte comes on standard input, and close with a positive result.
 
 #include <stdio.h>
 #include <stdlib.h>
@@ -27,5 +27,5 @@ int32_t CallStructMethod(uint32_t connection, uint32_t selector, const void *inp
 
 int32_t CloseService(uint32_t connection) {
   fprintf(stderr, "closed %u\n", connection);
-  return 0;
+  return 9;
 }

@@ -30,15 +30,15 @@ def test_controllers_are_read_and_given_back(tmp_path):
         left = morwick.Controller("VeltoQRN3NVMeController")
         for call in lambda: c.read("kvr"), lambda: left.read("nothing"), lambda: left.read(7), lambda: left.statistics("nothing"):
             try: call()
-            except (ValueError, TypeError) as error: print(error)
+            except (ValueError, TypeError) as error: print(type(error).__name__, error)
         """.replace('"kvr.bin"', repr(str(SOURCE / "examples/kvr.bin")))) == textwrap.dedent("""\
         VeltoQRN3NVMeController True 5 kvr:
         T 120 None
         True
-        the controller is closed
-        what must be one of kvr, ftl, statistics, msp, snapshot, snapshot_header, band, defects, telemetry, not 'nothing'
-        what must be a str, not int
-        stream must be 'kvr', 'ftl' or 'msp', not 'nothing'
+        ValueError the controller is closed
+        ValueError what must be one of kvr, ftl, statistics, msp, snapshot, snapshot_header, band, defects, telemetry, not 'nothing'
+        TypeError what must be a str, not int
+        ValueError stream must be 'kvr', 'ftl' or 'msp', not 'nothing'
         """)  # fmt: skip
     failing = """
         for name in None, "KVRStorage", "VeltoEmbeddedNVMeController":
@@ -96,5 +96,6 @@ def test_a_call_waits_without_the_interpreter(tmp_path):
             closed = pool.submit(c.close)
             print(*concurrent.futures.wait([read, closed], 0.3).done)
             here.send(b"!")
-            print(read.exception().result, closed.result())
-        """, ODD="77", LD_PRELOAD=driver) == f"\n{2**32 - 8} None\nanswered\nclosed 77\n"  # fmt: skip
+            print(read.exception().result, closed.exception().result)
+        """, ODD="77", LD_PRELOAD=driver) == f"\n{2**32 - 8} 9\nanswered\nclosed 77\n"  # fmt: skip
+    assert "refused, result 0x0" in play("statistics.toml", "morwick.Controller()", ODD="0", LD_PRELOAD=driver)
