@@ -275,11 +275,8 @@ class ControllerError(Exception):
     driver was not asked or did not fail."""
 
     def __init__(self, message: str, result: int | None = None) -> None:
-        super().__init__(message, result)
+        super().__init__(message)
         self.result = result
-
-    def __str__(self) -> str:
-        return str(self.args[0])
 
 
 class ControllerClass(NamedTuple):
