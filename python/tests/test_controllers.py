@@ -98,4 +98,5 @@ def test_a_call_waits_without_the_interpreter(tmp_path):
             here.send(b"!")
             print(read.exception().result, closed.exception().result)
         """, ODD="77", LD_PRELOAD=driver) == f"\n{2**32 - 8} 9\nanswered\nclosed 77\n"  # fmt: skip
-    assert "refused, result 0x0" in play("statistics.toml", "morwick.Controller()", ODD="0", LD_PRELOAD=driver)
+    code = "try: morwick.Controller()\nexcept morwick.ControllerError as error: print(error, error.result)"
+    assert play("statistics.toml", code, ODD="0", LD_PRELOAD=driver).endswith("refused, result 0x0 0\n")
