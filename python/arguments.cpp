@@ -43,7 +43,12 @@ std::string AsString(py::handle object, const char *name) {
   const auto text = py::reinterpret_steal<py::bytes>(
       PyUnicode_AsEncodedString(object.ptr(), "utf-8", "backslashreplace"));
   if (!text) throw py::error_already_set();
-  return std::string(ViewOf(text));
+  std::string escaped(ViewOf(text));
+  // A message would end at a null byte.
+  for (size_t at = 0; (at = escaped.find('\0')) != std::string::npos;) {
+    escaped.replace(at, 1, "\\x00");
+  }
+  return escaped;
 }
 
 MorwickStream AsStream(py::handle stream) {

@@ -13,7 +13,8 @@ namespace python {
 
 namespace py = pybind11;
 
-// A str as UTF-8. Characters that UTF-8 cannot hold are escaped, so that the text is no known name.
+// A str as UTF-8. Null bytes and characters that UTF-8 cannot hold are escaped, so that the text is
+// no known name.
 std::string AsString(py::handle object, const char *name);
 
 // "kvr", "ftl" or "msp".

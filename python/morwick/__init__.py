@@ -170,9 +170,10 @@ def render(data: Any, header: Any = None) -> str:
 
 class Table(Mapping[str, "np.ma.MaskedArray[Any, np.dtype[np.uint64]]"]):
     """Many dumps: a row each, and a column for each statistic. table[name] is a NumPy masked array
-    of uint64, in which the values that a dump lacks are masked. `files` are the names of the files,
-    and `faults` says what is wrong with each, None for a good dump. Leave out rows with a fault
-    before you rank: a cut dump has fewer figures, not better ones."""
+    of uint64, in which the values that a dump lacks are masked; a change of it changes the table.
+    `files` are the names of the files, and `faults` says what is wrong with each, None for a good
+    dump. Leave out rows with a fault before you rank: a cut dump has fewer figures, not better
+    ones."""
 
     __eq__ = object.__eq__
     __hash__ = object.__hash__
@@ -255,7 +256,7 @@ def _names(names: str | Iterable[str] | None) -> list[bytes]:
             raise TypeError(f"names must hold str, not {type(name).__name__}")
     if not listed:
         raise ValueError("names is empty; leave it out for all statistics")
-    return [name.encode("utf-8", "backslashreplace") for name in listed]
+    return [name.replace("\0", "\\x00").encode("utf-8", "backslashreplace") for name in listed]
 
 
 def _jobs(jobs: int | None) -> int:
@@ -272,7 +273,7 @@ def _jobs(jobs: int | None) -> int:
 
 class ControllerError(Exception):
     """A controller is absent or has failed. `result` is the driver's result code, or None when the
-    driver was not asked or did not fail."""
+    driver was not asked or has answered."""
 
     def __init__(self, message: str, result: int | None = None) -> None:
         super().__init__(message)
@@ -282,7 +283,7 @@ class ControllerError(Exception):
 class ControllerClass(NamedTuple):
     """A class of controllers that the library knows, and whether this machine has one. `opened`
     tells whether a connection could be opened, which is closed again; `result` is the driver's
-    result code for that, 0 for success. `offers` names what Controller.read can read."""
+    result code for that, 0 for success or where it was not asked. `offers` names what Controller.read can read."""
 
     name: str
     present: bool
