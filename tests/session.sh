@@ -10,7 +10,7 @@
 set -uo pipefail
 session=$(realpath "$1")
 work=$(mktemp -d)
-trap 'kill "${pid:-}" 2>/dev/null; rm -rf "$work"' EXIT
+trap 'kill "${pid:-}" "$watcher" 2>/dev/null; rm -rf "$work" "$work.now"' EXIT
 cd "$work" || exit 1
 : "${SANITIZED:=}"
 cp -r "$SOURCE"/examples/{*.bin,fleet} .
@@ -57,8 +57,20 @@ start() {
 wait_for() { await grep -q -- "$1" log; }
 stop() { SECONDS=0; kill "-$1" "$pid"; wait "$pid"; echo "status $?, $([ $SECONDS -le 6 ] && echo "in time" || echo "after $SECONDS s")"; }
 
+# Ends the session after two minutes in one command, and says in which.
+while sleep 1 >/dev/null 2>&1; do
+  [ -z "$(find "$work.now" -mmin +2 2>/dev/null)" ] && continue
+  echo "this does not end: $(cat "$work.now")"
+  commands=$(</proc/$$/task/$$/children)
+  kill $$
+  for each in $commands; do [ "$each" = "$BASHPID" ] || kill -KILL "$each"; done
+done &
+watcher=$!
+disown  # or a session's own `wait` would wait for it
+
 perform() {
   [ -n "$command" ] || return
+  printf '%s\n' "$command" >"$work.now"
   eval "$command" >output 2>&1 </dev/null
   local status=$?
   sed 's/^/    /' output

@@ -12,6 +12,7 @@
 
 #include "tools/commands.h"
 #include "tools/memory.h"
+#include "tools/options.h"
 #include "tools/write_file.h"
 
 namespace tools {
@@ -53,8 +54,6 @@ void AddHelp(CLI::App &app, Action *action) {
     };
   });
 }
-
-constexpr char kValueMissing[] = "a value is missing";
 
 // Refuses an option with an empty value, such as --write=. The argument parser would take the next
 // word as its value.

@@ -3,6 +3,7 @@
 #include "tools/options.h"
 
 #include <algorithm>
+#include <ranges>
 
 #include "fleet/controllers.h"
 #include "tools/messages.h"
@@ -43,14 +44,20 @@ void AddStream(CLI::App *command, MorwickStream *stream) {
       ->required();
 }
 
-void AddNames(CLI::App *command, std::vector<std::string> *names) {
-  command->add_option("-n,--names", *names, "Only these statistics; 'host*' for all that begin so")
-      ->delimiter(',')
+void AddNames(CLI::App *command, std::vector<std::string> *lists) {
+  command->add_option("-n,--names", *lists, "Only these statistics; 'host*' for all that begin so")
       ->allow_extra_args(false)
       ->type_name("NAMES");
 }
 
-Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &names) {
+Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &lists) {
+  std::vector<std::string> names;
+  for (const std::string &list : lists) {
+    for (const auto part : std::views::split(list, ',')) {
+      if (!part.empty()) names.emplace_back(part.begin(), part.end());
+    }
+  }
+  if (names.empty() && !lists.empty()) throw CLI::ValidationError("--names", kValueMissing);
   try {
     return std::make_shared<const fleet::Selection>(streams, names);
   } catch (const fleet::UnknownName &unknown) {
@@ -58,8 +65,8 @@ Filter Select(std::span<const MorwickStream> streams, const std::vector<std::str
   }
 }
 
-Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &names) {
-  return names.empty() ? nullptr : Select(streams, names);
+Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &lists) {
+  return lists.empty() ? nullptr : Select(streams, lists);
 }
 
 void AddController(CLI::App *command, std::string *className, const std::string &description) {

@@ -35,15 +35,17 @@ void AddFormat(CLI::App *command, Format *format, const std::vector<Format> &cho
 // -s, --stream: required.
 void AddStream(CLI::App *command, MorwickStream *stream);
 
-// -n, --names: names of statistics, separated by commas or in several options.
-void AddNames(CLI::App *command, std::vector<std::string> *names);
+inline constexpr char kValueMissing[] = "a value is missing";
 
-// The statistics with these names; all of them when there are no names. A name that no stream has
-// is wrong usage.
-Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
+// -n, --names: lists of statistics, whose names are separated by commas.
+void AddNames(CLI::App *command, std::vector<std::string> *lists);
 
-// As Select, but null without names.
-Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &names);
+// The statistics of these lists; all of them when there are no lists. A name that no stream has
+// is wrong usage, and so are lists without a name.
+Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &lists);
+
+// As Select, but null without lists.
+Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &lists);
 
 // -c, --controller: a class that the library knows.
 void AddController(CLI::App *command, std::string *className, const std::string &description);

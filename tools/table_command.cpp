@@ -31,7 +31,9 @@ namespace {
 using std::chrono::milliseconds;
 
 void AppendRow(const fleet::Row &row, std::string *rows) {
-  AppendCsvField(rows, row.file.name);
+  // A line end in a name would forge a row at a terminal, even where the field is quoted.
+  static const bool terminal = OutputIsTerminal();
+  AppendCsvField(rows, terminal ? PrintableLine(row.file.name) : row.file.name);
   *rows += ',';
   AppendCsvField(rows, row.file.fault);
   for (size_t i = 0; i < row.values.size(); ++i) {
