@@ -176,7 +176,8 @@ def exchange(number):
     """Writes a file while a thread exchanges the link to it for one to a device, or moves its folder."""
     here, name, done = folder() + "/there", ("link", "old")[number % 2], threading.Event()
     os.mkdir(here)
-    fill({"there/old": b"old"})
+    old = GOOD["kvr.bin"] + b"old"  # longer than what replaces it
+    fill({"there/old": old})
     os.symlink("old", here + "/link")
 
     def exchange_it():
@@ -193,7 +194,7 @@ def exchange(number):
         exchanger.submit(exchange_it)
         result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
         done.set()
-    good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (b"old", GOOD["kvr.bin"])
+    good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (old, GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good
 
