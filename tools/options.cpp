@@ -3,7 +3,7 @@
 #include "tools/options.h"
 
 #include <algorithm>
-#include <ranges>
+#include <sstream>
 
 #include "fleet/controllers.h"
 #include "tools/messages.h"
@@ -53,8 +53,9 @@ void AddNames(CLI::App *command, std::vector<std::string> *lists) {
 Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &lists) {
   std::vector<std::string> names;
   for (const std::string &list : lists) {
-    for (const auto part : std::views::split(list, ',')) {
-      if (!part.empty()) names.emplace_back(part.begin(), part.end());
+    std::istringstream parts(list);
+    for (std::string name; std::getline(parts, name, ',');) {
+      if (!name.empty()) names.push_back(name);
     }
   }
   if (names.empty() && !lists.empty()) throw CLI::ValidationError("--names", kValueMissing);
