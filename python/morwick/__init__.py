@@ -283,7 +283,8 @@ class ControllerError(Exception):
 class ControllerClass(NamedTuple):
     """A class of controllers that the library knows, and whether this machine has one. `opened`
     tells whether a connection could be opened, which is closed again; `result` is the driver's
-    result code for that, 0 for success or where it was not asked. `offers` names what Controller.read can read."""
+    result code for that, 0 for success or where it was not asked. `offers` names what
+    Controller.read can read."""
 
     name: str
     present: bool
