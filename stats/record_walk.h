@@ -3,6 +3,7 @@
  * end and why. The three parsers and morwick/records.h are built on it. C11 and C++20 alike.
  * Comments that begin with an at sign are rules in ACSL: scripts/prove proves that the code keeps
  * them for any bytes of any length. There `s` is a stream, `b` its bytes and `o` an offset in them.
+ * In front of a rule stand the words by which public headers tell it; scripts/lint compares them.
  */
 #ifndef STATS_RECORD_WALK_H
 #define STATS_RECORD_WALK_H
@@ -38,16 +39,31 @@ struct WalkedRecord {
 
     // What stands at `o`, where there is no filler.
     logic integer Step(MorwickStream s, uint8_t *b, integer size, integer o) =
+      // records.h: the buffer ends right after a record, so it is whole
       o == size ? kMorwickEndOfBuffer
+      // records.h: bytes are left, but fewer than a header has
+      // kvr_stats.h: bytes after the last whole 64-bit word are ignored
+      // msp_stats.h: where only 1 to 3 bytes are left for the next header
       : o + HeaderSize(s) > size ? kMorwickPartOfHeader
+      // records.h: a record with the end key of FTL or MSP
+      // ftl_stats.h: at a record of the end key 0xFFFF
       : s == kMorwickFTL && Id(s, b, o) == 0xFFFF ? kMorwickEndRecord
+      // msp_stats.h: at a record of the end key 0x2FFF
       : s == kMorwickMSP && Id(s, b, o) == 0x2FFF ? kMorwickEndRecord
+      // records.h: a KVR or FTL header with a key above 0x30000000
+      // kvr_stats.h: a bad header (a key above 0x30000000 or a length past the end
+      // ftl_stats.h: a bad header (a key above 0x30000000 or a length past the end
       : s != kMorwickMSP && Id(s, b, o) > 0x30000000 ? kMorwickBadKey
+      // records.h: a record that needs more bytes than are left
+      // msp_stats.h: at a record that runs past the end
       : o + HeaderSize(s) + Length(s, b, o) > size ? kMorwickTooLong
       : kMorwickRecord;
 
     // The offset of the first that is no filler, from `o` on. A filler is a record of length 0.
     logic integer Start(MorwickStream s, uint8_t *b, integer size, integer o) =
+      // records.h: In FTL and MSP it passes over records of length 0
+      // ftl_stats.h: records of length 0 are passed over
+      // msp_stats.h: A record of length 0 is a filler of four bytes
       s != kMorwickKVR && o + HeaderSize(s) <= size && Length(s, b, o) == 0
         ? Start(s, b, size, o + HeaderSize(s)) : o;
 
@@ -142,8 +158,13 @@ static inline MorwickStep WalkToRecord(MorwickStream stream, const uint8_t *byte
     requires stream == kMorwickKVR || stream == kMorwickFTL || stream == kMorwickMSP;
     assigns \nothing;
     ensures payload + \result * (stream == kMorwickMSP ? 4 : 8) <= size;
+    // records.h: as many as are configured, which may continue in the records after it, or none
+    // kvr_stats.h: The key, not the record's length, decides how many values are read
     ensures stream == kMorwickKVR ==>
       \result == (payload + configured * 8 <= size ? configured : 0);
+    // records.h: as many as both the configuration and the record have
+    // ftl_stats.h: the smaller one is added
+    // msp_stats.h: as many whole elements as both allow are added
     ensures stream != kMorwickKVR ==>
       \result == \min(configured, length / (stream == kMorwickMSP ? 4 : 8)); */
 static inline uint32_t ValuesTaken(MorwickStream stream, uint64_t payload, uint64_t length,
