@@ -153,6 +153,12 @@ def refuse(program, scenario, number, good):
         and result.errors == b"morwick: out of memory\n")
 
 
+def refuse_module():
+    result = run(["/usr/bin/python3", os.path.abspath("python/tests/memory.py"), "refusals"], "live",
+                 PYTHONMALLOC="malloc", PYTHONPATH=BUILD + "/python", SOURCE=os.getcwd())
+    return result, result.status == 0 and result.errors == b""  # a driver complains of an open handle
+
+
 def interrupt(number):
     draw = random.Random(f"{SEED} signals {number}")
     last = draw.choice(STOP)
@@ -163,7 +169,8 @@ def interrupt(number):
         return result, result.status in result.deaths or (
             result.status == 0 and ended_well(result.errors))
     if number % 4 == 1:
-        program = [MORWICK, *"watch -s kvr --every 0.1 -o".split(), draw.choice(("csv", "json"))]
+        program = [MORWICK, *"watch -s kvr --every".split(), draw.choice(("0.1", "0.1", "60000")),
+                   "-o", draw.choice(("csv", "json", "normal"))]
         result = run(program, "live", draw, [last])
         return result, result.status in (0, *result.deaths) and whole_json(program, result.output)
     program = [MORWICK, *draw.choice(("read telemetry -w out", "metrics -w out")).split()]
@@ -172,37 +179,60 @@ def interrupt(number):
     return result, whole or result.status in result.deaths and result.file is None
 
 
+def run_while(act, *words):
+    """Runs the command while a thread acts again and again."""
+    done = threading.Event()
+    with ThreadPoolExecutor() as actor:
+        actor.submit(lambda: [act() for _ in iter(done.is_set, True)])
+        result = run([MORWICK, *words], "live")
+        done.set()
+    return result
+
+
 def exchange(number):
-    """Writes a file while a thread exchanges the link to it for one to a device, or moves its folder."""
-    here, name, done = folder() + "/there", ("link", "old")[number % 2], threading.Event()
+    """Writes a file while the link to it is exchanged for one to a device, or its folder is moved."""
+    here, name = folder() + "/there", ("link", "old")[number % 2]
     os.mkdir(here)
-    old = GOOD["kvr.bin"] + b"old"  # longer than what replaces it
+    old = GOOD["kvr.bin"][::-1] + b"old"  # other bytes than what replaces it, and more
     fill({"there/old": old})
     os.symlink("old", here + "/link")
 
-    def exchange_it():
-        while not done.is_set():
-            if name == "old":
-                os.rename(here, here + ".moved")
-                os.rename(here + ".moved", here)
-            else:
-                for target in ("/dev/null", "old"):
-                    os.symlink(target, here + "/next")
-                    os.rename(here + "/next", here + "/link")
+    def move_folder():
+        os.rename(here, here + ".moved")
+        os.rename(here + ".moved", here)
 
-    with ThreadPoolExecutor() as exchanger:
-        exchanger.submit(exchange_it)
-        result = run([MORWICK, "read", "telemetry", "-w", "there/" + name], "live")
-        done.set()
+    def exchange_link():
+        for target in ("/dev/null", "old"):
+            os.symlink(target, here + "/next")
+            os.rename(here + "/next", here + "/link")
+
+    result = run_while((exchange_link, move_folder)[number % 2], "read", "telemetry", "-w", "there/" + name)
     good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (old, GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good
 
 
-def many_entries():
+def shrink(number):
+    """Makes a table of a file that is overwritten: a row has all values or a fault."""
+    file = Path(folder(), "kvr.bin")
+    result = run_while(lambda: [file.write_bytes(content) for content in (bytes(20000), GOOD["kvr.bin"], b"")],
+                       *"table -s kvr -n hostWrites kvr.bin kvr.bin kvr.bin".split())
+    fill(GOOD)
+    return result, re.fullmatch(rb'file,fault,hostWrites\n(kvr.bin,(,123456789|"?(there is nothing|the statistics end|'
+                                rb'no statistics).*,)\n){3}', result.output)
+
+
+def many_entries(words, room="unlimited"):
+    """Reads entries that need more memory than the command takes, or than its caller leaves it (in bytes)."""
     fill({"kvr.bin": b"\x36\0\0\0\0\0\0\0" * 262144})  # each eight bytes make 256 entries
-    result = run([MORWICK, *"stats -s kvr --summary kvr.bin".split()], "live")
-    return result, result.status == 1 and b"out of memory after" in result.errors
+    result = run(["prlimit", f"--as={room}:", MORWICK, *words.split()], "live")
+    fill(GOOD)
+    counts = [int(count) for count in re.findall(rb"out of memory after (\d+) entries", result.errors)]
+    lines = result.output.splitlines()
+    shown = sum(len(line.split()) - 2 for line in lines)
+    return result, result.status == 1 and counts and (room == "unlimited" or counts[0] < 500000) and (
+        "normal" not in words or counts == [shown]) and (  # the next reading of a watch is good
+        "json" not in words or json.loads(lines[-1])["status"] == (0 if "watch" in words else 1))
 
 
 def feed(number):
@@ -241,11 +271,11 @@ def carry_out(attack, jobs, pool):
     """Returns the number of runs, of findings, and the longest run in seconds."""
     jobs, end, numbers = list(jobs), float("inf"), itertools.count()
     if SECONDS > 0:  # the first hundred always
-        jobs[100:] = random.Random(SEED).sample(jobs[100:], len(jobs) - 100)
-        end = time.monotonic() + SECONDS / 5  # attacks
+        jobs[100:] = random.Random(SEED).sample(jobs[100:], max(0, len(jobs) - 100))
+        end = time.monotonic() + SECONDS / 6  # long attacks
 
-    def one(job):
-        if time.monotonic() > end:
+    def one(index, job):
+        if index >= 100 and time.monotonic() > end:
             return None
         result, fine = job()
         if fine and not result.fault:
@@ -256,7 +286,7 @@ def carry_out(attack, jobs, pool):
               result.command.replace(folder(), kept), flush=True)
         return result.took, 1
 
-    times, found = zip(*filter(None, pool.map(one, jobs)))
+    times, found = zip(*filter(None, pool.map(one, itertools.count(), jobs)))
     return len(times), sum(found), max(times)
 
 
@@ -267,10 +297,15 @@ os.makedirs(ROOT)
 print("seed", SEED, flush=True)
 with ThreadPoolExecutor(os.cpu_count()) as workers:
     table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
-        "daemon": refused_memory(PROGRAMS[:3]), "memory": refused_memory(PROGRAMS[3:]),
+        "daemon": refused_memory(PROGRAMS[:3]), "memory": refused_memory(PROGRAMS[3:]), "module": [refuse_module],
+        "room": [partial(many_entries, "stats -s kvr --summary kvr.bin", "100000000"), *(
+            partial(many_entries, words) for words in (
+                "stats -s kvr -o normal kvr.bin", "stats -s kvr -o json kvr.bin", "metrics kvr=kvr.bin",
+                "diff -s kvr -o json kvr.bin kvr.bin", "watch -s kvr --every 0.1 --count 1 -o json"))],
         "signals": (partial(interrupt, n) for n in range(1000)),
         "links": (partial(exchange, n) for n in range(1000)),
-        "bytes": [many_entries, *(partial(feed, n) for n in range(10000))]}.items()]
+        "files": (partial(shrink, n) for n in range(100)),
+        "bytes": (partial(feed, n) for n in range(10000))}.items()]
 print("attack      runs  findings  worst time")
 for row in table:
     print("{:8} {:7} {:9} {:9.2f} s".format(*row))

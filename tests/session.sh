@@ -21,6 +21,13 @@ export LD_PRELOAD=
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
 # A watch, with pauses and seconds a thousand times shorter.
 fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" watch "$@"; }
+# A command with that many KiB of memory, so that what grows ends it; a sanitizer needs more.
+with_memory() { ([ "$SANITIZED" ] || ulimit -v "$1" && "${@:2}"); }
+# The screen of a terminal at a command's end, as tests/terminal.py has it, without times and rates.
+terminal() {
+  /usr/bin/python3 "$SOURCE/tests/terminal.py" "$@" 2>&1 |
+    sed 's/^[-0-9]* [:0-9]*, [.0-9]* s/TIME/; s/ [0-9.-]*\.[0-9]*/ RATE/' | tr -s ' '
+}
 # Runs morwick with a clock that stands at these milliseconds since 1970.
 at() { NOW=$1 LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" "${@:2}" 2>/dev/null; }
 # Runs the command. With -o json its output and messages are kept for the checks at the end: the schema,
@@ -41,6 +48,19 @@ le32() { perl -e 'print pack "V*", map { /^0x/ ? hex : $_ } @ARGV' -- "$@"; }
 layout() { le32 0 6 "$1" 5 0 0 40 0 0 0 "$2" 0; }
 field() { perl -e 'print pack "V3 a16", @ARGV' -- "$@"; }
 
+# Runs a program as somebody who may not read everything, as root may.
+unprivileged() { if [ "$UID" = 0 ]; then setpriv --bounding-set=-all --inh-caps=-all "$@"; else "$@"; fi; }
+# Runs a script of the shell with file systems of its own. Where it may not mount any it goes on without.
+mounting() { if unshare -rm true 2>error; then unshare -rm sh -c "$1"; else unprivileged sh -c "$1"; fi; }
+# Runs a program and sends it a signal after some time. Usage: after SECONDS SIGNAL PROGRAM...
+after() { timeout --foreground --preserve-status -s "$2" "$1" "${@:3}"; }
+
+# Runs a program whose standard input and output do not block, as another program may have left them.
+unblocked() {
+  /usr/bin/python3 -c 'import os, sys
+for file in 0, 1: os.set_blocking(file, False)
+os.execvp(sys.argv[1], sys.argv[1:])' "$@"
+}
 # Waits, for 20 seconds at most, until a command succeeds.
 await() {
   for _ in {1..1000}; do "$@" && return; sleep 0.02; done
