@@ -1,6 +1,6 @@
-"""The daemon with early signals, with random faults, and with outputs and logs that take nothing. GRELLON names it,
+"""The daemon with early signals, and with outputs and logs that take nothing. GRELLON names it,
 FAST_SLEEP a library that makes its pauses a thousand times shorter."""
-import atexit, fcntl, os, random, re, socket, subprocess, tempfile, time
+import atexit, fcntl, os, socket, subprocess, tempfile, time
 from pathlib import Path
 from signal import SIGHUP, SIGINT, SIGTERM, SIGUSR1
 
@@ -22,9 +22,9 @@ def start(*before, errors=None):
     return daemon
 
 
-def wait_for(text, times=1):
+def wait_for(text):
     end = time.monotonic() + 20
-    while LOG.read_text().count(text) < times:
+    while text not in LOG.read_text():
         assert time.monotonic() < end, f"in vain: {text}"
         time.sleep(0.002)
 
@@ -47,28 +47,6 @@ def early_signals():
             seen = daemon.wait(20), LOG.read_text().count("running")
         assert seen == outcome and (outcome[0] == 0 or LOG.read_text() == ""), (option, signals, seen)
     SCENARIO.unlink()
-
-
-def random_faults():
-    """A hundred signals to yield, over at least as many runs with faults: no handle stays open, and memory is
-    flat after the first twenty."""
-    draw, pages = random.Random(7), []
-    faults = {"vanish": 44, "refuse_open": 44, "fail_request": 100, "fail_close": 80}
-    SCENARIO.write_text(LONG + "".join(
-        f"{fault} = {draw.sample(range(1, 401), times)}\n" for fault, times in faults.items()))
-    daemon = start()
-    for run in range(100):
-        wait_for("running grellon", run + 1)
-        daemon.send_signal(SIGUSR1)
-        pages.append(int(Path(f"/proc/{daemon.pid}/statm").read_text().split()[1]))
-    daemon.terminate()
-    assert daemon.wait(20) == 0
-    assert (pages[99] - pages[20]) * os.sysconf("SC_PAGE_SIZE") <= 256 << 10, pages
-    log = LOG.read_text()
-    assert not re.search("still open|already released|is unknown|of another kind", log), log
-    assert re.search(r"\ngrellon: (deferring|stopping) grellon daemon\n$", log), log[-99:]
-    for text in "status fail", "error closing", "deferring grellon", "stopping grellon":
-        assert text in log, f"never: {text}"
 
 
 def outputs_that_take_nothing():
@@ -106,6 +84,5 @@ def unread_logs():
 with tempfile.TemporaryDirectory() as folder:
     os.chdir(folder)
     early_signals()
-    random_faults()
     outputs_that_take_nothing()
     unread_logs()
