@@ -52,6 +52,8 @@ field() { perl -e 'print pack "V3 a16", @ARGV' -- "$@"; }
 unprivileged() { if [ "$UID" = 0 ]; then setpriv --bounding-set=-all --inh-caps=-all "$@"; else "$@"; fi; }
 # Runs a script of the shell with file systems of its own. Where it may not mount any it goes on without.
 mounting() { if unshare -rm true 2>error; then unshare -rm sh -c "$1"; else unprivileged sh -c "$1"; fi; }
+# Runs a program whose standard input is a terminal that hangs up once what came here is read.
+hang_up() { /usr/bin/python3 "$SOURCE/tests/hang_up.py" "$@"; }
 # Runs a program and sends it a signal after some time. Usage: after SECONDS SIGNAL PROGRAM...
 after() { timeout --foreground --preserve-status -s "$2" "$1" "${@:3}"; }
 
