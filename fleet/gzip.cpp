@@ -22,7 +22,7 @@ struct GzipReader::Inflation {
   std::array<unsigned char, kBlock> packed;
   z_stream stream = {};
   bool inMember = true;       // false after the end of a member, where another may begin
-  bool damaged = false;       // told when the bytes before the damage have been returned
+  bool damaged = false;       // reported after the bytes before the damage
   bool mayHoldBytes = false;  // the caller's room was full: zlib may hold the rest of a repetition
 
   Inflation() {

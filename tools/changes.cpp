@@ -98,7 +98,7 @@ std::optional<std::vector<Change>> FindChanges(const Statistics &old, const Stat
     }
     return changes;
   } catch (const std::bad_alloc &) {
-    Complain(subject, "out of memory when compared");
+    Complain(subject, "out of memory while comparing");
     return std::nullopt;
   }
 }

@@ -23,7 +23,7 @@ Controller::Controller(const std::string &className, const std::string &bufferNa
     Complain(name() + ": " + bufferName,
              "the connection was refused, result " + fleet::Hexadecimal(result));
   } else if (errno == ENOMEM) {
-    RefuseMemory();
+    ThrowOutOfMemory();
   } else if (className.empty()) {
     Complain(bufferName, "no controller is present");
   } else {

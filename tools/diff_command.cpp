@@ -93,7 +93,7 @@ void AddDiff(CLI::App &app, Action *action) {
     if (options->oldFile == "-" && options->newFile == "-") {
       throw CLI::ValidationError("OLD, NEW", "standard input can be read only once");
     }
-    if (options->seconds == 0) throw CLI::ValidationError("--seconds", "no time has passed");
+    if (options->seconds == 0) throw CLI::ValidationError("--seconds", "must be above 0");
     *action = [=] { return Diff(*options); };
   });
 }

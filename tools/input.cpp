@@ -51,7 +51,7 @@ fleet::ReadResult Input::ReadRaw(char *bytes, size_t room) {
     if (count >= 0) {
       bytesRead_ += static_cast<size_t>(count);
       if (progress_.IsDue()) {
-        const std::string total = size_ == 0 ? "" : " of " + std::to_string(size_ >> 10);
+        const std::string total = size_ == 0 ? "" : fmt::format(" of {}", size_ >> 10);
         fmt::print(stderr, "\rmorwick: {}: {}{} KiB read", PrintableLine(name_), bytesRead_ >> 10,
                    total);
       }
@@ -77,7 +77,7 @@ void NoteUnreadInput() {
     int count = 0;
     hasBytes = ioctl(STDIN_FILENO, FIONREAD, &count) == 0 && count > 0;
   }
-  if (hasBytes) Note("standard input", "was not read; name it, as -, to read it");
+  if (hasBytes) Note("standard input", "was not read; give - as the file to read it");
 }
 
 WholeInput ReadInput(const std::string &file, uint64_t limit) {

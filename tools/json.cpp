@@ -10,7 +10,7 @@ namespace tools {
 
 Json::Json(Output &output, std::string_view command, const std::vector<Source> &sources)
     : stream_{output} {
-  if (!reserve_.IsHeld()) RefuseMemory();
+  if (!reserve_.IsHeld()) ThrowOutOfMemory();
   BeginObject();
   Array("format_version", std::array{1U, 0U}, [&](uint32_t part) { Number(part); });
   Member("morwick", MORWICK_VERSION);

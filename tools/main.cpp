@@ -119,7 +119,7 @@ int main(int argc, char **argv) {
   try {
     status = tools::Run(argc, argv);
   } catch (const std::bad_alloc &) {
-    tools::NoteMemoryRefusal();
+    tools::RememberMemoryRefusal();
   } catch (const std::exception &error) {
     std::fprintf(stderr, "morwick: %s\n", error.what());
   }

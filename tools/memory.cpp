@@ -20,8 +20,8 @@ std::atomic<bool> refusalTaken = false;
 MemoryReserve *held = nullptr;
 
 void OnRefusal() {
-  if (held == nullptr) RefuseMemory();
-  NoteMemoryRefusal();
+  if (held == nullptr) ThrowOutOfMemory();
+  RememberMemoryRefusal();
   held->GiveUp();
 }
 
@@ -37,13 +37,13 @@ void LimitMemory() {
 #endif
 }
 
-void NoteMemoryRefusal() {
+void RememberMemoryRefusal() {
   refused = true;
   refusalTaken = false;
 }
 
-void RefuseMemory() {
-  NoteMemoryRefusal();
+void ThrowOutOfMemory() {
+  RememberMemoryRefusal();
   throw std::bad_alloc();
 }
 

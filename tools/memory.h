@@ -14,8 +14,8 @@ void LimitMemory();
 
 // For memory that is refused outside of operator new: both remember the refusal, and the second
 // throws std::bad_alloc.
-void NoteMemoryRefusal();
-[[noreturn]] void RefuseMemory();
+void RememberMemoryRefusal();
+[[noreturn]] void ThrowOutOfMemory();
 
 // Whether memory was refused so far. Ask at the end of the program: a library may swallow the
 // exception and print only a part.

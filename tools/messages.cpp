@@ -2,6 +2,7 @@
 
 #include "tools/messages.h"
 
+#include <fmt/format.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -86,7 +87,7 @@ void KeepMessages() { keeping = true; }
 
 std::vector<Message> TakeMessages() {
   if (const uint64_t more = std::exchange(leftOut, 0)) {
-    kept.push_back({"note", std::to_string(more) + " more messages are left out here"});
+    kept.push_back({"note", fmt::format("{} more messages are left out here", more)});
   }
   return std::exchange(kept, {});
 }

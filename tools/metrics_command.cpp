@@ -262,7 +262,7 @@ void AddMetrics(CLI::App &app, Action *action) {
     }
     std::vector<MorwickStream> streams;
     for (const File &file : options->files) streams.push_back(file.stream);
-    if (streams.empty()) streams = {kMorwickKVR, kMorwickMSP};  // those that ReadLive reads
+    if (streams.empty()) streams = {kMorwickKVR, kMorwickMSP};  // ReadLive reads these two
     options->filter = MakeFilter(streams, options->names);
     *action = [=] { return Print(*options); };
   });

@@ -44,7 +44,7 @@ void AddNames(CLI::App *command, std::vector<std::string> *lists);
 // is wrong usage, and so are lists without a name.
 Filter Select(std::span<const MorwickStream> streams, const std::vector<std::string> &lists);
 
-// As Select, but null without lists.
+// Calls Select; null when there are no lists.
 Filter MakeFilter(std::span<const MorwickStream> streams, const std::vector<std::string> &lists);
 
 // -c, --controller: a class that the library knows.

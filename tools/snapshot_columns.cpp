@@ -33,7 +33,8 @@ SnapshotColumns::SnapshotColumns(const char *header)
     for (uint32_t part = 0; part < (isTriple ? 3 : 1); ++part) {
       const auto &[label, column] = field.names[part];
       for (uint32_t priority = 0; priority < std::max(field.priorities, 1U); ++priority) {
-        std::string name = ValidText(column);  // JSON would do so, and make two names equal
+        std::string name =
+            ValidText(column);  // as JSON does; two names must not become equal there
         if (isTriple) name.append("_").append(std::to_string(priority));
         // Labels differ, but one may be RO_0, which is also the first name of the priorities RO.
         while (!names.insert(name).second) name += "_2";

@@ -7,6 +7,7 @@
 #include <memory>
 #include <new>
 
+#include "fleet/judge.h"
 #include "fleet/snapshot_header.h"
 #include "fleet/snapshot_text.h"
 #include "tools/commands.h"
@@ -187,7 +188,7 @@ bool PrintRows(Output &output, Json &json, SnapshotRecords &records,
   return good;
 }
 
-// Nothing is flushed before all records have come: refused memory then leaves no half object.
+// Flushes only after all records: if memory is refused, no half object is left.
 bool PrintSummary(Output &output, Json *json, SnapshotRecords &records,
                   const SnapshotColumns &columns) {
   SnapshotSummary summary(columns);
@@ -204,16 +205,15 @@ bool PrintSummary(Output &output, Json *json, SnapshotRecords &records,
 // Says where the records end, unless they end as promised.
 Status JudgeEnd(const Snapshot &snapshot, const SnapshotRecords &records, uint64_t promised) {
   const auto promisedRecords = [&] {
-    return std::to_string(promised) + " records that " + snapshot.headerName + " promises";
+    return fmt::format("{} records that {} promises", promised, snapshot.headerName);
   };
   if (snapshot.header && records.count() < promised) {
-    Complain(snapshot.name,
-             "ends after " + std::to_string(records.count()) + " of " + promisedRecords());
+    Complain(snapshot.name, fmt::format("ends after {} of {}", records.count(), promisedRecords()));
     return kBadData;
   }
   if (!snapshot.header && records.rest() > 0) {
     Complain(snapshot.name,
-             "the last " + std::to_string(records.rest()) + " bytes are not a whole record");
+             fmt::format("the rest, {}, is not a whole record", fleet::Bytes(records.rest())));
     return kBadData;
   }
   if (records.rest() > records.recordSize()) {  // more than the record that is not printed
@@ -298,7 +298,7 @@ void AddSnapshot(CLI::App &app, Action *action) {
   command->callback([=] {
     options->live = file->count() == 0;
     if (!options->live && !options->className.empty()) {
-      throw CLI::ValidationError("--controller", "is not asked for what is read from a file");
+      throw CLI::ValidationError("--controller", "cannot be used with a file");
     }
     if (options->summary && options->format == Format::kCsv) {
       throw CLI::ValidationError("--summary", "is not printed as csv");

@@ -164,9 +164,9 @@ Status PrintRows(const Options &options, std::FILE *list, bool showProgress, Out
     if (!WriteRows(output, *batch)) return kBadData;
     dumps += batch->files.size();
     faults += ComplainOf(*batch, progress);
-    if (batch->outOfMemory) RefuseMemory();
+    if (batch->outOfMemory) ThrowOutOfMemory();
   }
-  if (table.outOfMemory()) RefuseMemory();
+  if (table.outOfMemory()) ThrowOutOfMemory();
   if (table.listFault().empty()) return faults == 0 ? kGood : kBadData;
   progress.Clear();
   Complain(DisplayName(options.list), table.listFault());

@@ -152,7 +152,7 @@ class Drivers {
                       std::string *answer) {
     const auto *buffer = std::ranges::find(kBuffers, command, &Buffer::command);
     if (buffer == kBuffers.end()) return kBadArgument;
-    // Both faults count every read, so both are asked before any return.
+    // Both faults count every read, so ask both before any return.
     const bool isShort = controller->shortRead.Hits();
     if (controller->failRead.Hits()) return kDeviceError;
     if (argument != kReadArgument) return kBadArgument;

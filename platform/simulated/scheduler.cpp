@@ -123,7 +123,7 @@ void ExitTransactionClean() { theActivity.inTransaction = false; }
 
 void RunMainQueue() {
   const simulated::Schedule &schedule = simulated::TakeProcess().schedule;
-  // So the lines that the library prints appear among the lines of the log, not after all of them.
+  // The library prints lines too. With a buffer for each line they stand among those of the log.
   std::setvbuf(stdout, nullptr, _IOLBF, 0);
   try {
     simulated::Run(schedule);

@@ -51,7 +51,7 @@ class Output {
       const size_t length = std::strlen(waiting_.data());
       const ssize_t written = write_(descriptor_, waiting_.data(), length);
       if (written == 0) return false;
-      // Counts the line, or all the lines that it was to report.
+      // The line is lost. If it reported lost lines, those count again.
       if (written < 0) dropped_ += std::max(reported_, 1ULL);
       // The rest of a line that was written in part keeps waiting.
       const bool done = written < 0 || static_cast<size_t>(written) == length;
