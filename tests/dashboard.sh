@@ -11,5 +11,5 @@ for query in "${queries[@]}"; do
   grep -q '=> [-+.e0-9]* @' <<<"$answer" || { printf '%s\nis not a number but\n%s\n' "$query" "$answer"; exit 1; }
 done
 [ ${#queries[@]} -gt 1 ]
-[ -z "$(jq '.panels[].id' "$1" | sort | uniq -d)" ] || { echo "$1: two panels have the same id"; exit 1; }
+[ -z "$(jq -c '.panels[] | .id, (.gridPos | {x, y})' "$1" | sort | uniq -d)" ] || { echo "$1: two panels have the same id or place"; exit 1; }
 echo "${#queries[@]} queries of the dashboard return data"

@@ -50,7 +50,7 @@ def refuse_each(call):
             assert getattr(error, "result", 1), error  # the driver's own
         except ValueError as raised:
             error = raised
-            assert "tuple" in str(raised)  # NumPy's own, of a type
+            assert "tuple" in str(raised)  # NumPy's own, about a type
         if refuse(0) < number:
             break
         assert error or repr(result) == good or "result=262" in repr(result), (call, number)  # the driver was refused

@@ -13,8 +13,8 @@ except OSError: pass
 
 
 def play(scenario, code, **environment):
-    """What the code prints in a fresh interpreter, with the platform's complaints about open handles. Something
-    else was refused memory before, which errno still tells."""
+    """What the code prints in a fresh interpreter, with the platform's complaints about open handles. A refusal
+    of memory came before; errno still tells it."""
     played = run("timeout", "60", sys.executable, "-c", PREFACE + textwrap.dedent(code),
                  GRELLON_SCENARIO=str(SOURCE / "packaging/scenarios" / scenario), **environment)  # fmt: skip
     return played.stdout + played.stderr
