@@ -25,7 +25,8 @@ FAULTS = b"refuse_open = [1]\nfail_request = [3]\nfail_close = true\nvanish = [4
 FILES = (b"statistics = ['kvr.bin', 'ftl.bin']\nmsp = 'msp.bin'\nsnapshot = 'snapshot.bin'\n"
          b"snapshot_header = 'snapshot_header.bin'\ntelemetry = 'kvr.bin'\n"
          b"[[controller]]\nclass = 'KVRStorage'\nstatistics = ['many.bin', 'more.bin']\n")
-GOOD = {"live.toml": NVME + FILES, "works.toml": QUICK % 1 + NVME, "bad.toml": b"a = \n"}
+GOOD = {"live.toml": NVME + FILES, "works.toml": QUICK % 1 + NVME, "bad.toml": b"a = \n",
+        "room.toml": NVME + b"statistics = ['many.bin', 'hostile.bin', 'more.bin']\n"}
 GOOD |= {f"faults-{runs}.toml": QUICK % runs + NVME + FAULTS for runs in (5, 50, 100000)}
 for example in ("kvr.bin", "ftl.bin", "msp.bin", "snapshot.bin", "snapshot_header.bin"):
     GOOD[example] = Path("examples", example).read_bytes() * (3 if example == "snapshot.bin" else 1)  # fills a pipe
@@ -179,13 +180,16 @@ def interrupt(number):
     return result, whole or result.status in result.deaths and result.file is None
 
 
-def run_while(act, *words):
+def run_while(act, call):
     """Runs the command while a thread acts again and again."""
     done = threading.Event()
     with ThreadPoolExecutor() as actor:
-        actor.submit(lambda: [act() for _ in iter(done.is_set, True)])
-        result = run([MORWICK, *words], "live")
-        done.set()
+        acting = actor.submit(lambda: [act() for _ in iter(done.is_set, True)])
+        try:
+            result = run([MORWICK, *call.split()], "live")
+        finally:
+            done.set()
+        acting.result()
     return result
 
 
@@ -206,7 +210,7 @@ def exchange(number):
             os.symlink(target, here + "/next")
             os.rename(here + "/next", here + "/link")
 
-    result = run_while((exchange_link, move_folder)[number % 2], "read", "telemetry", "-w", "there/" + name)
+    result = run_while((exchange_link, move_folder)[number % 2], "read telemetry -w there/" + name)
     good = set(os.listdir(here)) == {"old", "link"} and take("there/old") in (old, GOOD["kvr.bin"])
     shutil.rmtree(here)
     return result, good
@@ -214,25 +218,30 @@ def exchange(number):
 
 def shrink(number):
     """Makes a table of a file that is overwritten: a row has all values or a fault."""
-    file = Path(folder(), "kvr.bin")
+    file = Path(folder(), "s")
+    file.touch()
     result = run_while(lambda: [file.write_bytes(content) for content in (bytes(20000), GOOD["kvr.bin"], b"")],
-                       *"table -s kvr -n hostWrites kvr.bin kvr.bin kvr.bin".split())
-    fill(GOOD)
-    return result, re.fullmatch(rb'file,fault,hostWrites\n(kvr.bin,(,123456789|"?(there is nothing|the statistics end|'
+                       "table -s kvr -n hostWrites s s s")
+    return result, re.fullmatch(rb'file,fault,hostWrites\n(s,(,123456789|"?(there is nothing|the statistics end|'
                                 rb'no statistics).*,)\n){3}', result.output)
 
 
-def many_entries(words, room="unlimited"):
+def many_entries(call, room="unlimited"):
     """Reads entries that need more memory than the command takes, or than its caller leaves it (in bytes)."""
-    fill({"kvr.bin": b"\x36\0\0\0\0\0\0\0" * 262144})  # each eight bytes make 256 entries
-    result = run(["prlimit", f"--as={room}:", MORWICK, *words.split()], "live")
-    fill(GOOD)
+    fill({"hostile.bin": b"\x36\0\0\0\0\0\0\0" * 262144})  # each eight bytes make 256 entries
+    result = run(["prlimit", f"--as={room}:", MORWICK, *call.split()], "room")
     counts = [int(count) for count in re.findall(rb"out of memory after (\d+) entries", result.errors)]
     lines = result.output.splitlines()
-    shown = sum(len(line.split()) - 2 for line in lines)
-    return result, result.status == 1 and counts and (room == "unlimited" or counts[0] < 500000) and (
-        "normal" not in words or counts == [shown]) and (  # the next reading of a watch is good
-        "json" not in words or json.loads(lines[-1])["status"] == (0 if "watch" in words else 1))
+    if result.status != 1 or not counts or room != "unlimited" and counts[0] >= 500000:
+        return result, False
+    if "normal" in call:  # all that was read is printed
+        return result, counts == [sum(len(line.split()) - 2 for line in lines)]
+    if "metrics" in call:
+        return result, b'morwick_read_success{stream="msp"} 1' in lines
+    objects = [json.loads(line) for line in lines] if "json" in call else []
+    if "watch" in call:  # compares the third reading with the first
+        return result, [each["status"] for each in objects] == [0, 1, 0] and len(objects[2]["changes"]) == 2000
+    return result, all(each["status"] == 1 for each in objects)
 
 
 def feed(number):
@@ -283,7 +292,7 @@ def carry_out(attack, jobs, pool):
         kept = f"{ROOT}/{attack}-{next(numbers)}"
         shutil.copytree(folder(), kept, symlinks=True)
         print(f"{attack}: {result.fault or 'goes wrong'}, status {result.status}:",
-              result.command.replace(folder(), kept), flush=True)
+              result.command.replace(folder(), kept), result.errors[-300:], flush=True)
         return result.took, 1
 
     times, found = zip(*filter(None, pool.map(one, itertools.count(), jobs)))
@@ -298,10 +307,11 @@ print("seed", SEED, flush=True)
 with ThreadPoolExecutor(os.cpu_count()) as workers:
     table = [(attack, *carry_out(attack, jobs, workers)) for attack, jobs in {
         "daemon": refused_memory(PROGRAMS[:3]), "memory": refused_memory(PROGRAMS[3:]), "module": [refuse_module],
-        "room": [partial(many_entries, "stats -s kvr --summary kvr.bin", "100000000"), *(
+        "room": [partial(many_entries, "stats -s kvr --summary hostile.bin", "100000000"), *(
             partial(many_entries, words) for words in (
-                "stats -s kvr -o normal kvr.bin", "stats -s kvr -o json kvr.bin", "metrics kvr=kvr.bin",
-                "diff -s kvr -o json kvr.bin kvr.bin", "watch -s kvr --every 0.1 --count 1 -o json"))],
+                "stats -s kvr -o normal hostile.bin", "stats -s kvr -o json hostile.bin",
+                "metrics kvr=hostile.bin msp=msp.bin", "diff -s kvr -o json hostile.bin hostile.bin",
+                "watch -s kvr --every 0.1 --count 2 -o json"))],
         "signals": (partial(interrupt, n) for n in range(1000)),
         "links": (partial(exchange, n) for n in range(1000)),
         "files": (partial(shrink, n) for n in range(100)),

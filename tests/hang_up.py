@@ -7,7 +7,7 @@ tty.setraw(reading)
 os.write(terminal, sys.stdin.buffer.read())
 reader = subprocess.Popen(sys.argv[1:], stdin=reading)
 waits = lambda: open(f"/proc/{reader.pid}/stat").read().split()[2] == "S"
-while any(fcntl.ioctl(reading, termios.FIONREAD, bytes(4))) or not waits():
+while reader.poll() is None and (any(fcntl.ioctl(reading, termios.FIONREAD, bytes(4))) or not waits()):
     time.sleep(0.01)
 os.close(terminal)
 sys.exit(reader.wait())

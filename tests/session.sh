@@ -21,7 +21,7 @@ export LD_PRELOAD=
 fast() { LD_PRELOAD=$FAST_SLEEP ASAN_OPTIONS=verify_asan_link_order=0 "$@"; }
 # A watch, with pauses and seconds a thousand times shorter.
 fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MORWICK" watch "$@"; }
-# Runs a command with that many KiB of memory, so that a leak ends it; a sanitizer needs more.
+# Runs a command with at most that many KiB of memory, so that a leak ends it; a sanitizer needs more.
 with_memory() { ([ "$SANITIZED" ] || ulimit -v "$1" && "${@:2}"); }
 # The screen of a terminal at a command's end, as tests/terminal.py has it, without times and rates.
 terminal() {
@@ -51,7 +51,11 @@ field() { perl -e 'print pack "V3 a16", @ARGV' -- "$@"; }
 # Runs a program as somebody who may not read everything, as root may.
 unprivileged() { if [ "$UID" = 0 ]; then setpriv --bounding-set=-all --inh-caps=-all "$@"; else "$@"; fi; }
 # Runs a script of the shell with file systems of its own. Where it may not mount any, the script runs without.
-mounting() { if unshare -rm true 2>error; then unshare -rm sh -c "$1"; else unprivileged sh -c "$1"; fi; }
+mounting() {
+  local own
+  for own in "unshare -m" "unshare -rm" unprivileged; do $own true 2>error && break; done
+  $own sh -c "$1"
+}
 # Runs a program that reads its input from a terminal, which hangs up once all is read.
 hang_up() { /usr/bin/python3 "$SOURCE/tests/hang_up.py" "$@"; }
 # Runs a program and sends it a signal after some time. Usage: after SECONDS SIGNAL PROGRAM...

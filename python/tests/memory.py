@@ -13,7 +13,7 @@ def read():
         return controller.read("snapshot")
 
 
-def table():
+def read_table():
     table = morwick.table(EXAMPLES + "fleet", names=["host*"], jobs=2, progress=lambda *now: None)
     assert len(table.files) == 6
 
@@ -22,21 +22,22 @@ calls = [lambda: dict(morwick.parse(bytearray(kvr)).items()), lambda: morwick.pa
          lambda: morwick.parse(kvr).summary, lambda: morwick.parse(kvr[:100] + b"1").fault,
          lambda: morwick.parse(kvr)["readCountHisto"], lambda: morwick.keys("msp"),
          lambda: morwick.snapshot(data), lambda: morwick.snapshot(data, header),
-         lambda: morwick.render(words), lambda: morwick.render(data, header), morwick.controllers, read, table]
+         lambda: morwick.render(words), lambda: morwick.render(data, header), morwick.controllers, read, read_table]
 
 
 class Heap(ctypes.Structure):  # of mallinfo2
-    _fields_ = [(name, ctypes.c_size_t) for name in "abcdefghij"]
+    _fields_ = [(name, ctypes.c_size_t) for name in (
+        "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost").split()]
 
 
 def growth():
-    """In bytes. The fields e (hblkhd) and h (uordblks) are the bytes in use."""
+    """Of the bytes in use: the heap's own, and those of mapped blocks."""
     before = heap()
     for call in calls * 100:
         call()
         morwick.parse(b"").get("x" * len(kvr))
     now = heap()
-    return now.h + now.e - before.h - before.e
+    return now.uordblks + now.hblkhd - before.uordblks - before.hblkhd
 
 
 def refuse_each(call):
@@ -47,13 +48,13 @@ def refuse_each(call):
             result, error = call(), None
         except (MemoryError, morwick.ControllerError) as raised:
             error = raised
-            assert getattr(error, "result", 1), error  # the driver's own
+            assert getattr(error, "result", 1), error  # the code of a driver that was refused memory
         except ValueError as raised:
             error = raised
-            assert "tuple" in str(raised)  # NumPy's own, about a type
+            assert "tuple" in str(raised)  # NumPy says so when it is refused memory for a type
         if refuse(0) < number:
             break
-        assert error or repr(result) == good or "result=262" in repr(result), (call, number)  # the driver was refused
+        assert error or repr(result) == good or "result=262" in repr(result), (call, number)  # as above
     assert error is None and number > 3, (call, number)
     call()
 
@@ -65,7 +66,7 @@ if sys.argv[1] == "leaks":
     heap.restype = Heap
     grown = [growth() for _ in range(6)]
     assert min(grown) < 20000, grown  # the first calls fill caches
-else:
+elif sys.argv[1] == "refusals":
     refuse = ctypes.CDLL(None).RefuseAllocation
     for call in calls:
         refuse_each(call)
