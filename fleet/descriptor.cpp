@@ -1,5 +1,3 @@
-// File descriptors.
-
 #include "fleet/descriptor.h"
 
 #include <poll.h>

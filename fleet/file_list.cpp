@@ -1,5 +1,3 @@
-// The files of a fleet, one after the other.
-
 #include "fleet/file_list.h"
 
 #include <dirent.h>

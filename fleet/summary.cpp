@@ -1,5 +1,3 @@
-// The main figures of a KVR dump.
-
 #include "fleet/summary.h"
 
 #include "morwick/summary.h"

@@ -1,5 +1,3 @@
-// A table with aligned columns, for people.
-
 #include "tools/aligned_table.h"
 
 #include <algorithm>

@@ -1,5 +1,3 @@
-// What changed between two readings of the same statistics.
-
 #include "tools/changes.h"
 
 #include <cmath>

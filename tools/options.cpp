@@ -1,5 +1,3 @@
-// Options that several sub-commands share.
-
 #include "tools/options.h"
 
 #include <algorithm>

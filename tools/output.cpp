@@ -1,5 +1,3 @@
-// Standard output of the morwick command.
-
 #include "tools/output.h"
 
 #include <fcntl.h>

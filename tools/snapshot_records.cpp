@@ -1,5 +1,3 @@
-// The records of a snapshot, in blocks, as they arrive.
-
 #include "tools/snapshot_records.h"
 
 #include <algorithm>

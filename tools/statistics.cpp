@@ -1,5 +1,3 @@
-// Dumps, their parsed statistics, and the entries in these.
-
 #include "tools/statistics.h"
 
 #include <fmt/format.h>

@@ -1,5 +1,3 @@
-// Cleans texts for terminals, JSON and CSV; reads and writes numbers.
-
 #include "tools/text.h"
 
 #include <fmt/format.h>

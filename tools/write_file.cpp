@@ -1,5 +1,3 @@
-// Writes files whole or not at all.
-
 #include "tools/write_file.h"
 
 #include <fcntl.h>

@@ -1,5 +1,3 @@
-// Reads files from outside, and prints complaints.
-
 #include "platform/simulated/files.h"
 
 #include <errno.h>
