@@ -24,7 +24,7 @@ fast_watch() { LD_PRELOAD=$FAST_WATCH ASAN_OPTIONS=verify_asan_link_order=0 "$MO
 # Runs a command with at most that many KiB of memory, so that a leak ends it; a sanitizer needs more.
 with_memory() { ([ "$SANITIZED" ] || ulimit -v "$1" && "${@:2}"); }
 # The screen of a terminal at a command's end, as tests/terminal.py has it, without times and rates.
-terminal() {
+screen() {
   /usr/bin/python3 "$SOURCE/tests/terminal.py" "$@" 2>&1 |
     sed 's/^[-0-9]* [:0-9]*, [.0-9]* s/TIME/; s/ [0-9.-]*\.[0-9]*/ RATE/' | tr -s ' '
 }
